@@ -1,0 +1,32 @@
+# Compiler settings shared by every target of the project.
+set(CMAKE_CXX_STANDARD 20)
+set(CMAKE_CXX_STANDARD_REQUIRED ON)
+set(CMAKE_CXX_EXTENSIONS OFF)
+set(CMAKE_POSITION_INDEPENDENT_CODE ON)
+set(CMAKE_EXPORT_COMPILE_COMMANDS ON)
+
+if(NOT CMAKE_BUILD_TYPE)
+    set(CMAKE_BUILD_TYPE Release)
+endif()
+
+add_compile_options(-Wall -Wextra -Wpedantic -Wshadow -Wno-non-virtual-dtor
+    -Woverloaded-virtual -Wcast-align -Wformat=2 -Wundef -Wconversion -Wno-sign-conversion)
+
+option(SSOCLIENT_WERROR "Treat compiler warnings as errors" ON)
+if(SSOCLIENT_WERROR)
+    add_compile_options(-Werror)
+endif()
+
+# Hardening that costs nothing measurable; the linker flags make the GOT read-only.
+add_compile_options(-fstack-protector-strong)
+if(CMAKE_BUILD_TYPE STREQUAL "Release" OR CMAKE_BUILD_TYPE STREQUAL "RelWithDebInfo")
+    add_compile_options(-U_FORTIFY_SOURCE -D_FORTIFY_SOURCE=2)
+endif()
+add_link_options(-Wl,-z,relro,-z,now)
+
+set(SSOCLIENT_SANITIZE "" CACHE STRING "Sanitizers to build with, for example address,undefined")
+if(SSOCLIENT_SANITIZE)
+    add_compile_options(-fsanitize=${SSOCLIENT_SANITIZE} -fno-sanitize-recover=all
+        -fno-omit-frame-pointer)
+    add_link_options(-fsanitize=${SSOCLIENT_SANITIZE})
+endif()
