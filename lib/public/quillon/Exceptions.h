@@ -70,8 +70,7 @@ public:
 QUILLON_API std::string GetClassName(const std::exception& error);
 
 /** A bad argument. The text is "Invalid argument : " followed by the given message. */
-class QUILLON_API InvalidArgumentException
-    : public ExceptionOf<InvalidArgumentException, Exception>
+class QUILLON_API InvalidArgumentException : public ExceptionOf<InvalidArgumentException, Exception>
 {
 public:
     explicit InvalidArgumentException(const std::string& message);

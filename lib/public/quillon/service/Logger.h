@@ -20,7 +20,8 @@ enum LogLevel : int
  * Takes the lines of all loggers: logger name, level, text without line break. It is called on
  * the thread that logs, from several threads at once, and must not throw.
  */
-using LogSink = boost::function<void(const std::string& logger, int level, const std::string& text)>;
+using LogSink =
+    boost::function<void(const std::string& logger, int level, const std::string& text)>;
 
 /**
  * A named stream of log lines with a level of its own.
