@@ -1,0 +1,2 @@
+def add_all(catalogue):
+    pass
