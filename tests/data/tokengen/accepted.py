@@ -414,8 +414,9 @@ def _sizes(c):
 
 
 def _of_size(size, token):
-    count = 0
-    while len(signed(token).encode()) < size:
-        count += 1
-        token = token.but(groups=[(f"Group-{i:04}", "example.com") for i in range(count)])
+    signature_value = 342
+    groups = []
+    while len(token.text()) + signature_value < size:
+        groups.append((f"Group-{len(groups):04}", "example.com"))
+        token = token.but(groups=groups)
     return token

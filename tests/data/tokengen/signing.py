@@ -9,8 +9,10 @@ character references stay as the caller wrote them.
 import base64
 import hashlib
 import hmac
+import subprocess
+import tempfile
 
-from cryptography.hazmat.primitives import hashes
+from cryptography.hazmat.primitives import hashes, serialization
 from cryptography.hazmat.primitives.asymmetric import ec, padding, rsa
 from cryptography.hazmat.primitives.asymmetric.utils import decode_dss_signature
 from lxml import etree
@@ -37,8 +39,10 @@ def sign(text, key, digest_form=str, value_form=str, hmac_key=None):
 
     digest_form and value_form turn the Base64 text into what is written in the token.
     """
-    for position in range(text.count("@DIGEST@")):
-        digest = _reference_digest(_parse(text), position)
+    if "#default" in text:
+        return _sign_by_xmlsec1(text, key)
+    for _ in range(text.count("@DIGEST@")):
+        digest = _reference_digest(_parse(text))
         text = text.replace("@DIGEST@", digest_form(_base64(digest)), 1)
     signed_info = _find(_parse(text), "ds:SignedInfo")
     value = _signature_value(signed_info, key, hmac_key)
@@ -81,7 +85,26 @@ def _base64(data):
     return base64.b64encode(data).decode()
 
 
-def _reference_digest(root, position):
+def _sign_by_xmlsec1(text, key):
+    """lxml drops #default from a PrefixList, so xmlsec1 computes the two values then."""
+    pem = key.private_bytes(
+        serialization.Encoding.PEM, serialization.PrivateFormat.PKCS8, serialization.NoEncryption())
+    with tempfile.NamedTemporaryFile() as key_file, tempfile.NamedTemporaryFile() as template:
+        key_file.write(pem)
+        key_file.flush()
+        template.write(text.replace("@DIGEST@", "").replace("@VALUE@", "").encode())
+        template.flush()
+        output = subprocess.run(
+            ["xmlsec1", "--sign", "--id-attr:ID", names.SAML + ":Assertion"]
+            + ["--privkey-pem", key_file.name, template.name], check=True, capture_output=True)
+    root = _parse_bytes(output.stdout)
+    for mark, path in (("@DIGEST@", "ds:SignedInfo/ds:Reference/ds:DigestValue"),
+                       ("@VALUE@", "ds:SignatureValue")):
+        text = text.replace(mark, "".join(_find(root, path).text.split()))
+    return text
+
+
+def _reference_digest(root):
     # The marks are replaced in document order, so the first unfilled DigestValue is the one.
     signature = next(root.iter("{%s}Signature" % names.DS))
     reference = next(
