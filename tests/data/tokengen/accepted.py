@@ -409,8 +409,8 @@ def _sizes(c):
     _add(c, "bearer-8k", "a bearer token of about 8 KB",
          _of_size(8192, BASE.signed_as(key_info=key_info("sts"))))
     _add(c, "bearer-100k", "a bearer token of a thousand groups, about 100 KB",
-         BASE.but(groups=[(f"Group-{i:04}", "example.com") for i in range(1000)]))
-    _add(c, "long-value", "one value of 64 KB", BASE.but(given_name="0123456789abcdef" * 4096))
+         BASE.but(groups=[(f"Department-{i:04}-Staff", "example.com") for i in range(1000)]))
+    _add(c, "long-value", "one value of 16 KB", BASE.but(given_name="0123456789abcdef" * 1024))
 
 
 def _of_size(size, token):

@@ -2,6 +2,7 @@
 
 import base64
 import subprocess
+from functools import lru_cache
 from pathlib import Path
 
 from cryptography import x509
@@ -38,11 +39,13 @@ def certificate_path(name):
     return DIRECTORY / f"{name}-cert.pem"
 
 
+@lru_cache
 def private_key(name):
     pem = (DIRECTORY / f"{name}-key.pem").read_bytes()
     return serialization.load_pem_private_key(pem, None)
 
 
+@lru_cache
 def certificate(name):
     return x509.load_pem_x509_certificate(certificate_path(name).read_bytes())
 

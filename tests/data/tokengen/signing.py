@@ -34,26 +34,29 @@ HMAC_HASHES = {names.HMAC_SHA1: "sha1", names.HMAC_SHA256: "sha256"}
 _NAMESPACES = {"ds": names.DS, "ec": names.EXC_C14N}
 
 
-def sign(text, key, digest_form=str, value_form=str, hmac_key=None):
+def sign(text, key, digest_form=str, value_form=str, hmac_key=None, stand_in=None):
     """Signs the first ds:Signature of the text by what its own SignedInfo asks for.
 
-    digest_form and value_form turn the Base64 text into what is written in the token.
+    digest_form and value_form turn the Base64 text into what is written in the token. stand_in is
+    a text and what takes its place in the end, for what libxml2 would not canonicalize.
     """
     if "#default" in text:
         return _sign_by_xmlsec1(text, key)
     for _ in range(text.count("@DIGEST@")):
-        digest = _reference_digest(_parse(text))
+        digest = _reference_digest(_parse(text), stand_in)
         text = text.replace("@DIGEST@", digest_form(_base64(digest)), 1)
     signed_info = _find(_parse(text), "ds:SignedInfo")
     value = _signature_value(signed_info, key, hmac_key)
-    return text.replace("@VALUE@", value_form(_base64(value)))
+    text = text.replace("@VALUE@", value_form(_base64(value)))
+    return text.replace(*stand_in) if stand_in else text
 
 
 def canonical(element, method):
     """The canonical form of the element, as the given CanonicalizationMethod or Transform."""
     algorithm = method.get("Algorithm")
     prefixes = None
-    exclusive = algorithm.startswith(names.EXC_C14N)
+    # Whatever is no canonicalization at all is taken for the exclusive one.
+    exclusive = not algorithm.startswith(names.C14N)
     inclusive_namespaces = method.find("ec:InclusiveNamespaces", _NAMESPACES)
     if exclusive and inclusive_namespaces is not None:
         prefixes = inclusive_namespaces.get("PrefixList").split()
@@ -104,7 +107,7 @@ def _sign_by_xmlsec1(text, key):
     return text
 
 
-def _reference_digest(root):
+def _reference_digest(root, stand_in):
     # The marks are replaced in document order, so the first unfilled DigestValue is the one.
     signature = next(root.iter("{%s}Signature" % names.DS))
     reference = next(
@@ -113,15 +116,19 @@ def _reference_digest(root):
     target = _target(root, reference.get("URI"))
     last = reference
     for transform in reference.iterfind("ds:Transforms/ds:Transform", _NAMESPACES):
-        algorithm = transform.get("Algorithm")
+        algorithm = transform.get("Algorithm", "")
         if algorithm == names.ENVELOPED:
             _remove(signature)
-        elif "c14n" in algorithm:
+        elif algorithm.startswith((names.C14N, names.EXC_C14N)):
             last = transform
     if last is reference:
         last = etree.Element("Transform", Algorithm=names.C14N)
-    digest = reference.find("ds:DigestMethod", _NAMESPACES).get("Algorithm")
-    return hashlib.new(DIGESTS.get(digest, "sha256"), canonical(target, last)).digest()
+    method = reference.find("ds:DigestMethod", _NAMESPACES)
+    algorithm = "" if method is None else method.get("Algorithm", "")
+    data = canonical(target, last)
+    if stand_in:
+        data = data.replace(*(part.encode() for part in stand_in))
+    return hashlib.new(DIGESTS.get(algorithm, "sha256"), data).digest()
 
 
 def _target(root, uri):
@@ -152,7 +159,7 @@ def _signature_value(signed_info, key, hmac_key):
         method = etree.Element("CanonicalizationMethod", Algorithm=names.EXC_C14N)
     data = canonical(signed_info, method)
     signature_method = signed_info.find("ds:SignatureMethod", _NAMESPACES)
-    algorithm = names.RSA_SHA256 if signature_method is None else signature_method.get("Algorithm")
+    algorithm = "" if signature_method is None else signature_method.get("Algorithm", "")
     if hmac_key is not None:
         return hmac.new(hmac_key, data, HMAC_HASHES[algorithm]).digest()
     hash_class = SIGNATURE_HASHES.get(algorithm, hashes.SHA256)
