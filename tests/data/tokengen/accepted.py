@@ -8,6 +8,9 @@ from .catalogue import signed
 
 BASE = Token()
 HOLDER = Token(holder="client")
+# What the refused tokens are made of: there are many, so it is short.
+LEAN = Token(surname=None)
+LEAN_HOLDER = LEAN.but(holder="client")
 DELEGATES = [
     ("first", "example.com", "2026-01-01T01:00:00Z"),
     ("second", "example.com", "2026-01-01T02:00:00Z"),
@@ -205,9 +208,10 @@ def _lexical_forms(c):
     _add(c, "attribute-normalization", "tabs and line ends inside attribute values", BASE,
          ("<saml:AuthnContextClassRef>",
           '<saml:AuthnContextClassRef a="x\ty\nz" b="&#9;&#10;&#13;&lt;&amp;&gt;&quot;">'))
-    _add(c, "empty-element-tags", "empty elements in the short form", BASE,
-         ("></saml:SubjectConfirmationData>", "/>"), ("></ds:SignatureMethod>", " />"),
-         ("></ds:DigestMethod>", "/>"), ("></ds:CanonicalizationMethod>", "/>"))
+    _add(c, "empty-element-tags", "empty elements in the other form", BASE,
+         ("></saml:SubjectConfirmationData>", " />"),
+         (f'"{names.RSA_SHA256}"/>', f'"{names.RSA_SHA256}"></ds:SignatureMethod>'),
+         (f'"{names.SHA256}"/>', f'"{names.SHA256}"> </ds:DigestMethod>'))
     _add(c, "blanks-inside-tags", "blanks and line ends inside tags", BASE,
          ("<saml:Subject>", "<saml:Subject\n\t >"), ("</saml:Subject>", "</saml:Subject  \n>"),
          ('" NotOnOrAfter="2026-12-31T00:00:00Z">\n</saml:Conditions>',

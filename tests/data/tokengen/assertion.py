@@ -7,7 +7,7 @@ from xml.sax.saxutils import escape
 
 from . import keys, names
 
-ID = "_7d1f6a52-0b35-4a8e-9c61-2f4e8d90ab17"
+ID = "_7d1f6a52-9c61"
 
 
 def micros(text):
@@ -33,24 +33,22 @@ class SignatureForm:
         p = self.prefix + ":" if self.prefix else ""
         declaration = "xmlns:" + self.prefix if self.prefix else "xmlns"
         transforms = "".join(
-            f'<{p}Transform Algorithm="{t}">{self._prefix_list(t, self.transform_prefixes)}'
-            f"</{p}Transform>" for t in self.transforms)
+            self._method(p + "Transform", t, self.transform_prefixes) for t in self.transforms)
         return (
             f'<{p}Signature {declaration}="{names.DS}"><{p}SignedInfo>'
-            f'<{p}CanonicalizationMethod Algorithm="{self.c14n}">'
-            f"{self._prefix_list(self.c14n, self.c14n_prefixes)}</{p}CanonicalizationMethod>"
-            f'<{p}SignatureMethod Algorithm="{self.method}"></{p}SignatureMethod>'
-            f'<{p}Reference URI="{self.uri}"><{p}Transforms>{transforms}</{p}Transforms>'
-            f'<{p}DigestMethod Algorithm="{self.digest}"></{p}DigestMethod>'
-            f"<{p}DigestValue>@DIGEST@</{p}DigestValue></{p}Reference></{p}SignedInfo>"
+            + self._method(p + "CanonicalizationMethod", self.c14n, self.c14n_prefixes)
+            + self._method(p + "SignatureMethod", self.method)
+            + f'<{p}Reference URI="{self.uri}"><{p}Transforms>{transforms}</{p}Transforms>'
+            + self._method(p + "DigestMethod", self.digest)
+            + f"<{p}DigestValue>@DIGEST@</{p}DigestValue></{p}Reference></{p}SignedInfo>"
             f"<{p}SignatureValue>@VALUE@</{p}SignatureValue>{self.key_info}</{p}Signature>")
 
     @staticmethod
-    def _prefix_list(algorithm, prefixes):
+    def _method(name, algorithm, prefixes=None):
         if prefixes is None or algorithm != names.EXC_C14N:
-            return ""
-        return (f'<ec:InclusiveNamespaces xmlns:ec="{names.EXC_C14N}" '
-                f'PrefixList="{prefixes}"></ec:InclusiveNamespaces>')
+            return f'<{name} Algorithm="{algorithm}"/>'
+        return (f'<{name} Algorithm="{algorithm}"><ec:InclusiveNamespaces '
+                f'xmlns:ec="{names.EXC_C14N}" PrefixList="{prefixes}"/></{name}>')
 
 
 def x509_data(*certificates, prefix="ds:", form=str):

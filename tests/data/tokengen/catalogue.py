@@ -6,8 +6,13 @@ import re
 from . import keys, signing
 from .assertion import Token, micros
 
-NOW = "2026-06-15T12:00:00Z"
-TOLERANCE = 600
+DEFAULTS = {
+    "trust": ["sts"],
+    "now": "2026-06-15T12:00:00Z",
+    "nowMicros": micros("2026-06-15T12:00:00Z"),
+    "toleranceSec": 600,
+    "xmlsec1": "none",
+}
 
 PARSE = "SsoClient::ParseException"
 SIGNATURE = "SsoClient::InvalidSignatureException"
@@ -58,7 +63,8 @@ class Catalogue:
     def refuse(self, name, about, text, refusals, xmlsec1="none", **conditions):
         """xmlsec1: what that program must say of the bare signature, or "none" for not asked."""
         entry = self._entry("refused", name, about, text, conditions)
-        entry["xmlsec1"] = xmlsec1
+        if xmlsec1 != "none":
+            entry["xmlsec1"] = xmlsec1
         entry["refusals"] = refusals
 
     def save(self):
@@ -70,22 +76,23 @@ class Catalogue:
         for entry in self._entries:
             lines = [f"  {json.dumps(k)}: {json.dumps(v)}" for k, v in entry.items()]
             blocks.append("{\n" + ",\n".join(lines) + "\n}")
-        (self._directory / "expected.json").write_text("[\n" + ",\n".join(blocks) + "\n]\n")
+        (self._directory / "expected.json").write_text(
+            '{"defaults":\n' + json.dumps(DEFAULTS) + ',\n"tokens": [\n' + ",\n".join(blocks)
+            + "\n]}\n")
         return len(self._entries)
 
     def _entry(self, folder, name, about, text, conditions):
         file = f"{folder}/{name}.xml"
         if any(e["file"] == file for e in self._entries):
             raise ValueError(f"{file} is made twice")
-        now = conditions.get("now", NOW)
-        entry = {
-            "file": file,
-            "about": about,
-            "trust": conditions.get("trust", ["sts"]),
-            "now": now,
-            "nowMicros": micros(now),
-            "toleranceSec": conditions.get("tolerance", TOLERANCE),
-        }
+        entry = {"file": file, "about": about}
+        if "trust" in conditions:
+            entry["trust"] = conditions["trust"]
+        if "now" in conditions:
+            entry["now"] = conditions["now"]
+            entry["nowMicros"] = micros(conditions["now"])
+        if "tolerance" in conditions:
+            entry["toleranceSec"] = conditions["tolerance"]
         self._entries.append(entry)
         data = text if isinstance(text, bytes) else text.encode()
         _write_unless_same_but_signature(self._directory / file, data)

@@ -5,7 +5,7 @@ import base64
 from cryptography.hazmat.primitives.serialization import Encoding
 
 from . import keys, names
-from .accepted import BASE, DELEGATES, HOLDER, rsa_key_value
+from .accepted import DELEGATES, LEAN, LEAN_HOLDER, rsa_key_value
 from .assertion import ID, key_info
 from .catalogue import (
     MALFORMED, NOT_COVERED, OUTSIDE_PROFILE, PARSE, SIGNATURE_SYNTAX, TAMPERED, replaced, says,
@@ -49,7 +49,7 @@ def _changed_digit(value, position):
 
 
 def _tampering(c):
-    good = signed(HOLDER.but(delegates=DELEGATES[:1], renew_count="1"))
+    good = signed(LEAN.but(renew_count="1"))
 
     def add(name, *edits, refusals=TAMPERED, text=good):
         for edit in edits:
@@ -61,7 +61,7 @@ def _tampering(c):
     for name, position in (("first", 0), ("middle", 170), ("last", 340)):
         add(f"signature-{name}-digit", (value, _changed_digit(value, position)))
     add("digest-of-another", (digest, base64.b64encode(bytes(32)).decode()))
-    add("signature-of-another", (value, _value_of(signed(BASE), "SignatureValue")))
+    add("signature-of-another", (value, _value_of(signed(LEAN), "SignatureValue")))
     short = OUTSIDE_PROFILE + TAMPERED + SIGNATURE_SYNTAX
     add("digest-empty", (digest, ""), refusals=short)
     add("digest-cut", (digest, digest[:40]), refusals=short)
@@ -83,20 +83,21 @@ def _tampering(c):
     add("issuer", ("https://sts.example.com/STS", "https://sts.example.com/STT"))
     add("one-attribute", ('Count="1"', 'Count="2"'))
     add("attribute-added", ("<saml:AuthnContextClassRef>", '<saml:AuthnContextClassRef a="b">'))
-    add("end", ('NotOnOrAfter="2026-12-31', 'NotOnOrAfter="2036-12-31'))
-    add("element-removed", (BASE.attribute(names.GIVEN_NAME, ["Ada"]), ""))
+    add("end", ('NotOnOrAfter="2026-12-31', 'NotOnOrAfter="2036-12-31', 2))
+    add("element-removed", (LEAN.attribute(names.GIVEN_NAME, ["Ada"]), ""))
     add("element-added", ("</saml:AttributeStatement>",
-                          BASE.attribute(names.SOLUTION, ["true"]) + "</saml:AttributeStatement>"))
+                          LEAN.attribute(names.SOLUTION, ["true"]) + "</saml:AttributeStatement>"))
     add("blank-added", ("<saml:Subject>", "<saml:Subject> "))
     add("line-ends", ("\n<saml:Subject>", "&#13;\n<saml:Subject>"))
     add("prefix-renamed", ("<saml:Subject>", f'<s:Subject xmlns:s="{names.SAML}">'),
         ("</saml:Subject>", "</s:Subject>"))
     add("confirmation-certificate",
-        (keys.certificate_base64("client"), keys.certificate_base64("foreign")))
+        (keys.certificate_base64("client"), keys.certificate_base64("foreign")),
+        text=signed(LEAN_HOLDER))
     add("attribute-in-signed-info", ("<ds:SignedInfo>", '<ds:SignedInfo Id="a">'))
     add("blank-in-signed-info", ("<ds:SignedInfo>", "<ds:SignedInfo> "))
     add("reference-made-empty", (f'URI="#{ID}"', 'URI=""'))
-    add("digest-method", (names.SHA256 + '"></ds:Dig', names.SHA512 + '"></ds:Dig'),
+    add("digest-method", (names.SHA256 + '"', names.SHA512 + '"'),
         refusals=OUTSIDE_PROFILE + TAMPERED)
     add("signature-method", (names.RSA_SHA256, names.RSA_SHA512))
     add("canonicalization",
@@ -104,14 +105,14 @@ def _tampering(c):
          f'<ds:CanonicalizationMethod Algorithm="{names.C14N}"'))
     add("transform", (f'<ds:Transform Algorithm="{names.EXC_C14N}"',
                       f'<ds:Transform Algorithm="{names.C14N}"'))
-    inclusive = BASE.signed_as(c14n=names.C14N, transforms=(names.ENVELOPED, names.C14N))
+    inclusive = LEAN.signed_as(c14n=names.C14N, transforms=(names.ENVELOPED, names.C14N))
     add("unused-declaration-inclusive", ("<saml:Subject>", '<saml:Subject xmlns:a="urn:a">'),
         text=signed(inclusive))
     add("declaration-changed-inclusive", (names.XS + '"', 'urn:xs"'), text=signed(inclusive))
-    listed = signed(BASE.signed_as(transform_prefixes="xs"))
+    listed = signed(LEAN.signed_as(transform_prefixes="xs"))
     add("listed-declaration", (names.XS + '"', 'urn:xs"'), text=listed)
     add("prefix-list", ('PrefixList="xs"', 'PrefixList="xsi"'), text=listed)
-    whole = signed(BASE.signed_as(uri=""))
+    whole = signed(LEAN.signed_as(uri=""))
     add("instruction-before-root", ("<saml:Assertion ", "<?a b?><saml:Assertion "), text=whole,
         refusals=TAMPERED + OUTSIDE_PROFILE + MALFORMED)
     add("instruction-after-root", ("</saml:Assertion>", "</saml:Assertion><?a b?>"), text=whole,
@@ -122,40 +123,40 @@ def _other_keys(c):
     def add(name, about, text, refusals, **conditions):
         c.refuse("key-" + name, about, text, refusals, "invalid", **conditions)
     any_way = TAMPERED + OUTSIDE_PROFILE
-    add("foreign", "another key of the same name signed", signed(BASE, key="foreign"), TAMPERED)
+    add("foreign", "another key of the same name signed", signed(LEAN, key="foreign"), TAMPERED)
     add("foreign-own-certificate", "the signer brings its own certificate",
-        signed(BASE.signed_as(key_info=key_info("foreign")), key="foreign"), OUTSIDE_PROFILE)
+        signed(LEAN.signed_as(key_info=key_info("foreign")), key="foreign"), OUTSIDE_PROFILE)
     add("foreign-trusted-certificate", "another key signed, KeyInfo shows the trusted certificate",
-        signed(BASE.signed_as(key_info=key_info("sts")), key="foreign"), TAMPERED)
+        signed(LEAN.signed_as(key_info=key_info("sts")), key="foreign"), TAMPERED)
     add("foreign-both-certificates", "KeyInfo shows the trusted certificate and its own",
-        signed(BASE.signed_as(key_info=key_info("sts", "foreign")), key="foreign"), TAMPERED)
+        signed(LEAN.signed_as(key_info=key_info("sts", "foreign")), key="foreign"), TAMPERED)
     add("foreign-key-value", "the signer brings its bare key",
-        signed(BASE.signed_as(key_info=rsa_key_value("foreign")), key="foreign"), any_way)
-    add("client", "the holder of the key signed for itself", signed(HOLDER, key="client"), TAMPERED)
+        signed(LEAN.signed_as(key_info=rsa_key_value("foreign")), key="foreign"), any_way)
+    add("client", "the holder of the key signed for itself", signed(LEAN_HOLDER, key="client"), TAMPERED)
     c.refuse("key-info-untrusted", "a trusted key signed, but KeyInfo shows another certificate",
-             signed(BASE.signed_as(key_info=key_info("foreign"))), OUTSIDE_PROFILE, "valid")
+             signed(LEAN.signed_as(key_info=key_info("foreign"))), OUTSIDE_PROFILE, "valid")
     c.refuse("key-info-picks-another", "a trusted key signed, KeyInfo picks another trusted one",
-             signed(BASE.signed_as(key_info=key_info("sts-second"))), TAMPERED, "valid",
+             signed(LEAN.signed_as(key_info=key_info("sts-second"))), TAMPERED, "valid",
              trust=["sts", "sts-second"])
     almost = keys.certificate_base64("sts")
     almost = almost[:-8] + _changed_digit(almost[-8:], 0)
     c.refuse("key-info-almost-trusted", "one bit of the certificate in KeyInfo differs",
-             signed(BASE.signed_as(key_info=key_info("sts"))).replace(
+             signed(LEAN.signed_as(key_info=key_info("sts"))).replace(
                  keys.certificate_base64("sts"), almost), OUTSIDE_PROFILE)
-    c.refuse("key-none-trusted", "nobody is trusted", signed(BASE), OUTSIDE_PROFILE, trust=[])
-    add("other-kind", "an RSA signature where an elliptic curve is trusted", signed(BASE),
+    c.refuse("key-none-trusted", "nobody is trusted", signed(LEAN), OUTSIDE_PROFILE, trust=[])
+    add("other-kind", "an RSA signature where an elliptic curve is trusted", signed(LEAN),
         OUTSIDE_PROFILE, trust=["sts-p256"])
     add("other-curve", "the same algorithm by a key of another curve",
-        signed(BASE.signed_as(method=names.ECDSA_SHA256), key="sts-p256"), any_way,
+        signed(LEAN.signed_as(method=names.ECDSA_SHA256), key="sts-p256"), any_way,
         trust=["sts-p384"])
     add("method-of-other-kind", "an ECDSA method where RSA is trusted",
-        signed(BASE.signed_as(method=names.ECDSA_SHA256), key="sts-p256"), OUTSIDE_PROFILE)
-    c.refuse("key-weak", "a trusted RSA key of 1024 bits", signed(BASE, key="weak"),
+        signed(LEAN.signed_as(method=names.ECDSA_SHA256), key="sts-p256"), OUTSIDE_PROFILE)
+    c.refuse("key-weak", "a trusted RSA key of 1024 bits", signed(LEAN, key="weak"),
              OUTSIDE_PROFILE, "valid", trust=["weak"])
     c.refuse("key-weak-picked", "the weak key among strong ones",
-             signed(BASE.signed_as(key_info=key_info("weak")), key="weak"), OUTSIDE_PROFILE,
+             signed(LEAN.signed_as(key_info=key_info("weak")), key="weak"), OUTSIDE_PROFILE,
              "valid", trust=["sts", "weak"])
-    ecdsa = signed(BASE.signed_as(method=names.ECDSA_SHA256), key="sts-p256")
+    ecdsa = signed(LEAN.signed_as(method=names.ECDSA_SHA256), key="sts-p256")
     value = _value_of(ecdsa, "SignatureValue")
     for name, forged in (("zeros", bytes(64)), ("odd-length", base64.b64decode(value)[:-1]),
                          ("longer", base64.b64decode(value) + b"\0"),
@@ -180,12 +181,13 @@ def _hmac(c):
             ("certificate-der", certificate.public_bytes(Encoding.DER)),
             ("modulus", keys.modulus_bytes("sts")), ("empty", b"")):
         c.refuse(f"hmac-{name}", "HMAC keyed with what everybody knows",
-                 signed(BASE.signed_as(method=names.HMAC_SHA256), hmac_key=secret),
+                 signed(LEAN.signed_as(method=names.HMAC_SHA256), hmac_key=secret),
                  OUTSIDE_PROFILE)
-    method = f'<ds:SignatureMethod Algorithm="{names.HMAC_SHA256}">'
+    method = f'<ds:SignatureMethod Algorithm="{names.HMAC_SHA256}"/>'
     c.refuse("hmac-cut-to-nothing", "HMACOutputLength of zero",
-             signed(BASE.signed_as(method=names.HMAC_SHA256),
-                    (method, method + "<ds:HMACOutputLength>0</ds:HMACOutputLength>"),
+             signed(LEAN.signed_as(method=names.HMAC_SHA256),
+                    (method, method.replace("/>", "><ds:HMACOutputLength>0</ds:HMACOutputLength>"
+                                            "</ds:SignatureMethod>")),
                     hmac_key=b"", value_form=lambda text: ""), SYNTAX_OR_OUTSIDE)
 
 
@@ -193,33 +195,33 @@ def _weak_algorithms(c):
     def add(name, token, key="sts", trust=None, xmlsec1="none"):
         c.refuse("algorithm-" + name, "an algorithm outside the profile", signed(token, key=key),
                  OUTSIDE_PROFILE, xmlsec1, trust=trust or ["sts"])
-    add("rsa-sha1", BASE.signed_as(method=names.RSA_SHA1), xmlsec1="valid")
-    add("rsa-md5", BASE.signed_as(method=names.RSA_MD5))
-    add("ecdsa-sha1", BASE.signed_as(method=names.ECDSA_SHA1), "sts-p256", ["sts-p256"], "valid")
-    add("hmac-sha1-named", BASE.signed_as(method=names.HMAC_SHA1.replace("hmac", "rsa") + "x"))
-    add("digest-sha1", BASE.signed_as(digest=names.SHA1), xmlsec1="valid")
-    add("digest-md5", BASE.signed_as(digest=names.MD5))
+    add("rsa-sha1", LEAN.signed_as(method=names.RSA_SHA1), xmlsec1="valid")
+    add("rsa-md5", LEAN.signed_as(method=names.RSA_MD5))
+    add("ecdsa-sha1", LEAN.signed_as(method=names.ECDSA_SHA1), "sts-p256", ["sts-p256"], "valid")
+    add("hmac-sha1-named", LEAN.signed_as(method=names.HMAC_SHA1.replace("hmac", "rsa") + "x"))
+    add("digest-sha1", LEAN.signed_as(digest=names.SHA1), xmlsec1="valid")
+    add("digest-md5", LEAN.signed_as(digest=names.MD5))
     for name, method in (("unknown", "urn:unknown"), ("empty", ""), ("blank", names.RSA_SHA256 + " "),
                          ("upper-case", names.RSA_SHA256.upper()), ("digest", names.SHA256),
                          ("pss", "http://www.w3.org/2007/05/xmldsig-more#sha256-rsa-MGF1")):
-        add(f"method-{name}", BASE.signed_as(method=method))
-        add(f"digest-{name}", BASE.signed_as(digest=method if name != "digest" else names.RSA_SHA256))
+        add(f"method-{name}", LEAN.signed_as(method=method))
+        add(f"digest-{name}", LEAN.signed_as(digest=method if name != "digest" else names.RSA_SHA256))
     for name, method in (
             ("unknown", "urn:unknown"), ("empty", ""), ("c14n11", "http://www.w3.org/2006/12/xml-c14n11"),
             ("with-comments", names.C14N + "#WithComments"),
             ("exclusive-with-comments", names.EXC_C14N + "WithComments"),
             ("enveloped", names.ENVELOPED)):
-        add(f"c14n-{name}", BASE.signed_as(c14n=method),
+        add(f"c14n-{name}", LEAN.signed_as(c14n=method),
             xmlsec1="valid" if "comments" in name else "none")
 
 
 def _references(c):
-    def add(name, refusals, *edits, token=BASE, xmlsec1="none"):
+    def add(name, refusals, *edits, token=LEAN, xmlsec1="none"):
         c.refuse("reference-" + name, "what the signature refers to", signed(token, *edits),
                  refusals, xmlsec1)
 
     def uri(value):
-        return BASE.signed_as(uri=value)
+        return LEAN.signed_as(uri=value)
     for name, value in (
             ("http", "http://attacker.example/token.xml"), ("file", "file:///etc/passwd"),
             ("relative-file", "token.xml"), ("absolute-path", "/etc/passwd"),
@@ -237,8 +239,8 @@ def _references(c):
     add("signature-value", NOT_COVERED, value, token=uri("#_child"))
     info = ("<ds:KeyInfo>", '<ds:KeyInfo Id="_child">')
     add("key-info", NOT_COVERED, info,
-        token=BASE.signed_as(uri="#_child", key_info="<ds:KeyInfo></ds:KeyInfo>"))
-    reference = BASE.signature.text()
+        token=LEAN.signed_as(uri="#_child", key_info="<ds:KeyInfo></ds:KeyInfo>"))
+    reference = LEAN.signature.text()
     reference = reference[reference.index("<ds:Reference "):]
     reference = reference[:reference.index("</ds:SignedInfo>")]
     for name, other in (("http", "http://attacker.example/a"), ("file", "file:///dev/zero"),
@@ -252,7 +254,7 @@ def _references(c):
     add("two-signed-infos", SYNTAX_OR_OUTSIDE,
         ("</ds:SignedInfo>", f"</ds:SignedInfo><ds:SignedInfo>{reference}</ds:SignedInfo>"))
     # The second, genuine SignedInfo stands where a careless search finds it first.
-    good = signed(BASE)
+    good = signed(LEAN)
     info = good[good.index("<ds:SignedInfo>"):good.index("<ds:SignatureValue>")]
     forged = replaced(info, _value_of(good, "DigestValue"), base64.b64encode(bytes(32)).decode())
     for name, order in (("genuine-first", info + forged), ("forged-first", forged + info)):
@@ -266,10 +268,10 @@ def _references(c):
 
 def _transforms(c):
     end = "</ds:Transforms>"
-    enveloped = f'<ds:Transform Algorithm="{names.ENVELOPED}"></ds:Transform>'
-    exclusive = f'<ds:Transform Algorithm="{names.EXC_C14N}"></ds:Transform>'
+    enveloped = f'<ds:Transform Algorithm="{names.ENVELOPED}"/>'
+    exclusive = f'<ds:Transform Algorithm="{names.EXC_C14N}"/>'
 
-    def add(name, refusals, *edits, token=BASE, xmlsec1="none"):
+    def add(name, refusals, *edits, token=LEAN, xmlsec1="none"):
         c.refuse("transform-" + name, "what is done before digesting", signed(token, *edits),
                  refusals, xmlsec1)
 
@@ -293,28 +295,28 @@ def _transforms(c):
     add("unknown", OUTSIDE_PROFILE, (exclusive, transform("urn:unknown")))
     add("empty-name", OUTSIDE_PROFILE, (exclusive, transform("")))
     add("no-name", SYNTAX_OR_OUTSIDE, (exclusive, "<ds:Transform></ds:Transform>"))
-    add("c14n11", OUTSIDE_PROFILE, token=BASE.signed_as(
+    add("c14n11", OUTSIDE_PROFILE, token=LEAN.signed_as(
         transforms=(names.ENVELOPED, "http://www.w3.org/2006/12/xml-c14n11")))
-    add("c14n-before-enveloped", OUTSIDE_PROFILE, token=BASE.signed_as(
+    add("c14n-before-enveloped", OUTSIDE_PROFILE, token=LEAN.signed_as(
         transforms=(names.EXC_C14N, names.ENVELOPED)))
-    add("c14n-twice", OUTSIDE_PROFILE, token=BASE.signed_as(
+    add("c14n-twice", OUTSIDE_PROFILE, token=LEAN.signed_as(
         transforms=(names.ENVELOPED, names.EXC_C14N, names.EXC_C14N)))
-    add("c14n-two-kinds", OUTSIDE_PROFILE, token=BASE.signed_as(
+    add("c14n-two-kinds", OUTSIDE_PROFILE, token=LEAN.signed_as(
         transforms=(names.ENVELOPED, names.EXC_C14N, names.C14N)))
-    add("enveloped-twice", OUTSIDE_PROFILE, token=BASE.signed_as(
+    add("enveloped-twice", OUTSIDE_PROFILE, token=LEAN.signed_as(
         transforms=(names.ENVELOPED, names.ENVELOPED, names.EXC_C14N)))
     # Without removing the signature first no digest can match either.
-    add("c14n-only", OUTSIDE_PROFILE + TAMPERED, token=BASE.signed_as(transforms=(names.EXC_C14N,)))
+    add("c14n-only", OUTSIDE_PROFILE + TAMPERED, token=LEAN.signed_as(transforms=(names.EXC_C14N,)))
     for name, algorithm in (("inclusive", names.C14N + "#WithComments"),
                             ("exclusive", names.EXC_C14N + "WithComments")):
         add(f"{name}-with-comments", OUTSIDE_PROFILE,
-            token=BASE.signed_as(transforms=(names.ENVELOPED, algorithm)), xmlsec1="valid")
+            token=LEAN.signed_as(transforms=(names.ENVELOPED, algorithm)), xmlsec1="valid")
     add("none", SYNTAX_OR_OUTSIDE + TAMPERED, (enveloped + exclusive, ""))
     add("no-list", OUTSIDE_PROFILE + TAMPERED,
         (f"<ds:Transforms>{enveloped}{exclusive}{end}", ""))
     add("list-twice", SYNTAX_OR_OUTSIDE, (end, end + f"<ds:Transforms>{exclusive}{end}"))
     add("other-child", SYNTAX_OR_OUTSIDE, (end, f"<ds:Other></ds:Other>{end}"))
-    add("many", OUTSIDE_PROFILE + SIGNATURE_SYNTAX, (exclusive, exclusive * 1000))
+    add("many", OUTSIDE_PROFILE + SIGNATURE_SYNTAX, (exclusive, exclusive * 50))
     add("enveloped-with-content", SYNTAX_OR_OUTSIDE,
         (enveloped, transform(names.ENVELOPED, "<ds:XPath>1</ds:XPath>")))
     add("c14n-with-xpath", SYNTAX_OR_OUTSIDE,
@@ -322,17 +324,16 @@ def _transforms(c):
 
 
 def _signature_shape(c):
-    good = signed(BASE)
+    good = signed(LEAN)
     info = good[good.index("<ds:SignedInfo>"):good.index("<ds:SignatureValue>")]
     value = good[good.index("<ds:SignatureValue>"):good.index("</ds:Signature>")]
-    method = f'<ds:SignatureMethod Algorithm="{names.RSA_SHA256}"></ds:SignatureMethod>'
-    c14n = (f'<ds:CanonicalizationMethod Algorithm="{names.EXC_C14N}">'
-            "</ds:CanonicalizationMethod>")
-    digest_method = f'<ds:DigestMethod Algorithm="{names.SHA256}"></ds:DigestMethod>'
+    method = f'<ds:SignatureMethod Algorithm="{names.RSA_SHA256}"/>'
+    c14n = (f'<ds:CanonicalizationMethod Algorithm="{names.EXC_C14N}"/>')
+    digest_method = f'<ds:DigestMethod Algorithm="{names.SHA256}"/>'
     digest = "<ds:DigestValue>@DIGEST@</ds:DigestValue>"
 
     def add(name, *edits, refusals=SYNTAX_OR_OUTSIDE):
-        c.refuse("shape-" + name, "how the signature is built", signed(BASE, *edits), refusals)
+        c.refuse("shape-" + name, "how the signature is built", signed(LEAN, *edits), refusals)
 
     def add_changed(name, *edits, refusals=SYNTAX_OR_OUTSIDE):
         text = good
@@ -377,10 +378,8 @@ def _signature_shape(c):
     add("c14n-twice", (c14n, c14n * 2))
     add("digest-method-twice", (digest_method, digest_method * 2))
     add("digest-first", (digest_method + digest, digest + digest_method))
-    add("method-no-algorithm", (f'<ds:SignatureMethod Algorithm="{names.RSA_SHA256}">',
-                                "<ds:SignatureMethod>"))
-    add("digest-no-algorithm", (f'<ds:DigestMethod Algorithm="{names.SHA256}">',
-                                "<ds:DigestMethod>"))
+    add("method-no-algorithm", (method, "<ds:SignatureMethod/>"))
+    add("digest-no-algorithm", (digest_method, "<ds:DigestMethod/>"))
     add("digest-in-two-elements", (digest, digest + "<ds:DigestValue>AAAA</ds:DigestValue>"))
     add("digest-with-element", (digest, digest.replace("</", "<ds:a></ds:a></")))
     add("text-in-signed-info", ("<ds:SignedInfo>", "<ds:SignedInfo>text"))
@@ -392,7 +391,7 @@ def _signature_shape(c):
 
 
 def _comments(c):
-    good = signed(BASE)
+    good = signed(LEAN)
 
     def add(name, before, text=good):
         position = text.index(before) + len(before) + 10
@@ -400,7 +399,7 @@ def _comments(c):
                  text[:position] + "<!-- -->" + text[position:], SIGNATURE_SYNTAX)
     add("digest-value", "<ds:DigestValue>")
     add("signature-value", "<ds:SignatureValue>")
-    with_certificate = signed(BASE.signed_as(key_info=key_info("sts")))
+    with_certificate = signed(LEAN.signed_as(key_info=key_info("sts")))
     position = with_certificate.index("<ds:X509Certificate>") + 60
     c.refuse("comment-in-key-info-certificate", "a comment inside KeyInfo's certificate",
              with_certificate[:position] + "<!-- -->" + with_certificate[position:],
@@ -411,7 +410,7 @@ def _comments(c):
 
 
 def _duplicate_ids(c):
-    def add(name, refusals, *edits, token=BASE):
+    def add(name, refusals, *edits, token=LEAN):
         c.refuse("duplicate-" + name, "the signed ID stands twice in the document",
                  signed(token, *edits), refusals)
     value = '<saml:AttributeValue xsi:type="xs:string">Ada'
@@ -423,7 +422,7 @@ def _duplicate_ids(c):
         ("<saml:AuthnContextClassRef>", f'<saml:AuthnContextClassRef ID="{ID}">'))
     add("id-in-signature", SYNTAX_OR_OUTSIDE, ("<ds:Signature ", f'<ds:Signature Id="{ID}" '))
     add("id-in-key-info", SYNTAX_OR_OUTSIDE, ("<ds:KeyInfo>", f'<ds:KeyInfo Id="{ID}">'),
-        token=BASE.signed_as(key_info=key_info("sts")))
+        token=LEAN.signed_as(key_info=key_info("sts")))
     add("id-in-signature-value", SYNTAX_OR_OUTSIDE,
         ("<ds:SignatureValue>", f'<ds:SignatureValue Id="{ID}">'))
 
@@ -437,11 +436,11 @@ def _wrapping(c):
 
 def _wrap_all(c, name, evil_id, uri, whole_too):
     """whole_too: the assertion is moved with its signature as well as without."""
-    original = signed(BASE.signed_as(uri=uri))
+    original = signed(LEAN.signed_as(uri=uri))
     start, end = original.index("<ds:Signature "), original.index("</ds:Signature>") + 15
     signature = original[start:end]
     bare = original[:start] + original[end:]
-    evil = BASE.but(id=evil_id, subject=("admin", "example.com"), delegates=DELEGATES[:1],
+    evil = LEAN.but(id=evil_id, subject=("admin", "example.com"), delegates=DELEGATES[:1],
                     audience=["urn:a"]).text()
     evil_start = evil.index("<ds:Signature ")
     evil = evil[:evil_start] + "@SIGNATURE@" + evil[evil.index("</ds:Signature>") + 15:]

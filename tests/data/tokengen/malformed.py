@@ -1,7 +1,7 @@
 """Texts that are not XML as it is accepted here: broken, encoded otherwise, or with a DOCTYPE."""
 
 from . import names
-from .accepted import BASE
+from .accepted import LEAN
 from .catalogue import MALFORMED, OUTSIDE_PROFILE, PARSE, SIGNATURE, replaced, signed
 
 # Where names break the rules of namespaces, who notices is open; that it never passes is not.
@@ -17,7 +17,7 @@ def add_all(catalogue):
 
 
 def _doctypes(c):
-    good = signed(BASE)
+    good = signed(LEAN)
 
     def add(name, doctype, *edits):
         text = doctype + good
@@ -62,7 +62,7 @@ def _doctypes(c):
 
 
 def _references(c):
-    good = signed(BASE)
+    good = signed(LEAN)
     for name, reference in (
             ("undefined", "&e;"), ("html", "&nbsp;"), ("nul", "&#0;"), ("control", "&#1;"),
             ("surrogate", "&#xD800;"), ("noncharacter", "&#xFFFE;"), ("too-large", "&#x110000;"),
@@ -70,13 +70,14 @@ def _references(c):
             ("empty", "&#;"), ("bad-digit", "&#12a;"), ("upper-case-x", "&#X41;")):
         c.refuse(f"entity-{name}", "a reference that is none", replaced(good, ">Ada<", f">{reference}<"),
                  MALFORMED)
+    for name, reference in (("undefined", "&e;"), ("nul", "&#0;"), ("bare", "&")):
         c.refuse(f"entity-in-attribute-{name}", "a reference that is none",
                  replaced(good, "<saml:AuthnContextClassRef>",
                           f'<saml:AuthnContextClassRef a="{reference}">'), MALFORMED)
 
 
 def _encodings(c):
-    good = signed(BASE)
+    good = signed(LEAN)
     head, tail = (part.encode() for part in good.split(">Ada<"))
 
     def value(name, data, about="bytes that are not UTF-8"):
@@ -115,13 +116,13 @@ def _encodings(c):
         c.refuse(f"encoding-declared-{name.lower()}", "a declared encoding other than UTF-8", text,
                  MALFORMED)
     # The declared encoding gives the bytes another meaning than the one that was signed.
-    text = '<?xml version="1.0" encoding="ISO-8859-1"?>' + signed(BASE.but(given_name="Zo\u00eb"))
+    text = '<?xml version="1.0" encoding="ISO-8859-1"?>' + signed(LEAN.but(given_name="Zo\u00eb"))
     c.refuse("encoding-latin-1-text", "text outside ASCII under another encoding",
              text.encode("latin-1"), MALFORMED)
 
 
 def _broken(c):
-    good = signed(BASE)
+    good = signed(LEAN)
 
     def add(name, text, about="not well-formed"):
         c.refuse("broken-" + name, about, text, MALFORMED)
@@ -182,7 +183,7 @@ def _namespaces(c):
 
     def add(name, *edits, refusals=NAMESPACES):
         c.refuse("namespace-" + name, "names that break the rules of namespaces",
-                 signed(BASE, *edits), refusals)
+                 signed(LEAN, *edits), refusals)
     add("undeclared-element", (ref, "<nowhere:AuthnContextClassRef>"),
         (end, "</nowhere:AuthnContextClassRef>"))
     add("undeclared-value-element",
@@ -193,7 +194,7 @@ def _namespaces(c):
     add("undeclared-prefix-of-all", (f'xmlns:saml="{names.SAML}" ', ""))
     add("undeclared-xsi", (f'xmlns:xsi="{names.XSI}" ', ""))
     c.refuse("namespace-undeclared-ds", "names that break the rules of namespaces",
-             replaced(signed(BASE), f' xmlns:ds="{names.DS}"', ""), NAMESPACES)
+             replaced(signed(LEAN), f' xmlns:ds="{names.DS}"', ""), NAMESPACES)
     add("prefix-unbound", (ref, '<saml:AuthnContextClassRef xmlns:a="">'))
     add("xml-bound-elsewhere", (ref, ref[:-1] + ' xmlns:xml="urn:a">'))
     add("xmlns-bound", (ref, ref[:-1] + ' xmlns:xmlns="urn:a">'))
@@ -207,9 +208,9 @@ def _namespaces(c):
     add("leading-colon", (ref, ref[:-1] + ' :a="1">'))
     add("trailing-colon", (ref, ref[:-1] + ' saml:="1">'))
     stand_in = ("http://stand-in.example/path", "relative/path")
-    inclusive = BASE.signed_as(c14n=names.C14N, transforms=(names.ENVELOPED, names.C14N))
+    inclusive = LEAN.signed_as(c14n=names.C14N, transforms=(names.ENVELOPED, names.C14N))
     used, default = f' xmlns:a="{stand_in[0]}" a:b="c">', f' xmlns="{stand_in[0]}">'
-    for name, token, attributes in (("relative-uri", BASE, used),
+    for name, token, attributes in (("relative-uri", LEAN, used),
                                     ("relative-uri-inclusive", inclusive, used),
                                     ("relative-default-inclusive", inclusive, default)):
         text = signed(token, (ref, ref[:-1] + attributes), stand_in=stand_in)

@@ -2,11 +2,11 @@
 the named rule can refuse them."""
 
 from . import keys, names
-from .accepted import ADVICE, BASE, DELEGATES, HOLDER
+from .accepted import ADVICE, DELEGATES, LEAN, LEAN_HOLDER
 from .assertion import ID
 from .catalogue import SIGNATURE_SYNTAX, begins, says, signed
 
-EMPTY_REFERENCE = BASE.signed_as(uri="")
+EMPTY_REFERENCE = LEAN.signed_as(uri="")
 ISSUER = f'<saml:Issuer Format="{names.ENTITY_FORMAT}">https://sts.example.com/STS</saml:Issuer>'
 NAME_ID = f'<saml:NameID Format="{names.UPN}">user@example.com</saml:NameID>'
 BEARER_DATA = ('<saml:SubjectConfirmationData NotOnOrAfter="2026-12-31T00:00:00Z">'
@@ -104,9 +104,8 @@ def _assertion(c):
         (" Version=", ' xsi:schemaLocation="urn:a b" Version='))
     add("xml-id", unexpected("Assertion"), (" Version=", f' xml:id="{ID}x" Version='))
     add("xml-lang", unexpected("Assertion"), (" Version=", ' xml:lang="en" Version='))
-    for name, value in BAD_DATES.items():
-        add(f"issue-instant-{name}", says("Assertion/@IssueInstant is not a date"),
-            (' IssueInstant="2026-01-01T00:00:00Z"', f' IssueInstant="{value}"'))
+    add("issue-instant-bad", says("Assertion/@IssueInstant is not a date"),
+        (' IssueInstant="2026-01-01T00:00:00Z"', ' IssueInstant="2026-01-01"'))
     add("text-first", not_found("Issuer"), (ISSUER, "text" + ISSUER))
     add("text-last", says("Unexpected elements under Assertion"),
         ("</saml:Assertion>", "text</saml:Assertion>"))
@@ -116,7 +115,7 @@ def _assertion(c):
     add("instruction-last", says("Unexpected elements under Assertion"),
         ("</saml:Assertion>", "<?a b?></saml:Assertion>"))
     add("two-attribute-statements", says("Unexpected elements under Assertion"),
-        ("</saml:Assertion>", "<saml:AttributeStatement>" + BASE.attribute(names.GROUPS, [])
+        ("</saml:Assertion>", "<saml:AttributeStatement>" + LEAN.attribute(names.GROUPS, [])
          + "</saml:AttributeStatement></saml:Assertion>"))
     add("extra-element", says("Unexpected elements under Assertion"),
         ("</saml:Assertion>", "<saml:AuthzDecisionStatement/></saml:Assertion>"))
@@ -131,7 +130,7 @@ def _assertion(c):
 
 def _issuer(c):
     def add(name, refusals, *edits):
-        _add(c, "issuer-" + name, BASE, refusals, *edits)
+        _add(c, "issuer-" + name, LEAN, refusals, *edits)
     add("missing", not_found("Issuer"), (ISSUER, ""))
     add("no-format", missing("Issuer", "Format"), (f' Format="{names.ENTITY_FORMAT}"', ""))
     for attribute in ("NameQualifier", "SPNameQualifier", "SPProvidedID"):
@@ -146,7 +145,7 @@ def _issuer(c):
 
 
 def _signature_place(c):
-    unsigned = BASE.text().replace(BASE.signature.text(), "")
+    unsigned = LEAN.text().replace(LEAN.signature.text(), "")
     not_there = says("Expected element ds:Signature not found")
 
     def add(name, refusals, text):
@@ -156,7 +155,7 @@ def _signature_place(c):
     add("missing-and-nothing-else", not_there, head + "</saml:Assertion>")
     add("text-instead", not_there, unsigned.replace("<saml:Subject>", "text<saml:Subject>"))
     add("instruction-instead", not_there, unsigned.replace("<saml:Subject>", "<?a?><saml:Subject>"))
-    form = BASE.signature.text()
+    form = LEAN.signature.text()
 
     def moved(before, after):
         return signed(unsigned.replace(before, after.replace("@SIGNATURE@", form), 1))
@@ -165,18 +164,18 @@ def _signature_place(c):
     add("after-subject", SIGNATURE_SYNTAX, moved("</saml:Subject>", "</saml:Subject>@SIGNATURE@"))
     add("last", SIGNATURE_SYNTAX, moved("</saml:Assertion>", "@SIGNATURE@</saml:Assertion>"))
     add("twice", not_found("Subject"),
-        signed(BASE).replace("<saml:Subject>", "@S@<saml:Subject>", 1).replace(
-            "@S@", signed(BASE)[signed(BASE).index("<ds:Signature"):].split("\n")[0]))
-    add("other-namespace", SIGNATURE_SYNTAX, signed(BASE).replace(names.DS + '"', 'urn:other"', 1))
+        signed(LEAN).replace("<saml:Subject>", "@S@<saml:Subject>", 1).replace(
+            "@S@", signed(LEAN)[signed(LEAN).index("<ds:Signature"):].split("\n")[0]))
+    add("other-namespace", SIGNATURE_SYNTAX, signed(LEAN).replace(names.DS + '"', 'urn:other"', 1))
     add("in-a-wrapper", SIGNATURE_SYNTAX,
-        signed(BASE).replace("<ds:Signature ", '<x:w xmlns:x="urn:x"><ds:Signature ').replace(
+        signed(LEAN).replace("<ds:Signature ", '<x:w xmlns:x="urn:x"><ds:Signature ').replace(
             "</ds:Signature>", "</ds:Signature></x:w>"))
 
 
 def _subject(c):
     def add(name, refusals, *edits):
-        _add(c, "subject-" + name, BASE, refusals, *edits)
-    confirmation = BASE.text()[BASE.text().index("<saml:SubjectConfirmation "):]
+        _add(c, "subject-" + name, LEAN, refusals, *edits)
+    confirmation = LEAN.text()[LEAN.text().index("<saml:SubjectConfirmation "):]
     confirmation = confirmation[:confirmation.index("</saml:Subject>")]
     data = "SubjectConfirmationData"
     add("attribute", unexpected("Subject"), ("<saml:Subject>", '<saml:Subject a="b">'))
@@ -234,8 +233,8 @@ def _holder_data(c):
     xsi_type = f"{names.XSI}:type"
 
     def add(name, refusals, *edits):
-        _add(c, "holder-" + name, HOLDER, refusals, *edits)
-    text = HOLDER.text()
+        _add(c, "holder-" + name, LEAN_HOLDER, refusals, *edits)
+    text = LEAN_HOLDER.text()
     key_info = text[text.index("<ds:KeyInfo xmlns"):text.index(f"</saml:{data}>")]
     certificate = keys.certificate_base64("client")
     element = f"<ds:X509Certificate>{certificate}</ds:X509Certificate>"
@@ -299,7 +298,7 @@ def _with_trailing_byte(quantum):
 def _conditions(c):
     unknown = "Unknown or duplicate restriction node under Conditions"
 
-    def add(name, refusals, *edits, token=BASE):
+    def add(name, refusals, *edits, token=LEAN):
         _add(c, "conditions-" + name, token, refusals, *edits)
 
     def inside(content):
@@ -360,7 +359,7 @@ def _conditions(c):
     def renew(attributes):
         return (f'<saml:Condition xmlns:rsa="{names.RSA}" xsi:type="rsa:RenewRestrictionType"'
                 f"{attributes}/>")
-    for name, count in counts:
+    for name, count in counts[:3]:
         add(f"renew-count-{name}", says("Condition/@Count is not a non-negative integer."),
             inside(renew(f' Count="{count}"')))
     add("renew-twice", says(unknown + ": Condition"), inside(renew(' Count="1"') * 2))
@@ -373,7 +372,7 @@ def _conditions(c):
 
 
 def _delegation(c):
-    token = HOLDER.but(delegates=DELEGATES[:2])
+    token = LEAN_HOLDER.but(delegates=DELEGATES[:2])
     first = f'<saml:NameID Format="{names.UPN}">first@example.com</saml:NameID>'
     second = first.replace("first@", "second@")
     condition = token.text()[token.text().index("<saml:Condition xmlns:del"):]
@@ -422,8 +421,8 @@ def _delegation(c):
 
 def _advice(c):
     def add(name, refusals, *edits):
-        _add(c, "advice-" + name, BASE.but(advice=ADVICE[:1]), refusals, *edits)
-    text = BASE.but(advice=ADVICE[:1]).text()
+        _add(c, "advice-" + name, LEAN.but(advice=ADVICE[:1]), refusals, *edits)
+    text = LEAN.but(advice=ADVICE[:1]).text()
     advice = text[text.index("<rsa:RSAAdvice"):text.index("\n</saml:Advice>")]
     inner = advice[advice.index("<saml:Attribute"):-len("</rsa:RSAAdvice>")]
     add("attribute", unexpected("Advice"), ("<saml:Advice>", '<saml:Advice a="b">'))
@@ -447,8 +446,8 @@ def _advice(c):
 
 def _authn_statement(c):
     def add(name, refusals, *edits):
-        _add(c, "authn-" + name, BASE, refusals, *edits)
-    text = BASE.text()
+        _add(c, "authn-" + name, LEAN, refusals, *edits)
+    text = LEAN.text()
     statement = text[text.index("<saml:AuthnStatement"):text.index("\n<saml:AttributeStatement")]
     context = f"<saml:AuthnContext>{CLASS_REF}</saml:AuthnContext>"
     add("missing", not_found("AuthnStatement"), (statement, ""))
@@ -477,11 +476,11 @@ def _authn_statement(c):
 
 def _attribute_statement(c):
     def add(name, refusals, *edits):
-        _add(c, "attributes-" + name, BASE, refusals, *edits)
+        _add(c, "attributes-" + name, LEAN, refusals, *edits)
     name_format = f' NameFormat="{names.NAME_FORMAT}"'
-    given = BASE.attribute(names.GIVEN_NAME, ["Ada"])
-    all_of_them = "\n".join(BASE.attribute(*a) for a in (
-        (names.GIVEN_NAME, ["Ada"]), (names.SURNAME, ["Example"]),
+    given = LEAN.attribute(names.GIVEN_NAME, ["Ada"])
+    all_of_them = "\n".join(LEAN.attribute(*a) for a in (
+        (names.GIVEN_NAME, ["Ada"]),
         (names.GROUPS, ["example.com\\Users"])))
     add("attribute", unexpected("AttributeStatement"),
         ("<saml:AttributeStatement>", '<saml:AttributeStatement a="b">'))
@@ -502,49 +501,49 @@ def _attribute_statement(c):
     for name, value in (("nested", "<saml:a>Ada</saml:a>"), ("mixed", "Ada<saml:a/>"),
                         ("comment", "Ada<!-- -->x"), ("instruction", "Ada<?a?>")):
         add(f"value-{name}", only_text("AttributeValue"), (given, given.replace("Ada", value)))
-    solution = BASE.attribute(names.SOLUTION, ["true"])
+    solution = LEAN.attribute(names.SOLUTION, ["true"])
     add("solution-none", says("No value found for attribute isSolution."),
-        (given, given + BASE.attribute(names.SOLUTION, [])))
+        (given, given + LEAN.attribute(names.SOLUTION, [])))
     add("solution-two", says("More than one value found for attribute isSolution."),
-        (given, given + BASE.attribute(names.SOLUTION, ["true", "true"])))
+        (given, given + LEAN.attribute(names.SOLUTION, ["true", "true"])))
     add("solution-two-after-one", says("More than one value found for attribute isSolution."),
-        (given, given + solution + BASE.attribute(names.SOLUTION, ["true", "false"])))
+        (given, given + solution + LEAN.attribute(names.SOLUTION, ["true", "false"])))
 
 
 def _properties(c):
     unsatisfiable = says("Unsatisfiable token validity conditions: NotBefore must be less than "
                          "NotOnOrAfter.")
     instant = "2026-06-15T12:00:00Z"
-    _add(c, "validity-empty", BASE.but(start=instant, end=instant), unsatisfiable)
-    _add(c, "validity-empty-large-tolerance", BASE.but(start=instant, end=instant), unsatisfiable,
+    _add(c, "validity-empty", LEAN.but(start=instant, end=instant), unsatisfiable)
+    _add(c, "validity-empty-large-tolerance", LEAN.but(start=instant, end=instant), unsatisfiable,
          tolerance=1000000)
     _add(c, "validity-empty-other-offset",
-         BASE.but(start=instant, end="2026-06-15T14:00:00+02:00"), unsatisfiable)
-    _add(c, "validity-reversed", BASE.but(start="2026-12-31T00:00:00Z", end="2026-01-01T00:00:00Z"),
+         LEAN.but(start=instant, end="2026-06-15T14:00:00+02:00"), unsatisfiable)
+    _add(c, "validity-reversed", LEAN.but(start="2026-12-31T00:00:00Z", end="2026-01-01T00:00:00Z"),
          unsatisfiable)
     shorter = says("Invalid token subject validity")
-    _add(c, "confirmation-ends-earlier", BASE.but(confirmed_until="2026-12-30T23:59:59Z"), shorter)
+    _add(c, "confirmation-ends-earlier", LEAN.but(confirmed_until="2026-12-30T23:59:59Z"), shorter)
     _add(c, "confirmation-ends-a-microsecond-earlier",
-         BASE.but(confirmed_until="2026-12-30T23:59:59.999999Z"), shorter)
+         LEAN.but(confirmed_until="2026-12-30T23:59:59.999999Z"), shorter)
     # The checks have an order, and the first that fails speaks.
     _add(c, "order-version-before-id", EMPTY_REFERENCE, says("Invalid token version"),
          (' Version="2.0"', ' Version="3.0"'), (f' ID="{ID}"', ' ID="a"'))
     _add(c, "order-id-before-validity", EMPTY_REFERENCE.but(start=instant, end=instant),
          says("Invalid token ID"), (f' ID="{ID}"', ' ID="a"'))
     _add(c, "order-expiry-before-confirmation",
-         BASE.but(end="2026-02-01T00:00:00Z", confirmed_until="2026-01-02T00:00:00Z"),
+         LEAN.but(end="2026-02-01T00:00:00Z", confirmed_until="2026-01-02T00:00:00Z"),
          says("The token has expired at: 2026-02-01T00:00:00.000Z"))
-    forged = signed(BASE.but(end="2026-02-01T00:00:00Z"), key="foreign")
+    forged = signed(LEAN.but(end="2026-02-01T00:00:00Z"), key="foreign")
     c.refuse("order-expiry-before-signature", "an expired forged token reports expiry", forged,
              says("The token has expired at: 2026-02-01T00:00:00.000Z"), "invalid")
     c.refuse("order-signature-before-subject", "a forged token with a bad subject reports forgery",
-             signed(BASE, ("user@example.com", "user"), key="foreign"),
+             signed(LEAN, ("user@example.com", "user"), key="foreign"),
              [{"class": "SsoClient::InvalidSignatureException"}], "invalid")
 
 
 def _clock(c):
     start, end = "2026-06-15T12:00:00Z", "2026-06-15T13:00:00Z"
-    token = BASE.but(start=start, end=end)
+    token = LEAN.but(start=start, end=end)
     future = says("Token start date is in the future: 2026-06-15T12:00:00.000Z")
     expired = says("The token has expired at: 2026-06-15T13:00:00.000Z")
     for name, refusals, now, tolerance in (
@@ -557,7 +556,7 @@ def _clock(c):
             ("expired-long-ago", expired, "2036-06-15T13:00:00Z", 600)):
         _add(c, "clock-" + name, token, refusals, now=now, tolerance=tolerance)
     _add(c, "clock-offset-read-right",
-         BASE.but(start="2026-06-15T12:00:00-01:00", end="2026-06-16T00:00:00Z"),
+         LEAN.but(start="2026-06-15T12:00:00-01:00", end="2026-06-16T00:00:00Z"),
          says("Token start date is in the future: 2026-06-15T13:00:00.000Z"),
          now="2026-06-15T12:30:00Z", tolerance=0)
 
@@ -569,17 +568,17 @@ def _values(c):
             ("email", names.EMAIL_FORMAT), ("empty", ""), ("upper-case", names.UPN.upper()),
             ("lower-case", names.UPN.lower()), ("other-host", "http://example.com/claims/UPN"),
             ("trailing-slash", names.UPN + "/")):
-        _add(c, f"format-{name}", BASE, format_error(value), (names.UPN, value))
+        _add(c, f"format-{name}", LEAN, format_error(value), (names.UPN, value))
     for name, value in (("no-at", "user"), ("at-first", "@example.com"), ("at-last", "user@"),
                         ("at-only", "@"), ("two-at-last", "user@example.com@")):
-        _add(c, f"upn-{name}", BASE,
+        _add(c, f"upn-{name}", LEAN,
              says(f"Failed to parse the UPN NameID: `{value}'; name or domain part is missing."),
              ("user@example.com", value))
     for name, value in (("no-backslash", "Admins"), ("first", "\\Admins"), ("last", "DOMAIN\\"),
                         ("only", "\\"), ("slash", "DOMAIN/Admins"), ("empty", ""), ("at", "a@b")):
-        _add(c, f"group-{name}", BASE,
+        _add(c, f"group-{name}", LEAN,
              says(f"Failed to parse Group Identity value: `{value}'; domain or group missing"),
              ("example.com\\Users", value))
-    _add(c, "group-second-bad", BASE.but(groups=[("Users", "example.com"), ("Admins", "D")]),
+    _add(c, "group-second-bad", LEAN.but(groups=[("Users", "example.com"), ("Admins", "D")]),
          says("Failed to parse Group Identity value: `Admins'; domain or group missing"),
          ("D\\Admins", "Admins"))
