@@ -30,7 +30,7 @@ public:
     /** Class name, message and call stack, for a diagnostic log. */
     virtual std::string Dump() const;
 
-    /** The innermost frame outside the exception's own constructors. */
+    /** The innermost frame outside the exception's own constructors, as far as symbols tell. */
     virtual std::string Where() const;
 
 private:
