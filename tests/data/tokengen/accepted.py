@@ -385,6 +385,13 @@ def _dates(c):
         token = BASE.but(start=start, end=end)
         facts = BASE.but(start=facts_start, end=facts_end).facts()
         c.accept(f"date-{name}", f"valid from {start} to {end}", signed(token), facts)
+    for name, written, meant in (
+            ("no-offset", "2026-01-01T00:00:00", "2026-01-01T00:00:00Z"),
+            ("end-of-day", "2026-01-01T24:00:00Z", "2026-01-02T00:00:00Z"),
+            ("nine-digits", "2026-01-01T00:00:00.123456789Z", "2026-01-01T00:00:00.123456Z"),
+            ("offset-14", "2026-01-01T14:00:00+14:00", "2026-01-01T00:00:00Z")):
+        c.accept(f"date-{name}", f"valid from {written}", signed(BASE.but(start=written)),
+                 BASE.but(start=meant).facts())
     start, end = "2026-06-15T12:00:00Z", "2026-06-15T13:00:00Z"
     token = BASE.but(start=start, end=end)
     for name, now, tolerance in (

@@ -462,28 +462,13 @@ def _wrap_all(c, name, evil_id, uri, whole_too):
     for form, moved in (("", bare), ("-with-signature", original))[:1 + whole_too]:
         in_signature("object" + form, "<ds:Object>", "</ds:Object>", moved)
         in_signature("key-info" + form, "<ds:KeyInfo>", "</ds:KeyInfo>", moved)
-        add("advice" + form, says("Expected element 'RSAAdvice' not found."),
-            "<saml:AuthnStatement ", f"<saml:Advice>{moved}</saml:Advice><saml:AuthnStatement ")
-        add("attribute-value" + form,
-            says("Element 'AttributeValue' must only have textual content (but has extra children "
-                 "or is empty)."), ">Ada</saml:AttributeValue>", f">{moved}</saml:AttributeValue>")
-        add("subject" + form, says("Unexpected elements after SubjectConfirmation"),
-            "</saml:Subject>", f"{moved}</saml:Subject>")
-        add("conditions" + form,
-            says("Unknown or duplicate restriction node under Conditions: Assertion"),
-            "</saml:Conditions>", f"{moved}</saml:Conditions>")
-        add("last-child" + form, says("Unexpected elements under Assertion"),
-            "</saml:Assertion>", f"{moved}</saml:Assertion>")
-        add("class-ref" + form,
-            says("Element 'AuthnContextClassRef' must only have textual content (but has extra "
-                 "children or is empty)."),
-            f">{names.PASSWORD_CONTEXT}<", f">{moved}<")
-        add("audience" + form,
-            says("Element 'Audience' must only have textual content (but has extra children or is "
-                 "empty)."), ">urn:a<", f">{moved}<")
         # What follows a delegate's NameID is not read, so only the signature can tell.
         add("delegate" + form, verdict + [{"class": PARSE}],
             "</del:Delegate>", f"{moved}</del:Delegate>")
+        if uri:
+            _wrap_where_structure_forbids(add, form, moved)
+    if not uri:
+        return
     text = replaced(evil, "<saml:Issuer ", original + "<saml:Issuer ").replace("@SIGNATURE@", "")
     c.refuse(f"wrapped-first-child-{name}", "the signed assertion is moved aside, whole", text,
              says("Expected element 'Issuer' not found."))
@@ -494,3 +479,25 @@ def _wrap_all(c, name, evil_id, uri, whole_too):
     c.refuse(f"wrapped-in-response-{name}", "both assertions stand in a response",
              response + evil.replace("@SIGNATURE@", "") + original + "</samlp:Response>",
              says("Expected element 'Assertion' not found."))
+
+
+def _wrap_where_structure_forbids(add, form, moved):
+    add("advice" + form, says("Expected element 'RSAAdvice' not found."),
+        "<saml:AuthnStatement ", f"<saml:Advice>{moved}</saml:Advice><saml:AuthnStatement ")
+    add("attribute-value" + form,
+        says("Element 'AttributeValue' must only have textual content (but has extra children "
+             "or is empty)."), ">Ada</saml:AttributeValue>", f">{moved}</saml:AttributeValue>")
+    add("subject" + form, says("Unexpected elements after SubjectConfirmation"),
+        "</saml:Subject>", f"{moved}</saml:Subject>")
+    add("conditions" + form,
+        says("Unknown or duplicate restriction node under Conditions: Assertion"),
+        "</saml:Conditions>", f"{moved}</saml:Conditions>")
+    add("last-child" + form, says("Unexpected elements under Assertion"),
+        "</saml:Assertion>", f"{moved}</saml:Assertion>")
+    add("class-ref" + form,
+        says("Element 'AuthnContextClassRef' must only have textual content (but has extra "
+             "children or is empty)."),
+        f">{names.PASSWORD_CONTEXT}<", f">{moved}<")
+    add("audience" + form,
+        says("Element 'Audience' must only have textual content (but has extra children or is "
+             "empty)."), ">urn:a<", f">{moved}<")

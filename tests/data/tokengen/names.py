@@ -18,7 +18,7 @@ HOLDER_OF_KEY = "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key"
 NAME_FORMAT = "urn:oasis:names:tc:SAML:2.0:attrname-format:uri"
 ENTITY_FORMAT = "urn:oasis:names:tc:SAML:2.0:nameid-format:entity"
 EMAIL_FORMAT = "urn:oasis:names:tc:SAML:1.1:nameid-format:emailAddress"
-PASSWORD_CONTEXT = "urn:oasis:names:tc:SAML:2.0:ac:classes:PasswordProtectedTransport"
+PASSWORD_CONTEXT = "urn:oasis:names:tc:SAML:2.0:ac:classes:Password"
 
 ENVELOPED = DS + "enveloped-signature"
 C14N = "http://www.w3.org/TR/2001/REC-xml-c14n-20010315"
