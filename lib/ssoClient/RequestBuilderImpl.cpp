@@ -56,7 +56,7 @@ void RequestBuilderImpl::BuildUserPassTokenRequest(
     header->Add(WsseUsernameTokenBuilder(userName, password));
     XMLBuilderPtr body =
         AcquireSecurityTokenBuilder(GetEffectiveConfirmationType(spec.confirmation), spec);
-    request.soapAction = WstIssueAction;
+    request.soapAction = Wire::IssueAction;
     request.body = BuildTokenRequest(ConfOverrideWithDelegate(spec), header, std::move(body));
 }
 

@@ -32,9 +32,9 @@ struct FaultName
 
 // [WST13 11], [SOAP Message Security 1.0, 12]
 constexpr FaultName BadCredentials[] = {
-    {WstNamespace, "FailedAuthentication"},
-    {WstNamespace, "InvalidSecurityToken"},
-    {WsseNamespace, "InvalidSecurityToken"},
+    {Wire::WsTrustNamespace, "FailedAuthentication"},
+    {Wire::WsTrustNamespace, "InvalidSecurityToken"},
+    {Wire::WsseNamespace, "InvalidSecurityToken"},
 };
 
 bool IsBadCredentials(const QName& code)
@@ -58,7 +58,7 @@ std::string GetElementText(const ElementNode* element)
     const std::string codeText = GetElementText(faultCode);
     QName code;
     if (!codeText.empty()) {
-        ResolveQName(faultCode, codeText, SoapNamespace, code);
+        ResolveQName(faultCode, codeText, Wire::SoapNamespace, code);
     }
     if (code.GetLocalName().empty()) {
         throw SsoException("Invalid SOAP response: missing faultcode.");
@@ -160,10 +160,10 @@ bool ExtractValidity(const ElementNode& soapBody)
             ToString(Quillon::Xml::NodeType::TEXT),
             child != nullptr ? ToString(child->GetNodeType()) : "nothing");
     }
-    if (text->GetText() == WstValidStatus) {
+    if (text->GetText() == Wire::ValidStatus) {
         return true;
     }
-    if (text->GetText() == WstInvalidStatus) {
+    if (text->GetText() == Wire::InvalidStatus) {
         return false;
     }
     throw SsoException(UnexpectedFormat);

@@ -26,9 +26,9 @@ const char* GetKeyType(SamlToken::ConfirmationType confirmation)
 {
     switch (confirmation) {
     case SamlToken::CONFIRM_BEARER:
-        return WstBearerKeyType;
+        return Wire::BearerKeyType;
     case SamlToken::CONFIRM_HOLDER_OF_KEY:
-        return WstPublicKeyType;
+        return Wire::PublicKeyType;
     }
     Quillon::PanicVerify("false", Unit, 379);
 }
@@ -51,7 +51,7 @@ boost::shared_ptr<XMLCompositeBuilder> CreateRequestSecurityToken(
     const char* tokenType, const char* requestType)
 {
     const auto request = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("wst", "RequestSecurityToken", {{"xmlns:wst", WstNamespace}}));
+        ElementBuilder("wst", "RequestSecurityToken", {{"xmlns:wst", Wire::WsTrustNamespace}}));
     request->Add(TextElementBuilder("wst", "TokenType", tokenType))
         .Add(TextElementBuilder("wst", "RequestType", requestType));
     return request;
@@ -71,7 +71,7 @@ XMLBuilderPtr WssuLifetimeBuilder(long long lifetimeSec)
 {
     const DateTime now = Quillon::System::GetUtcDateTime();
     const auto lifetime = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("wst", "Lifetime", {{"xmlns:wsu", WsuNamespace}}));
+        ElementBuilder("wst", "Lifetime", {{"xmlns:wsu", Wire::WsuNamespace}}));
     lifetime->Add(TextElementBuilder("wsu", "Created", DateTimeFormatter(now)))
         .Add(TextElementBuilder(
             "wsu", "Expires", DateTimeFormatter(AddSecondsToDate(now, lifetimeSec))));
@@ -94,7 +94,7 @@ XMLBuilderPtr WstDelegateToBuilder(const std::string& userName)
 XMLBuilderPtr WstParticipantsBuilders(const std::set<std::string>& participants)
 {
     const auto builder = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("wst", "Participants", {{"xmlns:wsa", WsaNamespace}}));
+        ElementBuilder("wst", "Participants", {{"xmlns:wsa", Wire::WsAddressingNamespace}}));
     for (const std::string& participant : participants) {
         builder->Add(WstParticipantBuilder(participant));
     }
@@ -122,10 +122,10 @@ XMLBuilderPtr RsaAdviceSetBuilder(const std::vector<Advice>& advice)
     const auto adviceSet = boost::make_shared<XMLCompositeBuilder>(ElementBuilder(
         "rsa-advice",
         "AdviceSet",
-        {{"xmlns:rsa-advice", RsaAdviceNamespace},
-         {"xmlns:saml", SamlNamespace},
-         {"xmlns:xs", XsNamespace},
-         {"xmlns:xsi", XsiNamespace}}));
+        {{"xmlns:rsa-advice", Wire::RsaAdviceNamespace},
+         {"xmlns:saml", Wire::SamlNamespace},
+         {"xmlns:xs", Wire::XsNamespace},
+         {"xmlns:xsi", Wire::XsiNamespace}}));
     for (const Advice& item : advice) {
         adviceSet->Add(RsaAdviceBuilder(item));
     }
@@ -156,7 +156,7 @@ XMLBuilderPtr RsaAttributeBuilder(const AdviceAttribute& attribute)
 boost::shared_ptr<XMLCompositeBuilder> CommonAcquireSecurityTokenBuilder(
     SamlToken::ConfirmationType confirmation, const TokenSpec& spec)
 {
-    const auto request = CreateRequestSecurityToken(SamlNamespace, WstIssueRequestType);
+    const auto request = CreateRequestSecurityToken(Wire::SamlNamespace, Wire::IssueRequestType);
     request->Add(TextElementBuilder("wst", "KeyType", GetKeyType(confirmation)))
         .Add(WssuLifetimeBuilder(spec.tokenLifetimeSec))
         .Add(WstRenewingBuilder(spec.renewable))
@@ -178,7 +178,7 @@ XMLBuilderPtr AcquireSecurityTokenBuilder(
 {
     const auto request = CommonAcquireSecurityTokenBuilder(confirmation, spec);
     if (confirmation == SamlToken::CONFIRM_HOLDER_OF_KEY && !spec.delegateTo) {
-        request->Add(ElementBuilder("wst", "UseKey", {{"Sig", ProofSignatureId}}));
+        request->Add(ElementBuilder("wst", "UseKey", {{"Sig", Wire::ProofSignatureId}}));
     }
     return request;
 }
@@ -195,14 +195,15 @@ XMLBuilderPtr RenewSecurityTokenBuilder(const SamlToken& token, long long lifeti
         Quillon::PanicVerify(
             "token.GetConfirmationMethod() == SamlToken::CONFIRM_HOLDER_OF_KEY", Unit, 513);
     }
-    const auto request = CreateRequestSecurityToken(SamlNamespace, WstRenewRequestType);
+    const auto request = CreateRequestSecurityToken(Wire::SamlNamespace, Wire::RenewRequestType);
     request->Add(WssuLifetimeBuilder(lifetimeSec)).Add(CreateTarget("RenewTarget", token));
     return request;
 }
 
 XMLBuilderPtr ValidateSecurityTokenBuilder(const SamlToken& token)
 {
-    const auto request = CreateRequestSecurityToken(WstStatusTokenType, WstValidateRequestType);
+    const auto request =
+        CreateRequestSecurityToken(Wire::StatusTokenType, Wire::ValidateRequestType);
     request->Add(CreateTarget("ValidateTarget", token));
     return request;
 }

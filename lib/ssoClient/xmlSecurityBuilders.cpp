@@ -59,7 +59,7 @@ XMLBuilderPtr WssuTimestampBuilder(int validityMinutes)
 {
     const DateTime now = Quillon::System::GetUtcDateTime();
     const auto timestamp = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("wsu", "Timestamp", {{"xmlns:wsu", WsuNamespace}}));
+        ElementBuilder("wsu", "Timestamp", {{"xmlns:wsu", Wire::WsuNamespace}}));
     timestamp->Add(TextElementBuilder("wsu", "Created", DateTimeFormatter(now)))
         .Add(TextElementBuilder(
             "wsu", "Expires", DateTimeFormatter(AddMinutesToDate(now, validityMinutes))));
@@ -69,7 +69,7 @@ XMLBuilderPtr WssuTimestampBuilder(int validityMinutes)
 XMLBuilderPtr WsSecurityHeaderBuilder(int validityMinutes)
 {
     const auto security = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("wsse", "Security", {{"xmlns:wsse", WsseNamespace}}));
+        ElementBuilder("wsse", "Security", {{"xmlns:wsse", Wire::WsseNamespace}}));
     security->Add(WssuTimestampBuilder(validityMinutes));
     return security;
 }
@@ -77,7 +77,7 @@ XMLBuilderPtr WsSecurityHeaderBuilder(int validityMinutes)
 XMLBuilderPtr WsseUsernameTokenBuilder(const std::string& userName)
 {
     const auto usernameToken = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("wsse", "UsernameToken", {{"xmlns:wsse", WsseNamespace}}));
+        ElementBuilder("wsse", "UsernameToken", {{"xmlns:wsse", Wire::WsseNamespace}}));
     usernameToken->Add(TextElementBuilder("wsse", "Username", userName));
     return usernameToken;
 }
@@ -87,7 +87,7 @@ XMLBuilderPtr WsseUsernameTokenBuilder(const std::string& userName, const std::s
     const auto usernameToken =
         boost::make_shared<XMLCompositeBuilder>(WsseUsernameTokenBuilder(userName));
     usernameToken->Add(
-        TextElementBuilder("wsse", "Password", {{"Type", PasswordTextType}}, password));
+        TextElementBuilder("wsse", "Password", {{"Type", Wire::PasswordTextType}}, password));
     return usernameToken;
 }
 
@@ -97,19 +97,19 @@ XMLBuilderPtr WsseX509v3BinarySecTokenBuilder(
     return TextElementBuilder(
         "wsse",
         "BinarySecurityToken",
-        {{"EncodingType", Base64BinaryEncoding},
-         {"ValueType", X509v3ValueType},
+        {{"EncodingType", Wire::Base64BinaryEncoding},
+         {"ValueType", Wire::X509v3ValueType},
          {"wsu:Id", id},
-         {"xmlns:wsu", WsuNamespace}},
+         {"xmlns:wsu", Wire::WsuNamespace}},
         Quillon::StringUtil::Base64Encode(certificate->GetEncoded()));
 }
 
 XMLBuilderPtr WsseX509v3BSTReferenceBuilder(const std::string& id)
 {
     const auto tokenReference = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("wsse", "SecurityTokenReference", {{"xmlns:wsse", WsseNamespace}}));
-    tokenReference->Add(
-        ElementBuilder("wsse", "Reference", {{"URI", "#" + id}, {"ValueType", X509v3ValueType}}));
+        ElementBuilder("wsse", "SecurityTokenReference", {{"xmlns:wsse", Wire::WsseNamespace}}));
+    tokenReference->Add(ElementBuilder(
+        "wsse", "Reference", {{"URI", "#" + id}, {"ValueType", Wire::X509v3ValueType}}));
     return tokenReference;
 }
 
@@ -118,11 +118,11 @@ XMLBuilderPtr WsseSamlKeyIdReferenceBuilder(const std::string& assertionId)
     const auto tokenReference = boost::make_shared<XMLCompositeBuilder>(ElementBuilder(
         "wsse",
         "SecurityTokenReference",
-        {{"wsse11:TokenType", SamlV2TokenType},
-         {"xmlns:wsse", WsseNamespace},
-         {"xmlns:wsse11", Wsse11Namespace}}));
-    tokenReference->Add(
-        TextElementBuilder("wsse", "KeyIdentifier", {{"ValueType", SamlIdValueType}}, assertionId));
+        {{"wsse11:TokenType", Wire::Saml20TokenType},
+         {"xmlns:wsse", Wire::WsseNamespace},
+         {"xmlns:wsse11", Wire::Wsse11Namespace}}));
+    tokenReference->Add(TextElementBuilder(
+        "wsse", "KeyIdentifier", {{"ValueType", Wire::SamlIdValueType}}, assertionId));
     return tokenReference;
 }
 

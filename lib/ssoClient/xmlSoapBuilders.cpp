@@ -16,11 +16,11 @@ XMLBuilderPtr SoapBuilder(XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder
 
     // Some bodies use `wst` without declaring it.
     const auto body = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("soapenv", "Body", {{"xmlns:wst", WstNamespace}}));
+        ElementBuilder("soapenv", "Body", {{"xmlns:wst", Wire::WsTrustNamespace}}));
     body->Add(std::move(bodyBuilder));
 
     const auto envelope = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("soapenv", "Envelope", {{"xmlns:soapenv", SoapNamespace}}));
+        ElementBuilder("soapenv", "Envelope", {{"xmlns:soapenv", Wire::SoapNamespace}}));
     envelope->Add(header).Add(body);
     return envelope;
 }

@@ -11,8 +11,7 @@ public:
     explicit FixedClock(std::string_view now)
         : _now(now)
         , _before(Quillon::System::ReplaceClock(this))
-    {
-    }
+    {}
     FixedClock(const FixedClock&) = delete;
     FixedClock& operator=(const FixedClock&) = delete;
     ~FixedClock() { Quillon::System::ReplaceClock(_before); }

@@ -22,8 +22,9 @@ TEST(ElementBuilder, WithoutAttributesGivesEmptyElement)
 
 TEST(ElementBuilder, WritesAttributesInByteOrderOfTheirNames)
 {
-    EXPECT_EQ(ToText(ElementBuilder("p", "e",
-                  {{"xmlns:wsu", "4"}, {"ValueType", "2"}, {"wsu:Id", "3"}, {"URI", "1"}})),
+    EXPECT_EQ(
+        ToText(ElementBuilder(
+            "p", "e", {{"xmlns:wsu", "4"}, {"ValueType", "2"}, {"wsu:Id", "3"}, {"URI", "1"}})),
         R"(<p:e URI="1" ValueType="2" wsu:Id="3" xmlns:wsu="4"/>)");
 }
 
@@ -56,7 +57,8 @@ TEST(TextElementBuilder, KeepsTextAndEscapesItOnlyOnTheWire)
 
 TEST(TextElementBuilder, WithAttributesWritesThemInOrder)
 {
-    EXPECT_EQ(ToText(TextElementBuilder("p", "e", {{"b", "2"}, {"a", "1"}}, "t")),
+    EXPECT_EQ(
+        ToText(TextElementBuilder("p", "e", {{"b", "2"}, {"a", "1"}}, "t")),
         R"(<p:e a="1" b="2">t</p:e>)");
 }
 
@@ -89,8 +91,7 @@ TEST(XMLCompositeBuilder, NestsAsRootAndAsChild)
     root->Add(ElementBuilder("p", "last"));
     const auto outer = boost::make_shared<XMLCompositeBuilder>(ElementBuilder("p", "outer"));
     outer->Add(root);
-    EXPECT_EQ(
-        ToText(outer), "<p:outer><p:inner><p:t>x</p:t><p:last/></p:inner></p:outer>");
+    EXPECT_EQ(ToText(outer), "<p:outer><p:inner><p:t>x</p:t><p:last/></p:inner></p:outer>");
 }
 
 TEST(XMLCompositeBuilder, PassesOverNullChildAndReturnsItself)
@@ -113,8 +114,10 @@ TEST(XMLCompositeBuilder, GivesIndependentTreesEachTime)
 
 TEST(XMLCompositeBuilderDeathTest, StopsTheProcessWithoutRoot)
 {
-    EXPECT_DEATH(XMLCompositeBuilder(nullptr),
-        AllOf(HasSubstr("rootBuilder != __null"),
+    EXPECT_DEATH(
+        XMLCompositeBuilder(nullptr),
+        AllOf(
+            HasSubstr("rootBuilder != __null"),
             HasSubstr("lib/ssoClient/xmlCommonBuilders"),
             HasSubstr("168")));
 }
@@ -143,7 +146,8 @@ TEST(InsertSamlTokenBuilder, InsertsTheRootElementUntouched)
                 "<a:A b=\"2\" xmlns:a=\"urn:a\" a=\"1\"> <a:B>x</a:B>\n<!-- in --></a:A>";
     const auto composite = boost::make_shared<XMLCompositeBuilder>(ElementBuilder("p", "e"));
     composite->Add(InsertSamlTokenBuilder(token));
-    EXPECT_EQ(ToText(composite),
+    EXPECT_EQ(
+        ToText(composite),
         "<p:e><a:A b=\"2\" xmlns:a=\"urn:a\" a=\"1\"> <a:B>x</a:B>\n<!-- in --></a:A></p:e>");
 }
 

@@ -54,7 +54,8 @@ TEST(WssuLifetimeBuilder, WritesCreationAndExpiry)
 TEST(WssuLifetimeBuilder, OfZeroSecondsExpiresAtCreation)
 {
     const FixedClock clock(Now);
-    EXPECT_EQ(ToText(WssuLifetimeBuilder(0)),
+    EXPECT_EQ(
+        ToText(WssuLifetimeBuilder(0)),
         "<wst:Lifetime xmlns:wsu=\"" WSU "\">"
         "<wsu:Created>2011-07-05T09:03:07.042Z</wsu:Created>"
         "<wsu:Expires>2011-07-05T09:03:07.042Z</wsu:Expires>"
@@ -99,27 +100,31 @@ TEST(WstRenewingBuilder, NeverAsksForRenewalAfterExpiry)
 
 TEST(WstDelegateToBuilder, HoldsUserNameWithoutPassword)
 {
-    EXPECT_EQ(ToText(WstDelegateToBuilder("proxy")),
+    EXPECT_EQ(
+        ToText(WstDelegateToBuilder("proxy")),
         "<wst:DelegateTo><wsse:UsernameToken xmlns:wsse=\"" WSSE "\">"
         "<wsse:Username>proxy</wsse:Username></wsse:UsernameToken></wst:DelegateTo>");
 }
 
 TEST(WsaEndpointAddressReferenceBuilder, HoldsTheAddress)
 {
-    EXPECT_EQ(ToText(WsaEndpointAddressReferenceBuilder("urn:a")),
+    EXPECT_EQ(
+        ToText(WsaEndpointAddressReferenceBuilder("urn:a")),
         "<wsa:EndpointReference><wsa:Address>urn:a</wsa:Address></wsa:EndpointReference>");
 }
 
 TEST(WstParticipantBuilder, HoldsTheReference)
 {
-    EXPECT_EQ(ToText(WstParticipantBuilder("urn:a")),
+    EXPECT_EQ(
+        ToText(WstParticipantBuilder("urn:a")),
         "<wst:Participant><wsa:EndpointReference><wsa:Address>urn:a</wsa:Address>"
         "</wsa:EndpointReference></wst:Participant>");
 }
 
 TEST(WstParticipantsBuilders, WritesParticipantsInStringOrder)
 {
-    EXPECT_EQ(ToText(WstParticipantsBuilders({"b", "a"})),
+    EXPECT_EQ(
+        ToText(WstParticipantsBuilders({"b", "a"})),
         "<wst:Participants xmlns:wsa=\"http://www.w3.org/2005/08/addressing\">"
         "<wst:Participant><wsa:EndpointReference><wsa:Address>a</wsa:Address>"
         "</wsa:EndpointReference></wst:Participant>"
@@ -130,7 +135,8 @@ TEST(WstParticipantsBuilders, WritesParticipantsInStringOrder)
 
 TEST(RsaAttributeBuilder, WritesValuesInOrder)
 {
-    EXPECT_EQ(ToText(RsaAttributeBuilder({"urn:n", {"y", "x"}})),
+    EXPECT_EQ(
+        ToText(RsaAttributeBuilder({"urn:n", {"y", "x"}})),
         "<rsa-advice:Attribute Name=\"urn:n\">"
         "<rsa-advice:AttributeValue xsi:type=\"xs:string\">y</rsa-advice:AttributeValue>"
         "<rsa-advice:AttributeValue xsi:type=\"xs:string\">x</rsa-advice:AttributeValue>"
@@ -139,13 +145,13 @@ TEST(RsaAttributeBuilder, WritesValuesInOrder)
 
 TEST(RsaAttributeBuilder, WithoutValuesIsEmpty)
 {
-    EXPECT_EQ(
-        ToText(RsaAttributeBuilder({"urn:n", {}})), "<rsa-advice:Attribute Name=\"urn:n\"/>");
+    EXPECT_EQ(ToText(RsaAttributeBuilder({"urn:n", {}})), "<rsa-advice:Attribute Name=\"urn:n\"/>");
 }
 
 TEST(RsaAdviceBuilder, WritesAttributesInOrder)
 {
-    EXPECT_EQ(ToText(RsaAdviceBuilder({"urn:s", {{"b", {}}, {"a", {}}}})),
+    EXPECT_EQ(
+        ToText(RsaAdviceBuilder({"urn:s", {{"b", {}}, {"a", {}}}})),
         "<rsa-advice:Advice AdviceSource=\"urn:s\">"
         "<rsa-advice:Attribute Name=\"b\"/><rsa-advice:Attribute Name=\"a\"/>"
         "</rsa-advice:Advice>");
@@ -153,7 +159,8 @@ TEST(RsaAdviceBuilder, WritesAttributesInOrder)
 
 TEST(RsaAdviceSetBuilder, DeclaresItsNamespacesAndKeepsTheOrder)
 {
-    EXPECT_EQ(ToText(RsaAdviceSetBuilder({{"urn:2", {}}, {"urn:1", {}}})),
+    EXPECT_EQ(
+        ToText(RsaAdviceSetBuilder({{"urn:2", {}}, {"urn:1", {}}})),
         "<rsa-advice:AdviceSet"
         " xmlns:rsa-advice=\"http://www.rsa.com/names/2009/12/std-ext/WS-Trust1.4/advice\""
         " xmlns:saml=\"urn:oasis:names:tc:SAML:2.0:assertion\""
@@ -187,7 +194,8 @@ TEST(CommonAcquireSecurityTokenBuilder, OfFullSpecKeepsTheOrder)
     spec.audienceRestriction = {"aud"};
     spec.advice = {{"urn:s", {{"urn:n", {"v"}}}}};
     const FixedClock clock(Now);
-    EXPECT_EQ(ToText(CommonAcquireSecurityTokenBuilder(SamlToken::CONFIRM_HOLDER_OF_KEY, spec)),
+    EXPECT_EQ(
+        ToText(CommonAcquireSecurityTokenBuilder(SamlToken::CONFIRM_HOLDER_OF_KEY, spec)),
         std::string("<wst:RequestSecurityToken xmlns:wst=\"" WST "\">"
                     "<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>"
                     "<wst:RequestType>" WST "/Issue</wst:RequestType>"
@@ -225,9 +233,11 @@ TEST(AcquireSecurityTokenBuilder, OfHolderOfKeyEndsWithUseKey)
     spec.advice = {{"urn:s", {}}};
     const std::string text =
         ToText(AcquireSecurityTokenBuilder(SamlToken::CONFIRM_HOLDER_OF_KEY, spec));
-    EXPECT_THAT(text, testing::EndsWith("</rsa-advice:AdviceSet>"
-                                        "<wst:UseKey Sig=\"holderOfKeyProofSignature\"/>"
-                                        "</wst:RequestSecurityToken>"));
+    EXPECT_THAT(
+        text,
+        testing::EndsWith("</rsa-advice:AdviceSet>"
+                          "<wst:UseKey Sig=\"holderOfKeyProofSignature\"/>"
+                          "</wst:RequestSecurityToken>"));
 }
 
 TEST(AcquireSecurityTokenBuilder, OfDelegatedHolderOfKeyHasNoUseKey)
@@ -236,16 +246,27 @@ TEST(AcquireSecurityTokenBuilder, OfDelegatedHolderOfKeyHasNoUseKey)
     spec.delegateTo = "proxy";
     EXPECT_THAT(
         GetChildNames(AcquireSecurityTokenBuilder(SamlToken::CONFIRM_HOLDER_OF_KEY, spec)),
-        ElementsAre("wst:TokenType", "wst:RequestType", "wst:KeyType", "wst:Lifetime",
-            "wst:Renewing", "wst:Delegatable", "wst:DelegateTo"));
+        ElementsAre(
+            "wst:TokenType",
+            "wst:RequestType",
+            "wst:KeyType",
+            "wst:Lifetime",
+            "wst:Renewing",
+            "wst:Delegatable",
+            "wst:DelegateTo"));
 }
 
 TEST(AcquireSecurityTokenBuilder, OfBearerHasNoUseKey)
 {
     EXPECT_THAT(
         GetChildNames(AcquireSecurityTokenBuilder(SamlToken::CONFIRM_BEARER, MinimalSpec())),
-        ElementsAre("wst:TokenType", "wst:RequestType", "wst:KeyType", "wst:Lifetime",
-            "wst:Renewing", "wst:Delegatable"));
+        ElementsAre(
+            "wst:TokenType",
+            "wst:RequestType",
+            "wst:KeyType",
+            "wst:Lifetime",
+            "wst:Renewing",
+            "wst:Delegatable"));
 }
 
 TEST(ExchangeSecurityTokenBuilder, OfHolderOfKeyHasNoUseKey)
@@ -253,7 +274,8 @@ TEST(ExchangeSecurityTokenBuilder, OfHolderOfKeyHasNoUseKey)
     const auto element =
         Build(*ExchangeSecurityTokenBuilder(SamlToken::CONFIRM_HOLDER_OF_KEY, MinimalSpec()));
     EXPECT_EQ(element->FindChildElement("UseKey"), nullptr);
-    EXPECT_EQ(ToText(*element->FindChildElement("KeyType")),
+    EXPECT_EQ(
+        ToText(*element->FindChildElement("KeyType")),
         "<wst:KeyType>" WST "/PublicKey</wst:KeyType>");
 }
 
@@ -263,7 +285,8 @@ TEST(RenewSecurityTokenBuilder, HoldsTheToken)
     token.confirmationMethod = SamlToken::CONFIRM_HOLDER_OF_KEY;
     token.xml = "<a:A xmlns:a=\"urn:a\"/>";
     const FixedClock clock(Now);
-    EXPECT_EQ(ToText(RenewSecurityTokenBuilder(token, 300)),
+    EXPECT_EQ(
+        ToText(RenewSecurityTokenBuilder(token, 300)),
         std::string("<wst:RequestSecurityToken xmlns:wst=\"" WST "\">"
                     "<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>"
                     "<wst:RequestType>" WST "/Renew</wst:RequestType>")
@@ -284,8 +307,10 @@ TEST(RenewSecurityTokenBuilderDeathTest, StopsTheProcessOnBearerToken)
 {
     FakeSamlToken token;
     token.xml = "<A/>";
-    EXPECT_DEATH(RenewSecurityTokenBuilder(token, 300),
-        AllOf(HasSubstr("token.GetConfirmationMethod() == SamlToken::CONFIRM_HOLDER_OF_KEY"),
+    EXPECT_DEATH(
+        RenewSecurityTokenBuilder(token, 300),
+        AllOf(
+            HasSubstr("token.GetConfirmationMethod() == SamlToken::CONFIRM_HOLDER_OF_KEY"),
             HasSubstr("lib/ssoClient/xmlRequestBuilders"),
             HasSubstr("513")));
 }
@@ -294,7 +319,8 @@ TEST(ValidateSecurityTokenBuilder, HoldsTheToken)
 {
     FakeSamlToken token;
     token.xml = "<a:A xmlns:a=\"urn:a\"/>";
-    EXPECT_EQ(ToText(ValidateSecurityTokenBuilder(token)),
+    EXPECT_EQ(
+        ToText(ValidateSecurityTokenBuilder(token)),
         "<wst:RequestSecurityToken xmlns:wst=\"" WST "\">"
         "<wst:TokenType>" WST "/RSTR/Status</wst:TokenType>"
         "<wst:RequestType>" WST "/Validate</wst:RequestType>"

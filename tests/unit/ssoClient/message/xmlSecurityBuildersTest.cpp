@@ -23,8 +23,7 @@ class EncodingOnly : public Quillon::Crypto::Certificate
 public:
     explicit EncodingOnly(std::vector<unsigned char> encoded)
         : _encoded(std::move(encoded))
-    {
-    }
+    {}
 
     const std::vector<unsigned char>& GetEncoded() const noexcept override { return _encoded; }
     const Quillon::Crypto::PublicKey& GetPublicKey() const noexcept override { std::abort(); }
@@ -76,7 +75,8 @@ TEST(AddMinutesToDate, WrapsBeyond35Minutes)
 TEST(WssuTimestampBuilder, WritesCreationAndExpiry)
 {
     const FixedClock clock(Now);
-    EXPECT_EQ(ToText(WssuTimestampBuilder(10)),
+    EXPECT_EQ(
+        ToText(WssuTimestampBuilder(10)),
         "<wsu:Timestamp xmlns:wsu=\"" WSU "\">"
         "<wsu:Created>2011-07-05T09:03:07.042Z</wsu:Created>"
         "<wsu:Expires>2011-07-05T09:13:07.042Z</wsu:Expires>"
@@ -97,7 +97,8 @@ TEST(WssuTimestampBuilder, KeepsTheTimeOfItsCreation)
 TEST(WsSecurityHeaderBuilder, HoldsTheTimestamp)
 {
     const FixedClock clock(Now);
-    EXPECT_EQ(ToText(WsSecurityHeaderBuilder(5)),
+    EXPECT_EQ(
+        ToText(WsSecurityHeaderBuilder(5)),
         "<wsse:Security xmlns:wsse=\"" WSSE "\">"
         "<wsu:Timestamp xmlns:wsu=\"" WSU "\">"
         "<wsu:Created>2011-07-05T09:03:07.042Z</wsu:Created>"
@@ -107,14 +108,16 @@ TEST(WsSecurityHeaderBuilder, HoldsTheTimestamp)
 
 TEST(WsseUsernameTokenBuilder, WithoutPasswordHasTheNameOnly)
 {
-    EXPECT_EQ(ToText(WsseUsernameTokenBuilder("jdoe")),
+    EXPECT_EQ(
+        ToText(WsseUsernameTokenBuilder("jdoe")),
         "<wsse:UsernameToken xmlns:wsse=\"" WSSE "\">"
         "<wsse:Username>jdoe</wsse:Username></wsse:UsernameToken>");
 }
 
 TEST(WsseUsernameTokenBuilder, WithPasswordHasNameThenPassword)
 {
-    EXPECT_EQ(ToText(WsseUsernameTokenBuilder("jdoe", "p<w&")),
+    EXPECT_EQ(
+        ToText(WsseUsernameTokenBuilder("jdoe", "p<w&")),
         "<wsse:UsernameToken xmlns:wsse=\"" WSSE "\">"
         "<wsse:Username>jdoe</wsse:Username>"
         "<wsse:Password Type=\"http://docs.oasis-open.org/wss/2004/01/"
@@ -139,7 +142,8 @@ TEST(WsseX509v3BinarySecTokenBuilder, WritesTheEncodingInOneLine)
     // 60 zero bytes make 80 digits, more than a PEM line has.
     const Quillon::Ref<EncodingOnly> certificate(
         new EncodingOnly(std::vector<unsigned char>(60, 0)));
-    EXPECT_EQ(ToText(WsseX509v3BinarySecTokenBuilder("certId", certificate.get())),
+    EXPECT_EQ(
+        ToText(WsseX509v3BinarySecTokenBuilder("certId", certificate.get())),
         "<wsse:BinarySecurityToken EncodingType=\"http://docs.oasis-open.org/wss/2004/01/"
         "oasis-200401-wss-soap-message-security-1.0#Base64Binary\" ValueType=\"" X509V3
         "\" wsu:Id=\"certId\" xmlns:wsu=\"" WSU "\">"
@@ -148,7 +152,8 @@ TEST(WsseX509v3BinarySecTokenBuilder, WritesTheEncodingInOneLine)
 
 TEST(WsseX509v3BSTReferenceBuilder, PointsAtTheTokenById)
 {
-    EXPECT_EQ(ToText(WsseX509v3BSTReferenceBuilder("certId")),
+    EXPECT_EQ(
+        ToText(WsseX509v3BSTReferenceBuilder("certId")),
         "<wsse:SecurityTokenReference xmlns:wsse=\"" WSSE "\">"
         "<wsse:Reference URI=\"#certId\" ValueType=\"" X509V3 "\"/>"
         "</wsse:SecurityTokenReference>");
@@ -157,7 +162,8 @@ TEST(WsseX509v3BSTReferenceBuilder, PointsAtTheTokenById)
 TEST(WsseSamlKeyIdReferenceBuilder, NamesTheAssertion)
 {
     // The two spellings of the profile's name differ, as they do in the profile.
-    EXPECT_EQ(ToText(WsseSamlKeyIdReferenceBuilder("_id-1")),
+    EXPECT_EQ(
+        ToText(WsseSamlKeyIdReferenceBuilder("_id-1")),
         "<wsse:SecurityTokenReference wsse11:TokenType=\"http://docs.oasis-open.org/wss/"
         "oasis-wss-saml-tokenprofile-1.1#SAMLV2.0\" xmlns:wsse=\"" WSSE
         "\" xmlns:wsse11=\"http://docs.oasis-open.org/wss/"

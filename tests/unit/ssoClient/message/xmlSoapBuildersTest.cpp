@@ -8,7 +8,8 @@ using namespace SsoClient;
 
 TEST(SoapBuilder, WrapsHeaderAndBody)
 {
-    EXPECT_EQ(ToText(SoapBuilder(ElementBuilder("p", "h"), ElementBuilder("p", "b"))),
+    EXPECT_EQ(
+        ToText(SoapBuilder(ElementBuilder("p", "h"), ElementBuilder("p", "b"))),
         "<soapenv:Envelope xmlns:soapenv=\"http://schemas.xmlsoap.org/soap/envelope/\">"
         "<soapenv:Header><p:h/></soapenv:Header>"
         "<soapenv:Body xmlns:wst=\"http://docs.oasis-open.org/ws-sx/ws-trust/200512\"><p:b/>"
@@ -17,7 +18,8 @@ TEST(SoapBuilder, WrapsHeaderAndBody)
 
 TEST(SoapBuilder, LeavesElementsEmptyWithoutTheirParts)
 {
-    EXPECT_EQ(ToText(SoapBuilder(nullptr, nullptr)),
+    EXPECT_EQ(
+        ToText(SoapBuilder(nullptr, nullptr)),
         "<soapenv:Envelope xmlns:soapenv=\"http://schemas.xmlsoap.org/soap/envelope/\">"
         "<soapenv:Header/>"
         "<soapenv:Body xmlns:wst=\"http://docs.oasis-open.org/ws-sx/ws-trust/200512\"/>"
