@@ -66,6 +66,7 @@ protected:
 private:
     friend class Arena;
     friend class ElementNode;
+    friend class TextNode;
     friend class TreeBuilder;
 
     Arena* _arena;
