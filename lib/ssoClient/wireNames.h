@@ -56,6 +56,9 @@ inline constexpr char Saml20TokenType[] =
 inline constexpr char SamlIdValueType[] =
     "http://docs.oasis-open.org/wss/oasis-wss-saml-token-profile-1.1#SAMLID";
 
+/** The Id of the signature by the holder-of-key private key, for `wst:UseKey` to point at. */
+inline constexpr char ProofSignatureId[] = "holderOfKeyProofSignature";
+
 // SAML 2.0. The namespace of assertions is also the token type of an issued assertion.
 inline constexpr char SamlNamespace[] = "urn:oasis:names:tc:SAML:2.0:assertion";
 inline constexpr char DelegationNamespace[] = "urn:oasis:names:tc:SAML:2.0:conditions:delegation";
