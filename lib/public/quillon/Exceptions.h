@@ -30,7 +30,7 @@ public:
     /** Class name, message and call stack, for a diagnostic log. */
     virtual std::string Dump() const;
 
-    /** The innermost frame outside the exception's own constructors. */
+    /** The innermost frame outside the exception's own constructors, as far as symbols tell. */
     virtual std::string Where() const;
 
 private:
@@ -70,8 +70,7 @@ public:
 QUILLON_API std::string GetClassName(const std::exception& error);
 
 /** A bad argument. The text is "Invalid argument : " followed by the given message. */
-class QUILLON_API InvalidArgumentException
-    : public ExceptionOf<InvalidArgumentException, Exception>
+class QUILLON_API InvalidArgumentException : public ExceptionOf<InvalidArgumentException, Exception>
 {
 public:
     explicit InvalidArgumentException(const std::string& message);

@@ -46,7 +46,7 @@ private:
 
     static std::string ToText(const std::string& value) { return value; }
     static std::string ToText(std::string_view value) { return std::string(value); }
-    static std::string ToText(const char* value) { return value; }
+    static std::string ToText(const char* value) { return value == nullptr ? "(null)" : value; }
     static std::string ToText(bool value) { return value ? "true" : "false"; }
     static std::string ToText(int value) { return std::to_string(value); }
     static std::string ToText(long value) { return std::to_string(value); }

@@ -9,8 +9,11 @@
 namespace Quillon::StringUtil {
 
 /**
- * Upper-cases UTF-8 text by the simple, locale-independent mapping of the C library's "C.UTF-8"
- * rules: ASCII, Latin, Greek and Cyrillic letters. Malformed bytes stay as they are.
+ * Upper-cases UTF-8 text, letter by letter and independent of the locale, by the simple mapping of
+ * Unicode [UNICODE 4.2] in these ranges: ASCII, Latin-1 (U+0080 to U+00FF), Latin Extended-A
+ * (U+0100 to U+017F), Greek (U+0370 to U+03FF) and Cyrillic (U+0400 to U+052F). Everything else
+ * stays as it is, malformed bytes included. So do, on purpose, the letters outside ASCII whose
+ * partner is an ASCII letter (U+0130, U+0131, U+017F): a look-alike never equals a plain name.
  */
 QUILLON_API std::string ToUpper(std::string_view text);
 

@@ -31,12 +31,14 @@ inline constexpr long long DefaultClockToleranceSec = 600;
  * Thread safety: any number of threads, also with the same certificates. Cost: one parse, one
  * hash and one public-key operation.
  */
-SSOCLIENT_API boost::shared_ptr<const SamlToken> CreateSamlToken(const std::string& xml,
+SSOCLIENT_API boost::shared_ptr<const SamlToken> CreateSamlToken(
+    const std::string& xml,
     const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCerts,
     long long clockToleranceSec);
 
 /** The same with a clock tolerance of 600 seconds. */
-SSOCLIENT_API boost::shared_ptr<const SamlToken> CreateSamlToken(const std::string& xml,
+SSOCLIENT_API boost::shared_ptr<const SamlToken> CreateSamlToken(
+    const std::string& xml,
     const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCerts);
 
 /** The same for one trusted certificate, which is referenced only during the call. */

@@ -8,7 +8,7 @@ namespace SsoClient {
 /** One link of a token's delegation chain. */
 struct Delegate
 {
-    PrincipalId subject;                     ///< the delegate
+    PrincipalId subject;                      ///< the delegate
     Quillon::System::DateTime delegationDate; ///< when the delegation took place
 };
 

@@ -32,8 +32,8 @@ public:
      *
      * @return the verified token; null if the service answered with an empty assertion.
      */
-    virtual boost::shared_ptr<const SamlToken> AcquireToken(const std::string& userName,
-        const std::string& password, const TokenSpec& spec) const = 0;
+    virtual boost::shared_ptr<const SamlToken> AcquireToken(
+        const std::string& userName, const std::string& password, const TokenSpec& spec) const = 0;
 };
 
 /**

@@ -21,7 +21,7 @@ struct TokenSpec
         CONFIRMATION_BEARER = 1
     };
 
-    long long tokenLifetimeSec = 300; ///< must be positive
+    long long tokenLifetimeSec = 300;          ///< must be positive
     std::set<std::string> audienceRestriction; ///< empty: none requested
     std::vector<Advice> advice;
     bool delegable = false;

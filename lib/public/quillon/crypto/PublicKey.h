@@ -58,8 +58,11 @@ public:
      *
      * @return whether it verifies; false also for a value of the wrong form.
      */
-    virtual bool VerifyDigest(HashAlgorithm algorithm, const unsigned char* digest,
-        const unsigned char* signature, std::size_t signatureLength) const = 0;
+    virtual bool VerifyDigest(
+        HashAlgorithm algorithm,
+        const unsigned char* digest,
+        const unsigned char* signature,
+        std::size_t signatureLength) const = 0;
 
 protected:
     ~PublicKey() = default;

@@ -17,10 +17,12 @@ enum LogLevel : int
 };
 
 /**
- * Takes the lines of all loggers: logger name, level, text without line break. It is called on
- * the thread that logs, from several threads at once, and must not throw.
+ * Takes the lines of all loggers: logger name, level and text. Control characters other than the
+ * tab arrive written out as `\xNN`, so a line cannot pretend to be two. It is called on the thread
+ * that logs, from several threads at once; what it throws is dropped with the line.
  */
-using LogSink = boost::function<void(const std::string& logger, int level, const std::string& text)>;
+using LogSink =
+    boost::function<void(const std::string& logger, int level, const std::string& text)>;
 
 /**
  * A named stream of log lines with a level of its own.

@@ -29,8 +29,7 @@ struct SSLContextOptions
  * Thread safety: immutable; any number of connections at once.
  */
 class QUILLON_API SSLContext : public RefCounted
-{
-};
+{};
 
 /**
  * @throws InvalidArgumentException  a client key without a certificate or the reverse, or no

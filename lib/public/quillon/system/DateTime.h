@@ -9,8 +9,7 @@
 namespace Quillon::System {
 
 /** Text that should be a date and time is not, or lies outside the years 1 to 9999. */
-class QUILLON_API DateTimeFormatException
-    : public ExceptionOf<DateTimeFormatException, Exception>
+class QUILLON_API DateTimeFormatException : public ExceptionOf<DateTimeFormatException, Exception>
 {
 public:
     using ExceptionOf::ExceptionOf;

@@ -60,13 +60,13 @@ protected:
     Node(NodeType type, Arena* arena) noexcept
         : _arena(arena)
         , _type(type)
-    {
-    }
+    {}
     ~Node() = default;
 
 private:
     friend class Arena;
     friend class ElementNode;
+    friend class TextNode;
     friend class TreeBuilder;
 
     Arena* _arena;
@@ -95,8 +95,7 @@ private:
     explicit TextNode(Arena* arena, std::string_view text = {}) noexcept
         : Node(NodeType::TEXT, arena)
         , _text(text)
-    {
-    }
+    {}
 
     std::string_view _text;
 };
@@ -112,8 +111,7 @@ private:
     CommentNode(Arena* arena, std::string_view text) noexcept
         : Node(NodeType::COMMENT, arena)
         , _text(text)
-    {
-    }
+    {}
 
     std::string_view _text;
 };
@@ -127,13 +125,11 @@ public:
 private:
     friend class Arena;
 
-    ProcessingInstructionNode(
-        Arena* arena, std::string_view target, std::string_view data) noexcept
+    ProcessingInstructionNode(Arena* arena, std::string_view target, std::string_view data) noexcept
         : Node(NodeType::PROCESSING_INSTRUCTION, arena)
         , _target(target)
         , _data(data)
-    {
-    }
+    {}
 
     std::string_view _target;
     std::string_view _data;
@@ -160,8 +156,7 @@ public:
     AttributeRange(const Attribute* first, std::size_t count) noexcept
         : _first(first)
         , _count(count)
-    {
-    }
+    {}
     const Attribute* begin() const noexcept { return _first; }
     const Attribute* end() const noexcept { return _first + _count; }
     std::size_t size() const noexcept { return _count; }
@@ -273,8 +268,8 @@ QUILLON_API void CreateTextNode(Ref<TextNode>& out);
 inline ElementNode* AsElement(Node* node) noexcept
 {
     return node != nullptr && node->GetNodeType() == NodeType::ELEMENT
-        ? static_cast<ElementNode*>(node)
-        : nullptr;
+               ? static_cast<ElementNode*>(node)
+               : nullptr;
 }
 inline const ElementNode* AsElement(const Node* node) noexcept
 {
@@ -283,8 +278,8 @@ inline const ElementNode* AsElement(const Node* node) noexcept
 inline const TextNode* AsText(const Node* node) noexcept
 {
     return node != nullptr && node->GetNodeType() == NodeType::TEXT
-        ? static_cast<const TextNode*>(node)
-        : nullptr;
+               ? static_cast<const TextNode*>(node)
+               : nullptr;
 }
 
 } // namespace Quillon::Xml

@@ -15,8 +15,7 @@ public:
     QName(std::string namespaceUri, std::string localName)
         : _namespaceUri(std::move(namespaceUri))
         , _localName(std::move(localName))
-    {
-    }
+    {}
 
     const std::string& GetNamespaceUri() const noexcept { return _namespaceUri; }
     const std::string& GetLocalName() const noexcept { return _localName; }

@@ -13,8 +13,7 @@ public:
 };
 
 /** A `ds:Signature` element is not built as XML Signature says [XMLDSIG 4]. */
-class QUILLON_API SignatureSyntaxException
-    : public ExceptionOf<SignatureSyntaxException, Exception>
+class QUILLON_API SignatureSyntaxException : public ExceptionOf<SignatureSyntaxException, Exception>
 {
 public:
     using ExceptionOf::ExceptionOf;
