@@ -45,5 +45,6 @@ void AddAcquirePasswordCommand(CLI::App& parent, Action& action)
     options->token.AddTo(*command);
     options->output.AddOutTo(*command);
     options->output.AddJsonTo(*command);
-    command->callback([options, &action] { action = [options] { return AcquirePassword(*options); }; });
+    command->callback(
+        [options, &action] { action = [options] { return AcquirePassword(*options); }; });
 }

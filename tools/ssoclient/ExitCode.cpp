@@ -5,7 +5,9 @@
 #include "quillon/http/Exceptions.h"
 #include "ssoClient/Exceptions.h"
 
+#include <cerrno>
 #include <iostream>
+#include <system_error>
 
 namespace {
 
@@ -17,12 +19,15 @@ bool IsOneOf(const std::exception& error)
 
 } // namespace
 
+void ThrowSystemError(const std::string& what)
+{
+    throw UsageError(what + ": " + std::system_category().message(errno));
+}
+
 ExitCode GetExitCode(const std::exception& error)
 {
-    if (IsOneOf<
-            UsageError,
-            Quillon::InvalidArgumentException,
-            Quillon::InvalidStateException>(error)) {
+    if (IsOneOf<UsageError, Quillon::InvalidArgumentException, Quillon::InvalidStateException>(
+            error)) {
         return ExitCode::USAGE;
     }
     if (IsOneOf<SsoClient::InvalidCredentialsException>(error)) {

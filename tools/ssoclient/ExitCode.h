@@ -22,6 +22,9 @@ public:
     using ExceptionOf::ExceptionOf;
 };
 
+/** Throws a `UsageError` that says what could not be done and the reason that `errno` tells. */
+[[noreturn]] void ThrowSystemError(const std::string& what);
+
 /** The exit code that tells a script what kind of failure `error` is. */
 ExitCode GetExitCode(const std::exception& error);
 

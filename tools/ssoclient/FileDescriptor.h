@@ -12,12 +12,10 @@ public:
     FileDescriptor() noexcept = default;
     explicit FileDescriptor(int descriptor) noexcept
         : _descriptor(descriptor)
-    {
-    }
+    {}
     FileDescriptor(FileDescriptor&& other) noexcept
         : _descriptor(std::exchange(other._descriptor, -1))
-    {
-    }
+    {}
     FileDescriptor& operator=(FileDescriptor&& other) noexcept
     {
         std::swap(_descriptor, other._descriptor);

@@ -6,10 +6,8 @@
 
 #include <sys/stat.h>
 
-#include <cerrno>
 #include <cstdio>
 #include <cstdlib>
-#include <cstring>
 
 #include <fcntl.h>
 #include <unistd.h>
@@ -18,32 +16,27 @@ using Quillon::MessageFormatter;
 
 namespace {
 
-// Twice what the library reads of a token; certificates are far smaller.
-constexpr std::size_t MaxFileBytes = 16 * 1024 * 1024;
+// Far more than the library reads of a token, so that an oversized one is refused there; this only
+// bounds what an endless input can take up.
+constexpr std::size_t MaxFileBytes = 64 * 1024 * 1024;
 
-[[noreturn]] void ThrowFileError(const char* what, const std::string& path, int error)
-{
-    throw UsageError(MessageFormatter::ASPrint("%1 `%2': %3", what, path, std::strerror(error)));
-}
-
-std::string ReadAll(int descriptor, const std::string& path)
+std::string ReadAll(int descriptor, const std::string& name)
 {
     std::string text;
     char buffer[16 * 1024];
     for (;;) {
-        const ssize_t count = RetryInterrupted([&] {
-            return ::read(descriptor, buffer, sizeof buffer);
-        });
+        const ssize_t count =
+            RetryInterrupted([&] { return ::read(descriptor, buffer, sizeof buffer); });
         if (count < 0) {
-            ThrowFileError("cannot read", path, errno);
+            ThrowSystemError("cannot read " + name);
         }
         if (count == 0) {
             return text;
         }
         text.append(buffer, static_cast<std::size_t>(count));
         if (text.size() > MaxFileBytes) {
-            throw UsageError(MessageFormatter::ASPrint(
-                "`%1' is larger than %2 bytes", path, MaxFileBytes));
+            throw UsageError(
+                MessageFormatter::ASPrint("%1 is larger than %2 bytes", name, MaxFileBytes));
         }
     }
 }
@@ -60,11 +53,10 @@ void RequireRegularOrAbsent(const std::string& path)
 void WriteAll(int descriptor, const std::string& text, const std::string& path)
 {
     for (std::size_t at = 0; at < text.size();) {
-        const ssize_t count = RetryInterrupted([&] {
-            return ::write(descriptor, text.data() + at, text.size() - at);
-        });
+        const ssize_t count = RetryInterrupted(
+            [&] { return ::write(descriptor, text.data() + at, text.size() - at); });
         if (count < 0) {
-            ThrowFileError("cannot write", path, errno);
+            ThrowSystemError("cannot write `" + path + "'");
         }
         at += static_cast<std::size_t>(count);
     }
@@ -79,9 +71,9 @@ std::string ReadFile(const std::string& path)
     }
     const FileDescriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC));
     if (!file.IsOpen()) {
-        ThrowFileError("cannot open", path, errno);
+        ThrowSystemError("cannot open `" + path + "'");
     }
-    return ReadAll(file.Get(), path);
+    return ReadAll(file.Get(), "`" + path + "'");
 }
 
 OutputFile::OutputFile(std::string path)
@@ -92,7 +84,7 @@ OutputFile::OutputFile(std::string path)
     // mkostemp makes the file with mode 0600, whatever the umask.
     _descriptor = FileDescriptor(::mkostemp(_temporaryPath.data(), O_CLOEXEC));
     if (!_descriptor.IsOpen()) {
-        ThrowFileError("cannot write", _path, errno);
+        ThrowSystemError("cannot write `" + _path + "'");
     }
 }
 
@@ -108,7 +100,7 @@ void OutputFile::Commit(const std::string& text)
     WriteAll(_descriptor.Get(), text, _path);
     if (::fsync(_descriptor.Get()) != 0
         || std::rename(_temporaryPath.c_str(), _path.c_str()) != 0) {
-        ThrowFileError("cannot write", _path, errno);
+        ThrowSystemError("cannot write `" + _path + "'");
     }
     _committed = true;
 }

@@ -25,8 +25,8 @@ ExitCode Inspect(const InspectOptions& options)
 {
     TokenOutput output(options.output);
     const CertificateList trusted = ReadCertificates(options.trustFiles);
-    output.Show(SsoClient::CreateSamlToken(
-        ReadFile(options.file), trusted, options.clockToleranceSec));
+    output.Show(
+        SsoClient::CreateSamlToken(ReadFile(options.file), trusted, options.clockToleranceSec));
     return ExitCode::DONE;
 }
 

@@ -21,8 +21,7 @@ namespace {
 
 [[noreturn]] void ThrowReadError(const std::string& name)
 {
-    throw UsageError(MessageFormatter::ASPrint(
-        "cannot read the password from %1: %2", name, std::strerror(errno)));
+    ThrowSystemError("cannot read the password from " + name);
 }
 
 /**
@@ -95,7 +94,7 @@ public:
     {
         pollfd input = {descriptor, POLLIN, 0};
         while (::ppoll(&input, 1, nullptr, &_maskBefore) < 0 && errno == EINTR
-            && caughtSignal == 0) {
+               && caughtSignal == 0) {
         }
         return caughtSignal == 0;
     }

@@ -16,8 +16,10 @@ Quillon::Ref<Quillon::Ssl::SSLContext> CreateContext(const std::vector<std::stri
 /** The library's logger writes to standard error unless it is given another sink. */
 void EnableTraceLines()
 {
-    Quillon::Service::GetApp()->GetLogFacility().GetLogger("SsoClient")->SetLevel(
-        Quillon::Service::LOG_LEVEL_TRACE);
+    Quillon::Service::GetApp()
+        ->GetLogFacility()
+        .GetLogger("SsoClient")
+        ->SetLevel(Quillon::Service::LOG_LEVEL_TRACE);
 }
 
 } // namespace
@@ -41,8 +43,7 @@ void ServiceOptions::AddTo(CLI::App& command)
             "What the TLS server must prove: another host name, or sha256//BASE64 of its public "
             "key (default: the host name of the URL)")
         ->type_name("TEXT");
-    command.add_flag(
-        "--verbose", verbose, "Write the library's trace lines to standard error");
+    command.add_flag("--verbose", verbose, "Write the library's trace lines to standard error");
 }
 
 boost::shared_ptr<SsoClient::SecurityTokenService> ServiceOptions::CreateService() const

@@ -4,6 +4,7 @@
 #include "OneLine.h"
 
 #include "ssoClient/Descriptions.h"
+#include "ssoClient/Exceptions.h"
 
 #include <nlohmann/json.hpp>
 
@@ -78,13 +79,17 @@ TokenOutput::TokenOutput(const OutputOptions& options)
     }
 }
 
-void TokenOutput::Show(const SsoClient::SamlToken& token)
+void TokenOutput::Show(const boost::shared_ptr<const SsoClient::SamlToken>& token)
 {
-    if (_file) {
-        _file->Commit(token.ToXml());
+    if (!token) {
+        throw SsoClient::SsoException("The token service answered without a token");
     }
-    PrintLine(_json ? CreateJsonDescription(token)
-                    : ToOneLine(SsoClient::CreateRedactedDescription(token)));
+    if (_file) {
+        _file->Commit(token->ToXml());
+    }
+    PrintLine(
+        _json ? CreateJsonDescription(*token)
+              : ToOneLine(SsoClient::CreateRedactedDescription(*token)));
 }
 
 void PrintLine(const std::string& line)

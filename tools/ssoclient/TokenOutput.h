@@ -6,6 +6,8 @@
 
 #include <CLI/App.hpp>
 
+#include <boost/smart_ptr/shared_ptr.hpp>
+
 #include <optional>
 #include <string>
 
@@ -28,8 +30,10 @@ public:
     /**
      * Writes the assertion to the file, if there is one, and then the redacted description or the
      * same facts as JSON to standard output.
+     *
+     * @throws SsoException  there is no token: the service answered with an empty one.
      */
-    void Show(const SsoClient::SamlToken& token);
+    void Show(const boost::shared_ptr<const SsoClient::SamlToken>& token);
 
 private:
     bool _json;

@@ -13,6 +13,7 @@ void TokenSpecOptions::AddTo(CLI::App& command)
             [this](const std::string& name) { spec.delegateTo = name; },
             "Ask for a token delegated to this principal")
         ->type_name("NAME");
-    command.add_option("--audience", spec.audienceRestriction, "Restrict the token to these parties")
+    command
+        .add_option("--audience", spec.audienceRestriction, "Restrict the token to these parties")
         ->type_name("URI");
 }
