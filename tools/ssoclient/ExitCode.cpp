@@ -2,7 +2,7 @@
 
 #include "OneLine.h"
 
-#include "quillon/http/Exceptions.h"
+#include "quillon/http/HttpException.h"
 #include "ssoClient/Exceptions.h"
 
 #include <cerrno>

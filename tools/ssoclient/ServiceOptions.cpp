@@ -1,15 +1,27 @@
 #include "ServiceOptions.h"
 
+#include "quillon/http/HttpURL.h"
 #include "quillon/service/Logger.h"
 
 namespace {
 
-/** With authorities of its own the connection trusts those alone, otherwise the system's. */
-Quillon::Ref<Quillon::Ssl::SSLContext> CreateContext(const std::vector<std::string>& files)
+/**
+ * With authorities of its own the connection trusts those alone, otherwise the system's; a plain
+ * `http` connection needs neither.
+ */
+Quillon::Ref<Quillon::Ssl::SSLContext> CreateContext(const ServiceOptions& service)
 {
+    bool isHttps = false;
+    std::string host;
+    int port = 0;
+    std::string path;
+    Quillon::Http::ParseHttpURL(service.url, isHttps, host, port, path);
+    if (!isHttps) {
+        return {};
+    }
     Quillon::Ssl::SSLContextOptions options;
-    options.useSystemAuthorities = files.empty();
-    options.authorities = ReadCertificates(files);
+    options.useSystemAuthorities = service.authorityFiles.empty();
+    options.authorities = ReadCertificates(service.authorityFiles);
     return Quillon::Ssl::CreateSSLContext(options);
 }
 
@@ -52,7 +64,7 @@ boost::shared_ptr<SsoClient::SecurityTokenService> ServiceOptions::CreateService
         EnableTraceLines();
     }
     // The service keeps the context by reference, so it may go when this returns.
-    const Quillon::Ref<Quillon::Ssl::SSLContext> context = CreateContext(authorityFiles);
+    const Quillon::Ref<Quillon::Ssl::SSLContext> context = CreateContext(*this);
 
     SsoClient::SecurityTokenServiceConfig config;
     config.url = url;
