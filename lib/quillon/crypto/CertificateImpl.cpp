@@ -72,7 +72,8 @@ public:
         Digest digest(HashAlgorithm::SHA256);
         digest.Update(_encoded.data(), _encoded.size());
         std::string text;
-        for (const unsigned char byte : digest.Finish().AsView()) {
+        const DigestValue value = digest.Finish();
+        for (const unsigned char byte : value.AsView()) {
             constexpr char Digits[] = "0123456789abcdef";
             text += Digits[byte >> 4U];
             text += Digits[byte & 15U];

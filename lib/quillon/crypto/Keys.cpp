@@ -3,7 +3,6 @@
 #include "crypto/Handles.h"
 
 #include <array>
-#include <cstring>
 #include <vector>
 
 namespace Quillon::Crypto {
@@ -35,35 +34,41 @@ std::vector<unsigned char> ToDerEcdsa(
     return der;
 }
 
+/** The name of an elliptic curve; empty for any other key. */
+std::string GetGroupName(const EVP_PKEY* key)
+{
+    const ErrorQueueScope errors;
+    std::array<char, 80> name{};
+    const bool isCurve = EVP_PKEY_is_a(key, "EC") == 1
+                         && EVP_PKEY_get_group_name(key, name.data(), name.size(), nullptr) == 1;
+    return isCurve ? name.data() : "";
+}
+
 } // namespace
 
 CryptoException::~CryptoException() = default;
 
-KeyType GetKeyType(const EVP_PKEY* key) noexcept
+KeyType GetKeyType(const EVP_PKEY* key)
 {
-    switch (EVP_PKEY_get_base_id(key)) {
-    case EVP_PKEY_RSA:
+    // By name, not by number: a key behind a provider has no number.
+    if (EVP_PKEY_is_a(key, "RSA") == 1) {
         return KeyType::RSA;
-    case EVP_PKEY_EC:
-        return KeyType::EC;
-    default:
-        // A key behind a provider has no legacy id, only a name.
-        return EVP_PKEY_is_a(key, "RSA") == 1  ? KeyType::RSA
-               : EVP_PKEY_is_a(key, "EC") == 1 ? KeyType::EC
-                                               : KeyType::OTHER;
     }
+    const std::string group = GetGroupName(key);
+    const bool isAccepted = group == SN_X9_62_prime256v1 || group == "P-256"
+                            || group == SN_secp384r1 || group == "P-384" || group == SN_secp521r1
+                            || group == "P-521";
+    return isAccepted ? KeyType::EC : KeyType::OTHER;
 }
 
 std::string DescribeKey(const EVP_PKEY* key)
 {
-    const KeyType type = GetKeyType(key);
-    if (type == KeyType::RSA) {
+    if (EVP_PKEY_is_a(key, "RSA") == 1) {
         return "RSA-" + std::to_string(EVP_PKEY_get_bits(key));
     }
-    std::array<char, 80> name{};
-    if (type == KeyType::EC
-        && EVP_PKEY_get_group_name(key, name.data(), name.size(), nullptr) == 1) {
-        return std::string("EC ") + name.data();
+    const std::string group = GetGroupName(key);
+    if (!group.empty()) {
+        return "EC " + group;
     }
     const char* typeName = EVP_PKEY_get0_type_name(key);
     return typeName != nullptr ? typeName : "unknown";

@@ -8,7 +8,7 @@
 
 namespace Quillon::Crypto {
 
-KeyType GetKeyType(const EVP_PKEY* key) noexcept;
+KeyType GetKeyType(const EVP_PKEY* key);
 
 /** For messages, for example `RSA-2048` or `EC prime256v1`. */
 std::string DescribeKey(const EVP_PKEY* key);

@@ -33,6 +33,9 @@ public:
     Arena(const Arena&) = delete;
     Arena& operator=(const Arena&) = delete;
 
+    /** The arena that made `node`. */
+    static Arena& Of(const Node& node) noexcept { return *node._arena; }
+
     /** Uninitialised memory, aligned for any node, that lives as long as the arena. */
     void* Allocate(std::size_t size);
 

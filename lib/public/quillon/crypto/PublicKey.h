@@ -18,8 +18,8 @@ public:
 enum class KeyType
 {
     RSA,
-    EC,
-    OTHER
+    EC,   ///< on one of the curves P-256, P-384 and P-521 [FIPS 186-4 D.1.2]
+    OTHER ///< any other algorithm or curve
 };
 
 enum class HashAlgorithm
