@@ -22,7 +22,7 @@ ONE_UNIT = {
 }
 
 # What Quillon takes from the platform beside the standard library.
-PLATFORM_HEADERS = {"cxxabi.h", "dlfcn.h", "execinfo.h", "poll.h", "unistd.h"}
+PLATFORM_HEADERS = {"cxxabi.h", "dlfcn.h", "execinfo.h", "poll.h", "sys/random.h", "unistd.h"}
 
 
 def is_boost_or_standard(include):
