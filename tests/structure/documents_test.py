@@ -33,6 +33,18 @@ class Documents(unittest.TestCase):
         self.assertIn("InvalidArgumentException", classes)
         self.assertEqual([], [name for name in classes if f"`{name}`" not in text])
 
+    def test_every_text_of_an_error_stands_in_the_code(self):
+        text = read("docs/errors.md")
+        texts = re.findall(r"^\| `([^`]+)` \|", text[text.index("## Acquiring"):], re.MULTILINE)
+        self.assertGreater(len(texts), 40)
+        code = "".join(sources.without_comments(path.read_text("utf-8"))
+                       for path in sources.files("lib"))
+        code = re.sub(r'"\s*"', "", code).replace("\\\\", "\\")
+        for text in texts:
+            for piece in filter(None, text.split("…")):
+                with self.subTest(text=text):
+                    self.assertIn(piece.strip(), code)
+
     def test_every_option_of_the_command_line_is_described(self):
         text = read("docs/usage.md")
         for command in (["acquire", "password"], ["inspect"]):
