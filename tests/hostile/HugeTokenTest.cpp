@@ -265,6 +265,11 @@ const std::vector<HugeCase> HugeCases{
 class HugeToken : public testing::TestWithParam<HugeCase>
 {};
 
+std::string NameOf(const testing::TestParamInfo<HugeCase>& info)
+{
+    return info.param.name;
+}
+
 } // namespace
 
 TEST_P(HugeToken, IsJudgedWithinItsLimits)
@@ -282,10 +287,7 @@ TEST_P(HugeToken, IsJudgedWithinItsLimits)
     }
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    Of, HugeToken, testing::ValuesIn(HugeCases), [](const testing::TestParamInfo<HugeCase>& info) {
-        return info.param.name;
-    });
+INSTANTIATE_TEST_SUITE_P(Of, HugeToken, testing::ValuesIn(HugeCases), NameOf);
 
 TEST(HugeDocument, IsAcceptedUpToTheLimit)
 {

@@ -88,6 +88,11 @@ protected:
     }
 };
 
+std::string NameOf(const testing::TestParamInfo<Subject>& info)
+{
+    return info.param.name;
+}
+
 } // namespace
 
 TEST_P(MutatedToken, IsRefusedWithItsLowestBitsFlipped)
@@ -116,9 +121,6 @@ TEST_P(MutatedToken, IsRefusedWhenCutShort)
     }
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    Of, MutatedToken, testing::ValuesIn(Subjects), [](const testing::TestParamInfo<Subject>& info) {
-        return info.param.name;
-    });
+INSTANTIATE_TEST_SUITE_P(Of, MutatedToken, testing::ValuesIn(Subjects), NameOf);
 
 } // namespace HostileTests
