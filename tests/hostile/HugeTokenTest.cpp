@@ -9,7 +9,7 @@ namespace HostileTests {
 
 namespace {
 
-constexpr std::size_t Million = 1000 * 1000;
+constexpr std::size_t Million = 1000000;
 
 const char XmlError[] = "Quillon::Xml::XMLParseException";
 const std::vector<Refusal> OverLimit{{XmlError, "", "", ""}};
@@ -45,7 +45,7 @@ std::string Numbered(const std::string& before, const std::string& after, std::s
 {
     std::string result;
     for (std::size_t i = 0; i < count; ++i) {
-        result += before + std::to_string(i) + after;
+        result.append(before).append(std::to_string(i)).append(after);
     }
     return result;
 }
