@@ -10,16 +10,15 @@ namespace SsoClient {
 
 XMLBuilderPtr SoapBuilder(XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder)
 {
-    const auto header =
-        boost::make_shared<XMLCompositeBuilder>(ElementBuilder("soapenv", "Header"));
+    auto header = boost::make_shared<XMLCompositeBuilder>(ElementBuilder("soapenv", "Header"));
     header->Add(std::move(headerBuilder));
 
     // Some bodies use `wst` without declaring it.
-    const auto body = boost::make_shared<XMLCompositeBuilder>(
+    auto body = boost::make_shared<XMLCompositeBuilder>(
         ElementBuilder("soapenv", "Body", {{"xmlns:wst", Wire::WsTrustNamespace}}));
     body->Add(std::move(bodyBuilder));
 
-    const auto envelope = boost::make_shared<XMLCompositeBuilder>(
+    auto envelope = boost::make_shared<XMLCompositeBuilder>(
         ElementBuilder("soapenv", "Envelope", {{"xmlns:soapenv", Wire::SoapNamespace}}));
     envelope->Add(header).Add(body);
     return envelope;
