@@ -50,7 +50,7 @@ DateTime AddSecondsToDate(const DateTime& time, long long seconds)
 boost::shared_ptr<XMLCompositeBuilder> CreateRequestSecurityToken(
     const char* tokenType, const char* requestType)
 {
-    const auto request = boost::make_shared<XMLCompositeBuilder>(
+    auto request = boost::make_shared<XMLCompositeBuilder>(
         ElementBuilder("wst", "RequestSecurityToken", {{"xmlns:wst", Wire::WsTrustNamespace}}));
     request->Add(TextElementBuilder("wst", "TokenType", tokenType))
         .Add(TextElementBuilder("wst", "RequestType", requestType));
@@ -60,7 +60,7 @@ boost::shared_ptr<XMLCompositeBuilder> CreateRequestSecurityToken(
 // An element that holds the assertion of `token`.
 XMLBuilderPtr CreateTarget(const char* localName, const SamlToken& token)
 {
-    const auto target = boost::make_shared<XMLCompositeBuilder>(ElementBuilder("wst", localName));
+    auto target = boost::make_shared<XMLCompositeBuilder>(ElementBuilder("wst", localName));
     target->Add(InsertSamlTokenBuilder(token));
     return target;
 }
@@ -70,7 +70,7 @@ XMLBuilderPtr CreateTarget(const char* localName, const SamlToken& token)
 XMLBuilderPtr WssuLifetimeBuilder(long long lifetimeSec)
 {
     const DateTime now = Quillon::System::GetUtcDateTime();
-    const auto lifetime = boost::make_shared<XMLCompositeBuilder>(
+    auto lifetime = boost::make_shared<XMLCompositeBuilder>(
         ElementBuilder("wst", "Lifetime", {{"xmlns:wsu", Wire::WsuNamespace}}));
     lifetime->Add(TextElementBuilder("wsu", "Created", DateTimeFormatter(now)))
         .Add(TextElementBuilder(
@@ -85,15 +85,14 @@ XMLBuilderPtr WstRenewingBuilder(bool allow)
 
 XMLBuilderPtr WstDelegateToBuilder(const std::string& userName)
 {
-    const auto delegateTo =
-        boost::make_shared<XMLCompositeBuilder>(ElementBuilder("wst", "DelegateTo"));
+    auto delegateTo = boost::make_shared<XMLCompositeBuilder>(ElementBuilder("wst", "DelegateTo"));
     delegateTo->Add(WsseUsernameTokenBuilder(userName));
     return delegateTo;
 }
 
 XMLBuilderPtr WstParticipantsBuilders(const std::set<std::string>& participants)
 {
-    const auto builder = boost::make_shared<XMLCompositeBuilder>(
+    auto builder = boost::make_shared<XMLCompositeBuilder>(
         ElementBuilder("wst", "Participants", {{"xmlns:wsa", Wire::WsAddressingNamespace}}));
     for (const std::string& participant : participants) {
         builder->Add(WstParticipantBuilder(participant));
@@ -103,15 +102,14 @@ XMLBuilderPtr WstParticipantsBuilders(const std::set<std::string>& participants)
 
 XMLBuilderPtr WstParticipantBuilder(const std::string& participant)
 {
-    const auto builder =
-        boost::make_shared<XMLCompositeBuilder>(ElementBuilder("wst", "Participant"));
+    auto builder = boost::make_shared<XMLCompositeBuilder>(ElementBuilder("wst", "Participant"));
     builder->Add(WsaEndpointAddressReferenceBuilder(participant));
     return builder;
 }
 
 XMLBuilderPtr WsaEndpointAddressReferenceBuilder(const std::string& address)
 {
-    const auto reference =
+    auto reference =
         boost::make_shared<XMLCompositeBuilder>(ElementBuilder("wsa", "EndpointReference"));
     reference->Add(TextElementBuilder("wsa", "Address", address));
     return reference;
@@ -119,7 +117,7 @@ XMLBuilderPtr WsaEndpointAddressReferenceBuilder(const std::string& address)
 
 XMLBuilderPtr RsaAdviceSetBuilder(const std::vector<Advice>& advice)
 {
-    const auto adviceSet = boost::make_shared<XMLCompositeBuilder>(ElementBuilder(
+    auto adviceSet = boost::make_shared<XMLCompositeBuilder>(ElementBuilder(
         "rsa-advice",
         "AdviceSet",
         {{"xmlns:rsa-advice", Wire::RsaAdviceNamespace},
@@ -134,7 +132,7 @@ XMLBuilderPtr RsaAdviceSetBuilder(const std::vector<Advice>& advice)
 
 XMLBuilderPtr RsaAdviceBuilder(const Advice& advice)
 {
-    const auto builder = boost::make_shared<XMLCompositeBuilder>(
+    auto builder = boost::make_shared<XMLCompositeBuilder>(
         ElementBuilder("rsa-advice", "Advice", {{"AdviceSource", advice.source}}));
     for (const AdviceAttribute& attribute : advice.attributes) {
         builder->Add(RsaAttributeBuilder(attribute));
@@ -144,7 +142,7 @@ XMLBuilderPtr RsaAdviceBuilder(const Advice& advice)
 
 XMLBuilderPtr RsaAttributeBuilder(const AdviceAttribute& attribute)
 {
-    const auto builder = boost::make_shared<XMLCompositeBuilder>(
+    auto builder = boost::make_shared<XMLCompositeBuilder>(
         ElementBuilder("rsa-advice", "Attribute", {{"Name", attribute.name}}));
     for (const std::string& value : attribute.values) {
         builder->Add(
@@ -156,7 +154,7 @@ XMLBuilderPtr RsaAttributeBuilder(const AdviceAttribute& attribute)
 boost::shared_ptr<XMLCompositeBuilder> CommonAcquireSecurityTokenBuilder(
     SamlToken::ConfirmationType confirmation, const TokenSpec& spec)
 {
-    const auto request = CreateRequestSecurityToken(Wire::SamlNamespace, Wire::IssueRequestType);
+    auto request = CreateRequestSecurityToken(Wire::SamlNamespace, Wire::IssueRequestType);
     request->Add(TextElementBuilder("wst", "KeyType", GetKeyType(confirmation)))
         .Add(WssuLifetimeBuilder(spec.tokenLifetimeSec))
         .Add(WstRenewingBuilder(spec.renewable))
@@ -176,7 +174,7 @@ boost::shared_ptr<XMLCompositeBuilder> CommonAcquireSecurityTokenBuilder(
 XMLBuilderPtr AcquireSecurityTokenBuilder(
     SamlToken::ConfirmationType confirmation, const TokenSpec& spec)
 {
-    const auto request = CommonAcquireSecurityTokenBuilder(confirmation, spec);
+    auto request = CommonAcquireSecurityTokenBuilder(confirmation, spec);
     if (confirmation == SamlToken::CONFIRM_HOLDER_OF_KEY && !spec.delegateTo) {
         request->Add(ElementBuilder("wst", "UseKey", {{"Sig", Wire::ProofSignatureId}}));
     }
@@ -195,15 +193,14 @@ XMLBuilderPtr RenewSecurityTokenBuilder(const SamlToken& token, long long lifeti
         Quillon::PanicVerify(
             "token.GetConfirmationMethod() == SamlToken::CONFIRM_HOLDER_OF_KEY", Unit, 513);
     }
-    const auto request = CreateRequestSecurityToken(Wire::SamlNamespace, Wire::RenewRequestType);
+    auto request = CreateRequestSecurityToken(Wire::SamlNamespace, Wire::RenewRequestType);
     request->Add(WssuLifetimeBuilder(lifetimeSec)).Add(CreateTarget("RenewTarget", token));
     return request;
 }
 
 XMLBuilderPtr ValidateSecurityTokenBuilder(const SamlToken& token)
 {
-    const auto request =
-        CreateRequestSecurityToken(Wire::StatusTokenType, Wire::ValidateRequestType);
+    auto request = CreateRequestSecurityToken(Wire::StatusTokenType, Wire::ValidateRequestType);
     request->Add(CreateTarget("ValidateTarget", token));
     return request;
 }

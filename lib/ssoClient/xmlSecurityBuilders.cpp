@@ -58,7 +58,7 @@ DateTime AddMinutesToDate(const DateTime& time, int minutes)
 XMLBuilderPtr WssuTimestampBuilder(int validityMinutes)
 {
     const DateTime now = Quillon::System::GetUtcDateTime();
-    const auto timestamp = boost::make_shared<XMLCompositeBuilder>(
+    auto timestamp = boost::make_shared<XMLCompositeBuilder>(
         ElementBuilder("wsu", "Timestamp", {{"xmlns:wsu", Wire::WsuNamespace}}));
     timestamp->Add(TextElementBuilder("wsu", "Created", DateTimeFormatter(now)))
         .Add(TextElementBuilder(
@@ -68,7 +68,7 @@ XMLBuilderPtr WssuTimestampBuilder(int validityMinutes)
 
 XMLBuilderPtr WsSecurityHeaderBuilder(int validityMinutes)
 {
-    const auto security = boost::make_shared<XMLCompositeBuilder>(
+    auto security = boost::make_shared<XMLCompositeBuilder>(
         ElementBuilder("wsse", "Security", {{"xmlns:wsse", Wire::WsseNamespace}}));
     security->Add(WssuTimestampBuilder(validityMinutes));
     return security;
@@ -76,7 +76,7 @@ XMLBuilderPtr WsSecurityHeaderBuilder(int validityMinutes)
 
 XMLBuilderPtr WsseUsernameTokenBuilder(const std::string& userName)
 {
-    const auto usernameToken = boost::make_shared<XMLCompositeBuilder>(
+    auto usernameToken = boost::make_shared<XMLCompositeBuilder>(
         ElementBuilder("wsse", "UsernameToken", {{"xmlns:wsse", Wire::WsseNamespace}}));
     usernameToken->Add(TextElementBuilder("wsse", "Username", userName));
     return usernameToken;
@@ -84,7 +84,7 @@ XMLBuilderPtr WsseUsernameTokenBuilder(const std::string& userName)
 
 XMLBuilderPtr WsseUsernameTokenBuilder(const std::string& userName, const std::string& password)
 {
-    const auto usernameToken =
+    auto usernameToken =
         boost::make_shared<XMLCompositeBuilder>(WsseUsernameTokenBuilder(userName));
     usernameToken->Add(
         TextElementBuilder("wsse", "Password", {{"Type", Wire::PasswordTextType}}, password));
@@ -106,7 +106,7 @@ XMLBuilderPtr WsseX509v3BinarySecTokenBuilder(
 
 XMLBuilderPtr WsseX509v3BSTReferenceBuilder(const std::string& id)
 {
-    const auto tokenReference = boost::make_shared<XMLCompositeBuilder>(
+    auto tokenReference = boost::make_shared<XMLCompositeBuilder>(
         ElementBuilder("wsse", "SecurityTokenReference", {{"xmlns:wsse", Wire::WsseNamespace}}));
     tokenReference->Add(ElementBuilder(
         "wsse", "Reference", {{"URI", "#" + id}, {"ValueType", Wire::X509v3ValueType}}));
@@ -115,7 +115,7 @@ XMLBuilderPtr WsseX509v3BSTReferenceBuilder(const std::string& id)
 
 XMLBuilderPtr WsseSamlKeyIdReferenceBuilder(const std::string& assertionId)
 {
-    const auto tokenReference = boost::make_shared<XMLCompositeBuilder>(ElementBuilder(
+    auto tokenReference = boost::make_shared<XMLCompositeBuilder>(ElementBuilder(
         "wsse",
         "SecurityTokenReference",
         {{"wsse11:TokenType", Wire::Saml20TokenType},
