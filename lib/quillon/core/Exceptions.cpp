@@ -23,7 +23,7 @@ std::vector<void*> CaptureFrames()
 {
     std::array<void*, MaxFrames> frames{};
     const int count = backtrace(frames.data(), MaxFrames);
-    return {frames.begin(), frames.begin() + count};
+    return std::vector<void*>(frames.begin(), frames.begin() + count);
 }
 
 std::string Demangle(const char* name)

@@ -12,6 +12,8 @@
 #include <openssl/pem.h>
 #include <openssl/rsa.h>
 #include <openssl/ssl.h>
+#include <openssl/store.h>
+#include <openssl/ui.h>
 #include <openssl/x509.h>
 #include <openssl/x509_vfy.h>
 #include <openssl/x509v3.h>
@@ -47,6 +49,9 @@ using OpenSslMemory = std::unique_ptr<T, OpenSslMemoryDeleter>;
 
 using BioOwner = std::unique_ptr<BIO, OpenSslDeleter<BIO_free_all>>;
 using EcdsaSigOwner = std::unique_ptr<ECDSA_SIG, OpenSslDeleter<ECDSA_SIG_free>>;
+using StoreContextOwner = std::unique_ptr<OSSL_STORE_CTX, OpenSslDeleter<OSSL_STORE_close>>;
+using StoreInfoOwner = std::unique_ptr<OSSL_STORE_INFO, OpenSslDeleter<OSSL_STORE_INFO_free>>;
+using UiMethodOwner = std::unique_ptr<UI_METHOD, OpenSslDeleter<UI_destroy_method>>;
 using SslContextOwner = std::unique_ptr<SSL_CTX, OpenSslDeleter<SSL_CTX_free>>;
 
 /** The reason of the latest error on OpenSSL's queue of this thread, for a message. */

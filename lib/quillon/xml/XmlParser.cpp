@@ -61,7 +61,9 @@ public:
     {
         *_context.sax = GetHandlers();
         _context.userData = this;
-        xmlCtxtUseOptions(&_context, XML_PARSE_NONET);
+        // NOENT makes `&amp;` in an attribute arrive as `&` and not as `&#38;`; there are no other
+        // entities to replace, as a DOCTYPE ends the run.
+        xmlCtxtUseOptions(&_context, XML_PARSE_NONET | XML_PARSE_NOENT);
         xmlParseDocument(&_context);
         if (_failure) {
             std::rethrow_exception(_failure);
@@ -229,20 +231,14 @@ ParserContextOwner CreateContext(std::string_view source)
     std::call_once(initialized, &xmlInitParser);
 
     ParserContextOwner context(xmlNewParserCtxt());
-    xmlParserInputBuffer* buffer =
-        context == nullptr
-            ? nullptr
-            : xmlParserInputBufferCreateStatic(
-                source.data(), static_cast<int>(source.size()), XML_CHAR_ENCODING_NONE);
-    // The input takes the buffer over, and the context the input.
-    xmlParserInput* input =
-        buffer == nullptr ? nullptr
-                          : xmlNewIOInputStream(context.get(), buffer, XML_CHAR_ENCODING_NONE);
-    if (input == nullptr) {
-        xmlFreeParserInputBuffer(buffer);
+    // A string input has no buffer of its own: the parser neither copies nor moves the text.
+    xmlParserInput* input = context == nullptr
+                                ? nullptr
+                                : xmlNewStringInputStream(
+                                    context.get(), reinterpret_cast<const xmlChar*>(source.data()));
+    if (input == nullptr || inputPush(context.get(), input) < 0) {
         throw std::bad_alloc();
     }
-    inputPush(context.get(), input);
     return context;
 }
 

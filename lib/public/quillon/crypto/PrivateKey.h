@@ -35,7 +35,7 @@ public:
         HashAlgorithm algorithm, const unsigned char* digest) const = 0;
 };
 
-/** Asked for the passphrase of an encrypted key; called only if the key is encrypted. */
+/** Asked for the passphrase of an encrypted key; called only if the key is encrypted. May throw. */
 using PassphraseCallback = boost::function<std::string()>;
 
 /**
@@ -45,5 +45,16 @@ using PassphraseCallback = boost::function<std::string()>;
  */
 QUILLON_API Ref<const PrivateKey> CreatePrivateKey(
     std::string_view pemOrDer, const PassphraseCallback& passphrase = PassphraseCallback());
+
+/**
+ * Loads the private key that a URI names, through OpenSSL's store: `file:/path`, or what a
+ * provider that the process has loaded offers, for example `pkcs11:token=t;object=key`. The key
+ * may stay inside a device.
+ *
+ * @param passphrase  is asked for the passphrase or PIN, if one is needed.
+ * @throws CryptoException  nothing can be loaded from there, or no private key is among it.
+ */
+QUILLON_API Ref<const PrivateKey> LoadPrivateKey(
+    const std::string& uri, const PassphraseCallback& passphrase = PassphraseCallback());
 
 } // namespace Quillon::Crypto

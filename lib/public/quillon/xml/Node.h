@@ -136,7 +136,7 @@ private:
 };
 
 /** One attribute or namespace declaration, with its name as written. */
-struct Attribute
+struct QUILLON_API Attribute
 {
     std::string_view name;
     std::string_view value;

@@ -1,6 +1,6 @@
-#include "crypto/Digest.h"
 #include "quillon/xml/security/Identifiers.h"
 #include "xml/security/Algorithms.h"
+#include "xml/security/CanonicalDigest.h"
 #include "xml/security/Canonicalization.h"
 #include "xml/security/SignatureModel.h"
 #include "xml/security/SignatureTarget.h"
@@ -14,19 +14,6 @@ namespace {
 
 /** Each reference costs a pass over the signed element; a token has one. */
 constexpr std::size_t MaxReferences = 8;
-
-class DigestSink final : public ByteSink
-{
-public:
-    explicit DigestSink(Crypto::HashAlgorithm algorithm)
-        : _digest(algorithm)
-    {}
-    void Write(const char* bytes, std::size_t size) override { _digest.Update(bytes, size); }
-    Crypto::DigestValue Finish() { return _digest.Finish(); }
-
-private:
-    Crypto::Digest _digest;
-};
 
 void RequireNoChild(const AlgorithmUse& use)
 {
@@ -111,23 +98,53 @@ std::vector<const Crypto::PublicKey*> SelectKeys(
     return keys;
 }
 
+[[noreturn]] void RefuseToSign()
+{
+    throw InvalidStateException("A signature that was read from a document is not signed again");
+}
+
+/** A reference as it was read. */
+class ReadReference final : public Reference
+{
+public:
+    explicit ReadReference(const std::string& uri)
+        : _uri(uri)
+    {}
+
+    const std::string& GetUri() const noexcept override { return _uri; }
+    void SetDigestMethod(const std::string& /*identifier*/) override { RefuseToSign(); }
+    void AddTransform(const std::string& /*identifier*/) override { RefuseToSign(); }
+
+private:
+    const std::string& _uri;
+};
+
 class SignatureImpl final : public Signature
 {
 public:
-    SignatureImpl(const ElementNode* parent, const ElementNode* element)
+    SignatureImpl(ElementNode* parent, ElementNode* element)
         : _parent(parent)
         , _element(element)
         , _model(ReadSignature(*element))
-    {}
+    {
+        for (const ReferenceModel& reference : _model.references) {
+            _references.emplace_back(reference.uri);
+        }
+    }
 
     std::vector<const Reference*> GetReferences() const override
     {
         std::vector<const Reference*> references;
-        for (const ReferenceModel& reference : _model.references) {
+        for (const ReadReference& reference : _references) {
             references.push_back(&reference);
         }
         return references;
     }
+
+    ElementNode* GetElement() const noexcept override { return _element.get(); }
+    Reference* AddReference(const std::string& /*uri*/) override { RefuseToSign(); }
+    void AddKeyInfoContent(ElementNode* /*content*/) override { RefuseToSign(); }
+    void Sign(const Crypto::PrivateKey* /*key*/) override { RefuseToSign(); }
 
     bool Verify(const KeyInfoResolver* resolver) const override
     {
@@ -169,11 +186,8 @@ private:
         const std::vector<Ref<const Crypto::Certificate>>& certificates) const
     {
         const auto candidates = SelectKeys(algorithm, certificates);
-        DigestSink sink(algorithm.hash);
-        OutputBuffer out(sink);
-        Canonicalize(method, *_model.signedInfo, nullptr, out);
-        out.Flush();
-        const Crypto::DigestValue digest = sink.Finish();
+        const Crypto::DigestValue digest =
+            DigestElement(algorithm.hash, method, *_model.signedInfo, nullptr);
         return std::any_of(candidates.begin(), candidates.end(), [&](const Crypto::PublicKey* key) {
             return key->VerifyDigest(
                 algorithm.hash,
@@ -185,30 +199,26 @@ private:
 
     bool DigestMatches(const CheckedReference& reference) const
     {
-        DigestSink sink(reference.hash);
-        OutputBuffer out(sink);
         const Node* first = reference.model->uri.empty() ? GetFirstTopLevel(*_parent) : nullptr;
-        if (first != nullptr) {
-            CanonicalizeDocument(reference.canonicalization, first, _element.get(), out);
-        } else {
-            Canonicalize(reference.canonicalization, *_parent, _element.get(), out);
-        }
-        out.Flush();
-        const Crypto::DigestValue digest = sink.Finish();
+        const Crypto::DigestValue digest =
+            first != nullptr
+                ? DigestDocument(reference.hash, reference.canonicalization, first, _element.get())
+                : DigestElement(
+                    reference.hash, reference.canonicalization, *_parent, _element.get());
         const std::vector<unsigned char>& expected = reference.model->digestValue;
         return expected.size() == digest.length
                && std::memcmp(expected.data(), digest.bytes.data(), digest.length) == 0;
     }
 
-    Ref<const ElementNode> _parent;
-    Ref<const ElementNode> _element;
+    Ref<ElementNode> _parent;
+    Ref<ElementNode> _element;
     SignatureModel _model;
+    std::vector<ReadReference> _references;
 };
 
 } // namespace
 
-void CreateSignatureFromDom(
-    const ElementNode* parent, const ElementNode* signatureElement, Ref<Signature>& out)
+void CreateSignatureFromDom(ElementNode* parent, ElementNode* signatureElement, Ref<Signature>& out)
 {
     if (signatureElement->GetParent() != parent) {
         throw SignatureSyntaxException("The signature is not a child of the element that it signs");

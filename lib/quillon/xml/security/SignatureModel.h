@@ -18,10 +18,8 @@ struct AlgorithmUse
     std::string_view foreignChild;
 };
 
-struct ReferenceModel final : public Reference
+struct ReferenceModel
 {
-    const std::string& GetUri() const noexcept override { return uri; }
-
     std::string uri;
     std::vector<AlgorithmUse> transforms;
     AlgorithmUse digestMethod;

@@ -38,24 +38,34 @@ const ElementNode& GetRoot(const ElementNode& element) noexcept
     return *root;
 }
 
-/** Counts the elements with one ID. */
-class IdCounter
+/** Finds the elements with one ID. */
+class IdFinder
 {
 public:
-    explicit IdCounter(std::string_view id) noexcept
+    explicit IdFinder(std::string_view id) noexcept
         : _id(id)
-    {}
+    {
+    }
 
-    void Enter(const ElementNode& element) noexcept { _count += HasId(element, _id) ? 1U : 0U; }
+    void Enter(const ElementNode& element) noexcept
+    {
+        if (HasId(element, _id)) {
+            _found = &element;
+            ++_count;
+        }
+    }
     void Leave(const ElementNode& /*element*/) noexcept {}
     template <class Leaf>
     void Visit(const Leaf& /*leaf*/) noexcept
-    {}
+    {
+    }
 
+    const ElementNode* GetFound() const noexcept { return _found; }
     unsigned GetCount() const noexcept { return _count; }
 
 private:
     std::string_view _id;
+    const ElementNode* _found = nullptr;
     unsigned _count = 0;
 };
 
@@ -75,13 +85,19 @@ void RequireTarget(const std::string& uri, const ElementNode& parent)
         throw XmlSecurityException(
             "Reference '" + uri + "' does not name the element that encloses the signature");
     }
-    IdCounter counter(id);
-    WalkTree(GetRoot(parent), nullptr, counter);
-    if (counter.GetCount() != 1) {
+    FindTarget(uri, parent);
+}
+
+const ElementNode& FindTarget(const std::string& uri, const ElementNode& context)
+{
+    IdFinder finder(std::string_view(uri).substr(1));
+    WalkTree(GetRoot(context), nullptr, finder);
+    if (finder.GetCount() != 1) {
         throw XmlSecurityException(
-            "Reference '" + uri + "' names " + std::to_string(counter.GetCount())
+            "Reference '" + uri + "' names " + std::to_string(finder.GetCount())
             + " elements of the document");
     }
+    return *finder.GetFound();
 }
 
 const Node* GetFirstTopLevel(const ElementNode& root) noexcept

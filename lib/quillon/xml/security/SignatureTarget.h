@@ -17,6 +17,14 @@ namespace Quillon::Xml::Security {
  */
 void RequireTarget(const std::string& uri, const ElementNode& parent);
 
+/**
+ * The one element of the tree around `context` that a reference to be signed names.
+ *
+ * @param uri  `#` and an ID.
+ * @throws XmlSecurityException  no element has the ID, or several have.
+ */
+const ElementNode& FindTarget(const std::string& uri, const ElementNode& context);
+
 /** The first node of the document whose root is `root`; null if it was not parsed. */
 const Node* GetFirstTopLevel(const ElementNode& root) noexcept;
 

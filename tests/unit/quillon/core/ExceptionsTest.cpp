@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <memory>
 #include <stdexcept>
 
@@ -100,6 +101,7 @@ TEST(GetBacktrace, HasALineForEachFrame)
 {
     const std::string text = InvalidStateException("x").GetBacktrace();
     EXPECT_NE(std::string::npos, text.find("quillon_core_tests+0x"));
+    EXPECT_GT(std::count(text.begin(), text.end(), '\n'), 3);
     EXPECT_EQ('\n', text.back());
 }
 

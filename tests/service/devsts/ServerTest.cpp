@@ -1,0 +1,96 @@
+#include "Harness.h"
+#include "Requests.h"
+
+#include <httplib.h>
+
+namespace DevStsTests {
+
+namespace {
+
+using InProcessServer = ServerTest;
+
+TEST_F(InProcessServer, ReceivedRequestsShowHeadersAndBody)
+{
+    const std::string request = PasswordRequest();
+    PostIssue(request);
+    const std::vector<DevSts::ReceivedRequest> received = _server.ReceivedRequests();
+    ASSERT_EQ(received.size(), 1U);
+    EXPECT_EQ(received[0].method, "POST");
+    EXPECT_EQ(received[0].path, "/sts");
+    EXPECT_EQ(received[0].headers.find("content-type")->second, "text/xml");
+    EXPECT_EQ(
+        received[0].headers.find("SOAPACTION")->second,
+        '"' + std::string(Ns::Wst) + "/RST/Issue\"");
+    EXPECT_EQ(received[0].body, request);
+}
+
+TEST_F(InProcessServer, HookChangesTheNextReplyOnly)
+{
+    _server.OnNextReply([](const DevSts::ReceivedRequest&, DevSts::Reply& reply) {
+        reply.status = 503;
+        reply.contentType = "text/plain";
+        reply.body = "busy";
+        reply.headers.emplace("Set-Cookie", "a=b");
+    });
+    const HttpResult changed = PostIssue(PasswordRequest());
+    EXPECT_EQ(changed.status, 503);
+    EXPECT_EQ(changed.body, "busy");
+    EXPECT_EQ(changed.headers.find("Set-Cookie")->second, "a=b");
+    EXPECT_EQ(changed.headers.find("Content-Type")->second, "text/plain");
+    EXPECT_EQ(PostIssue(PasswordRequest()).status, 200);
+}
+
+TEST_F(InProcessServer, HookSeesTheReplyItChanges)
+{
+    _server.OnNextReply([](const DevSts::ReceivedRequest&, DevSts::Reply& reply) {
+        reply.body = Replaced(reply.body, ">alice@example.test<", ">admin@example.test<");
+    });
+    const std::string reply = PostIssue(PasswordRequest()).body;
+    EXPECT_EQ(FindOne(reply, "//saml:Subject/saml:NameID"), "admin@example.test");
+    EXPECT_FALSE(VerifiesWithXmlSec(AssertionIn(reply)));
+}
+
+TEST_F(InProcessServer, DelayOutlastsAnImpatientClient)
+{
+    _server.SetDelay(std::chrono::milliseconds(500));
+    httplib::Client client("127.0.0.1", _port);
+    client.set_read_timeout(std::chrono::milliseconds(50));
+    EXPECT_FALSE(client.Post("/sts", PasswordRequest(), "text/xml"));
+}
+
+TEST_F(InProcessServer, StoppedServerIsGone)
+{
+    _server.Stop();
+    httplib::Client client("127.0.0.1", _port);
+    EXPECT_FALSE(client.Post("/sts", PasswordRequest(), "text/xml"));
+}
+
+TEST_F(InProcessServer, UnusableAddressIsReported)
+{
+    DevSts::Options options;
+    options.stateDir = SharedState();
+    options.host = "256.256.256.256";
+    DevSts::Server second(options);
+    EXPECT_THROW(second.Start(), std::runtime_error);
+}
+
+TEST_F(InProcessServer, AnswersManyClientsAtOnce)
+{
+    std::vector<std::thread> clients;
+    std::atomic<int> issued{0};
+    for (int i = 0; i < 8; ++i) {
+        clients.emplace_back([this, &issued] {
+            for (int k = 0; k < 5; ++k) {
+                issued += PostIssue(PasswordRequest()).status == 200 ? 1 : 0;
+            }
+        });
+    }
+    for (std::thread& client : clients) {
+        client.join();
+    }
+    EXPECT_EQ(issued, 40);
+}
+
+} // namespace
+
+} // namespace DevStsTests

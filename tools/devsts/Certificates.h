@@ -1,0 +1,56 @@
+#ifndef DEVSTS_CERTIFICATES_H
+#define DEVSTS_CERTIFICATES_H
+
+#include <memory>
+#include <openssl/evp.h>
+#include <openssl/x509.h>
+#include <string>
+
+// Keys and certificates of a development installation, made with OpenSSL. Every function throws
+// std::runtime_error with OpenSSL's own reason.
+
+namespace DevSts {
+
+struct OpenSslDeleter
+{
+    void operator()(EVP_PKEY* key) const { EVP_PKEY_free(key); }
+    void operator()(X509* certificate) const { X509_free(certificate); }
+    void operator()(X509_EXTENSION* extension) const { X509_EXTENSION_free(extension); }
+    void operator()(BIO* bio) const { BIO_free(bio); }
+    void operator()(EVP_ENCODE_CTX* context) const { EVP_ENCODE_CTX_free(context); }
+};
+using PrivateKey = std::unique_ptr<EVP_PKEY, OpenSslDeleter>;
+using Certificate = std::unique_ptr<X509, OpenSslDeleter>;
+
+PrivateKey GenerateRsaKey();
+PrivateKey GenerateEcKey();
+
+struct CertificateSpec
+{
+    std::string commonName;
+    bool isAuthority = false;
+    std::string alternativeNames = {}; ///< in the syntax of openssl.cnf; may be empty
+};
+
+/** A certificate for `key` that signs itself. */
+Certificate MakeSelfSigned(const CertificateSpec& spec, EVP_PKEY* key);
+
+Certificate MakeSigned(
+    const CertificateSpec& spec, EVP_PKEY* key, X509* authority, EVP_PKEY* authorityKey);
+
+std::string ToPem(X509* certificate);
+std::string ToPem(EVP_PKEY* key);
+PrivateKey PrivateKeyFromPem(const std::string& pem);
+Certificate CertificateFromPem(const std::string& pem);
+
+/** The bytes inside the PEM armour of a certificate, which are not decoded. */
+std::string DerFromPem(const std::string& pem);
+
+std::string EncodeBase64(const std::string& bytes);
+
+/** Blanks in the text do not matter; what is not Base64 gives "". */
+std::string DecodeBase64(const std::string& text);
+
+} // namespace DevSts
+
+#endif

@@ -1,0 +1,71 @@
+#include "devsts/ReplyWriter.h"
+
+#include "devsts/Names.h"
+
+#include <new>
+
+namespace DevSts {
+
+namespace {
+
+struct Envelope
+{
+    XmlDocument doc = NewDocument("soapenv", {Names::Soap, "Envelope"});
+    xmlNode* body = nullptr;
+    xmlNs* wst = nullptr;
+
+    Envelope()
+    {
+        xmlNode* envelope = xmlDocGetRootElement(doc.get());
+        body = AddElement(envelope, envelope->ns, "Body");
+        wst = DeclareNamespace(body, "wst", Names::Wst);
+    }
+};
+
+void AddResponse(xmlNode* parent, xmlNs* wst, const xmlDoc* assertion, const Interval& lifetime)
+{
+    xmlNode* response = AddElement(parent, wst, "RequestSecurityTokenResponse");
+    AddElement(response, wst, "TokenType", Names::Saml);
+    xmlNode* token = AddElement(response, wst, "RequestedSecurityToken");
+    // The copy keeps its namespace declarations and its text node for node, and so its signature.
+    xmlNode* copy = xmlDocCopyNode(xmlDocGetRootElement(assertion), parent->doc, 1);
+    if (copy == nullptr) {
+        throw std::bad_alloc();
+    }
+    xmlAddChild(token, copy);
+    xmlNode* element = AddElement(response, wst, "Lifetime");
+    xmlNs* wsu = DeclareNamespace(element, "wsu", Names::Wsu);
+    AddElement(element, wsu, "Created", FormatTime(lifetime.created));
+    AddElement(element, wsu, "Expires", FormatTime(lifetime.expires));
+}
+
+} // namespace
+
+std::string WriteIssueReply(const xmlDoc* assertion, const Interval& lifetime)
+{
+    const Envelope reply;
+    xmlNode* collection =
+        AddElement(reply.body, reply.wst, "RequestSecurityTokenResponseCollection");
+    AddResponse(collection, reply.wst, assertion, lifetime);
+    return Serialize(reply.doc.get());
+}
+
+std::string WriteRenewReply(const xmlDoc* assertion, const Interval& lifetime)
+{
+    const Envelope reply;
+    AddResponse(reply.body, reply.wst, assertion, lifetime);
+    return Serialize(reply.doc.get());
+}
+
+std::string WriteStatusReply(bool isValid, const std::string& reason)
+{
+    const Envelope reply;
+    xmlNode* response = AddElement(reply.body, reply.wst, "RequestSecurityTokenResponse");
+    AddElement(response, reply.wst, "TokenType", Names::TokenStatus);
+    xmlNode* status = AddElement(response, reply.wst, "Status");
+    AddElement(status, reply.wst, "Code", isValid ? Names::StatusValid : Names::StatusInvalid);
+    AddElement(status, reply.wst, "Reason", reason);
+    return Serialize(reply.doc.get());
+}
+
+} // namespace DevSts

@@ -1,0 +1,81 @@
+#ifndef DEVSTS_REQUEST_H
+#define DEVSTS_REQUEST_H
+
+#include "devsts/Clock.h"
+#include "devsts/Xml.h"
+
+#include <optional>
+#include <string>
+#include <vector>
+
+// A request as it was read; nothing in it is verified yet.
+
+namespace DevSts {
+
+enum class Operation
+{
+    Issue,
+    Renew,
+    Validate
+};
+enum class KeyType
+{
+    Bearer,
+    PublicKey
+};
+
+struct Interval
+{
+    TimePoint created;
+    TimePoint expires;
+};
+
+struct UsernameToken
+{
+    std::string name;
+    std::string password;
+};
+
+struct AdviceAttribute
+{
+    std::string name;
+    std::vector<std::string> values;
+};
+
+struct Advice
+{
+    std::string source;
+    std::vector<AdviceAttribute> attributes;
+};
+
+/** The content of wst:RequestSecurityToken, as far as the operation has it. */
+struct TokenRequest
+{
+    KeyType keyType = KeyType::Bearer;
+    std::optional<Interval> lifetime;
+    bool renewable = false;
+    bool delegable = false;
+    std::optional<std::string> delegateTo;
+    std::vector<std::string> audience;
+    std::vector<Advice> advice;
+    std::optional<std::string> useKeySig;
+    xmlNode* target = nullptr; ///< the assertion to renew or to validate
+};
+
+struct Request
+{
+    XmlDocument doc; ///< owns every node below
+    Operation operation = Operation::Issue;
+    xmlNode* body = nullptr;
+    xmlNode* timestamp = nullptr;
+    Interval freshness;
+    std::optional<UsernameToken> usernameToken;
+    xmlNode* presentedAssertion = nullptr;
+    xmlNode* binaryToken = nullptr;
+    xmlNode* signature = nullptr;
+    TokenRequest token;
+};
+
+} // namespace DevSts
+
+#endif

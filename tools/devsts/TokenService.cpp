@@ -1,0 +1,128 @@
+#include "devsts/TokenService.h"
+
+#include "devsts/AssertionReader.h"
+#include "devsts/AssertionWriter.h"
+#include "devsts/Certificates.h"
+#include "devsts/Fault.h"
+#include "devsts/Issuance.h"
+#include "devsts/ReplyWriter.h"
+#include "devsts/RequestReader.h"
+
+#include <optional>
+#include <stdexcept>
+
+namespace DevSts {
+
+namespace {
+
+constexpr int StatusFault = 500; // [SOAP11 6.2]
+
+void RequireNoCredentials(const Request& request, const char* operation)
+{
+    if (request.usernameToken || request.presentedAssertion != nullptr) {
+        throw Fault(
+            FaultCodes::InvalidRequest,
+            std::string("A ") + operation
+                + " request carries no password and no token in its header");
+    }
+}
+
+} // namespace
+
+TokenService::TokenService(const State& state, Clock clock)
+    : _state(state)
+    , _clock(std::move(clock))
+    , _signer(state.SigningKeyPem(), state.SigningCertificatePem())
+    , _signingCertificateDer(DerFromPem(state.SigningCertificatePem()))
+{}
+
+Reply TokenService::Answer(const ReceivedRequest& received)
+{
+    Reply reply;
+    try {
+        reply.body = Handle(received);
+    } catch (const Fault& fault) {
+        reply.status = StatusFault;
+        reply.body = WriteFault(fault);
+    } catch (const std::runtime_error& error) {
+        reply.status = StatusFault;
+        reply.body = WriteFault(Fault(FaultCodes::Server, error.what()));
+    }
+    return reply;
+}
+
+std::string TokenService::Handle(const ReceivedRequest& received)
+{
+    const auto action = received.headers.find("SOAPAction");
+    const Request request = ReadRequest(
+        received.body,
+        action == received.headers.end() ? std::nullopt : std::optional(action->second));
+    const TimePoint now = _clock();
+    const Users users = Users::Load(_state.Dir());
+    Authenticate(users, now).RequireFresh(request);
+    switch (request.operation) {
+    case Operation::Issue:
+        return Issue(request, users, now);
+    case Operation::Renew:
+        return Renew(request, users, now);
+    case Operation::Validate:
+        return Validate(request, users, now);
+    }
+    throw std::runtime_error("unknown operation");
+}
+
+std::string TokenService::Issue(const Request& request, const Users& users, TimePoint now)
+{
+    const Sender sender = Authenticate(users, now).Identify(request);
+    const Assertion assertion = IssueAssertion(sender, request.token, users, now);
+    return WriteIssueReply(Sign(assertion).get(), {assertion.notBefore, assertion.notOnOrAfter});
+}
+
+std::string TokenService::Renew(const Request& request, const Users& users, TimePoint now)
+{
+    RequireNoCredentials(request, "Renew");
+    const KeyProof proof = Authenticate(users, now).ProveCertificate(request);
+    Assertion old;
+    try {
+        old = ReadVerifiedAssertion(request.token.target, _signingCertificateDer);
+        RequireCurrent(old, now);
+    } catch (const ShapeError& error) {
+        throw Fault(
+            FaultCodes::UnableToRenew, std::string("The token is refused: ") + error.what());
+    }
+    const Assertion renewed = RenewAssertion(old, proof, *request.token.lifetime, users, now);
+    return WriteRenewReply(Sign(renewed).get(), {renewed.notBefore, renewed.notOnOrAfter});
+}
+
+std::string TokenService::Validate(const Request& request, const Users& users, TimePoint now) const
+{
+    RequireNoCredentials(request, "Validate");
+    if (request.signature != nullptr || request.binaryToken != nullptr) {
+        throw Fault(FaultCodes::InvalidRequest, "A Validate request is not signed");
+    }
+    try {
+        const Assertion assertion =
+            ReadVerifiedAssertion(request.token.target, _signingCertificateDer);
+        RequireCurrent(assertion, now);
+        if (users.FindByName(assertion.subject) == nullptr) {
+            throw ShapeError("The subject '" + assertion.subject + "' is not known any more");
+        }
+    } catch (const ShapeError& error) {
+        return WriteStatusReply(false, error.what());
+    }
+    return WriteStatusReply(true, "The token and its subject are valid");
+}
+
+Authentication TokenService::Authenticate(const Users& users, TimePoint now)
+{
+    return {users, _signingCertificateDer, _guard, now};
+}
+
+XmlDocument TokenService::Sign(const Assertion& assertion) const
+{
+    XmlDocument doc = WriteAssertion(assertion);
+    _signer.SignAssertion(doc.get());
+    return doc;
+}
+
+} // namespace DevSts

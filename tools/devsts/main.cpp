@@ -1,0 +1,75 @@
+#include "devsts/Server.h"
+
+#include <CLI/CLI.hpp>
+#include <csignal>
+#include <exception>
+#include <iostream>
+#include <pthread.h>
+#include <regex>
+#include <stdexcept>
+
+namespace {
+
+// The signals are blocked before any thread exists, so that all of them inherit it and only
+// sigwait takes one.
+sigset_t BlockStopSignals()
+{
+    sigset_t signals;
+    sigemptyset(&signals);
+    sigaddset(&signals, SIGTERM);
+    sigaddset(&signals, SIGINT);
+    pthread_sigmask(SIG_BLOCK, &signals, nullptr);
+    return signals;
+}
+
+void SetAddress(DevSts::Options& options, const std::string& listen)
+{
+    static const std::regex pattern(R"((?:\[([0-9A-Fa-f:.]+)\]|([^:\[\]]+)):(\d{1,5}))");
+    std::smatch parts;
+    if (!std::regex_match(listen, parts, pattern) || std::stoi(parts[3].str()) > 65535) {
+        throw std::runtime_error("--listen wants HOST:PORT or [IPv6]:PORT, not " + listen);
+    }
+    options.host = parts[1].matched ? parts[1].str() : parts[2].str();
+    options.port = std::stoi(parts[3].str());
+}
+
+void Serve(const DevSts::Options& options)
+{
+    const sigset_t signals = BlockStopSignals();
+    DevSts::Server server(options);
+    server.Start();
+    std::cerr << "For development only: keys and passwords lie in plain files in "
+              << options.stateDir.string() << std::endl;
+    std::cout << "listening on " << server.Url() << std::endl;
+    int received = 0;
+    sigwait(&signals, &received);
+    server.Stop();
+}
+
+} // namespace
+
+int main(int argc, char** argv)
+{
+    CLI::App app("A WS-Trust 1.3 security token service for development and tests.");
+    app.footer(
+        "The state directory is made on first start. It holds ca.pem (trust it for TLS), sts.pem\n"
+        "(trust it for tokens), client.pem and client.key (a client identity that the STS knows\n"
+        "as a solution user), and users.json (the users and their passwords; it explains its\n"
+        "fields, and is read again for every request). SIGTERM or SIGINT ends the program.");
+    DevSts::Options options;
+    options.keptRequests = 0;
+    std::string listen = "127.0.0.1:0";
+    app.add_option("--state", options.stateDir, "the state directory")->required();
+    app.add_option("--listen", listen, "address and port; port 0 takes any free one")
+        ->capture_default_str();
+    app.add_flag("--http", options.plainHttp, "serve plain HTTP instead of HTTPS");
+    CLI11_PARSE(app, argc, argv);
+    try {
+        SetAddress(options, listen);
+        Serve(options);
+    } catch (const std::exception& error) {
+        std::cerr << "ssoclient-devsts: " << error.what() << std::endl;
+        return 1;
+    }
+    return 0;
+}
