@@ -9,7 +9,7 @@ namespace HostileTests {
 
 namespace {
 
-constexpr std::size_t Million = 1000 * 1000;
+constexpr std::size_t Million = 1000000;
 
 const char XmlError[] = "Quillon::Xml::XMLParseException";
 const std::vector<Refusal> OverLimit{{XmlError, "", "", ""}};
@@ -45,7 +45,7 @@ std::string Numbered(const std::string& before, const std::string& after, std::s
 {
     std::string result;
     for (std::size_t i = 0; i < count; ++i) {
-        result += before + std::to_string(i) + after;
+        result.append(before).append(std::to_string(i)).append(after);
     }
     return result;
 }
@@ -265,6 +265,11 @@ const std::vector<HugeCase> HugeCases{
 class HugeToken : public testing::TestWithParam<HugeCase>
 {};
 
+std::string NameOf(const testing::TestParamInfo<HugeCase>& info)
+{
+    return info.param.name;
+}
+
 } // namespace
 
 TEST_P(HugeToken, IsJudgedWithinItsLimits)
@@ -282,10 +287,7 @@ TEST_P(HugeToken, IsJudgedWithinItsLimits)
     }
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    Of, HugeToken, testing::ValuesIn(HugeCases), [](const testing::TestParamInfo<HugeCase>& info) {
-        return info.param.name;
-    });
+INSTANTIATE_TEST_SUITE_P(Of, HugeToken, testing::ValuesIn(HugeCases), NameOf);
 
 TEST(HugeDocument, IsAcceptedUpToTheLimit)
 {

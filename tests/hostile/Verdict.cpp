@@ -33,9 +33,9 @@ private:
     const Quillon::System::Clock* _previous;
 };
 
-std::string Quote(const SsoClient::PrincipalId& id)
+std::string QuoteId(const SsoClient::PrincipalId& id)
 {
-    return HostileTests::Quote(id.GetName()) + " in " + HostileTests::Quote(id.GetDomain());
+    return Quote(id.GetName()) + " in " + Quote(id.GetDomain());
 }
 
 void DescribeAdvice(const SsoClient::SamlToken& token, std::ostream& out)
@@ -60,12 +60,12 @@ void DescribeLists(const SsoClient::SamlToken& token, std::ostream& out)
     std::vector<SsoClient::PrincipalId> groups{SsoClient::PrincipalId("left", "over")};
     token.GetGroups(groups);
     for (const SsoClient::PrincipalId& group : groups) {
-        out << "group: " << Quote(group) << "\n";
+        out << "group: " << QuoteId(group) << "\n";
     }
     std::vector<SsoClient::Delegate> chain;
     token.GetDelegationChain(chain);
     for (const SsoClient::Delegate& delegate : chain) {
-        out << "delegate: " << Quote(delegate.subject) << " at "
+        out << "delegate: " << QuoteId(delegate.subject) << " at "
             << delegate.delegationDate.GetUtcTime() << "\n";
     }
     std::set<std::string> audience{"left over"};
@@ -109,7 +109,7 @@ std::string DescribeFacts(const SsoClient::SamlToken& token)
     token.GetFullName(fullName);
     std::ostringstream out;
     out << "id: " << Quote(token.GetId()) << "\n"
-        << "subject: " << Quote(token.GetSubject()) << "\n"
+        << "subject: " << QuoteId(token.GetSubject()) << "\n"
         << "name: " << Quote(fullName.first) << " " << Quote(fullName.second) << "\n"
         << "valid: " << token.GetStartDate().GetUtcTime() << " to "
         << token.GetEndDate().GetUtcTime() << "\n"

@@ -12,7 +12,8 @@ initializer_list iomanip ios iosfwd iostream istream iterator limits list locale
 memory_resource mutex new numbers numeric optional ostream queue random ranges ratio regex set
 shared_mutex source_location span sstream stack stdexcept stop_token streambuf string string_view
 strstream system_error thread tuple type_traits typeindex typeinfo unordered_map unordered_set
-utility valarray variant vector version""".split())
+utility valarray variant vector version
+string.h""".split())  # <cstring> does not declare explicit_bzero
 
 # Each third-party library of Quillon, and the one unit that may include it.
 ONE_UNIT = {

@@ -205,4 +205,25 @@ std::string EncodeBase64(const std::string& bytes)
     return text;
 }
 
+std::string DecodeBase64(const std::string& text)
+{
+    const std::unique_ptr<EVP_ENCODE_CTX, OpenSslDeleter> context(EVP_ENCODE_CTX_new());
+    Require(context != nullptr, "EVP_ENCODE_CTX_new");
+    EVP_DecodeInit(context.get());
+    std::string bytes(text.size() + 3, '\0');
+    auto* out = reinterpret_cast<unsigned char*>(bytes.data());
+    int size = 0;
+    int rest = 0;
+    const bool decoded = EVP_DecodeUpdate(
+                             context.get(),
+                             out,
+                             &size,
+                             reinterpret_cast<const unsigned char*>(text.data()),
+                             static_cast<int>(text.size()))
+                             >= 0
+                         && EVP_DecodeFinal(context.get(), out + size, &rest) == 1;
+    bytes.resize(decoded ? static_cast<std::size_t>(size + rest) : 0);
+    return bytes;
+}
+
 } // namespace DevSts

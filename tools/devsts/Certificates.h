@@ -17,6 +17,7 @@ struct OpenSslDeleter
     void operator()(X509* certificate) const { X509_free(certificate); }
     void operator()(X509_EXTENSION* extension) const { X509_EXTENSION_free(extension); }
     void operator()(BIO* bio) const { BIO_free(bio); }
+    void operator()(EVP_ENCODE_CTX* context) const { EVP_ENCODE_CTX_free(context); }
 };
 using PrivateKey = std::unique_ptr<EVP_PKEY, OpenSslDeleter>;
 using Certificate = std::unique_ptr<X509, OpenSslDeleter>;
@@ -46,6 +47,9 @@ Certificate CertificateFromPem(const std::string& pem);
 std::string DerFromPem(const std::string& pem);
 
 std::string EncodeBase64(const std::string& bytes);
+
+/** Blanks in the text do not matter; what is not Base64 gives "". */
+std::string DecodeBase64(const std::string& text);
 
 } // namespace DevSts
 

@@ -15,6 +15,9 @@ using Clock = std::function<TimePoint()>;
 
 TimePoint SystemTime();
 
+/** How far the clock of a client may be off. */
+constexpr std::chrono::minutes ClockSkew(5);
+
 /** The xs:dateTime form with milliseconds and the UTC designator. */
 std::string FormatTime(TimePoint time);
 

@@ -8,13 +8,13 @@ namespace DevSts {
 
 namespace {
 
-struct Reply
+struct Envelope
 {
     XmlDocument doc = NewDocument("soapenv", {Names::Soap, "Envelope"});
     xmlNode* body = nullptr;
     xmlNs* wst = nullptr;
 
-    Reply()
+    Envelope()
     {
         xmlNode* envelope = xmlDocGetRootElement(doc.get());
         body = AddElement(envelope, envelope->ns, "Body");
@@ -43,10 +43,28 @@ void AddResponse(xmlNode* parent, xmlNs* wst, const xmlDoc* assertion, const Int
 
 std::string WriteIssueReply(const xmlDoc* assertion, const Interval& lifetime)
 {
-    const Reply reply;
+    const Envelope reply;
     xmlNode* collection =
         AddElement(reply.body, reply.wst, "RequestSecurityTokenResponseCollection");
     AddResponse(collection, reply.wst, assertion, lifetime);
+    return Serialize(reply.doc.get());
+}
+
+std::string WriteRenewReply(const xmlDoc* assertion, const Interval& lifetime)
+{
+    const Envelope reply;
+    AddResponse(reply.body, reply.wst, assertion, lifetime);
+    return Serialize(reply.doc.get());
+}
+
+std::string WriteStatusReply(bool isValid, const std::string& reason)
+{
+    const Envelope reply;
+    xmlNode* response = AddElement(reply.body, reply.wst, "RequestSecurityTokenResponse");
+    AddElement(response, reply.wst, "TokenType", Names::TokenStatus);
+    xmlNode* status = AddElement(response, reply.wst, "Status");
+    AddElement(status, reply.wst, "Code", isValid ? Names::StatusValid : Names::StatusInvalid);
+    AddElement(status, reply.wst, "Reason", reason);
     return Serialize(reply.doc.get());
 }
 

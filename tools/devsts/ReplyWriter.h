@@ -10,6 +10,12 @@ namespace DevSts {
 /** The answer to Issue: a collection with one response. [WST13 4.3] */
 std::string WriteIssueReply(const xmlDoc* assertion, const Interval& lifetime);
 
+/** The answer to Renew: a single response, without a collection. [WST13 5] */
+std::string WriteRenewReply(const xmlDoc* assertion, const Interval& lifetime);
+
+/** The answer to Validate. [WST13 7] */
+std::string WriteStatusReply(bool isValid, const std::string& reason);
+
 } // namespace DevSts
 
 #endif

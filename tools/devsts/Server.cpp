@@ -186,7 +186,7 @@ private:
         return hook;
     }
 
-    Reply MakeReply(const ReceivedRequest& received) const
+    Reply MakeReply(const ReceivedRequest& received)
     {
         if (received.path != Path) {
             return PlainReply(StatusNotFound, std::string("Requests go to ") + Path);
@@ -203,7 +203,7 @@ private:
 
     const Options _options;
     const State _state;
-    const TokenService _service;
+    TokenService _service;
     std::unique_ptr<httplib::Server> _http;
     std::thread _thread;
     int _port = 0;

@@ -1,13 +1,13 @@
 #include "devsts/TokenService.h"
 
+#include "devsts/AssertionReader.h"
 #include "devsts/AssertionWriter.h"
+#include "devsts/Certificates.h"
 #include "devsts/Fault.h"
-#include "devsts/Names.h"
+#include "devsts/Issuance.h"
 #include "devsts/ReplyWriter.h"
 #include "devsts/RequestReader.h"
 
-#include <algorithm>
-#include <openssl/rand.h>
 #include <optional>
 #include <stdexcept>
 
@@ -15,104 +15,16 @@ namespace DevSts {
 
 namespace {
 
-constexpr std::chrono::minutes ClockSkew(5);
-constexpr std::chrono::hours LongestLifetime(30 * 24);
-constexpr unsigned RenewCount = 10;
-constexpr unsigned ProxyCount = 10;
-
 constexpr int StatusFault = 500; // [SOAP11 6.2]
 
-void RequireFresh(const Interval& timestamp, TimePoint now)
+void RequireNoCredentials(const Request& request, const char* operation)
 {
-    if (timestamp.created > now + ClockSkew) {
+    if (request.usernameToken || request.presentedAssertion != nullptr) {
         throw Fault(
-            FaultCodes::ExpiredData,
-            "The message was created in the future: " + FormatTime(timestamp.created));
+            FaultCodes::InvalidRequest,
+            std::string("A ") + operation
+                + " request carries no password and no token in its header");
     }
-    if (timestamp.expires + ClockSkew <= now) {
-        throw Fault(
-            FaultCodes::ExpiredData, "The message has expired at " + FormatTime(timestamp.expires));
-    }
-}
-
-const User& Authenticate(const UsernameToken& token, const Users& users)
-{
-    const User* user = users.FindByName(token.name);
-    if (user == nullptr || user->password != token.password) {
-        throw Fault(FaultCodes::FailedAuthentication, "Invalid user name or password");
-    }
-    return *user;
-}
-
-std::string NewAssertionId()
-{
-    unsigned char bytes[16];
-    if (RAND_bytes(bytes, sizeof bytes) != 1) {
-        throw std::runtime_error("RAND_bytes failed");
-    }
-    static constexpr const char* Digits = "0123456789abcdef";
-    std::string id = "_";
-    for (const unsigned char byte : bytes) {
-        id += Digits[byte >> 4U];
-        id += Digits[byte & 15U];
-    }
-    return id;
-}
-
-void SetLifetime(Assertion& assertion, const Interval& lifetime, TimePoint now)
-{
-    if (lifetime.expires <= lifetime.created) {
-        throw Fault(FaultCodes::InvalidTimeRange, "The lifetime ends before it begins");
-    }
-    if (lifetime.created > now + ClockSkew || lifetime.created < now - ClockSkew) {
-        throw Fault(
-            FaultCodes::InvalidTimeRange,
-            "The lifetime must begin now, not at " + FormatTime(lifetime.created));
-    }
-    assertion.notBefore = lifetime.created;
-    assertion.notOnOrAfter = std::min<TimePoint>(
-        lifetime.expires, lifetime.created + std::chrono::microseconds(LongestLifetime));
-}
-
-void SetAttributes(Assertion& assertion, const User& user)
-{
-    assertion.groups = user.groups;
-    assertion.givenName = user.givenName;
-    assertion.surname = user.surname;
-    assertion.isSolution = user.isSolution;
-}
-
-void SetDelegate(Assertion& assertion, const std::string& name, const Users& users, TimePoint now)
-{
-    const User* delegate = users.FindByName(name);
-    if (delegate == nullptr) {
-        throw Fault(FaultCodes::InvalidRequest, "The delegate '" + name + "' is not known");
-    }
-    assertion.delegates.push_back({delegate->name, now});
-}
-
-Assertion NewAssertion(
-    const User& subject, const TokenRequest& wanted, const Users& users, TimePoint now)
-{
-    Assertion assertion;
-    assertion.id = NewAssertionId();
-    assertion.issueInstant = now;
-    assertion.subject = subject.name;
-    SetLifetime(assertion, *wanted.lifetime, now);
-    if (wanted.renewable) {
-        assertion.renewCount = RenewCount;
-    }
-    if (wanted.delegable) {
-        assertion.proxyCount = ProxyCount;
-    }
-    if (wanted.delegateTo) {
-        SetDelegate(assertion, *wanted.delegateTo, users, now);
-    }
-    assertion.audience.insert(wanted.audience.begin(), wanted.audience.end());
-    assertion.advice = wanted.advice;
-    assertion.authnInstant = now;
-    SetAttributes(assertion, subject);
-    return assertion;
 }
 
 } // namespace
@@ -121,9 +33,10 @@ TokenService::TokenService(const State& state, Clock clock)
     : _state(state)
     , _clock(std::move(clock))
     , _signer(state.SigningKeyPem(), state.SigningCertificatePem())
+    , _signingCertificateDer(DerFromPem(state.SigningCertificatePem()))
 {}
 
-Reply TokenService::Answer(const ReceivedRequest& received) const
+Reply TokenService::Answer(const ReceivedRequest& received)
 {
     Reply reply;
     try {
@@ -138,35 +51,78 @@ Reply TokenService::Answer(const ReceivedRequest& received) const
     return reply;
 }
 
-std::string TokenService::Handle(const ReceivedRequest& received) const
+std::string TokenService::Handle(const ReceivedRequest& received)
 {
     const auto action = received.headers.find("SOAPAction");
     const Request request = ReadRequest(
         received.body,
         action == received.headers.end() ? std::nullopt : std::optional(action->second));
     const TimePoint now = _clock();
-    RequireFresh(request.freshness, now);
     const Users users = Users::Load(_state.Dir());
-    if (request.operation != Operation::Issue || request.signature != nullptr) {
-        throw Fault(FaultCodes::InvalidRequest, "Signed requests are not offered");
+    Authenticate(users, now).RequireFresh(request);
+    switch (request.operation) {
+    case Operation::Issue:
+        return Issue(request, users, now);
+    case Operation::Renew:
+        return Renew(request, users, now);
+    case Operation::Validate:
+        return Validate(request, users, now);
     }
-    return Issue(request, users, now);
+    throw std::runtime_error("unknown operation");
 }
 
-std::string TokenService::Issue(const Request& request, const Users& users, TimePoint now) const
+std::string TokenService::Issue(const Request& request, const Users& users, TimePoint now)
 {
-    if (!request.usernameToken) {
-        throw Fault(FaultCodes::InvalidRequest, "The request carries no credentials");
+    const Sender sender = Authenticate(users, now).Identify(request);
+    const Assertion assertion = IssueAssertion(sender, request.token, users, now);
+    return WriteIssueReply(Sign(assertion).get(), {assertion.notBefore, assertion.notOnOrAfter});
+}
+
+std::string TokenService::Renew(const Request& request, const Users& users, TimePoint now)
+{
+    RequireNoCredentials(request, "Renew");
+    const KeyProof proof = Authenticate(users, now).ProveCertificate(request);
+    Assertion old;
+    try {
+        old = ReadVerifiedAssertion(request.token.target, _signingCertificateDer);
+        RequireCurrent(old, now);
+    } catch (const ShapeError& error) {
+        throw Fault(
+            FaultCodes::UnableToRenew, std::string("The token is refused: ") + error.what());
     }
-    const User& user = Authenticate(*request.usernameToken, users);
-    if (request.token.keyType == KeyType::PublicKey) {
-        throw Fault(FaultCodes::InvalidRequest, "A holder-of-key token needs a signed request");
+    const Assertion renewed = RenewAssertion(old, proof, *request.token.lifetime, users, now);
+    return WriteRenewReply(Sign(renewed).get(), {renewed.notBefore, renewed.notOnOrAfter});
+}
+
+std::string TokenService::Validate(const Request& request, const Users& users, TimePoint now) const
+{
+    RequireNoCredentials(request, "Validate");
+    if (request.signature != nullptr || request.binaryToken != nullptr) {
+        throw Fault(FaultCodes::InvalidRequest, "A Validate request is not signed");
     }
-    Assertion assertion = NewAssertion(user, request.token, users, now);
-    assertion.authnContext = Names::ContextPassword;
-    const XmlDocument doc = WriteAssertion(assertion);
+    try {
+        const Assertion assertion =
+            ReadVerifiedAssertion(request.token.target, _signingCertificateDer);
+        RequireCurrent(assertion, now);
+        if (users.FindByName(assertion.subject) == nullptr) {
+            throw ShapeError("The subject '" + assertion.subject + "' is not known any more");
+        }
+    } catch (const ShapeError& error) {
+        return WriteStatusReply(false, error.what());
+    }
+    return WriteStatusReply(true, "The token and its subject are valid");
+}
+
+Authentication TokenService::Authenticate(const Users& users, TimePoint now)
+{
+    return {users, _signingCertificateDer, _guard, now};
+}
+
+XmlDocument TokenService::Sign(const Assertion& assertion) const
+{
+    XmlDocument doc = WriteAssertion(assertion);
     _signer.SignAssertion(doc.get());
-    return WriteIssueReply(doc.get(), {assertion.notBefore, assertion.notOnOrAfter});
+    return doc;
 }
 
 } // namespace DevSts

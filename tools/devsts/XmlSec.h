@@ -22,7 +22,8 @@ using SecSignature = std::unique_ptr<xmlSecDSigCtx, XmlSecDeleter>;
 /**
  * Makes the attribute an ID of the document, so that references find the element.
  *
- * @throws ShapeError  there is no such attribute, or its value names another element already.
+ * @throws ShapeError  there is no such attribute, or its value names another element already, or
+ *                     has other characters than letters, digits, '_', '-' and '.'.
  */
 std::string RegisterId(xmlNode* element, const XmlName& name);
 

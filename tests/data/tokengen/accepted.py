@@ -234,6 +234,11 @@ def _text_forms(c):
     _base64_forms(c)
     admin = BASE.but(subject=("user", "example.com"), given_name="A & B <C> \"D\" 'E'")
     _add(c, "escaped-text", "characters that must be escaped", admin)
+    escaped = [("http://source.example.com/?a=1&b=<2>", [("urn:\"name\"&amp;", ["&amp;"])])]
+    _add(c, "escaped-attributes", "attribute values with characters that must be escaped",
+         BASE.but(advice=escaped))
+    _add(c, "escaped-attributes-by-reference", "the same by character references",
+         BASE.but(advice=escaped), ("?a=1&amp;b=&lt;2&gt;", "&#63;a=1&#38;b=&#x3c;2&#x3E;"))
     _add(c, "cdata", "a value made of text and CDATA sections", admin,
          ("A &amp; B &lt;C&gt; \"D\" 'E'", "<![CDATA[A & B <C>]]> \"D<![CDATA[\" 'E]]>'"),
          (">user@example.com<", "><![CDATA[user@example.com]]><"))

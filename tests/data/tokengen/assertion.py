@@ -16,6 +16,10 @@ def micros(text):
     return (since.days * 86400 + since.seconds) * 1000000 + since.microseconds
 
 
+def _attribute_text(value):
+    return escape(value, {'"': "&quot;"})
+
+
 @dataclass
 class SignatureForm:
     """What a ds:Signature says, before its values are known."""
@@ -189,7 +193,7 @@ class Token:
         yield f"<{p}Advice>"
         for source, attributes in self.advice:
             inner = "".join(self.attribute(name, values) for name, values in attributes)
-            yield (f'<rsa:RSAAdvice xmlns:rsa="{names.RSA}" AdviceSource="{source}">'
+            yield (f'<rsa:RSAAdvice xmlns:rsa="{names.RSA}" AdviceSource="{_attribute_text(source)}">'
                    f"{inner}</rsa:RSAAdvice>")
         yield f"</{p}Advice>"
 
@@ -210,5 +214,5 @@ class Token:
         inner = "".join(
             f'<{p}AttributeValue xsi:type="xs:string">{escape(v)}</{p}AttributeValue>'
             for v in values)
-        return (f'<{p}Attribute Name="{name}" NameFormat="{names.NAME_FORMAT}">'
+        return (f'<{p}Attribute Name="{_attribute_text(name)}" NameFormat="{names.NAME_FORMAT}">'
                 f"{inner}</{p}Attribute>")

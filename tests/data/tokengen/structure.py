@@ -434,7 +434,7 @@ def _advice(c):
     add("other-child", not_found("Attribute"), (inner, inner + "<saml:Foo/>"))
     add("attribute-without-format", missing("Attribute", "NameFormat"),
         (inner, inner.replace(f' NameFormat="{names.NAME_FORMAT}"', "", 1)))
-    add("after-statement", not_found("AttributeStatement"),
+    add("after-statement", says("Unexpected elements under Assertion"),
         ("<saml:Advice>", "<saml:AuthnStatement AuthnInstant=\"2026-01-01T00:00:00Z\"><saml:"
          f"AuthnContext>{CLASS_REF}</saml:AuthnContext></saml:AuthnStatement><saml:Advice>"))
 
@@ -446,7 +446,7 @@ def _authn_statement(c):
     statement = text[text.index("<saml:AuthnStatement"):text.index("\n<saml:AttributeStatement")]
     context = f"<saml:AuthnContext>{CLASS_REF}</saml:AuthnContext>"
     add("missing", not_found("AuthnStatement"), (statement, ""))
-    add("twice", not_found("AttributeStatement"), (statement, statement * 2))
+    add("twice", says("Unexpected elements under Assertion"), (statement, statement * 2))
     for attribute in ("SessionIndex", "SessionNotOnOrAfter"):
         add(attribute.lower(), unexpected("AuthnStatement"),
             ("<saml:AuthnStatement ", f'<saml:AuthnStatement {attribute}="2026-12-31T00:00:00Z" '))

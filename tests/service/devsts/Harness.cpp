@@ -71,6 +71,11 @@ const fs::path& SharedState()
     return dir.Path();
 }
 
+StateCopy::StateCopy()
+{
+    fs::copy(SharedState(), Path());
+}
+
 std::string ReadText(const fs::path& path)
 {
     std::ifstream file(path, std::ios::binary);

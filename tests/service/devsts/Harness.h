@@ -83,6 +83,28 @@ protected:
     int _port;
 };
 
+/** A copy of the shared state that a test may change. */
+class StateCopy
+{
+public:
+    StateCopy();
+    std::filesystem::path Path() const { return _dir.Path() / "state"; }
+
+private:
+    TempDir _dir;
+};
+
+/** A server whose users may be edited. */
+class EditedUsersTest : private StateCopy, public ServerTest
+{
+protected:
+    EditedUsersTest()
+        : ServerTest(StateCopy::Path())
+    {}
+
+    std::filesystem::path UsersFile() const { return StateCopy::Path() / "users.json"; }
+};
+
 } // namespace DevStsTests
 
 #endif

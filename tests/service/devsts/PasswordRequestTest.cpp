@@ -97,7 +97,7 @@ TEST_F(IssueByPassword, MessageExpiredBeyondSkewIsRefused)
     _now = StartTime() + std::chrono::minutes(15);
     EXPECT_EQ(
         FaultText(PostIssue(PasswordRequest()), "wst:ExpiredData"),
-        "The message has expired at 2026-11-20T12:10:00.000Z");
+        "The message created at 2026-11-20T12:00:00.000Z has expired");
 }
 
 TEST_F(IssueByPassword, MessageFromTheFarFutureIsRefused)

@@ -9,17 +9,6 @@ namespace fs = std::filesystem;
 
 namespace {
 
-// Filled once for all, copied for those who change it.
-class StateCopy
-{
-public:
-    StateCopy() { fs::copy(SharedState(), _dir.Path() / "state"); }
-    fs::path Path() const { return _dir.Path() / "state"; }
-
-private:
-    TempDir _dir;
-};
-
 std::string OpenFailure(const fs::path& state)
 {
     DevSts::Options options;
@@ -102,15 +91,7 @@ TEST(State, GroupWithoutDomainIsReported)
         OpenFailure(state.Path()), "users.json: group 'Users' is not of the form DOMAIN\\group");
 }
 
-class EditedUsers : private StateCopy, public ServerTest
-{
-protected:
-    EditedUsers()
-        : ServerTest(StateCopy::Path())
-    {}
-
-    fs::path UsersFile() const { return StateCopy::Path() / "users.json"; }
-};
+using EditedUsers = EditedUsersTest;
 
 TEST_F(EditedUsers, NewPasswordHoldsFromTheNextRequest)
 {

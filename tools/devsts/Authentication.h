@@ -1,0 +1,58 @@
+#ifndef DEVSTS_AUTHENTICATION_H
+#define DEVSTS_AUTHENTICATION_H
+
+#include "devsts/MessageSignature.h"
+#include "devsts/ReplayGuard.h"
+#include "devsts/Request.h"
+#include "devsts/Sender.h"
+
+#include <string>
+
+namespace DevSts {
+
+/** Finds out who sent a request. Borrows all it is given. */
+class Authentication
+{
+public:
+    Authentication(
+        const Users& users,
+        const std::string& signingCertificateDer,
+        ReplayGuard& guard,
+        TimePoint now)
+        : _users(users)
+        , _signingCertificateDer(signingCertificateDer)
+        , _guard(guard)
+        , _now(now)
+    {}
+
+    /** @throws Fault  the message is not fresh. */
+    void RequireFresh(const Request& request) const;
+
+    /**
+     * The sender of an Issue request: by password, by presented token, or by certificate.
+     *
+     * @throws Fault
+     */
+    Sender Identify(const Request& request) const;
+
+    /** The key of a signed request that names a certificate in its header. @throws Fault */
+    KeyProof ProveCertificate(const Request& request) const;
+
+private:
+    Sender ByPassword(const Request& request) const;
+    Sender ByToken(const Request& request) const;
+    Sender ByCertificate(const Request& request) const;
+    Assertion ReadPresented(const Request& request) const;
+    std::string PresenterCertificate(
+        const MessageSignature& signature, const Assertion& presented) const;
+    void RequireNew(const Request& request, const MessageSignature& signature) const;
+
+    const Users& _users;
+    const std::string& _signingCertificateDer;
+    ReplayGuard& _guard;
+    TimePoint _now;
+};
+
+} // namespace DevSts
+
+#endif
