@@ -1,0 +1,54 @@
+#pragma once
+
+#include "quillon/Exceptions.h"
+#include "quillon/Ref.h"
+#include "quillon/crypto/PublicKey.h"
+#include "quillon/system/DateTime.h"
+
+#include <list>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace Quillon::Crypto {
+
+/**
+ * An X.509 certificate [RFC 5280], decoded once when it is made.
+ *
+ * Thread safety: immutable.
+ */
+class QUILLON_API Certificate : public RefCounted
+{
+public:
+    /** The DER encoding, exactly as it was given. Two certificates are equal if these are. */
+    virtual const std::vector<unsigned char>& GetEncoded() const noexcept = 0;
+
+    virtual const PublicKey& GetPublicKey() const noexcept = 0;
+
+    /** Subject and issuer as one-line RFC 2253 names, for messages. */
+    virtual std::string GetSubjectName() const = 0;
+    virtual std::string GetIssuerName() const = 0;
+
+    /** The SHA-256 digest of the DER encoding in lower-case hexadecimal. */
+    virtual std::string GetFingerprint() const = 0;
+
+    virtual System::DateTime GetNotBefore() const = 0;
+    virtual System::DateTime GetNotAfter() const = 0;
+};
+
+/**
+ * @param bytes  the DER encoding of one certificate, and nothing after it.
+ * @throws CryptoException  the bytes are not a certificate, or its key is not understood.
+ *
+ * Cost: about a hundred microseconds with OpenSSL 3.0. Make a certificate once and keep it.
+ */
+QUILLON_API Ref<const Certificate> CreateCertificate(const void* bytes, std::size_t length);
+
+/**
+ * Reads all certificates of a PEM text [RFC 7468], in order; other PEM blocks are passed over.
+ *
+ * @throws CryptoException  the text holds no certificate, or one that cannot be decoded.
+ */
+QUILLON_API std::list<Ref<const Certificate>> ParsePemCertificates(std::string_view pem);
+
+} // namespace Quillon::Crypto

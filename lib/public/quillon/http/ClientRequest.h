@@ -1,0 +1,52 @@
+#pragma once
+
+#include "quillon/Exceptions.h"
+#include "quillon/Reader.h"
+#include "quillon/Ref.h"
+
+#include <string>
+
+namespace Quillon::Http {
+
+enum class HttpMethod : int
+{
+    POST = 3
+};
+
+/**
+ * A request in the making. Its body is wiped from memory when the request goes.
+ *
+ * Thread safety: one thread; once sent it must not be changed any more.
+ */
+class QUILLON_API ClientRequest : public RefCounted
+{
+public:
+    /**
+     * Sets a header field, in place of an earlier one of the same name.
+     *
+     * @throws InvalidArgumentException  the name is not a token [RFC 9110 5.6.2] or the value has
+     *                                   a control character: it could start a line of its own.
+     */
+    virtual void SetHeader(const std::string& name, const std::string& value) = 0;
+
+    /** Where the body is written; valid as long as the request. */
+    virtual Writer* GetBodyWriter() noexcept = 0;
+
+    /**
+     * Limits the whole exchange, from the name look-up to the last byte of the reply.
+     *
+     * @param timeout  in microseconds, rounded up to milliseconds; at least one microsecond. A
+     *                 request starts with 240 seconds.
+     * @throws InvalidArgumentException  `timeout` is not positive.
+     */
+    virtual void SetTimeout(long long timeout) = 0;
+};
+
+/**
+ * @param path  the request target: `/` and what may follow in a URL, query included.
+ * @throws InvalidArgumentException  the path is malformed.
+ */
+QUILLON_API void CreateHttpRequest(
+    HttpMethod method, const std::string& path, Ref<ClientRequest>& out);
+
+} // namespace Quillon::Http

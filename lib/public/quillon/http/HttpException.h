@@ -1,0 +1,26 @@
+#pragma once
+
+#include "quillon/Exceptions.h"
+
+namespace Quillon::Http {
+
+/**
+ * An HTTP exchange failed: the server cannot be reached, is not who it should be, or its reply is
+ * not HTTP or too large. The text names the server and the reason, never what was sent.
+ */
+class QUILLON_API HttpException : public ExceptionOf<HttpException, Exception>
+{
+public:
+    using ExceptionOf::ExceptionOf;
+    ~HttpException() override;
+};
+
+/** The reply was not complete in time. The text names the server and the limit. */
+class QUILLON_API TimeoutException : public ExceptionOf<TimeoutException, HttpException>
+{
+public:
+    using ExceptionOf::ExceptionOf;
+    ~TimeoutException() override;
+};
+
+} // namespace Quillon::Http

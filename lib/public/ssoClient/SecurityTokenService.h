@@ -1,0 +1,80 @@
+#pragma once
+
+#include "ssoClient/SamlToken.h"
+#include "ssoClient/SecurityTokenServiceConfig.h"
+#include "ssoClient/TokenSpec.h"
+
+#include <boost/smart_ptr/shared_ptr.hpp>
+
+#include <string>
+
+namespace SsoClient {
+
+/**
+ * Obtains, renews and validates tokens at a WS-Trust 1.3 security token service.
+ *
+ * No operation retries. Each may throw:
+ * - `Quillon::InvalidArgumentException`, before anything is sent, for a bad argument;
+ * - `Quillon::InvalidStateException`, before anything is sent, if it needs the holder-of-key
+ *   identity and the configuration has none;
+ * - `CommunicationException`, or the transport's own exception, if the exchange fails;
+ * - `InvalidCredentialsException` if the service rejects the credentials;
+ * - `InvalidSignatureException` if the token it sends does not verify;
+ * - `SsoException` for any other fault or an answer that cannot be used.
+ *
+ * There is no virtual destructor: a service is only owned by the pointer of its factory.
+ *
+ * Thread safety: immutable; any number of threads.
+ */
+class SSOCLIENT_API SecurityTokenService
+{
+public:
+    /**
+     * Acquires a token with a user name and a password (WS-Security UsernameToken Profile 1.0).
+     *
+     * @return the verified token; null if the service answered with an empty assertion.
+     */
+    virtual boost::shared_ptr<const SamlToken> AcquireToken(
+        const std::string& userName, const std::string& password, const TokenSpec& spec) const = 0;
+
+    /**
+     * Acquires a holder-of-key token with the caller's own key and certificate. The confirmation
+     * asked for must be the default.
+     *
+     * @return as `AcquireToken`.
+     */
+    virtual boost::shared_ptr<const SamlToken> AcquireTokenByCertificate(
+        const TokenSpec& spec) const = 0;
+
+    /**
+     * Acquires a token by presenting `token`, for delegation or with other properties. The
+     * request is signed with the caller's own key.
+     *
+     * @return as `AcquireToken`.
+     */
+    virtual boost::shared_ptr<const SamlToken> AcquireTokenByToken(
+        const SamlToken& token, const TokenSpec& spec) const = 0;
+
+    /** Asks the service whether the subject of `token` is still valid. */
+    virtual bool ValidateSubject(const SamlToken& token) const = 0;
+
+    /**
+     * Renews a holder-of-key token. The request is signed with the caller's own key.
+     *
+     * @param lifetimeSec  of the new token, from now; must be positive.
+     * @return as `AcquireToken`.
+     */
+    virtual boost::shared_ptr<const SamlToken> RenewToken(
+        const SamlToken& token, long long lifetimeSec) const = 0;
+};
+
+/**
+ * Creates the service object. `config` may go afterwards, except its SSL context.
+ *
+ * @throws Quillon::InvalidArgumentException  the URL is malformed, or it is an HTTPS URL and there
+ *                                            is no SSL context.
+ */
+SSOCLIENT_API boost::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
+    const SecurityTokenServiceConfig& config);
+
+} // namespace SsoClient

@@ -1,0 +1,33 @@
+#include "crypto/OpenSsl.h"
+
+#include "crypto/Handles.h"
+
+namespace Quillon::Crypto {
+
+std::string GetOpenSslError()
+{
+    const unsigned long code = ERR_peek_last_error();
+    if (code == 0) {
+        return "unknown error";
+    }
+    const char* reason = ERR_reason_error_string(code);
+    return reason != nullptr ? reason : "error " + std::to_string(code);
+}
+
+const EVP_MD* GetDigest(HashAlgorithm algorithm)
+{
+    // A fetch walks the providers; the first one is kept, and its result lives as long as the
+    // process, so that verifying never depends on the order of static destruction.
+    static const EVP_MD* const Sha256 = EVP_MD_fetch(nullptr, "SHA256", nullptr);
+    static const EVP_MD* const Sha384 = EVP_MD_fetch(nullptr, "SHA384", nullptr);
+    static const EVP_MD* const Sha512 = EVP_MD_fetch(nullptr, "SHA512", nullptr);
+    const EVP_MD* digest = algorithm == HashAlgorithm::SHA256   ? Sha256
+                           : algorithm == HashAlgorithm::SHA384 ? Sha384
+                                                                : Sha512;
+    if (digest == nullptr) {
+        throw CryptoException("OpenSSL offers no SHA-2 digest: " + GetOpenSslError());
+    }
+    return digest;
+}
+
+} // namespace Quillon::Crypto

@@ -1,0 +1,66 @@
+#include "xml/security/Algorithms.h"
+
+#include "quillon/xml/security/Exceptions.h"
+#include "quillon/xml/security/Identifiers.h"
+
+#include <algorithm>
+#include <array>
+#include <string>
+
+namespace Quillon::Xml::Security {
+
+namespace {
+
+using Crypto::HashAlgorithm;
+using Crypto::KeyType;
+
+// No HMAC: its "key" would be a public text. No SHA-1 and no MD5: collisions are affordable.
+constexpr std::array<SignatureAlgorithm, 6> SignatureAlgorithms{{
+    {RsaSha256, KeyType::RSA, HashAlgorithm::SHA256},
+    {RsaSha384, KeyType::RSA, HashAlgorithm::SHA384},
+    {RsaSha512, KeyType::RSA, HashAlgorithm::SHA512},
+    {EcdsaSha256, KeyType::EC, HashAlgorithm::SHA256},
+    {EcdsaSha384, KeyType::EC, HashAlgorithm::SHA384},
+    {EcdsaSha512, KeyType::EC, HashAlgorithm::SHA512},
+}};
+
+constexpr int MinRsaBits = 2048;
+
+} // namespace
+
+const SignatureAlgorithm& GetSignatureAlgorithm(std::string_view identifier)
+{
+    const auto* found = std::find_if(
+        SignatureAlgorithms.begin(),
+        SignatureAlgorithms.end(),
+        [identifier](const SignatureAlgorithm& algorithm) {
+            return identifier == algorithm.identifier;
+        });
+    if (found == SignatureAlgorithms.end()) {
+        throw XmlSecurityException(
+            "Signature algorithm '" + std::string(identifier) + "' is not accepted");
+    }
+    return *found;
+}
+
+Crypto::HashAlgorithm GetDigestAlgorithm(std::string_view identifier)
+{
+    if (identifier == DigestSha256) {
+        return HashAlgorithm::SHA256;
+    }
+    if (identifier == DigestSha384) {
+        return HashAlgorithm::SHA384;
+    }
+    if (identifier == DigestSha512) {
+        return HashAlgorithm::SHA512;
+    }
+    throw XmlSecurityException(
+        "Digest algorithm '" + std::string(identifier) + "' is not accepted");
+}
+
+bool IsAcceptedKey(const SignatureAlgorithm& algorithm, Crypto::KeyType type, int bits) noexcept
+{
+    return type == algorithm.keyType && (type != KeyType::RSA || bits >= MinRsaBits);
+}
+
+} // namespace Quillon::Xml::Security

@@ -1,0 +1,204 @@
+#include "quillon/StringUtil.h"
+#include "quillon/xml/security/Identifiers.h"
+#include "xml/security/SignatureModel.h"
+
+namespace Quillon::Xml::Security {
+
+namespace {
+
+[[noreturn]] void Fail(const std::string& what)
+{
+    throw SignatureSyntaxException(what);
+}
+
+bool IsBlankText(const Node& node) noexcept
+{
+    const TextNode* text = AsText(&node);
+    return text != nullptr
+           && text->GetText().find_first_not_of("\t\n\r ") == std::string_view::npos;
+}
+
+/** Goes through the child elements of one element; comments and blanks between are passed over. */
+class ChildCursor
+{
+public:
+    explicit ChildCursor(const ElementNode& parent)
+        : _parent(parent)
+        , _node(parent.GetFirstChild())
+    {
+        SkipInsignificant();
+    }
+
+    /** The child element that is next in line; null at the end. */
+    const ElementNode* Get() const noexcept { return AsElement(_node); }
+
+    bool IsAt(std::string_view localName) const noexcept
+    {
+        return _node != nullptr && Get()->HasQName(localName, DsNamespace);
+    }
+
+    const ElementNode& Take(std::string_view localName)
+    {
+        if (!IsAt(localName)) {
+            Fail(
+                "Expected element '" + std::string(localName) + "' in '"
+                + std::string(_parent.GetLocalName()) + "', found " + DescribeNext());
+        }
+        const ElementNode& element = *Get();
+        Advance();
+        return element;
+    }
+
+    void Advance()
+    {
+        _node = _node->GetNextSibling();
+        SkipInsignificant();
+    }
+
+    void RequireEnd() const
+    {
+        if (_node != nullptr) {
+            Fail(
+                "Unexpected " + DescribeNext() + " in '" + std::string(_parent.GetLocalName())
+                + "'");
+        }
+    }
+
+private:
+    void SkipInsignificant()
+    {
+        while (_node != nullptr
+               && (_node->GetNodeType() == NodeType::COMMENT || IsBlankText(*_node))) {
+            _node = _node->GetNextSibling();
+        }
+        if (_node != nullptr && Get() == nullptr) {
+            Fail(
+                std::string("Unexpected ") + ToString(_node->GetNodeType()) + " in '"
+                + std::string(_parent.GetLocalName()) + "'");
+        }
+    }
+
+    std::string DescribeNext() const
+    {
+        return _node == nullptr ? "nothing" : "'" + std::string(Get()->GetName()) + "'";
+    }
+
+    const ElementNode& _parent;
+    const Node* _node;
+};
+
+std::string_view RequireAttribute(const ElementNode& element, std::string_view name)
+{
+    const Attribute* attribute = element.FindAttribute(name);
+    if (attribute == nullptr) {
+        Fail(
+            "'" + std::string(element.GetLocalName()) + "' has no attribute '" + std::string(name)
+            + "'");
+    }
+    return attribute->value;
+}
+
+/** The bytes of an element whose whole content is one text: a comment inside is refused. */
+std::vector<unsigned char> ReadBase64(const ElementNode& element)
+{
+    const TextNode* text = AsText(element.GetFirstChild());
+    if (text == nullptr || text->GetNextSibling() != nullptr) {
+        Fail("'" + std::string(element.GetLocalName()) + "' must hold text and nothing else");
+    }
+    std::vector<unsigned char> bytes;
+    try {
+        StringUtil::Base64Decode(text->GetText(), bytes);
+    } catch (const Base64FormatException& error) {
+        Fail("'" + std::string(element.GetLocalName()) + "' is not Base64: " + error.what());
+    }
+    return bytes;
+}
+
+AlgorithmUse ReadAlgorithm(const ElementNode& element)
+{
+    AlgorithmUse use;
+    use.identifier = RequireAttribute(element, "Algorithm");
+    for (ChildCursor child(element); child.Get() != nullptr; child.Advance()) {
+        if (use.prefixList == nullptr
+            && child.Get()->HasQName("InclusiveNamespaces", ExclusiveC14n)) {
+            use.prefixList = child.Get()->FindAttribute("PrefixList");
+        } else {
+            use.foreignChild = child.Get()->GetName();
+        }
+    }
+    return use;
+}
+
+std::vector<AlgorithmUse> ReadTransforms(const ElementNode& transforms)
+{
+    std::vector<AlgorithmUse> uses;
+    ChildCursor child(transforms);
+    do {
+        uses.push_back(ReadAlgorithm(child.Take("Transform")));
+    } while (child.Get() != nullptr);
+    return uses;
+}
+
+ReferenceModel ReadReference(const ElementNode& element)
+{
+    ReferenceModel reference;
+    reference.uri = RequireAttribute(element, "URI");
+    ChildCursor child(element);
+    if (child.IsAt("Transforms")) {
+        reference.transforms = ReadTransforms(child.Take("Transforms"));
+    }
+    reference.digestMethod = ReadAlgorithm(child.Take("DigestMethod"));
+    reference.digestValue = ReadBase64(child.Take("DigestValue"));
+    child.RequireEnd();
+    return reference;
+}
+
+void ReadSignedInfo(const ElementNode& element, SignatureModel& model)
+{
+    model.signedInfo = &element;
+    ChildCursor child(element);
+    model.canonicalization = ReadAlgorithm(child.Take("CanonicalizationMethod"));
+    model.signatureMethod = ReadAlgorithm(child.Take("SignatureMethod"));
+    while (child.Get() != nullptr) {
+        model.references.push_back(ReadReference(child.Take("Reference")));
+    }
+}
+
+/** Gathers the certificates; whatever else a key information may hold picks no trusted key. */
+KeyInfo ReadKeyInfo(const ElementNode& element)
+{
+    KeyInfo keyInfo;
+    for (ChildCursor data(element); data.Get() != nullptr; data.Advance()) {
+        if (!data.IsAt("X509Data")) {
+            continue;
+        }
+        for (ChildCursor item(*data.Get()); item.Get() != nullptr; item.Advance()) {
+            if (item.IsAt("X509Certificate")) {
+                keyInfo.certificates.push_back(ReadBase64(*item.Get()));
+            }
+        }
+    }
+    return keyInfo;
+}
+
+} // namespace
+
+SignatureSyntaxException::~SignatureSyntaxException() = default;
+
+SignatureModel ReadSignature(const ElementNode& signature)
+{
+    if (!signature.HasQName("Signature", DsNamespace)) {
+        Fail("Expected element 'Signature', found '" + std::string(signature.GetName()) + "'");
+    }
+    SignatureModel model;
+    ChildCursor child(signature);
+    ReadSignedInfo(child.Take("SignedInfo"), model);
+    model.signatureValue = ReadBase64(child.Take("SignatureValue"));
+    if (child.IsAt("KeyInfo")) {
+        model.keyInfo = ReadKeyInfo(child.Take("KeyInfo"));
+    }
+    child.RequireEnd();
+    return model;
+}
+
+} // namespace Quillon::Xml::Security

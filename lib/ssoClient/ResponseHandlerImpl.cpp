@@ -1,0 +1,191 @@
+#include "ssoClient/ResponseHandlerImpl.h"
+
+#include "quillon/PanicVerify.h"
+#include "quillon/xml/Parser.h"
+#include "quillon/xml/security/Canonicalizer.h"
+#include "quillon/xml/security/Identifiers.h"
+#include "ssoClient/Exceptions.h"
+#include "ssoClient/wireNames.h"
+#include "ssoClient/xmlReading.h"
+
+#include <algorithm>
+#include <initializer_list>
+#include <iterator>
+
+using Quillon::Ref;
+using Quillon::Xml::ElementNode;
+using Quillon::Xml::QName;
+
+namespace SsoClient {
+
+namespace {
+
+constexpr char Unit[] = "lib/ssoClient/ResponseHandlerImpl";
+constexpr char UnexpectedFormat[] = "Unexpected XML format";
+
+// A name in the reply's own terms: prefixes differ between services.
+struct FaultName
+{
+    const char* namespaceUri;
+    const char* localName;
+};
+
+// [WST13 11], [SOAP Message Security 1.0, 12]
+constexpr FaultName BadCredentials[] = {
+    {Wire::WsTrustNamespace, "FailedAuthentication"},
+    {Wire::WsTrustNamespace, "InvalidSecurityToken"},
+    {Wire::WsseNamespace, "InvalidSecurityToken"},
+};
+
+bool IsBadCredentials(const QName& code)
+{
+    return std::any_of(
+        std::begin(BadCredentials), std::end(BadCredentials), [&code](const FaultName& name) {
+            return code.GetNamespaceUri() == name.namespaceUri
+                   && code.GetLocalName() == name.localName;
+        });
+}
+
+// The text that an element starts with; empty for no element and for one without such a text.
+std::string GetElementText(const ElementNode* element)
+{
+    return GetText(GetTextNode(element));
+}
+
+[[noreturn]] void ThrowFault(const ElementNode& fault)
+{
+    const ElementNode* const faultCode = fault.FindChildElement("faultcode");
+    const std::string codeText = GetElementText(faultCode);
+    QName code;
+    if (!codeText.empty()) {
+        ResolveQName(faultCode, codeText, Wire::SoapNamespace, code);
+    }
+    if (code.GetLocalName().empty()) {
+        throw SsoException("Invalid SOAP response: missing faultcode.");
+    }
+    if (IsBadCredentials(code)) {
+        const std::string faultString = GetElementText(fault.FindChildElement("faultstring"));
+        throw InvalidCredentialsException(
+            "Authentication failed" + (faultString.empty() ? faultString : ": " + faultString));
+    }
+    throw SsoException("Unexpected SOAP fault: " + codeText + "; request failed.");
+}
+
+void ThrowIfFault(const ElementNode& envelope)
+{
+    const ElementNode* const body = envelope.FindChildElement("Body");
+    const ElementNode* const fault = body != nullptr ? body->FindChildElement("Fault") : nullptr;
+    if (fault != nullptr) {
+        ThrowFault(*fault);
+    }
+}
+
+Ref<Quillon::Xml::Document> ParseResponse(Quillon::Reader* body)
+{
+    Ref<Quillon::Xml::Document> document;
+    try {
+        ParseXML(body, document);
+    } catch (const Quillon::Xml::XMLParseException& error) {
+        throw SsoException(std::string("Response is not well-formed XML: ") + error.what());
+    }
+    return document;
+}
+
+// Hands the SOAP body of a reply that is not a fault to `extractor`.
+template <class Extractor>
+auto ProcessResponseWith(Quillon::Reader* body, const Extractor& extractor)
+{
+    const Ref<Quillon::Xml::Document> document = ParseResponse(body);
+    const ElementNode* const envelope = document->GetRootElement();
+    if (envelope == nullptr) {
+        Quillon::PanicVerify("envelope != __null", Unit, __LINE__);
+    }
+    ThrowIfFault(*envelope);
+    const ElementNode* const soapBody = envelope->FindChildElement("Body");
+    if (soapBody == nullptr) {
+        throw SsoException("Unexpected response format: missing SAOP Body.");
+    }
+    return extractor(*soapBody);
+}
+
+// Follows the path of local names, taking the first match at each step.
+const ElementNode& RequireDescendant(
+    const ElementNode& element, std::initializer_list<std::string_view> path)
+{
+    const ElementNode* current = &element;
+    for (const std::string_view localName : path) {
+        current = current->FindChildElement(localName);
+        if (current == nullptr) {
+            throw SsoException(UnexpectedFormat);
+        }
+    }
+    return *current;
+}
+
+// Inclusive, because it keeps every namespace declaration in scope: prefixes that only stand in
+// attribute values and text stay bound, and a signature in either canonical form still verifies.
+std::string ToCanonicalXml(const ElementNode& element)
+{
+    const Ref<Quillon::StringWriter> writer = Quillon::CreateStringWriter();
+    Quillon::Xml::Security::CreateCanonicalizer(Quillon::Xml::Security::InclusiveC14n)
+        ->Canonicalize(&element, writer.get());
+    return writer->TakeString();
+}
+
+std::string ExtractIssuedToken(const ElementNode& soapBody)
+{
+    return ToCanonicalXml(RequireDescendant(
+        soapBody,
+        {"RequestSecurityTokenResponseCollection",
+         "RequestSecurityTokenResponse",
+         "RequestedSecurityToken",
+         "Assertion"}));
+}
+
+// Only an issue request is answered by a collection [WST13 4.3, 5].
+std::string ExtractRenewedToken(const ElementNode& soapBody)
+{
+    return ToCanonicalXml(RequireDescendant(
+        soapBody, {"RequestSecurityTokenResponse", "RequestedSecurityToken", "Assertion"}));
+}
+
+bool ExtractValidity(const ElementNode& soapBody)
+{
+    const ElementNode& code =
+        RequireDescendant(soapBody, {"RequestSecurityTokenResponse", "Status", "Code"});
+    const Quillon::Xml::Node* const child = code.GetFirstChild();
+    const Quillon::Xml::TextNode* const text = Quillon::Xml::AsText(child);
+    if (text == nullptr) {
+        Quillon::ThrowTypeMismatchException(
+            ToString(Quillon::Xml::NodeType::TEXT),
+            child != nullptr ? ToString(child->GetNodeType()) : "nothing");
+    }
+    if (text->GetText() == Wire::ValidStatus) {
+        return true;
+    }
+    if (text->GetText() == Wire::InvalidStatus) {
+        return false;
+    }
+    throw SsoException(UnexpectedFormat);
+}
+
+} // namespace
+
+void ResponseHandlerImpl::HandleAcquireTokenResponse(
+    Quillon::Reader* body, std::string& tokenXml) const
+{
+    tokenXml = ProcessResponseWith(body, ExtractIssuedToken);
+}
+
+bool ResponseHandlerImpl::HandleValidateSubjectResponse(Quillon::Reader* body) const
+{
+    return ProcessResponseWith(body, ExtractValidity);
+}
+
+void ResponseHandlerImpl::HandleRenewTokenResponse(
+    Quillon::Reader* body, std::string& tokenXml) const
+{
+    tokenXml = ProcessResponseWith(body, ExtractRenewedToken);
+}
+
+} // namespace SsoClient

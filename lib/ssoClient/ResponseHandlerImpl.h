@@ -1,0 +1,15 @@
+#pragma once
+
+#include "ssoClient/ResponseHandler.h"
+
+namespace SsoClient {
+
+class ResponseHandlerImpl final : public ResponseHandler
+{
+public:
+    void HandleAcquireTokenResponse(Quillon::Reader* body, std::string& tokenXml) const override;
+    bool HandleValidateSubjectResponse(Quillon::Reader* body) const override;
+    void HandleRenewTokenResponse(Quillon::Reader* body, std::string& tokenXml) const override;
+};
+
+} // namespace SsoClient

@@ -1,0 +1,47 @@
+#pragma once
+
+#include "ssoClient/RequestBuilder.h"
+#include "ssoClient/ResponseHandler.h"
+#include "ssoClient/SecurityTokenService.h"
+#include "ssoClient/Transport.h"
+
+#include <list>
+
+namespace SsoClient {
+
+/** Each operation is one road: build a request, send it, read the reply, verify the token. */
+class SecurityTokenServiceImpl final : public SecurityTokenService
+{
+public:
+    SecurityTokenServiceImpl(
+        const boost::shared_ptr<const RequestBuilder>& requestBuilder,
+        const boost::shared_ptr<const Transport>& transport,
+        const boost::shared_ptr<const ResponseHandler>& responseHandler,
+        const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates);
+
+    boost::shared_ptr<const SamlToken> AcquireToken(
+        const std::string& userName,
+        const std::string& password,
+        const TokenSpec& spec) const override;
+    boost::shared_ptr<const SamlToken> AcquireTokenByCertificate(
+        const TokenSpec& spec) const override;
+    boost::shared_ptr<const SamlToken> AcquireTokenByToken(
+        const SamlToken& token, const TokenSpec& spec) const override;
+    bool ValidateSubject(const SamlToken& token) const override;
+    boost::shared_ptr<const SamlToken> RenewToken(
+        const SamlToken& token, long long lifetimeSec) const override;
+
+private:
+    /** Sends the request in a session of its own. @return the reply. */
+    Quillon::Ref<Quillon::Reader> Send(const Request& request) const;
+
+    /** @return the verified token; null for an empty text. */
+    boost::shared_ptr<const SamlToken> ToSamlToken(const std::string& tokenXml) const;
+
+    boost::shared_ptr<const RequestBuilder> _requestBuilder;
+    boost::shared_ptr<const Transport> _transport;
+    boost::shared_ptr<const ResponseHandler> _responseHandler;
+    std::list<Quillon::Ref<const Quillon::Crypto::Certificate>> _trustedCertificates;
+};
+
+} // namespace SsoClient

@@ -1,0 +1,310 @@
+#include "TokenTable.h"
+
+#include <gtest/gtest.h>
+
+#include <ostream>
+#include <stdexcept>
+
+namespace HostileTests {
+
+namespace {
+
+constexpr std::size_t Million = 1000000;
+
+const char XmlError[] = "Quillon::Xml::XMLParseException";
+const std::vector<Refusal> OverLimit{{XmlError, "", "", ""}};
+const std::vector<Refusal> BadSignature{
+    {"SsoClient::InvalidSignatureException", "", "", ""},
+    {"SsoClient::ParseException", "", "Signature syntax error: ", ""}};
+
+/** A genuine token with `inserted` put before the one place where `mark` stands. */
+struct HugeCase
+{
+    std::string name;
+    std::string mark;
+    std::string (*make)();
+    std::vector<Refusal> refusals; ///< none: the token is accepted as if nothing was inserted
+};
+
+std::ostream& operator<<(std::ostream& out, const HugeCase& hugeCase)
+{
+    return out << hugeCase.name;
+}
+
+std::string Repeat(const std::string& text, std::size_t count)
+{
+    std::string result;
+    result.reserve(text.size() * count);
+    for (std::size_t i = 0; i < count; ++i) {
+        result += text;
+    }
+    return result;
+}
+
+std::string Numbered(const std::string& before, const std::string& after, std::size_t count)
+{
+    std::string result;
+    for (std::size_t i = 0; i < count; ++i) {
+        result.append(before).append(std::to_string(i)).append(after);
+    }
+    return result;
+}
+
+std::string Nested(std::size_t depth)
+{
+    return Repeat("<a>", depth) + Repeat("</a>", depth);
+}
+
+std::string InKeyInfo(const std::string& content)
+{
+    return "<ds:KeyInfo>" + content + "</ds:KeyInfo>";
+}
+
+std::string Insert(const std::string& xml, const std::string& mark, const std::string& inserted)
+{
+    const std::size_t position = xml.find(mark);
+    if (position == std::string::npos || xml.find(mark, position + 1) != std::string::npos) {
+        throw std::runtime_error(mark + " does not stand once in the token");
+    }
+    std::string result = xml;
+    return result.insert(position, inserted);
+}
+
+const char BeforeSubject[] = "<saml:Subject>";
+const char SignatureEnd[] = "</ds:Signature>";
+const char SignedInfoEnd[] = "</ds:SignedInfo>";
+const char TransformsEnd[] = "</ds:Transforms>";
+const char InIssuerTag[] = " Format=\"urn:oasis:names:tc:SAML:2.0:nameid-format:entity\"";
+const char InGivenName[] = "Ada</saml:AttributeValue>";
+
+// The signature covers nothing of KeyInfo, and nothing in it but certificates is looked at. So
+// the limits can be touched there from both sides with a genuine signature. The elements above
+// are Assertion, Signature and KeyInfo.
+const std::vector<HugeCase> HugeCases{
+    {"DepthAtLimit", SignatureEnd, [] { return InKeyInfo(Nested(125)); }, {}},
+    {"DepthOverLimit", SignatureEnd, [] { return InKeyInfo(Nested(126)); }, OverLimit},
+    {"AttributesAtLimit",
+     SignatureEnd,
+     [] { return InKeyInfo("<a" + Numbered(" a", "=''", 256) + "/>"); },
+     {}},
+    {"AttributesOverLimit",
+     SignatureEnd,
+     [] { return InKeyInfo("<a" + Numbered(" a", "=''", 257) + "/>"); },
+     OverLimit},
+    {"NamespacesAtLimit",
+     SignatureEnd,
+     [] { return InKeyInfo("<a" + Numbered(" xmlns:a", "='urn:a'", 64) + "/>"); },
+     {}},
+    {"NamespacesOverLimit",
+     SignatureEnd,
+     [] { return InKeyInfo("<a" + Numbered(" xmlns:a", "='urn:a'", 65) + "/>"); },
+     OverLimit},
+    {"NamespacesInScopeOverLimit",
+     SignatureEnd,
+     [] {
+         std::string open;
+         for (int i = 0; i < 5; ++i) {
+             const std::string prefix = " xmlns:p" + std::to_string(i) + "x";
+             open += "<a" + Numbered(prefix, "='urn:a'", 60) + ">";
+         }
+         return InKeyInfo(open + Repeat("</a>", 5));
+     },
+     OverLimit},
+
+    {"TwoHundredThousandLevels", BeforeSubject, [] { return Nested(200 * 1000); }, OverLimit},
+    {"TwoHundredThousandLevelsInSignature",
+     SignatureEnd,
+     [] { return InKeyInfo(Nested(200 * 1000)); },
+     OverLimit},
+    {"TwoHundredThousandUnclosedLevels",
+     BeforeSubject,
+     [] { return Repeat("<a>", 200 * 1000); },
+     OverLimit},
+    {"TwoHundredThousandAttributes",
+     InIssuerTag,
+     [] { return Numbered(" a", "=\"\"", 200 * 1000); },
+     OverLimit},
+    {"TwoHundredThousandEqualAttributes",
+     InIssuerTag,
+     [] { return Repeat(" a=\"\"", 200 * 1000); },
+     OverLimit},
+    {"TwoHundredThousandPrefixedAttributes",
+     InIssuerTag,
+     [] { return " xmlns:p=\"urn:p\"" + Numbered(" p:a", "=\"\"", 200 * 1000); },
+     OverLimit},
+    {"HundredThousandNamespaces",
+     InIssuerTag,
+     [] { return Numbered(" xmlns:a", "=\"urn:a\"", 100 * 1000); },
+     OverLimit},
+    {"HundredThousandNamespacesOnNestedElements",
+     BeforeSubject,
+     [] { return Numbered("<a xmlns:a", "=\"urn:a\">", 100 * 1000); },
+     OverLimit},
+    {"ThirtyMegabytesOfText",
+     InGivenName,
+     [] { return std::string(30 * Million, 'a'); },
+     OverLimit},
+    {"ThirtyMegabytesOfBlanks",
+     BeforeSubject,
+     [] { return std::string(30 * Million, ' '); },
+     OverLimit},
+    {"ThirtyMegabytesInAnAttribute",
+     InIssuerTag,
+     [] { return " a=\"" + std::string(30 * Million, 'a') + "\""; },
+     OverLimit},
+    {"ThirtyMegabytesInAComment",
+     BeforeSubject,
+     [] { return "<!--" + std::string(30 * Million, 'a') + "-->"; },
+     OverLimit},
+
+    {"MillionComments", BeforeSubject, [] { return Repeat("<!---->", Million); }, {}},
+    {"MillionLargerComments",
+     BeforeSubject,
+     [] { return Repeat("<!-- larger -->", Million); },
+     OverLimit},
+    {"MillionCommentsInSignedInfo", SignedInfoEnd, [] { return Repeat("<!---->", Million); }, {}},
+    {"SevenMegabytesInAComment",
+     BeforeSubject,
+     [] { return "<!--" + std::string(7 * Million, 'a') + "-->"; },
+     {}},
+    {"SevenMegabytesOfText",
+     InGivenName,
+     [] { return std::string(7 * Million, 'a'); },
+     BadSignature},
+    {"SevenMegabytesInAnAttribute",
+     InIssuerTag,
+     [] { return " a=\"" + std::string(7 * Million, 'a') + "\""; },
+     {{"SsoClient::ParseException", "Unexpected attributes on element 'Issuer'", "", ""}}},
+    {"SevenMegabytesOfAnElementName",
+     BeforeSubject,
+     [] { return "<" + std::string(7 * Million, 'a') + "/>"; },
+     {{"SsoClient::ParseException", "Expected element 'Subject' not found.", "", ""},
+      {XmlError, "", "", ""}}},
+    {"MillionCharacterReferences",
+     InGivenName,
+     [] { return Repeat("&#65;", Million); },
+     BadSignature},
+    {"HalfMillionSections",
+     InGivenName,
+     [] { return Repeat("<![CDATA[a]]>", Million / 2); },
+     BadSignature},
+    {"MillionInstructions",
+     BeforeSubject,
+     [] { return Repeat("<?a ?>", Million); },
+     {{"SsoClient::ParseException", "Expected element 'Subject' not found.", "", ""}}},
+
+    {"TenThousandReferences",
+     SignedInfoEnd,
+     [] { return Repeat("<ds:Reference URI=\"\"></ds:Reference>", 10 * 1000); },
+     BadSignature},
+    {"TenThousandWholeReferences",
+     SignedInfoEnd,
+     [] {
+         return Repeat(
+             "<ds:Reference URI=\"\"><ds:Transforms><ds:Transform Algorithm=\"http://www.w3.org/"
+             "2000/09/xmldsig#enveloped-signature\"/></ds:Transforms><ds:DigestMethod Algorithm="
+             "\"http://www.w3.org/2001/04/xmlenc#sha256\"/><ds:DigestValue>"
+             "AAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAA=</ds:DigestValue></ds:Reference>",
+             10 * 1000);
+     },
+     BadSignature},
+    {"HundredThousandTransforms",
+     TransformsEnd,
+     [] {
+         return Repeat(
+             "<ds:Transform Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/>", 100 * 1000);
+     },
+     BadSignature},
+    {"HundredThousandListedPrefixes",
+     TransformsEnd,
+     [] {
+         return "<ds:Transform Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\">"
+                "<ec:InclusiveNamespaces xmlns:ec=\"http://www.w3.org/2001/10/xml-exc-c14n#\" "
+                "PrefixList=\""
+                + Numbered(" p", "", 100 * 1000) + "\"/></ds:Transform>";
+     },
+     BadSignature},
+    {"SevenMegabytesOfSignatureValue",
+     "</ds:SignatureValue>",
+     [] { return std::string(7 * Million, 'A'); },
+     BadSignature},
+    {"SevenMegabytesOfBlanksInSignatureValue",
+     "</ds:SignatureValue>",
+     [] { return std::string(7 * Million, '\n'); },
+     {}},
+    {"SevenMegabytesOfDigestValue",
+     "</ds:DigestValue>",
+     [] { return std::string(7 * Million, 'A'); },
+     BadSignature},
+    {"KeyInfoOfSevenMegabytes",
+     SignatureEnd,
+     [] { return InKeyInfo("<ds:KeyName>" + std::string(7 * Million, 'a') + "</ds:KeyName>"); },
+     {}},
+    {"KeyInfoOfAMillionElements",
+     SignatureEnd,
+     [] { return InKeyInfo(Repeat("<a/>", Million)); },
+     {}},
+    {"KeyInfoOfOneHugeCertificate",
+     SignatureEnd,
+     [] {
+         return InKeyInfo(
+             "<ds:X509Data><ds:X509Certificate>" + std::string(4 * Million, 'A')
+             + "</ds:X509Certificate></ds:X509Data>");
+     },
+     BadSignature},
+    {"KeyInfoOfHundredThousandCertificates",
+     SignatureEnd,
+     [] {
+         return InKeyInfo(
+             "<ds:X509Data>" + Repeat("<ds:X509Certificate>AAAA</ds:X509Certificate>", 100 * 1000)
+             + "</ds:X509Data>");
+     },
+     BadSignature},
+};
+
+class HugeToken : public testing::TestWithParam<HugeCase>
+{};
+
+std::string NameOf(const testing::TestParamInfo<HugeCase>& info)
+{
+    return info.param.name;
+}
+
+} // namespace
+
+TEST_P(HugeToken, IsJudgedWithinItsLimits)
+{
+    const TokenCase& line = GetTokenCase("accepted/bearer.xml");
+    const std::string xml = Insert(ReadToken(line), GetParam().mark, GetParam().make());
+    const Verdict verdict = Judge(xml, GetConditions(line));
+    if (GetParam().refusals.empty()) {
+        ASSERT_TRUE(verdict.IsAccepted()) << Describe(verdict);
+        EXPECT_EQ(*verdict.facts, line.facts);
+    } else {
+        EXPECT_TRUE(IsAmong(verdict, GetParam().refusals))
+            << "found:    " << Describe(verdict).substr(0, 1000)
+            << "\nexpected: " << Describe(GetParam().refusals);
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Of, HugeToken, testing::ValuesIn(HugeCases), NameOf);
+
+TEST(HugeDocument, IsAcceptedUpToTheLimit)
+{
+    const TokenCase& line = GetTokenCase("accepted/bearer.xml");
+    const std::string token = ReadToken(line);
+    const std::string xml = token + std::string(8 * 1024 * 1024 - token.size(), ' ');
+    const Verdict verdict = Judge(xml, GetConditions(line));
+    ASSERT_TRUE(verdict.IsAccepted()) << Describe(verdict);
+    EXPECT_EQ(*verdict.facts, line.facts);
+}
+
+TEST(HugeDocument, IsRefusedAByteOverTheLimit)
+{
+    const TokenCase& line = GetTokenCase("accepted/bearer.xml");
+    const std::string token = ReadToken(line);
+    const std::string xml = token + std::string(8 * 1024 * 1024 - token.size() + 1, ' ');
+    EXPECT_EQ(Judge(xml, GetConditions(line)).className, XmlError);
+}
+
+} // namespace HostileTests

@@ -1,0 +1,34 @@
+#pragma once
+
+#include "Verdict.h"
+
+#include <iosfwd>
+#include <string>
+#include <vector>
+
+namespace HostileTests {
+
+/** One token file and what must come of it, as the table beside the files says. */
+struct TokenCase
+{
+    std::string file;  ///< relative to the folder of tokens
+    std::string about; ///< what is special about it
+    std::vector<std::string> trusted;
+    long long nowMicros = 0;
+    long long toleranceSec = 0;
+    std::string facts;             ///< of an accepted token, as `DescribeFacts` writes them
+    std::vector<Refusal> refusals; ///< of a refused one: any of these
+};
+
+std::ostream& operator<<(std::ostream& out, const TokenCase& tokenCase);
+
+/** All lines of the table. Throws `std::exception` if it cannot be read. */
+const std::vector<TokenCase>& GetTokenTable();
+
+/** The line of one file, for example "accepted/bearer.xml". */
+const TokenCase& GetTokenCase(const std::string& file);
+
+std::string ReadToken(const TokenCase& tokenCase);
+Conditions GetConditions(const TokenCase& tokenCase);
+
+} // namespace HostileTests

@@ -1,0 +1,24 @@
+// Uses the installed library as another project would: prints what it says about a text that is
+// not a token, and about a service without TLS settings.
+
+#include "quillon/xml/Parser.h"
+#include "ssoClient/CreateSamlToken.h"
+#include "ssoClient/SecurityTokenService.h"
+
+#include <iostream>
+
+int main()
+{
+    try {
+        SsoClient::CreateSamlToken("this is no XML", {});
+    } catch (const Quillon::Xml::XMLParseException& error) {
+        std::cout << Quillon::GetClassName(error) << "\n";
+    }
+    try {
+        SsoClient::SecurityTokenServiceConfig config;
+        config.url = "https://sts.example.com/sts";
+        SsoClient::CreateSecurityTokenService(config);
+    } catch (const Quillon::InvalidArgumentException& error) {
+        std::cout << error.what() << "\n";
+    }
+}

@@ -1,0 +1,68 @@
+"""Installs into a temporary prefix, moves it, and builds and runs other projects with it."""
+
+import os
+import pathlib
+import subprocess
+import tempfile
+import unittest
+
+CONSUMER = pathlib.Path(__file__).resolve().parent / "consumer"
+CXX = os.environ["CXX"]
+FLAGS = [f"-fsanitize={os.environ['SANITIZE']}"] if os.environ["SANITIZE"] else []
+CONSUMER_SAYS = ("XMLParseException\n"
+                 "Invalid argument : HTTPS connection requested but no SSLContext provided.\n")
+
+
+def run(*command, **environment):
+    result = subprocess.run([str(part) for part in command], text=True, capture_output=True,
+                            env={**os.environ, **environment})
+    if result.returncode != 0:
+        raise AssertionError(f"{command}\n{result.stdout}{result.stderr}")
+    return result.stdout
+
+
+class Install(unittest.TestCase):
+    @classmethod
+    def setUpClass(cls):
+        folder = tempfile.TemporaryDirectory()
+        cls.addClassCleanup(folder.cleanup)
+        cls.folder = pathlib.Path(folder.name)
+        run(os.environ["CMAKE"], "--install", os.environ["BUILD_DIR"], "--prefix",
+            cls.folder / "first")
+        cls.prefix = (cls.folder / "first").rename(cls.folder / "moved")
+        cls.libraries = cls.prefix / os.environ["LIBDIR"]
+
+    def test_cmake_package(self):
+        build = self.folder / "build"
+        run(os.environ["CMAKE"], "-S", CONSUMER, "-B", build, f"-DCMAKE_PREFIX_PATH={self.prefix}",
+            f"-DCMAKE_CXX_COMPILER={CXX}", f"-DCMAKE_CXX_FLAGS={' '.join(FLAGS)}")
+        run(os.environ["CMAKE"], "--build", build)
+        self.assertEqual(CONSUMER_SAYS, run(build / "consumer"))
+        self.assertEqual("aW5zdGFsbGVk\n", run(build / "quillon-consumer"))
+
+    def build_with_pkg_config(self, package, source):
+        program = self.folder / package
+        flags = run("pkg-config", "--cflags", "--libs", package,
+                    PKG_CONFIG_PATH=str(self.libraries / "pkgconfig")).split()
+        run(CXX, "-std=c++17", *FLAGS, CONSUMER / source, "-o", program, *flags)
+        return run(program, LD_LIBRARY_PATH=str(self.libraries))
+
+    def test_pkg_config(self):
+        self.assertEqual(CONSUMER_SAYS, self.build_with_pkg_config("ssoclient", "consumer.cpp"))
+        self.assertEqual("aW5zdGFsbGVk\n",
+                         self.build_with_pkg_config("quillon", "quillon_consumer.cpp"))
+
+    def test_tools_find_their_libraries(self):
+        self.assertRegex(run(self.prefix / "bin" / "ssoclient", "--version"), r"^ssoclient \d")
+        self.assertIn("--state", run(self.prefix / "bin" / "ssoclient-devsts", "--help"))
+
+    def test_private_headers_stay_at_home(self):
+        installed = {path.relative_to(self.prefix / "include").as_posix()
+                     for path in (self.prefix / "include").rglob("*") if path.is_file()}
+        public = pathlib.Path(__file__).resolve().parents[2] / "lib" / "public"
+        self.assertEqual({path.relative_to(public).as_posix() for path in public.rglob("*.h")},
+                         installed)
+
+
+if __name__ == "__main__":
+    unittest.main()

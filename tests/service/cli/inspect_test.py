@@ -1,0 +1,131 @@
+"""`ssoclient inspect` on the test tokens, which independent tools made and signed."""
+
+import datetime
+import json
+import unittest
+
+from programs import DATA, DONE, REFUSED, ProgramTest, ssoclient
+
+TOKENS = DATA / "tokens"
+# The tokens are of other years; this tolerance takes the clock out of the test.
+ANY_TIME = ("--clock-tolerance", "3153600000")
+
+
+def entries(folder):
+    """The tokens of a folder that do not depend on the time, with what is expected of them."""
+    expected = json.loads((TOKENS / "expected.json").read_text("utf-8"))
+    found = [entry for entry in expected["tokens"]
+             if entry["file"].startswith(folder) and "now" not in entry]
+    assert len(found) > 50
+    return found
+
+
+def trust(entry):
+    return ["--trust", *(DATA / "keys" / f"{key}-cert.pem" for key in entry.get("trust", ["sts"]))]
+
+
+def text_of(micros):
+    time = datetime.datetime(1970, 1, 1) + datetime.timedelta(microseconds=micros)
+    digits = 3 if micros % 1000 == 0 else 6
+    return time.strftime("%Y-%m-%dT%H:%M:%S.%f")[:20 + digits] + "Z"
+
+
+def principal(pair):
+    return {"name": pair[0], "domain": pair[1]}
+
+
+def json_of(facts):
+    return {
+        "subject": principal(facts["subject"]),
+        "groups": [principal(group) for group in facts["groups"]],
+        "delegationChain": [
+            {"subject": principal((name, domain)), "delegationDate": text_of(micros)}
+            for name, domain, micros in facts["delegationChain"]],
+        "startTime": text_of(facts["startMicros"]),
+        "expirationTime": text_of(facts["endMicros"]),
+        "renewable": facts["renewable"],
+        "delegable": facts["delegable"],
+        "isSolution": facts["solution"],
+        "confirmationType": facts["confirmation"],
+    }
+
+
+class AcceptedTokens(ProgramTest):
+    def test_print_their_facts(self):
+        for entry in entries("accepted/"):
+            with self.subTest(token=entry["file"]):
+                result = ssoclient("inspect", TOKENS / entry["file"], *trust(entry), *ANY_TIME,
+                                   "--json")
+                self.assertEqual((DONE, ""), (result.code, result.err))
+                self.assertEqual(json_of(entry["facts"]), json.loads(result.out))
+
+
+class RefusedTokens(ProgramTest):
+    def test_name_the_class_and_the_reason(self):
+        for entry in entries("refused/"):
+            with self.subTest(token=entry["file"]):
+                result = ssoclient("inspect", TOKENS / entry["file"], *trust(entry), *ANY_TIME)
+                self.assertEqual((REFUSED, ""), (result.code, result.out))
+                self.assertEqual(1, result.err.count("\n"))
+                self.assertTrue(any(self.says(result.err, refusal)
+                                    for refusal in entry["refusals"]), result.err)
+
+    @staticmethod
+    def says(line, refusal):
+        start = f"ssoclient: {refusal['class'].rpartition('::')[2]}: "
+        if "message" in refusal:
+            return line == f"{start}{refusal['message']}\n"
+        return line.startswith(start + refusal.get("prefix", ""))
+
+
+class Inspect(ProgramTest):
+    TOKEN = TOKENS / "accepted" / "bearer.xml"
+    TRUST = ("--trust", DATA / "keys" / "sts-cert.pem")
+
+    def test_prints_the_redacted_description(self):
+        result = ssoclient("inspect", self.TOKEN, *self.TRUST, *ANY_TIME)
+        self.assertEqual((DONE, ""), (result.code, result.err))
+        self.assertEqual(
+            "SamlToken [subject={Name: user; Domain:example.com}, "
+            "groups=[{Name: Users; Domain:example.com}], delegationChain=[], "
+            "startTime=2026-01-01T00:00:00.000Z, expirationTime=2026-12-31T00:00:00.000Z, "
+            "renewable=false, delegable=false, isSolution=false,confirmationType=0]\n", result.out)
+
+    def test_reads_standard_input(self):
+        result = ssoclient("inspect", "-", *self.TRUST, *ANY_TIME,
+                           stdin=self.TOKEN.read_text("utf-8"))
+        self.assertEqual((DONE, ""), (result.code, result.err))
+        self.assertRegex(result.out, r"\ASamlToken \[")
+
+    def test_file_may_stand_after_the_trusted_certificates(self):
+        result = ssoclient("inspect", *self.TRUST, self.TOKEN, *ANY_TIME)
+        self.assertEqual((DONE, ""), (result.code, result.err))
+
+    def test_tells_a_foreign_signature(self):
+        result = ssoclient("inspect", self.TOKEN, "--trust", DATA / "keys" / "foreign-cert.pem",
+                           *ANY_TIME)
+        self.assert_fails_matching(result, REFUSED, "InvalidSignatureException", ".+")
+
+    def test_tells_a_changed_byte(self):
+        text = self.TOKEN.read_text("utf-8")
+        self.assertEqual(1, text.count("Users"))
+        result = ssoclient("inspect", "-", *self.TRUST, *ANY_TIME,
+                           stdin=text.replace("Users", "User5"))
+        self.assert_fails(result, REFUSED, "InvalidSignatureException",
+                          "Failed to verify signature: token might have been tampered with.")
+
+    def test_the_clock_counts_unless_it_is_told_otherwise(self):
+        token = TOKENS / "accepted" / "clock-start-equals-now.xml"
+        self.assert_fails(ssoclient("inspect", token, *self.TRUST), REFUSED, "ParseException",
+                          "The token has expired at: 2026-06-15T13:00:00.000Z")
+        result = ssoclient("inspect", token, *self.TRUST, *ANY_TIME)
+        self.assertEqual((DONE, ""), (result.code, result.err))
+
+    def test_oversized_token_is_refused_by_the_library(self):
+        text = f"<a>{'x' * 30_000_000}</a>"
+        result = ssoclient("inspect", "-", *self.TRUST, stdin=text)
+        self.assert_fails_matching(result, REFUSED, "XMLParseException", ".+")
+
+
+if __name__ == "__main__":
+    unittest.main()

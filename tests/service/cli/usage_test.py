@@ -1,0 +1,121 @@
+"""What the command line says before anything is asked of a service."""
+
+import unittest
+
+from programs import DATA, REFUSED, USAGE, ProgramTest, ssoclient
+
+STS_CERTIFICATE = DATA / "keys" / "sts-cert.pem"
+
+
+class Help(unittest.TestCase):
+    def assert_prints(self, result, *texts):
+        self.assertEqual((0, ""), (result.code, result.err))
+        for text in texts:
+            self.assertIn(text, result.out)
+
+    def test_of_the_program_names_the_commands(self):
+        self.assert_prints(ssoclient("--help"), "acquire", "inspect")
+
+    def test_of_a_command_names_its_options(self):
+        self.assert_prints(ssoclient("acquire", "password", "--help"), "--url", "--user",
+                           "--password-file", "--trust", "--ca", "--peer", "--lifetime",
+                           "--renewable", "--delegable", "--delegate-to", "--audience", "--out",
+                           "--json", "--verbose")
+        self.assert_prints(ssoclient("inspect", "--help"), "FILE", "--trust", "--clock-tolerance",
+                           "--json")
+
+    def test_version(self):
+        result = ssoclient("--version")
+        self.assertEqual((0, ""), (result.code, result.err))
+        self.assertRegex(result.out, r"\Assoclient \d+\.\d+\.\d+\n\Z")
+
+
+class UsageErrors(ProgramTest):
+    def assert_usage_error(self, pattern, *arguments):
+        self.assert_fails_matching(ssoclient(*arguments), USAGE, "UsageError", pattern)
+
+    def test_without_a_command(self):
+        self.assert_usage_error("A subcommand is required")
+
+    def test_unknown_command(self):
+        self.assert_usage_error(".*wish.*", "wish")
+
+    def test_acquire_without_a_way(self):
+        self.assert_usage_error("A subcommand is required", "acquire")
+
+    def test_unknown_option(self):
+        self.assert_usage_error(".*--wish.*", "inspect", "x", "--trust", "y", "--wish")
+
+    def test_missing_options(self):
+        options = {"--url": "https://127.0.0.1:1/sts", "--user": "u", "--trust": STS_CERTIFICATE}
+        for missing in options:
+            with self.subTest(missing=missing):
+                rest = [part for name, value in options.items() if name != missing
+                        for part in (name, value)]
+                self.assert_usage_error(f"{missing} is required", "acquire", "password", *rest)
+        self.assert_usage_error("--trust is required", "inspect", "x")
+        self.assert_usage_error("FILE is required", "inspect", "--trust", STS_CERTIFICATE)
+
+    def test_clock_tolerance_that_is_no_tolerance(self):
+        for value in ("-1", "3153600001", "ten", "9223372036854775808", ""):
+            with self.subTest(value=value):
+                self.assert_usage_error(".*--clock-tolerance.*", "inspect", "x", "--trust",
+                                        STS_CERTIFICATE, "--clock-tolerance", value)
+
+    def test_lifetime_that_is_no_number(self):
+        self.assert_usage_error(".*--lifetime.*", "acquire", "password", "--url", "x", "--user",
+                                "x", "--trust", STS_CERTIFICATE, "--lifetime", "long")
+
+    def test_missing_token_file(self):
+        self.assert_usage_error("cannot open `/no/such/file': No such file or directory",
+                                "inspect", "/no/such/file", "--trust", STS_CERTIFICATE)
+
+    def test_token_file_that_is_a_folder(self):
+        self.assert_usage_error(f"cannot read `{self.folder}': Is a directory",
+                                "inspect", self.folder, "--trust", STS_CERTIFICATE)
+
+    def test_missing_trust_file(self):
+        self.assert_usage_error("cannot open `/no/such/file': No such file or directory",
+                                "inspect", "x", "--trust", "/no/such/file")
+
+    def test_trust_file_without_certificate(self):
+        for text in ("", "no certificate\n", "-----BEGIN CERTIFICATE-----\nAAAA\n"
+                     "-----END CERTIFICATE-----\n"):
+            with self.subTest(text=text):
+                path = self.write("trust.pem", text)
+                self.assert_usage_error(f"cannot take certificates from `{path}': .+",
+                                        "inspect", "x", "--trust", path)
+
+    def test_private_key_in_place_of_a_certificate(self):
+        path = DATA / "keys" / "sts-key.pem"
+        self.assert_usage_error(f"cannot take certificates from `{path}': .+",
+                                "inspect", "x", "--trust", path)
+
+    def test_malformed_url(self):
+        password = self.write("password", "x\n")
+        for url in ("", "sts.example.com", "ftp://sts.example.com/", "https://", "https://h:0x/"):
+            with self.subTest(url=url):
+                result = ssoclient("acquire", "password", "--url", url, "--user", "u",
+                                   "--trust", STS_CERTIFICATE, "--password-file", password)
+                self.assert_fails_matching(result, USAGE, "InvalidArgumentException",
+                                           "Invalid argument : .+")
+
+    def test_line_breaks_and_control_characters_of_an_argument_become_blanks(self):
+        result = ssoclient("inspect", "a\nb\r\x1b[31m\u009b\u2028c", "--trust", STS_CERTIFICATE)
+        self.assert_fails(result, USAGE, "UsageError",
+                          "cannot open `a b  [31m  c': No such file or directory")
+
+
+class InputThatIsNoToken(ProgramTest):
+    def test_is_refused_and_no_usage_error(self):
+        for text in ("", "no xml", "<a/>"):
+            with self.subTest(text=text):
+                result = ssoclient("inspect", "-", "--trust", STS_CERTIFICATE, stdin=text)
+                self.assertEqual(REFUSED, result.code)
+                self.assertRegex(result.err,
+                                 r"\Assoclient: (XMLParseException|ParseException): .+\n\Z")
+                self.assertEqual("", result.out)
+
+
+if __name__ == "__main__":
+    unittest.main()

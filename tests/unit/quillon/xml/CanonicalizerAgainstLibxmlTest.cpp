@@ -1,0 +1,141 @@
+#include "RandomDocument.h"
+#include "XmlSupport.h"
+
+#include <libxml/c14n.h>
+#include <libxml/parser.h>
+
+#include <gtest/gtest.h>
+
+#include <memory>
+
+// The canonicalizer must agree octet for octet with an independent one on whatever it is given.
+namespace Quillon::Xml {
+
+namespace {
+
+constexpr unsigned Documents = 10000;
+
+struct DocDeleter
+{
+    void operator()(xmlDoc* doc) const noexcept { xmlFreeDoc(doc); }
+};
+using DocOwner = std::unique_ptr<xmlDoc, DocDeleter>;
+
+DocOwner ParseWithLibxml(const std::string& text)
+{
+    return DocOwner(xmlReadMemory(
+        text.data(),
+        static_cast<int>(text.size()),
+        "",
+        nullptr,
+        XML_PARSE_NONET | XML_PARSE_NOENT | XML_PARSE_NOERROR | XML_PARSE_NOWARNING));
+}
+
+/** Whether a node, or the element of an attribute or namespace, lies under the chosen apex. */
+int IsUnderApex(void* apex, xmlNode* node, xmlNode* parent)
+{
+    const bool isNamespace = node->type == XML_NAMESPACE_DECL;
+    for (xmlNode* up = isNamespace ? parent : node; up != nullptr; up = up->parent) {
+        if (up == apex) {
+            return 1;
+        }
+    }
+    return 0;
+}
+
+/** @param apex  null for the whole document. */
+std::string CanonicalizeWithLibxml(
+    xmlDoc* doc, xmlNode* apex, bool isExclusive, const std::vector<std::string>& prefixes)
+{
+    std::vector<xmlChar*> list;
+    for (const std::string& prefix : prefixes) {
+        list.push_back(const_cast<xmlChar*>(reinterpret_cast<const xmlChar*>(prefix.c_str())));
+    }
+    list.push_back(nullptr);
+    xmlOutputBuffer* buffer = xmlAllocOutputBuffer(nullptr);
+    const int result = xmlC14NExecute(
+        doc,
+        apex == nullptr ? nullptr : &IsUnderApex,
+        apex,
+        isExclusive ? XML_C14N_EXCLUSIVE_1_0 : XML_C14N_1_0,
+        isExclusive ? list.data() : nullptr,
+        0,
+        buffer);
+    std::string text = "failed";
+    if (result >= 0) {
+        text.assign(
+            reinterpret_cast<const char*>(xmlOutputBufferGetContent(buffer)),
+            xmlOutputBufferGetSize(buffer));
+    }
+    xmlOutputBufferClose(buffer);
+    return text;
+}
+
+/** The elements of both trees, in the same document order. */
+void CollectElements(xmlNode* node, std::vector<xmlNode*>& elements)
+{
+    for (; node != nullptr; node = node->next) {
+        if (node->type == XML_ELEMENT_NODE) {
+            elements.push_back(node);
+            CollectElements(node->children, elements);
+        }
+    }
+}
+
+void CollectElements(const Node* node, std::vector<const ElementNode*>& elements)
+{
+    for (; node != nullptr; node = node->GetNextSibling()) {
+        if (const ElementNode* element = AsElement(node)) {
+            elements.push_back(element);
+            CollectElements(element->GetFirstChild(), elements);
+        }
+    }
+}
+
+const std::vector<std::vector<std::string>> PrefixLists{
+    {}, {"a", "zz"}, {"#default"}, {"#default", "b", "ns-1", "unused"}};
+
+class CanonicalizeAgainstLibxml : public testing::TestWithParam<bool>
+{
+protected:
+    void Compare(unsigned seed)
+    {
+        const std::string text = RandomDocument(seed).Make();
+        const DocOwner doc = ParseWithLibxml(text);
+        ASSERT_NE(doc, nullptr) << text;
+        const Ref<Document> ours = ParseText(text);
+        std::vector<xmlNode*> theirElements;
+        std::vector<const ElementNode*> ourElements;
+        CollectElements(doc->children, theirElements);
+        CollectElements(ours->GetFirstChild(), ourElements);
+        ASSERT_EQ(theirElements.size(), ourElements.size()) << text;
+
+        const char* identifier = GetParam() ? Security::ExclusiveC14n : Security::InclusiveC14n;
+        const auto& prefixes = PrefixLists[GetParam() ? seed % PrefixLists.size() : 0];
+        EXPECT_EQ(
+            CanonicalizeWithLibxml(doc.get(), nullptr, GetParam(), prefixes),
+            CanonicalizeToText(identifier, ours.get(), prefixes))
+            << text;
+        const std::size_t nested = seed % ourElements.size();
+        EXPECT_EQ(
+            CanonicalizeWithLibxml(doc.get(), theirElements[nested], GetParam(), prefixes),
+            CanonicalizeToText(identifier, ourElements[nested], prefixes))
+            << text << "\nelement " << nested;
+    }
+};
+
+TEST_P(CanonicalizeAgainstLibxml, AgreesOnGeneratedDocuments)
+{
+    for (unsigned seed = 0; seed < Documents && !HasFailure(); ++seed) {
+        Compare(seed);
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Form, CanonicalizeAgainstLibxml, testing::Bool(), [](const testing::TestParamInfo<bool>& form) {
+        return form.param ? "Exclusive" : "Inclusive";
+    });
+
+} // namespace
+
+} // namespace Quillon::Xml

@@ -1,0 +1,336 @@
+#include "ssoClient/ResponseHandlerImpl.h"
+
+#include "quillon/xml/Parser.h"
+#include "ssoClient/Exceptions.h"
+#include "ssoClient/xmlReading.h"
+
+#include <gmock/gmock.h>
+
+#include <typeinfo>
+
+using namespace SsoClient;
+
+namespace {
+
+#define SOAP "http://schemas.xmlsoap.org/soap/envelope/"
+#define WST "http://docs.oasis-open.org/ws-sx/ws-trust/200512"
+#define WSSE "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd"
+
+std::string Envelope(const std::string& body)
+{
+    return "<S:Envelope xmlns:S=\"" SOAP "\"><S:Body>" + body + "</S:Body></S:Envelope>";
+}
+
+std::string Fault(const std::string& content)
+{
+    return Envelope("<S:Fault>" + content + "</S:Fault>");
+}
+
+std::string FaultWithCode(const std::string& code, const std::string& rest = "")
+{
+    return Fault(
+        "<faultcode xmlns:wst=\"" WST "\" xmlns:wsse=\"" WSSE "\">" + code + "</faultcode>" + rest);
+}
+
+std::string StatusReply(const std::string& code)
+{
+    return Envelope(
+        "<wst:RequestSecurityTokenResponse xmlns:wst=\"" WST "\"><wst:Status>" + code
+        + "</wst:Status></wst:RequestSecurityTokenResponse>");
+}
+
+std::string Acquire(const std::string& reply)
+{
+    std::string tokenXml;
+    ResponseHandlerImpl().HandleAcquireTokenResponse(
+        Quillon::CreateStringReader(reply).get(), tokenXml);
+    return tokenXml;
+}
+
+std::string Renew(const std::string& reply)
+{
+    std::string tokenXml;
+    ResponseHandlerImpl().HandleRenewTokenResponse(
+        Quillon::CreateStringReader(reply).get(), tokenXml);
+    return tokenXml;
+}
+
+bool Validate(const std::string& reply)
+{
+    return ResponseHandlerImpl().HandleValidateSubjectResponse(
+        Quillon::CreateStringReader(reply).get());
+}
+
+/** Class and text of what `handle` throws for `reply`, as "class: text". */
+template <class Handle>
+std::string GetFailure(const Handle& handle, const std::string& reply)
+{
+    try {
+        handle(reply);
+    } catch (const std::exception& error) {
+        return Quillon::GetClassName(error) + ": " + error.what();
+    }
+    return "none";
+}
+
+std::string GetParserText(const std::string& text)
+{
+    try {
+        Quillon::Ref<Quillon::Xml::Document> document;
+        ParseXML(text, document);
+    } catch (const Quillon::Xml::XMLParseException& error) {
+        return error.what();
+    }
+    return "well-formed";
+}
+
+constexpr char UnexpectedFormat[] = "SsoException: Unexpected XML format";
+
+} // namespace
+
+TEST(HandleAcquireTokenResponse, GivesTheAssertionInCanonicalForm)
+{
+    // Declarations in scope come along, attributes are sorted, empty elements get an end tag.
+    EXPECT_EQ(
+        Acquire("<?xml version=\"1.0\"?>\n"
+                "<S:Envelope xmlns:S=\"" SOAP "\" xmlns:xs=\"urn:xs\"><S:Header/><S:Body>"
+                "<w:RequestSecurityTokenResponseCollection xmlns:w=\"" WST "\">"
+                "<w:RequestSecurityTokenResponse><w:RequestedSecurityToken>"
+                "<saml:Assertion xmlns:saml=\"urn:saml\" b='2' a='1'><!-- no --><saml:X/> &#65;"
+                "</saml:Assertion>"
+                "</w:RequestedSecurityToken></w:RequestSecurityTokenResponse>"
+                "</w:RequestSecurityTokenResponseCollection></S:Body></S:Envelope>"),
+        "<saml:Assertion xmlns:S=\"" SOAP "\" xmlns:saml=\"urn:saml\" xmlns:w=\"" WST
+        "\" xmlns:xs=\"urn:xs\" a=\"1\" b=\"2\"><saml:X></saml:X> A</saml:Assertion>");
+}
+
+TEST(HandleAcquireTokenResponse, MatchesLocalNamesOnly)
+{
+    EXPECT_EQ(
+        Acquire("<Letter><Body><RequestSecurityTokenResponseCollection>"
+                "<RequestSecurityTokenResponse><RequestedSecurityToken>"
+                "<Assertion>x</Assertion></RequestedSecurityToken>"
+                "</RequestSecurityTokenResponse></RequestSecurityTokenResponseCollection>"
+                "</Body></Letter>"),
+        "<Assertion>x</Assertion>");
+}
+
+TEST(HandleAcquireTokenResponse, RefusesEachMissingStep)
+{
+    const std::string bodies[] = {
+        "",
+        "<RequestSecurityTokenResponseCollection/>",
+        "<RequestSecurityTokenResponseCollection><RequestSecurityTokenResponse/>"
+        "</RequestSecurityTokenResponseCollection>",
+        "<RequestSecurityTokenResponseCollection><RequestSecurityTokenResponse>"
+        "<RequestedSecurityToken/></RequestSecurityTokenResponse>"
+        "</RequestSecurityTokenResponseCollection>",
+        "<RequestSecurityTokenResponseCollection><RequestSecurityTokenResponse>"
+        "<RequestedSecurityToken><x><Assertion/></x></RequestedSecurityToken>"
+        "</RequestSecurityTokenResponse></RequestSecurityTokenResponseCollection>",
+    };
+    for (const std::string& body : bodies) {
+        EXPECT_EQ(GetFailure(Acquire, Envelope(body)), UnexpectedFormat) << body;
+    }
+}
+
+TEST(HandleAcquireTokenResponse, RefusesResponseWithoutCollection)
+{
+    EXPECT_EQ(
+        GetFailure(
+            Acquire,
+            Envelope("<RequestSecurityTokenResponse><RequestedSecurityToken><Assertion/>"
+                     "</RequestedSecurityToken></RequestSecurityTokenResponse>")),
+        UnexpectedFormat);
+}
+
+TEST(HandleAcquireTokenResponse, LooksAtTheFirstMatchOfEachStepOnly)
+{
+    EXPECT_EQ(
+        GetFailure(
+            Acquire,
+            Envelope("<RequestSecurityTokenResponseCollection>"
+                     "<RequestSecurityTokenResponse/>"
+                     "<RequestSecurityTokenResponse><RequestedSecurityToken><Assertion/>"
+                     "</RequestedSecurityToken></RequestSecurityTokenResponse>"
+                     "</RequestSecurityTokenResponseCollection>")),
+        UnexpectedFormat);
+}
+
+TEST(HandleAcquireTokenResponse, LeavesTheOutputAloneOnFailure)
+{
+    std::string tokenXml = "before";
+    EXPECT_THROW(
+        ResponseHandlerImpl().HandleAcquireTokenResponse(
+            Quillon::CreateStringReader(Envelope("")).get(), tokenXml),
+        SsoException);
+    EXPECT_EQ(tokenXml, "before");
+}
+
+TEST(HandleRenewTokenResponse, GivesTheAssertionInCanonicalForm)
+{
+    EXPECT_EQ(
+        Renew(Envelope("<w:RequestSecurityTokenResponse xmlns:w=\"" WST "\">"
+                       "<w:RequestedSecurityToken><Assertion/></w:RequestedSecurityToken>"
+                       "</w:RequestSecurityTokenResponse>")),
+        "<Assertion xmlns:S=\"" SOAP "\" xmlns:w=\"" WST "\"></Assertion>");
+}
+
+TEST(HandleRenewTokenResponse, RefusesCollection)
+{
+    EXPECT_EQ(
+        GetFailure(
+            Renew,
+            Envelope("<RequestSecurityTokenResponseCollection><RequestSecurityTokenResponse>"
+                     "<RequestedSecurityToken><Assertion/></RequestedSecurityToken>"
+                     "</RequestSecurityTokenResponse>"
+                     "</RequestSecurityTokenResponseCollection>")),
+        UnexpectedFormat);
+}
+
+TEST(HandleValidateSubjectResponse, ReadsTheVerdict)
+{
+    EXPECT_TRUE(Validate(StatusReply("<wst:Code>" WST "/status/valid</wst:Code>")));
+    EXPECT_FALSE(Validate(StatusReply("<wst:Code>" WST "/status/invalid</wst:Code>")));
+}
+
+TEST(HandleValidateSubjectResponse, RefusesAnyOtherCode)
+{
+    for (const std::string code :
+         {WST "/status/valid ",
+          " " WST "/status/valid",
+          WST "/status/VALID",
+          WST "/status/",
+          "http://other/status/valid"}) {
+        EXPECT_EQ(
+            GetFailure(Validate, StatusReply("<wst:Code>" + code + "</wst:Code>")),
+            UnexpectedFormat)
+            << code;
+    }
+}
+
+TEST(HandleValidateSubjectResponse, RefusesEachMissingStep)
+{
+    EXPECT_EQ(GetFailure(Validate, Envelope("")), UnexpectedFormat);
+    EXPECT_EQ(GetFailure(Validate, Envelope("<RequestSecurityTokenResponse/>")), UnexpectedFormat);
+    EXPECT_EQ(GetFailure(Validate, StatusReply("")), UnexpectedFormat);
+}
+
+TEST(HandleValidateSubjectResponse, RefusesCodeThatDoesNotStartWithText)
+{
+    for (const std::string content : {"", "<x/>", "<!-- c -->" WST "/status/valid"}) {
+        EXPECT_THROW(
+            Validate(StatusReply("<wst:Code>" + content + "</wst:Code>")),
+            Quillon::TypeMismatchException)
+            << content;
+    }
+}
+
+TEST(ProcessResponse, ReportsWhatIsNotXml)
+{
+    const std::string replies[] = {"", "<html><br></html>", "no markup", "<!DOCTYPE x><x/>"};
+    for (const std::string& reply : replies) {
+        EXPECT_EQ(
+            GetFailure(Acquire, reply),
+            "SsoException: Response is not well-formed XML: " + GetParserText(reply))
+            << reply;
+        EXPECT_NE(GetParserText(reply), "well-formed") << reply;
+    }
+}
+
+TEST(ProcessResponse, ReportsMissingBody)
+{
+    const char expected[] = "SsoException: Unexpected response format: missing SAOP Body.";
+    EXPECT_EQ(GetFailure(Acquire, "<html><body/></html>"), expected);
+    EXPECT_EQ(GetFailure(Renew, "<S:Envelope xmlns:S=\"" SOAP "\"/>"), expected);
+    EXPECT_EQ(GetFailure(Validate, "<Envelope><Header><Body/></Header></Envelope>"), expected);
+}
+
+TEST(ProcessResponse, ReportsBadCredentials)
+{
+    for (const std::string code :
+         {"wst:FailedAuthentication", "wst:InvalidSecurityToken", "wsse:InvalidSecurityToken"}) {
+        EXPECT_EQ(
+            GetFailure(Acquire, FaultWithCode(code, "<faultstring>Wrong password</faultstring>")),
+            "InvalidCredentialsException: Authentication failed: Wrong password")
+            << code;
+    }
+}
+
+TEST(ProcessResponse, ReportsBadCredentialsWithoutFaultString)
+{
+    for (const std::string faultString :
+         {"", "<faultstring/>", "<faultstring><b>Wrong password</b></faultstring>"}) {
+        EXPECT_EQ(
+            GetFailure(Acquire, FaultWithCode("wst:FailedAuthentication", faultString)),
+            "InvalidCredentialsException: Authentication failed")
+            << faultString;
+    }
+}
+
+TEST(ProcessResponse, ReportsBadCredentialsToEveryOperation)
+{
+    const std::string reply = FaultWithCode("wst:FailedAuthentication");
+    const char expected[] = "InvalidCredentialsException: Authentication failed";
+    EXPECT_EQ(GetFailure(Acquire, reply), expected);
+    EXPECT_EQ(GetFailure(Renew, reply), expected);
+    EXPECT_EQ(GetFailure(Validate, reply), expected);
+}
+
+TEST(ProcessResponse, ReportsOtherFaultsByTheirCodeAsWritten)
+{
+    for (const std::string code :
+         {"S:Server",
+          "wsse:FailedAuthentication",
+          "wst:failedAuthentication",
+          "wst:FailedAuthentication ",
+          "FailedAuthentication",
+          "InvalidSecurityToken"}) {
+        EXPECT_EQ(
+            GetFailure(Acquire, FaultWithCode(code, "<faultstring>Oh dear</faultstring>")),
+            "SsoException: Unexpected SOAP fault: " + code + "; request failed.")
+            << code;
+    }
+}
+
+TEST(ProcessResponse, ResolvesUnprefixedCodeInTheSoapNamespace)
+{
+    // The default namespace does not apply to it.
+    EXPECT_EQ(
+        GetFailure(Acquire, Fault("<faultcode xmlns=\"" WST "\">FailedAuthentication</faultcode>")),
+        "SsoException: Unexpected SOAP fault: FailedAuthentication; request failed.");
+}
+
+TEST(ProcessResponse, ReportsFaultWithoutUsableCode)
+{
+    for (const std::string content :
+         {"",
+          "<faultstring>Oh dear</faultstring>",
+          "<faultcode/>",
+          "<faultcode><b>S:Server</b></faultcode>",
+          "<faultcode><!-- c -->S:Server</faultcode>",
+          "<faultcode>S:</faultcode>"}) {
+        EXPECT_EQ(
+            GetFailure(Acquire, Fault(content)),
+            "SsoException: Invalid SOAP response: missing faultcode.")
+            << content;
+    }
+}
+
+TEST(ProcessResponse, ReportsCodeWithUndeclaredPrefix)
+{
+    EXPECT_EQ(
+        GetFailure(Acquire, Fault("\n  <faultcode>foo:Bar</faultcode>")),
+        "ParseException: Element faultcodeat 2,3 uses undefined prefix: `foo'");
+}
+
+TEST(ProcessResponse, LooksForFaultBeforeAnythingElse)
+{
+    EXPECT_EQ(
+        GetFailure(
+            Validate,
+            Envelope("<RequestSecurityTokenResponse><Status><Code>" WST
+                     "/status/valid</Code></Status></RequestSecurityTokenResponse>"
+                     "<S:Fault><faultcode>S:Server</faultcode></S:Fault>")),
+        "SsoException: Unexpected SOAP fault: S:Server; request failed.");
+}

@@ -1,0 +1,50 @@
+#include "Commands.h"
+#include "Password.h"
+#include "ServiceOptions.h"
+#include "TokenOutput.h"
+#include "TokenSpecOptions.h"
+
+#include <memory>
+
+namespace {
+
+struct AcquirePasswordOptions
+{
+    ServiceOptions service;
+    TokenSpecOptions token;
+    OutputOptions output;
+    std::string user;
+    std::string passwordFile;
+};
+
+ExitCode AcquirePassword(const AcquirePasswordOptions& options)
+{
+    const auto service = options.service.CreateService();
+    TokenOutput output(options.output);
+    SecretText password;
+    GetPassword(options.passwordFile, password);
+    output.Show(service->AcquireToken(options.user, password.Get(), options.token.spec));
+    return ExitCode::DONE;
+}
+
+} // namespace
+
+void AddAcquirePasswordCommand(CLI::App& parent, Action& action)
+{
+    CLI::App* command =
+        parent.add_subcommand("password", "Acquire a token with a user name and a password");
+    const auto options = std::make_shared<AcquirePasswordOptions>();
+    options->service.AddTo(*command);
+    command->add_option("--user", options->user, "User name")->required()->type_name("NAME");
+    command
+        ->add_option(
+            "--password-file",
+            options->passwordFile,
+            "File whose first line is the password, - for standard input (default: ask for it)")
+        ->type_name("FILE");
+    options->token.AddTo(*command);
+    options->output.AddOutTo(*command);
+    options->output.AddJsonTo(*command);
+    command->callback(
+        [options, &action] { action = [options] { return AcquirePassword(*options); }; });
+}

@@ -1,0 +1,217 @@
+#include "Password.h"
+
+#include "ExitCode.h"
+#include "FileDescriptor.h"
+
+#include "quillon/MessageFormatter.h"
+
+#include <array>
+#include <cerrno>
+#include <csignal>
+#include <cstring>
+
+#include <fcntl.h>
+#include <poll.h>
+#include <termios.h>
+#include <unistd.h>
+
+using Quillon::MessageFormatter;
+
+namespace {
+
+[[noreturn]] void ThrowReadError(const std::string& name)
+{
+    ThrowSystemError("cannot read the password from " + name);
+}
+
+/**
+ * Reads up to the end of the line, one byte at a time: what follows is left to others. `readByte`
+ * gives what `read` gives for one byte.
+ */
+template <class ReadByte>
+void ReadLine(ReadByte readByte, const std::string& name, SecretText& line)
+{
+    for (;;) {
+        char c = 0;
+        const ssize_t count = readByte(c);
+        if (count < 0) {
+            ThrowReadError(name);
+        }
+        if (count == 0 || c == '\n') {
+            break;
+        }
+        if (!line.Append(c)) {
+            throw UsageError(MessageFormatter::ASPrint(
+                "the password from %1 is longer than %2 bytes", name, SecretText::MaxBytes));
+        }
+    }
+    if (!line.Get().empty() && line.Get().back() == '\r') {
+        line.RemoveLast();
+    }
+}
+
+constexpr std::array<int, 5> TerminalSignals = {SIGHUP, SIGINT, SIGQUIT, SIGTERM, SIGTSTP};
+
+volatile std::sig_atomic_t caughtSignal = 0;
+
+void CatchSignal(int signal)
+{
+    caughtSignal = signal;
+}
+
+/**
+ * Holds back the signals that would leave the terminal without echo, for as long as it lives: they
+ * are caught while `WaitForInput` waits, and at no other moment.
+ */
+class SignalGuard
+{
+public:
+    SignalGuard()
+    {
+        caughtSignal = 0;
+        struct sigaction action = {};
+        action.sa_handler = CatchSignal;
+        sigset_t held;
+        sigemptyset(&held);
+        for (std::size_t i = 0; i < TerminalSignals.size(); ++i) {
+            sigaddset(&held, TerminalSignals[i]);
+            ::sigaction(TerminalSignals[i], &action, &_actionsBefore[i]);
+        }
+        ::sigprocmask(SIG_BLOCK, &held, &_maskBefore);
+    }
+    SignalGuard(const SignalGuard&) = delete;
+    SignalGuard& operator=(const SignalGuard&) = delete;
+    ~SignalGuard()
+    {
+        for (std::size_t i = 0; i < TerminalSignals.size(); ++i) {
+            ::sigaction(TerminalSignals[i], &_actionsBefore[i], nullptr);
+        }
+        ::sigprocmask(SIG_SETMASK, &_maskBefore, nullptr);
+    }
+
+    /** @return false if one of the signals came first. */
+    bool WaitForInput(int descriptor) const
+    {
+        pollfd input = {descriptor, POLLIN, 0};
+        while (::ppoll(&input, 1, nullptr, &_maskBefore) < 0 && errno == EINTR
+               && caughtSignal == 0) {
+        }
+        return caughtSignal == 0;
+    }
+
+private:
+    std::array<struct sigaction, TerminalSignals.size()> _actionsBefore;
+    sigset_t _maskBefore;
+};
+
+/** Keeps a terminal from echoing what is typed, for as long as it lives. */
+class EchoSwitch
+{
+public:
+    explicit EchoSwitch(int terminal)
+        : _terminal(terminal)
+    {
+        if (::tcgetattr(terminal, &_before) != 0) {
+            ThrowReadError("the terminal");
+        }
+        termios silent = _before;
+        silent.c_lflag &= ~static_cast<tcflag_t>(ECHO);
+        silent.c_lflag |= static_cast<tcflag_t>(ECHONL);
+        ::tcsetattr(terminal, TCSAFLUSH, &silent);
+    }
+    EchoSwitch(const EchoSwitch&) = delete;
+    EchoSwitch& operator=(const EchoSwitch&) = delete;
+    ~EchoSwitch() { ::tcsetattr(_terminal, TCSAFLUSH, &_before); }
+
+private:
+    int _terminal;
+    termios _before = {};
+};
+
+void WritePrompt(int terminal)
+{
+    constexpr char Prompt[] = "Password: ";
+    if (RetryInterrupted([&] { return ::write(terminal, Prompt, sizeof Prompt - 1); }) < 0) {
+        ThrowReadError("the terminal");
+    }
+}
+
+/** One prompt. @return the signal that interrupted it, with the terminal as it was; 0 for none. */
+int AskOnce(int terminal, SecretText& password)
+{
+    const SignalGuard signals;
+    const EchoSwitch silence(terminal);
+    WritePrompt(terminal);
+    // A signal ends the line; what was typed of it is thrown away by the caller.
+    const auto readByte = [&](char& c) -> ssize_t {
+        return signals.WaitForInput(terminal) ? ::read(terminal, &c, 1) : 0;
+    };
+    ReadLine(readByte, "the terminal", password);
+    return caughtSignal;
+}
+
+void AskPassword(SecretText& password)
+{
+    const FileDescriptor terminal(::open("/dev/tty", O_RDWR | O_CLOEXEC));
+    if (!terminal.IsOpen()) {
+        throw UsageError("no terminal to ask for the password: use --password-file");
+    }
+    // A signal takes its usual course once the terminal echoes again; after a stop and a
+    // continuation the question is asked anew.
+    while (const int signal = AskOnce(terminal.Get(), password)) {
+        password.Clear();
+        ::raise(signal);
+    }
+}
+
+void ReadPasswordFile(const std::string& file, SecretText& password)
+{
+    FileDescriptor opened;
+    if (file != "-") {
+        opened = FileDescriptor(::open(file.c_str(), O_RDONLY | O_CLOEXEC));
+        if (!opened.IsOpen()) {
+            ThrowReadError("`" + file + "'");
+        }
+    }
+    const int descriptor = opened.IsOpen() ? opened.Get() : STDIN_FILENO;
+    const auto readByte = [descriptor](char& c) {
+        return RetryInterrupted([&] { return ::read(descriptor, &c, 1); });
+    };
+    ReadLine(readByte, file == "-" ? "standard input" : "`" + file + "'", password);
+}
+
+} // namespace
+
+SecretText::~SecretText()
+{
+    Clear();
+}
+
+bool SecretText::Append(char c)
+{
+    if (_text.size() == MaxBytes) {
+        return false;
+    }
+    _text += c;
+    return true;
+}
+
+void SecretText::Clear()
+{
+    // What was removed from the end is still in the buffer.
+    _text.resize(_text.capacity());
+    ::explicit_bzero(_text.data(), _text.size());
+    _text.clear();
+}
+
+void GetPassword(const std::string& file, SecretText& password)
+{
+    if (file.empty()) {
+        AskPassword(password);
+    } else {
+        ReadPasswordFile(file, password);
+    }
+    if (password.Get().empty()) {
+        throw UsageError("the password is empty");
+    }
+}

@@ -1,0 +1,34 @@
+#pragma once
+
+#include <string>
+
+/** Text that is overwritten when it is no longer needed. */
+class SecretText
+{
+public:
+    /** Room for the longest line that is read, so that the text never moves and leaves a copy. */
+    static constexpr std::size_t MaxBytes = 4096;
+
+    SecretText() { _text.reserve(MaxBytes); }
+    SecretText(const SecretText&) = delete;
+    SecretText& operator=(const SecretText&) = delete;
+    ~SecretText();
+
+    /** Appends `c` unless that would take the text over `MaxBytes`. @return whether it did. */
+    bool Append(char c);
+    void RemoveLast() { _text.pop_back(); }
+    void Clear();
+
+    const std::string& Get() const noexcept { return _text; }
+
+private:
+    std::string _text;
+};
+
+/**
+ * Gets the password into `password`: the first line of the file, of standard input for `-`, or
+ * what the user types at the terminal without echo if `file` is empty.
+ *
+ * @throws UsageError  it cannot be read, is empty or too long.
+ */
+void GetPassword(const std::string& file, SecretText& password);

@@ -1,0 +1,26 @@
+#pragma once
+
+#include "Trust.h"
+
+#include "quillon/ssl/SSLContext.h"
+#include "ssoClient/SecurityTokenService.h"
+
+#include <CLI/App.hpp>
+
+#include <string>
+#include <vector>
+
+/** The options of every command that talks to a token service. */
+struct ServiceOptions
+{
+    std::string url;
+    std::vector<std::string> trustFiles;
+    std::vector<std::string> authorityFiles;
+    std::string peer;
+    bool verbose = false;
+
+    void AddTo(CLI::App& command);
+
+    /** Creates the service, and turns its trace lines on if that is asked for. */
+    boost::shared_ptr<SsoClient::SecurityTokenService> CreateService() const;
+};

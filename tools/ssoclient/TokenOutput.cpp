@@ -1,0 +1,100 @@
+#include "TokenOutput.h"
+
+#include "ExitCode.h"
+#include "OneLine.h"
+
+#include "ssoClient/Descriptions.h"
+#include "ssoClient/Exceptions.h"
+
+#include <nlohmann/json.hpp>
+
+#include <iostream>
+
+using Json = nlohmann::ordered_json;
+
+namespace {
+
+Json ToJson(const SsoClient::PrincipalId& principal)
+{
+    return {{"name", principal.GetName()}, {"domain", principal.GetDomain()}};
+}
+
+Json ToJson(const SsoClient::Delegate& delegate)
+{
+    Json json = {{"subject", ToJson(delegate.subject)}};
+    json["delegationDate"] = delegate.delegationDate.ToString();
+    return json;
+}
+
+template <class Item>
+Json ToJson(const std::vector<Item>& items)
+{
+    Json list = Json::array();
+    for (const Item& item : items) {
+        list.push_back(ToJson(item));
+    }
+    return list;
+}
+
+/** What the redacted description says, under the same names; nothing more. */
+std::string CreateJsonDescription(const SsoClient::SamlToken& token)
+{
+    std::vector<SsoClient::PrincipalId> groups;
+    token.GetGroups(groups);
+    std::vector<SsoClient::Delegate> delegationChain;
+    token.GetDelegationChain(delegationChain);
+    const bool isBearer = token.GetConfirmationMethod() == SsoClient::SamlToken::CONFIRM_BEARER;
+
+    Json json;
+    json["subject"] = ToJson(token.GetSubject());
+    json["groups"] = ToJson(groups);
+    json["delegationChain"] = ToJson(delegationChain);
+    json["startTime"] = token.GetStartDate().ToString();
+    json["expirationTime"] = token.GetEndDate().ToString();
+    json["renewable"] = token.IsRenewable();
+    json["delegable"] = token.IsDelegable();
+    json["isSolution"] = token.IsSolution();
+    json["confirmationType"] = isBearer ? "bearer" : "holder-of-key";
+    return json.dump(2);
+}
+
+} // namespace
+
+void OutputOptions::AddJsonTo(CLI::App& command)
+{
+    command.add_flag("--json", json, "Print the token's facts as JSON");
+}
+
+void OutputOptions::AddOutTo(CLI::App& command)
+{
+    command.add_option("--out", outFile, "Write the assertion to this file (mode 0600)")
+        ->type_name("FILE");
+}
+
+TokenOutput::TokenOutput(const OutputOptions& options)
+    : _json(options.json)
+{
+    if (!options.outFile.empty()) {
+        _file.emplace(options.outFile);
+    }
+}
+
+void TokenOutput::Show(const boost::shared_ptr<const SsoClient::SamlToken>& token)
+{
+    if (!token) {
+        throw SsoClient::SsoException("The token service answered without a token");
+    }
+    if (_file) {
+        _file->Commit(token->ToXml());
+    }
+    PrintLine(
+        _json ? CreateJsonDescription(*token)
+              : ToOneLine(SsoClient::CreateRedactedDescription(*token)));
+}
+
+void PrintLine(const std::string& line)
+{
+    if (!(std::cout << line << "\n" << std::flush)) {
+        throw UsageError("cannot write to standard output");
+    }
+}

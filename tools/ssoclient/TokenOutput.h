@@ -1,0 +1,44 @@
+#pragma once
+
+#include "Files.h"
+
+#include "ssoClient/SamlToken.h"
+
+#include <CLI/App.hpp>
+
+#include <boost/smart_ptr/shared_ptr.hpp>
+
+#include <optional>
+#include <string>
+
+/** How a command shows a token: `--json`, and `--out` where the command obtains one. */
+struct OutputOptions
+{
+    bool json = false;
+    std::string outFile;
+
+    void AddJsonTo(CLI::App& command);
+    void AddOutTo(CLI::App& command);
+};
+
+/** Shows tokens as the options say. Made before a token is asked for: see `OutputFile`. */
+class TokenOutput
+{
+public:
+    explicit TokenOutput(const OutputOptions& options);
+
+    /**
+     * Writes the assertion to the file, if there is one, and then the redacted description or the
+     * same facts as JSON to standard output.
+     *
+     * @throws SsoException  there is no token: the service answered with an empty one.
+     */
+    void Show(const boost::shared_ptr<const SsoClient::SamlToken>& token);
+
+private:
+    bool _json;
+    std::optional<OutputFile> _file;
+};
+
+/** Writes `line` and a line break to standard output. @throws UsageError  it cannot be written. */
+void PrintLine(const std::string& line);

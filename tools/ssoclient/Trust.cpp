@@ -1,0 +1,39 @@
+#include "Trust.h"
+
+#include "ExitCode.h"
+#include "Files.h"
+
+#include "quillon/MessageFormatter.h"
+
+namespace {
+
+CertificateList ReadCertificateFile(const std::string& file)
+{
+    const std::string pem = ReadFile(file);
+    try {
+        return Quillon::Crypto::ParsePemCertificates(pem);
+    } catch (const Quillon::Crypto::CryptoException& error) {
+        throw UsageError(Quillon::MessageFormatter::ASPrint(
+            "cannot take certificates from `%1': %2", file, error.what()));
+    }
+}
+
+} // namespace
+
+void AddTrustTo(CLI::App& command, std::vector<std::string>& trustFiles)
+{
+    command
+        .add_option(
+            "--trust", trustFiles, "PEM files with the certificates that may have signed the token")
+        ->required()
+        ->type_name("PEM");
+}
+
+CertificateList ReadCertificates(const std::vector<std::string>& files)
+{
+    CertificateList certificates;
+    for (const std::string& file : files) {
+        certificates.splice(certificates.end(), ReadCertificateFile(file));
+    }
+    return certificates;
+}

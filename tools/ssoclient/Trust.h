@@ -1,0 +1,21 @@
+#pragma once
+
+#include "quillon/crypto/Certificate.h"
+
+#include <CLI/App.hpp>
+
+#include <list>
+#include <string>
+#include <vector>
+
+using CertificateList = std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>;
+
+/** Adds the required `--trust PEM...`. */
+void AddTrustTo(CLI::App& command, std::vector<std::string>& trustFiles);
+
+/**
+ * Reads all certificates of the PEM files.
+ *
+ * @throws UsageError  a file cannot be read, or holds no certificate or one that is broken.
+ */
+CertificateList ReadCertificates(const std::vector<std::string>& files);

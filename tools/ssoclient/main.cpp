@@ -1,0 +1,45 @@
+#include "Commands.h"
+
+#include <CLI/App.hpp>
+#include <CLI/Config.hpp>
+#include <CLI/Formatter.hpp>
+
+namespace {
+
+void AddCommands(CLI::App& app, Action& action)
+{
+    app.set_version_flag("--version", std::string("ssoclient ") + SSOCLIENT_VERSION);
+    app.require_subcommand(1);
+    CLI::App* acquire = app.add_subcommand("acquire", "Acquire a token from a token service");
+    acquire->require_subcommand(1);
+    AddAcquirePasswordCommand(*acquire, action);
+    AddInspectCommand(app, action);
+}
+
+ExitCode Run(int argc, char** argv)
+{
+    CLI::App app("Obtains and verifies SAML 2.0 tokens.", "ssoclient");
+    Action action;
+    AddCommands(app, action);
+    try {
+        app.parse(argc, argv);
+    } catch (const CLI::Success& request) {
+        app.exit(request); // prints the help or the version that was asked for
+        return ExitCode::DONE;
+    } catch (const CLI::ParseError& error) {
+        throw UsageError(error.what());
+    }
+    return action();
+}
+
+} // namespace
+
+int main(int argc, char** argv)
+{
+    try {
+        return static_cast<int>(Run(argc, argv));
+    } catch (const std::exception& error) {
+        ReportFailure(Quillon::GetClassName(error), error.what());
+        return static_cast<int>(GetExitCode(error));
+    }
+}
