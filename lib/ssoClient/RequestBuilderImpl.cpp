@@ -1,5 +1,7 @@
 #include "ssoClient/RequestBuilderImpl.h"
 
+#include "quillon/Exceptions.h"
+#include "quillon/PanicVerify.h"
 #include "quillon/xml/Parser.h"
 #include "ssoClient/wireNames.h"
 #include "ssoClient/xmlRequestBuilders.h"
@@ -14,6 +16,12 @@ namespace SsoClient {
 
 namespace {
 
+constexpr char Unit[] = "lib/ssoClient/RequestBuilderImpl";
+
+constexpr char AcquireByCertificate[] = "acquire token by certificate";
+constexpr char AcquireByToken[] = "acquire token by token";
+constexpr char Renew[] = "renew token";
+
 constexpr int TimestampValidityMinutes = 10;
 
 void ValidateLifetime(long long lifetime)
@@ -23,10 +31,30 @@ void ValidateLifetime(long long lifetime)
     }
 }
 
-// The service takes a request that delegates only unsigned, whatever its body asks for.
+void ValidateTokenIsHok(const SamlToken& token, const std::string& operationName)
+{
+    if (token.GetConfirmationMethod() != SamlToken::CONFIRM_HOLDER_OF_KEY) {
+        throw Quillon::InvalidArgumentException(
+            "Unable to " + operationName + ": the provided token must be Holder Of Key");
+    }
+}
+
+// A request that delegates goes unsigned, whatever its body asks for.
 TokenSpec::Confirmation ConfOverrideWithDelegate(const TokenSpec& spec)
 {
     return spec.delegateTo ? TokenSpec::CONFIRMATION_BEARER : spec.confirmation;
+}
+
+XMLBuilderPtr CreateHeader()
+{
+    return WsSecurityHeaderBuilder(TimestampValidityMinutes);
+}
+
+XMLBuilderPtr CreateHeader(XMLBuilderPtr credentials)
+{
+    auto header = boost::make_shared<XMLCompositeBuilder>(CreateHeader());
+    header->Add(std::move(credentials));
+    return header;
 }
 
 std::string SerializeToXML(const XMLBaseBuilder& builder)
@@ -36,6 +64,11 @@ std::string SerializeToXML(const XMLBaseBuilder& builder)
     const Quillon::Ref<Quillon::StringWriter> writer = Quillon::CreateStringWriter();
     Quillon::Xml::Serialize(root.get(), writer.get());
     return writer->TakeString();
+}
+
+std::string BuildUnSignedRequest(XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder)
+{
+    return SerializeToXML(*SoapBuilder(std::move(headerBuilder), std::move(bodyBuilder)));
 }
 
 } // namespace
@@ -51,13 +84,67 @@ void RequestBuilderImpl::BuildUserPassTokenRequest(
     Request& request) const
 {
     ValidateLifetime(spec.tokenLifetimeSec);
-    const auto header =
-        boost::make_shared<XMLCompositeBuilder>(WsSecurityHeaderBuilder(TimestampValidityMinutes));
-    header->Add(WsseUsernameTokenBuilder(userName, password));
+    XMLBuilderPtr header = CreateHeader(WsseUsernameTokenBuilder(userName, password));
     XMLBuilderPtr body =
         AcquireSecurityTokenBuilder(GetEffectiveConfirmationType(spec.confirmation), spec);
     request.soapAction = Wire::IssueAction;
-    request.body = BuildTokenRequest(ConfOverrideWithDelegate(spec), header, std::move(body));
+    request.body =
+        BuildTokenRequest(ConfOverrideWithDelegate(spec), std::move(header), std::move(body));
+}
+
+void RequestBuilderImpl::BuildCertificateTokenRequest(const TokenSpec& spec, Request& request) const
+{
+    ValidateLifetime(spec.tokenLifetimeSec);
+    ValidateHokIsConfigured(AcquireByCertificate);
+    if (spec.confirmation != TokenSpec::CONFIRMATION_DEFAULT) {
+        throw Quillon::InvalidArgumentException(
+            std::string("TokenSpec::confirmation must be CONFIRMATION_DEFAULT for ")
+            + AcquireByCertificate);
+    }
+    XMLBuilderPtr header = CreateHeader();
+    XMLBuilderPtr body =
+        AcquireSecurityTokenBuilder(GetEffectiveConfirmationType(spec.confirmation), spec);
+    request.soapAction = Wire::IssueAction;
+    request.body = BuildCertRefSignedRequest(std::move(header), std::move(body));
+}
+
+void RequestBuilderImpl::BuildExchangeTokenRequest(
+    const SamlToken& token, const TokenSpec& spec, Request& request) const
+{
+    ValidateLifetime(spec.tokenLifetimeSec);
+    ValidateHokIsConfigured(AcquireByToken);
+    XMLBuilderPtr header = CreateHeader(InsertSamlTokenBuilder(token));
+    XMLBuilderPtr body =
+        ExchangeSecurityTokenBuilder(GetEffectiveConfirmationType(spec.confirmation), spec);
+    request.soapAction = Wire::IssueAction;
+    request.body = BuildSamlRefSignedRequest(token.GetId(), std::move(header), std::move(body));
+}
+
+void RequestBuilderImpl::BuildValidateSubjectRequest(const SamlToken& token, Request& request) const
+{
+    request.soapAction = Wire::ValidateAction;
+    XMLBuilderPtr body = ValidateSecurityTokenBuilder(token);
+    request.body = BuildUnSignedRequest(CreateHeader(), std::move(body));
+}
+
+void RequestBuilderImpl::BuildRenewRequest(
+    const SamlToken& token, long long lifetimeSec, Request& request) const
+{
+    ValidateLifetime(lifetimeSec);
+    ValidateHokIsConfigured(Renew);
+    ValidateTokenIsHok(token, Renew);
+    XMLBuilderPtr header = CreateHeader();
+    XMLBuilderPtr body = RenewSecurityTokenBuilder(token, lifetimeSec);
+    request.soapAction = Wire::RenewAction;
+    request.body = BuildCertRefSignedRequest(std::move(header), std::move(body));
+}
+
+void RequestBuilderImpl::ValidateHokIsConfigured(const std::string& operationName) const
+{
+    if (!_holderOfKeyConfig) {
+        throw Quillon::InvalidStateException(
+            "No HolderOfKeyConfig provided. Unable to " + operationName);
+    }
 }
 
 SamlToken::ConfirmationType RequestBuilderImpl::GetEffectiveConfirmationType(
@@ -68,22 +155,43 @@ SamlToken::ConfirmationType RequestBuilderImpl::GetEffectiveConfirmationType(
                : SamlToken::CONFIRM_BEARER;
 }
 
-std::string RequestBuilderImpl::BuildUnSignedRequest(
-    XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder) const
-{
-    return SerializeToXML(*SoapBuilder(std::move(headerBuilder), std::move(bodyBuilder)));
-}
-
 std::string RequestBuilderImpl::BuildTokenRequest(
     TokenSpec::Confirmation confirmation,
     XMLBuilderPtr headerBuilder,
     XMLBuilderPtr bodyBuilder) const
 {
-    if (GetEffectiveConfirmationType(confirmation) == SamlToken::CONFIRM_HOLDER_OF_KEY) {
-        throw Quillon::InvalidStateException(
-            "Requests for holder-of-key tokens cannot be signed yet");
+    return GetEffectiveConfirmationType(confirmation) == SamlToken::CONFIRM_HOLDER_OF_KEY
+               ? BuildCertRefSignedRequest(std::move(headerBuilder), std::move(bodyBuilder))
+               : BuildUnSignedRequest(std::move(headerBuilder), std::move(bodyBuilder));
+}
+
+std::string RequestBuilderImpl::BuildCertRefSignedRequest(
+    XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder) const
+{
+    const HolderOfKeyConfig& identity = GetHolderOfKeyConfig();
+    return SerializeToXML(*CertRefSignedSoapBuilder(
+        std::move(headerBuilder),
+        std::move(bodyBuilder),
+        identity.privateKey.get(),
+        identity.certificate.get()));
+}
+
+std::string RequestBuilderImpl::BuildSamlRefSignedRequest(
+    const std::string& tokenId, XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder) const
+{
+    return SerializeToXML(*SamlRefSignedSoapBuilder(
+        std::move(headerBuilder),
+        std::move(bodyBuilder),
+        GetHolderOfKeyConfig().privateKey.get(),
+        tokenId));
+}
+
+const HolderOfKeyConfig& RequestBuilderImpl::GetHolderOfKeyConfig() const
+{
+    if (!_holderOfKeyConfig.is_initialized()) {
+        Quillon::PanicVerify("_holderOfKeyConfig.is_initialized()", Unit, __LINE__);
     }
-    return BuildUnSignedRequest(std::move(headerBuilder), std::move(bodyBuilder));
+    return *_holderOfKeyConfig;
 }
 
 } // namespace SsoClient

@@ -2,7 +2,6 @@
 
 #include "ssoClient/HolderOfKeyConfig.h"
 #include "ssoClient/RequestBuilder.h"
-#include "ssoClient/SamlToken.h"
 #include "ssoClient/xmlCommonBuilders.h"
 
 #include <boost/optional.hpp>
@@ -20,16 +19,28 @@ public:
         const std::string& password,
         const TokenSpec& spec,
         Request& request) const override;
+    void BuildCertificateTokenRequest(const TokenSpec& spec, Request& request) const override;
+    void BuildExchangeTokenRequest(
+        const SamlToken& token, const TokenSpec& spec, Request& request) const override;
+    void BuildValidateSubjectRequest(const SamlToken& token, Request& request) const override;
+    void BuildRenewRequest(
+        const SamlToken& token, long long lifetimeSec, Request& request) const override;
 
 private:
+    void ValidateHokIsConfigured(const std::string& operationName) const;
     SamlToken::ConfirmationType GetEffectiveConfirmationType(
         TokenSpec::Confirmation confirmation) const;
 
-    std::string BuildUnSignedRequest(XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder) const;
+    // Each gives the envelope as text.
     std::string BuildTokenRequest(
         TokenSpec::Confirmation confirmation,
         XMLBuilderPtr headerBuilder,
         XMLBuilderPtr bodyBuilder) const;
+    std::string BuildCertRefSignedRequest(
+        XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder) const;
+    std::string BuildSamlRefSignedRequest(
+        const std::string& tokenId, XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder) const;
+    const HolderOfKeyConfig& GetHolderOfKeyConfig() const;
 
     boost::optional<HolderOfKeyConfig> _holderOfKeyConfig;
 };

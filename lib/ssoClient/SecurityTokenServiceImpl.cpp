@@ -87,6 +87,66 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireToken(
     return ToSamlToken(tokenXml);
 }
 
+boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByCertificate(
+    const TokenSpec& spec) const
+{
+    const OperationFrame frame("AcquireTokenByCertificate");
+    LogTrace([&spec] {
+        return MessageFormatter::ASPrint("Requested token with spec `%1'", WriteTokenSpec(spec));
+    });
+    Request request;
+    _requestBuilder->BuildCertificateTokenRequest(spec, request);
+    std::string tokenXml;
+    _responseHandler->HandleAcquireTokenResponse(Send(request).get(), tokenXml);
+    return ToSamlToken(tokenXml);
+}
+
+boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByToken(
+    const SamlToken& token, const TokenSpec& spec) const
+{
+    const OperationFrame frame("AcquireTokenByToken");
+    LogTrace([&] {
+        return MessageFormatter::ASPrint(
+            "Requested token for %1 with spec `%2'",
+            CreateRedactedDescription(token),
+            WriteTokenSpec(spec));
+    });
+    Request request;
+    _requestBuilder->BuildExchangeTokenRequest(token, spec, request);
+    std::string tokenXml;
+    _responseHandler->HandleAcquireTokenResponse(Send(request).get(), tokenXml);
+    return ToSamlToken(tokenXml);
+}
+
+bool SecurityTokenServiceImpl::ValidateSubject(const SamlToken& token) const
+{
+    const OperationFrame frame("ValidateSubject");
+    LogTrace([&token] {
+        return MessageFormatter::ASPrint(
+            "Validating subject of token %1", CreateRedactedDescription(token));
+    });
+    Request request;
+    _requestBuilder->BuildValidateSubjectRequest(token, request);
+    const bool result = _responseHandler->HandleValidateSubjectResponse(Send(request).get());
+    LogTrace([result] { return MessageFormatter::ASPrint("Result: %1", result); });
+    return result;
+}
+
+boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::RenewToken(
+    const SamlToken& token, long long lifetimeSec) const
+{
+    const OperationFrame frame("RenewToken");
+    LogTrace([&] {
+        return MessageFormatter::ASPrint(
+            "Renewing token %1 for %2 more seconds", CreateRedactedDescription(token), lifetimeSec);
+    });
+    Request request;
+    _requestBuilder->BuildRenewRequest(token, lifetimeSec, request);
+    std::string tokenXml;
+    _responseHandler->HandleRenewTokenResponse(Send(request).get(), tokenXml);
+    return ToSamlToken(tokenXml);
+}
+
 Quillon::Ref<Quillon::Reader> SecurityTokenServiceImpl::Send(const Request& request) const
 {
     Quillon::Ref<Quillon::Reader> reply;

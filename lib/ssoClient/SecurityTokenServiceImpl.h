@@ -23,6 +23,13 @@ public:
         const std::string& userName,
         const std::string& password,
         const TokenSpec& spec) const override;
+    boost::shared_ptr<const SamlToken> AcquireTokenByCertificate(
+        const TokenSpec& spec) const override;
+    boost::shared_ptr<const SamlToken> AcquireTokenByToken(
+        const SamlToken& token, const TokenSpec& spec) const override;
+    bool ValidateSubject(const SamlToken& token) const override;
+    boost::shared_ptr<const SamlToken> RenewToken(
+        const SamlToken& token, long long lifetimeSec) const override;
 
 private:
     /** Sends the request in a session of its own. @return the reply. */

@@ -169,7 +169,7 @@ void ParseSamlIssuerElement(NodeFilterIterator& iterator, NameIDType& issuer)
 void ParseTokenSignature(
     NodeFilterIterator& iterator, ElementNode* assertion, Ref<Security::Signature>& signature)
 {
-    const ElementNode* element = IteratorToElement(iterator);
+    ElementNode* element = IteratorToElement(iterator);
     if (element == nullptr) {
         throw ParseException("Expected element ds:Signature not found");
     }

@@ -11,10 +11,12 @@
 namespace SsoClient {
 
 /**
- * Obtains tokens from a WS-Trust 1.3 security token service.
+ * Obtains, renews and validates tokens at a WS-Trust 1.3 security token service.
  *
  * No operation retries. Each may throw:
  * - `Quillon::InvalidArgumentException`, before anything is sent, for a bad argument;
+ * - `Quillon::InvalidStateException`, before anything is sent, if it needs the holder-of-key
+ *   identity and the configuration has none;
  * - `CommunicationException`, or the transport's own exception, if the exchange fails;
  * - `InvalidCredentialsException` if the service rejects the credentials;
  * - `InvalidSignatureException` if the token it sends does not verify;
@@ -34,6 +36,36 @@ public:
      */
     virtual boost::shared_ptr<const SamlToken> AcquireToken(
         const std::string& userName, const std::string& password, const TokenSpec& spec) const = 0;
+
+    /**
+     * Acquires a holder-of-key token with the caller's own key and certificate. The confirmation
+     * asked for must be the default.
+     *
+     * @return as `AcquireToken`.
+     */
+    virtual boost::shared_ptr<const SamlToken> AcquireTokenByCertificate(
+        const TokenSpec& spec) const = 0;
+
+    /**
+     * Acquires a token by presenting `token`, for delegation or with other properties. The
+     * request is signed with the caller's own key.
+     *
+     * @return as `AcquireToken`.
+     */
+    virtual boost::shared_ptr<const SamlToken> AcquireTokenByToken(
+        const SamlToken& token, const TokenSpec& spec) const = 0;
+
+    /** Asks the service whether the subject of `token` is still valid. */
+    virtual bool ValidateSubject(const SamlToken& token) const = 0;
+
+    /**
+     * Renews a holder-of-key token. The request is signed with the caller's own key.
+     *
+     * @param lifetimeSec  of the new token, from now; must be positive.
+     * @return as `AcquireToken`.
+     */
+    virtual boost::shared_ptr<const SamlToken> RenewToken(
+        const SamlToken& token, long long lifetimeSec) const = 0;
 };
 
 /**

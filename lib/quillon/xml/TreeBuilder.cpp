@@ -102,7 +102,7 @@ void TreeBuilder::EndElement()
 
 void TreeBuilder::Characters(std::string_view text)
 {
-    if (_current == nullptr) {
+    if (_current == nullptr || text.empty()) {
         return;
     }
     if (!_isMixed && _run.empty() && IsInSource(text)) {

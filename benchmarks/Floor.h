@@ -1,0 +1,28 @@
+#pragma once
+
+#include <memory>
+#include <string>
+#include <vector>
+
+// The least that an operation can cost with the libraries that it stands on.
+namespace Benchmarks {
+
+/** What no verification can do without: one parse, two passes of SHA-256, one RSA operation. */
+class VerifyFloor
+{
+public:
+    /** Makes an RSA-2048 key and a signature of its own. */
+    VerifyFloor();
+    ~VerifyFloor();
+    VerifyFloor(const VerifyFloor&) = delete;
+    VerifyFloor& operator=(const VerifyFloor&) = delete;
+
+    /** @return false if anything failed, so that nothing is measured that does not work. */
+    bool Run(const std::string& xml) const;
+
+private:
+    struct Handles;
+    std::unique_ptr<Handles> _handles;
+};
+
+} // namespace Benchmarks

@@ -1,0 +1,79 @@
+#include "VerifyBenchmark.h"
+
+#include "Floor.h"
+
+#include "quillon/system/Clock.h"
+#include "ssoClient/CreateSamlToken.h"
+
+#include <benchmark/benchmark.h>
+
+#include <fstream>
+#include <sstream>
+#include <stdexcept>
+
+namespace Benchmarks {
+
+namespace {
+
+std::string ReadFile(const std::string& name)
+{
+    std::ifstream file(std::string(TEST_DATA_DIR) + "/" + name, std::ios::binary);
+    std::ostringstream text;
+    text << file.rdbuf();
+    if (!file || text.str().empty()) {
+        throw std::runtime_error("Cannot read " + name);
+    }
+    return text.str();
+}
+
+/** A moment inside the validity of the tokens. */
+class TokenClock final : public Quillon::System::Clock
+{
+public:
+    Quillon::System::DateTime Now() const override
+    {
+        return Quillon::System::DateTime("2026-06-15T12:00:00Z");
+    }
+};
+
+void BM_Own(
+    benchmark::State& state,
+    const std::string& xml,
+    const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trusted)
+{
+    for (auto _ : state) {
+        benchmark::DoNotOptimize(SsoClient::CreateSamlToken(xml, trusted));
+    }
+}
+
+void BM_Floor(benchmark::State& state, const std::string& xml, const VerifyFloor& floor)
+{
+    for (auto _ : state) {
+        if (!floor.Run(xml)) {
+            state.SkipWithError("The floor fails");
+        }
+    }
+}
+
+} // namespace
+
+void RegisterVerifyBenchmarks()
+{
+    static const TokenClock Clock;
+    static const VerifyFloor Floor;
+    static const auto Trusted =
+        Quillon::Crypto::ParsePemCertificates(ReadFile("keys/sts-cert.pem"));
+    Quillon::System::ReplaceClock(&Clock);
+    for (const char* size : {"4k", "8k", "100k"}) {
+        const std::string xml = ReadFile(std::string("tokens/accepted/bearer-") + size + ".xml");
+        const std::string name = std::string("Verify/") + size;
+        benchmark::RegisterBenchmark(("Floor/" + name).c_str(), [xml](benchmark::State& state) {
+            BM_Floor(state, xml, Floor);
+        });
+        benchmark::RegisterBenchmark(("Own/" + name).c_str(), [xml](benchmark::State& state) {
+            BM_Own(state, xml, Trusted);
+        });
+    }
+}
+
+} // namespace Benchmarks

@@ -1,0 +1,17 @@
+#include "RatioReporter.h"
+#include "VerifyBenchmark.h"
+
+#include <benchmark/benchmark.h>
+
+int main(int argc, char** argv)
+{
+    benchmark::Initialize(&argc, argv);
+    if (benchmark::ReportUnrecognizedArguments(argc, argv)) {
+        return 2;
+    }
+    Benchmarks::RegisterVerifyBenchmarks();
+    Benchmarks::RatioReporter reporter;
+    benchmark::RunSpecifiedBenchmarks(&reporter);
+    benchmark::Shutdown();
+    return 0;
+}

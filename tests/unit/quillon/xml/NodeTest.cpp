@@ -1,0 +1,227 @@
+#include "XmlSupport.h"
+
+#include <gtest/gtest.h>
+
+namespace Quillon::Xml {
+
+namespace {
+
+Ref<ElementNode> MakeElement(const char* prefix, const char* localName)
+{
+    Ref<ElementNode> element;
+    CreateElementNode(prefix, localName, element);
+    return element;
+}
+
+Ref<TextNode> MakeText(const char* content)
+{
+    Ref<TextNode> text;
+    CreateTextNode(text);
+    text->SetText(content);
+    return text;
+}
+
+TEST(CreateElementNode, JoinsPrefixAndLocalName)
+{
+    const Ref<ElementNode> element = MakeElement("p", "local");
+    EXPECT_EQ(element->GetName(), "p:local");
+    EXPECT_EQ(element->GetPrefix(), "p");
+    EXPECT_EQ(element->GetLocalName(), "local");
+    EXPECT_EQ(element->GetLine(), 0U);
+    EXPECT_EQ(element->GetColumn(), 0U);
+}
+
+TEST(CreateElementNode, GivesAnUnprefixedNameForAnEmptyPrefix)
+{
+    const Ref<ElementNode> element = MakeElement("", "local");
+    EXPECT_EQ(element->GetName(), "local");
+    EXPECT_EQ(element->GetPrefix(), "");
+}
+
+TEST(CreateTextNode, IsEmptyUntilItsTextIsSet)
+{
+    Ref<TextNode> text;
+    CreateTextNode(text);
+    EXPECT_EQ(text->GetText(), "");
+    text->SetText("<&>");
+    EXPECT_EQ(text->GetText(), "<&>");
+}
+
+TEST(DefineAttribute, KeepsTheOrderAndReplacesInPlace)
+{
+    const Ref<ElementNode> element = MakeElement("", "e");
+    for (const char* name : {"c", "a", "b", "d", "e"}) {
+        element->DefineAttribute(name, "1");
+    }
+    element->DefineAttribute("a", "<&\"\t\n\r>");
+    EXPECT_EQ(
+        SerializeToText(element.get()),
+        "<e c=\"1\" a=\"&lt;&amp;&quot;&#x9;&#xA;&#xD;>\" b=\"1\" d=\"1\" e=\"1\"/>");
+}
+
+TEST(DefineAttribute, MakesADeclarationThatIsLookedUp)
+{
+    const Ref<ElementNode> parent = MakeElement("p", "parent");
+    const Ref<ElementNode> child = MakeElement("p", "child");
+    parent->AppendChild(child.get());
+    std::string_view uri = "untouched";
+    EXPECT_FALSE(child->LookupNamespace("p", uri));
+    EXPECT_EQ(uri, "untouched");
+    parent->DefineAttribute("xmlns:p", "urn:p");
+    EXPECT_TRUE(child->LookupNamespace("p", uri));
+    EXPECT_EQ(uri, "urn:p");
+    EXPECT_TRUE(child->HasQName("child", "urn:p"));
+    EXPECT_FALSE(child->HasQName("child", "urn:q"));
+    EXPECT_FALSE(child->HasQName("parent", "urn:p"));
+}
+
+TEST(LookupNamespace, FindsTheNearestDeclaration)
+{
+    const Ref<Document> document = ParseText("<r xmlns='urn:d' xmlns:a='urn:1' xmlns:ab='urn:2'><m "
+                                             "xmlns:a='urn:3' xmlns=''><e/></m></r>");
+    const ElementNode* inner =
+        document->GetRootElement()->FindChildElement("m")->FindChildElement("e");
+    std::string_view uri;
+    EXPECT_TRUE(inner->LookupNamespace("a", uri));
+    EXPECT_EQ(uri, "urn:3");
+    EXPECT_TRUE(inner->LookupNamespace("ab", uri));
+    EXPECT_EQ(uri, "urn:2");
+    EXPECT_TRUE(inner->LookupNamespace("", uri));
+    EXPECT_EQ(uri, "");
+    EXPECT_TRUE(inner->LookupNamespace("xml", uri));
+    EXPECT_EQ(uri, "http://www.w3.org/XML/1998/namespace");
+    EXPECT_FALSE(inner->LookupNamespace("b", uri));
+    EXPECT_FALSE(inner->LookupNamespace("xmlns", uri));
+}
+
+TEST(FindAttribute, TellsRawFromExpandedNames)
+{
+    const Ref<Document> document =
+        ParseText("<e xmlns:p='urn:p' xmlns='urn:d' p:a='1' a='2' q='3'/>");
+    const ElementNode* element = document->GetRootElement();
+    EXPECT_EQ(element->FindAttribute("p:a")->value, "1");
+    EXPECT_EQ(element->FindAttribute("a")->value, "2");
+    EXPECT_EQ(element->FindAttribute("b"), nullptr);
+    EXPECT_EQ(element->FindAttribute("a", "urn:p")->value, "1");
+    EXPECT_EQ(element->FindAttribute("a", "")->value, "2");
+    // The default namespace does not apply to attributes [XML Names 6.2].
+    EXPECT_EQ(element->FindAttribute("a", "urn:d"), nullptr);
+    EXPECT_EQ(element->FindAttribute("p", ""), nullptr);
+    std::string value = "untouched";
+    EXPECT_FALSE(element->GetAttribute("p", value));
+    EXPECT_EQ(value, "untouched");
+    EXPECT_TRUE(element->GetAttribute("q", value));
+    EXPECT_EQ(value, "3");
+    EXPECT_EQ(
+        element->GetAttributeMap(),
+        (std::map<std::string, std::string>{
+            {"a", "2"}, {"p:a", "1"}, {"q", "3"}, {"xmlns", "urn:d"}, {"xmlns:p", "urn:p"}}));
+}
+
+TEST(FindChildElement, FindsTheFirstByLocalNameOrByQName)
+{
+    const Ref<Document> document = ParseText(
+        "<r>t<a:x xmlns:a='urn:a' n='1'/><x n='2'/><!--c--><a:x xmlns:a='urn:b' n='3'/></r>");
+    const ElementNode* root = document->GetRootElement();
+    EXPECT_EQ(root->FindChildElement("x")->FindAttribute("n")->value, "1");
+    EXPECT_EQ(root->FindChildElement("x", "urn:b")->FindAttribute("n")->value, "3");
+    EXPECT_EQ(root->FindChildElement("x", "")->FindAttribute("n")->value, "2");
+    EXPECT_EQ(root->FindChildElement("y"), nullptr);
+    EXPECT_EQ(root->FindChildElement("x", "urn:c"), nullptr);
+}
+
+TEST(AppendChild, KeepsAParsedTreeAliveInsideAComposedOne)
+{
+    const Ref<ElementNode> parent = MakeElement("", "parent");
+    {
+        const Ref<Document> document = ParseText("<!--before--><child a='1'>text</child><?after?>");
+        parent->AppendChild(document->GetRootElement());
+    }
+    EXPECT_EQ(SerializeToText(parent.get()), "<parent><child a=\"1\">text</child></parent>");
+    EXPECT_EQ(parent->GetFirstChild()->GetNextSibling(), nullptr);
+}
+
+TEST(AppendChild, KeepsTheWholeTreeAliveThroughARefToAnyNode)
+{
+    Ref<TextNode> text = MakeText("deep");
+    {
+        const Ref<ElementNode> root = MakeElement("p", "root");
+        const Ref<ElementNode> middle = MakeElement("p", "middle");
+        root->DefineAttribute("xmlns:p", "urn:p");
+        middle->AppendChild(text.get());
+        root->AppendChild(middle.get());
+    }
+    EXPECT_EQ(
+        SerializeToText(text->GetParent()->GetParent()),
+        "<p:root xmlns:p=\"urn:p\"><p:middle>deep</p:middle></p:root>");
+}
+
+TEST(AppendChild, MovesAChildFromItsOldParent)
+{
+    const Ref<ElementNode> first = MakeElement("", "first");
+    const Ref<ElementNode> second = MakeElement("", "second");
+    for (const char* name : {"a", "b", "c"}) {
+        first->AppendChild(MakeElement("", name).get());
+    }
+    second->AppendChild(first->FindChildElement("c"));
+    second->AppendChild(first->FindChildElement("a"));
+    first->AppendChild(MakeElement("", "d").get());
+    EXPECT_EQ(SerializeToText(first.get()), "<first><b/><d/></first>");
+    EXPECT_EQ(SerializeToText(second.get()), "<second><c/><a/></second>");
+}
+
+TEST(AppendChild, MovesAChildToTheEndOfTheSameParent)
+{
+    const Ref<ElementNode> parent = MakeElement("", "p");
+    const Ref<ElementNode> a = MakeElement("", "a");
+    parent->AppendChild(a.get());
+    parent->AppendChild(MakeElement("", "b").get());
+    parent->AppendChild(a.get());
+    EXPECT_EQ(SerializeToText(parent.get()), "<p><b/><a/></p>");
+}
+
+TEST(AppendChild, RefusesTheElementItselfAndItsAncestors)
+{
+    const Ref<ElementNode> parent = MakeElement("", "p");
+    const Ref<ElementNode> child = MakeElement("", "c");
+    parent->AppendChild(child.get());
+    EXPECT_THROW(parent->AppendChild(parent.get()), InvalidArgumentException);
+    EXPECT_THROW(child->AppendChild(parent.get()), InvalidArgumentException);
+    EXPECT_EQ(SerializeToText(parent.get()), "<p><c/></p>");
+}
+
+TEST(Serialize, EscapesWhatXmlNeedsAndKeepsEveryKindOfNode)
+{
+    const Ref<Document> document =
+        ParseText("<a:r xmlns:a='urn:a' a:x='&lt;\"&#10;'>&lt;&amp;&gt;&#13;<!-- c --><?pi "
+                  "d?><![CDATA[<]]><e/></a:r>");
+    EXPECT_EQ(
+        SerializeToText(document->GetRootElement()),
+        "<a:r xmlns:a=\"urn:a\" a:x=\"&lt;&quot;&#xA;\">"
+        "&lt;&amp;&gt;&#xD;<!-- c --><?pi d?>&lt;<e/></a:r>");
+}
+
+TEST(NodeTypes, HaveNamesForMessages)
+{
+    EXPECT_STREQ(ToString(NodeType::ELEMENT), "element");
+    EXPECT_STREQ(ToString(NodeType::TEXT), "text");
+    EXPECT_STREQ(ToString(NodeType::COMMENT), "comment");
+    EXPECT_STREQ(ToString(NodeType::PROCESSING_INSTRUCTION), "processing instruction");
+}
+
+TEST(AsNode, GivesNullForNullAndForOtherKinds)
+{
+    const Ref<TextNode> text = MakeText("t");
+    const Ref<ElementNode> element = MakeElement("", "e");
+    EXPECT_EQ(AsElement(static_cast<Node*>(nullptr)), nullptr);
+    EXPECT_EQ(AsElement(static_cast<Node*>(text.get())), nullptr);
+    EXPECT_EQ(AsElement(static_cast<Node*>(element.get())), element.get());
+    EXPECT_EQ(AsText(nullptr), nullptr);
+    EXPECT_EQ(AsText(element.get()), nullptr);
+    EXPECT_EQ(AsText(text.get()), text.get());
+    EXPECT_EQ(text->GetFirstChild(), nullptr);
+}
+
+} // namespace
+
+} // namespace Quillon::Xml

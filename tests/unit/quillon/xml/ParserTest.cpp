@@ -1,0 +1,333 @@
+#include "XmlSupport.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+namespace Quillon::Xml {
+
+namespace {
+
+std::string Repeat(std::string_view text, std::size_t count)
+{
+    std::string result;
+    result.reserve(text.size() * count);
+    for (std::size_t i = 0; i < count; ++i) {
+        result.append(text);
+    }
+    return result;
+}
+
+/** `count` attributes of distinct names. */
+std::string MakeAttributes(std::size_t count, const std::string& namePrefix = "a")
+{
+    std::string text;
+    for (std::size_t i = 0; i < count; ++i) {
+        text += " " + namePrefix + std::to_string(i) + "=\"urn:" + std::to_string(i) + "\"";
+    }
+    return text;
+}
+
+/** Kinds and contents of the children of the root, for example `text(a) comment(b)`. */
+std::string DescribeChildren(std::string_view text)
+{
+    std::string description;
+    const Ref<Document> document = ParseText(text);
+    for (const Node* node = document->GetRootElement()->GetFirstChild(); node != nullptr;
+         node = node->GetNextSibling()) {
+        description += description.empty() ? "" : " ";
+        description += ToString(node->GetNodeType());
+        if (const TextNode* content = AsText(node)) {
+            description += "(" + std::string(content->GetText()) + ")";
+        } else if (const ElementNode* element = AsElement(node)) {
+            description += "(" + std::string(element->GetName()) + ")";
+        } else if (node->GetNodeType() == NodeType::COMMENT) {
+            description +=
+                "(" + std::string(static_cast<const CommentNode*>(node)->GetText()) + ")";
+        } else {
+            const auto* instruction = static_cast<const ProcessingInstructionNode*>(node);
+            description += "(" + std::string(instruction->GetTarget()) + "|"
+                           + std::string(instruction->GetData()) + ")";
+        }
+    }
+    return description;
+}
+
+TEST(Parse, KeepsNamesAndAttributesAsWritten)
+{
+    const Ref<Document> document = ParseText(
+        "<p:r  b = '2'\n xmlns:p=\"urn:p\" a='1' xmlns = 'urn:d' p:c='&#x33;'  ><x/></p:r >");
+    EXPECT_EQ(
+        SerializeToText(document->GetRootElement()),
+        "<p:r b=\"2\" xmlns:p=\"urn:p\" a=\"1\" xmlns=\"urn:d\" p:c=\"3\"><x/></p:r>");
+}
+
+TEST(Parse, NormalisesLineEndsAndAttributeBlanks)
+{
+    const Ref<Document> document = ParseText("<r a='x\r\ny\tz\n&#13;&#10;&#9;'>l\r\nm\rn&#13;</r>");
+    EXPECT_EQ(document->GetRootElement()->FindAttribute("a")->value, "x y z \r\n\t");
+    EXPECT_EQ(AsText(document->GetRootElement()->GetFirstChild())->GetText(), "l\nm\nn\r");
+}
+
+TEST(Parse, MakesOneNodeOfAdjacentTextCDataAndReferences)
+{
+    EXPECT_EQ(
+        DescribeChildren("<r>a&amp;b<![CDATA[<c>]]>d&#x65;\xC3\xA4</r>"), "text(a&b<c>de\xC3\xA4)");
+    EXPECT_EQ(DescribeChildren("<r>plain</r>"), "text(plain)");
+    EXPECT_EQ(DescribeChildren("<r>&lt;</r>"), "text(<)");
+    EXPECT_EQ(DescribeChildren("<r><![CDATA[]]></r>"), "");
+}
+
+TEST(Parse, KeepsCommentsAndProcessingInstructionsAsNodes)
+{
+    EXPECT_EQ(
+        DescribeChildren("<r>a<!--b-->c<?d e f?><g/> </r>"),
+        "text(a) comment(b) text(c) processing instruction(d|e f) element(g) text( )");
+}
+
+TEST(Parse, KeepsLongTextWhole)
+{
+    for (const char* piece : {"abcdefghij", "\xC3\xA4\xE2\x82\xAC", "a&amp;", "\n"}) {
+        const std::string text = Repeat(piece, 20000);
+        const Ref<Document> document = ParseText("<r>" + text + "</r>");
+        const Node* child = document->GetRootElement()->GetFirstChild();
+        const std::string expected = std::string(piece) == "a&amp;" ? Repeat("a&", 20000) : text;
+        EXPECT_EQ(AsText(child)->GetText(), expected);
+        EXPECT_EQ(child->GetNextSibling(), nullptr);
+    }
+}
+
+TEST(Parse, TellsWhereATagStarts)
+{
+    const Ref<Document> document = ParseText("<r>\n  <a\n   x='1'/><b/></r>");
+    const ElementNode* root = document->GetRootElement();
+    EXPECT_EQ(root->GetLine(), 1U);
+    EXPECT_EQ(root->GetColumn(), 1U);
+    EXPECT_EQ(root->FindChildElement("a")->GetLine(), 2U);
+    EXPECT_EQ(root->FindChildElement("a")->GetColumn(), 3U);
+    EXPECT_EQ(root->FindChildElement("b")->GetLine(), 3U);
+    EXPECT_EQ(root->FindChildElement("b")->GetColumn(), 11U);
+}
+
+TEST(Parse, LeavesAnUndeclaredPrefixReadable)
+{
+    const Ref<Document> document = ParseText("<p:r q:a='1'/>");
+    EXPECT_EQ(document->GetRootElement()->GetName(), "p:r");
+    EXPECT_EQ(document->GetRootElement()->FindAttribute("q:a")->value, "1");
+}
+
+TEST(Parse, KeepsWhatStandsBesideTheRoot)
+{
+    const Ref<Document> document = ParseText("<?xml version='1.0'?><?a?><!--b--><r/><?c d?>");
+    const Node* node = document->GetFirstChild();
+    EXPECT_EQ(node->GetNodeType(), NodeType::PROCESSING_INSTRUCTION);
+    node = node->GetNextSibling();
+    EXPECT_EQ(node->GetNodeType(), NodeType::COMMENT);
+    node = node->GetNextSibling();
+    EXPECT_EQ(node, document->GetRootElement());
+    node = node->GetNextSibling();
+    EXPECT_EQ(node->GetNodeType(), NodeType::PROCESSING_INSTRUCTION);
+    EXPECT_EQ(node->GetNextSibling(), nullptr);
+}
+
+TEST(Parse, ReadsAReaderAndKeepsTheTreeAfterThat)
+{
+    const Ref<DocumentHandler> handler = CreateXMLDocumentHandler();
+    {
+        const Ref<Reader> reader = CreateStringReader("<r>" + Repeat("text ", 5000) + "</r>");
+        CreateXMLParser(handler.get())->Parse(reader.get());
+    }
+    EXPECT_EQ(
+        AsText(handler->GetDocument()->GetRootElement()->GetFirstChild())->GetText(),
+        Repeat("text ", 5000));
+}
+
+TEST(GetDocument, RefusesWhenNothingWasParsed)
+{
+    EXPECT_THROW(CreateXMLDocumentHandler()->GetDocument(), TypeMismatchException);
+}
+
+TEST(Parse, AcceptsUtf8InEveryDeclaredSpelling)
+{
+    EXPECT_EQ(GetParseError("<?xml version='1.0' encoding='UTF-8'?><r/>"), "accepted");
+    EXPECT_EQ(
+        GetParseError("<?xml version='1.0' encoding='utf-8' standalone='yes'?><r/>"), "accepted");
+    EXPECT_EQ(GetParseError("\xEF\xBB\xBF<r/>"), "accepted");
+    EXPECT_EQ(GetParseError(" \n<r/>"), "accepted");
+}
+
+TEST(Parse, RefusesOtherEncodings)
+{
+    EXPECT_THAT(
+        GetParseError("<?xml version='1.0' encoding='ISO-8859-1'?><r/>"),
+        testing::HasSubstr("Encoding 'ISO-8859-1' is not UTF-8"));
+    EXPECT_THAT(
+        GetParseError("<?xml version='1.0' encoding='UTF-16'?><r/>"),
+        testing::Not(testing::HasSubstr("accepted")));
+    EXPECT_EQ(
+        GetParseError(std::string_view("\xFF\xFE<\0r\0/\0>\0", 10)),
+        "Start tag expected, '<' not found at octet 0");
+    EXPECT_EQ(GetParseError(std::string_view("<\0r\0/\0>\0", 8)), "NUL character at octet 1");
+}
+
+TEST(Parse, RefusesAnotherXmlVersion)
+{
+    EXPECT_THAT(
+        GetParseError("<?xml version='1.1'?><r/>"),
+        testing::HasSubstr("XML version '1.1' is not supported"));
+}
+
+TEST(Parse, RefusesOctetsThatAreNotUtf8)
+{
+    const std::vector<std::string> malformed{
+        "\x80",
+        "\xC0\xAF",
+        "\xC1\x81",
+        "\xC3",
+        "\xC3(",
+        "\xE0\x80\xAF",
+        "\xE2\x82",
+        "\xED\xA0\x80",
+        "\xED\xBF\xBF",
+        "\xF0\x80\x80\xAF",
+        "\xF4\x90\x80\x80",
+        "\xF5\x80\x80\x80",
+        "\xFE",
+        "\xFF"};
+    for (const std::string& octets : malformed) {
+        for (std::size_t padding = 0; padding < 9; ++padding) {
+            const std::string text = "<r>" + std::string(padding, 'a') + octets + "</r>";
+            EXPECT_EQ(
+                GetParseError(text),
+                "The text is not UTF-8 at octet " + std::to_string(3 + padding));
+        }
+    }
+    EXPECT_EQ(
+        GetParseError("<r>\xC2\x80\xDF\xBF\xE0\xA0\x80\xED\x9F\xBF\xEE\x80\x80"
+                      "\xF0\x90\x80\x80\xF4\x8F\xBF\xBD</r>"),
+        "accepted");
+}
+
+TEST(Parse, RefusesEveryDoctype)
+{
+    for (const char* doctype :
+         {"<!DOCTYPE r>",
+          "<!DOCTYPE r []>",
+          "<!DOCTYPE r SYSTEM 'file:///x'>",
+          "<!DOCTYPE r PUBLIC 'p' 'http://127.0.0.1/x'>",
+          "<!DOCTYPE r [<!ENTITY e 'x'>]>",
+          "<!DOCTYPE r [<!ENTITY % p SYSTEM 'file:///x'> %p;]>"}) {
+        EXPECT_THAT(
+            GetParseError(std::string(doctype) + "<r/>"),
+            testing::HasSubstr("A DOCTYPE is not accepted"))
+            << doctype;
+    }
+}
+
+TEST(Parse, RefusesWhatIsNotWellFormed)
+{
+    for (const char* text :
+         {"<r>",
+          "<r></s>",
+          "<r/><r/>",
+          "<r/>text",
+          "text",
+          "<r a='1' a='2'/>",
+          "<r a=1/>",
+          "<r a/>",
+          "<r a='<'/>",
+          "<r>&undefined;</r>",
+          "<r>&#0;</r>",
+          "<r>&#xFFFE;</r>",
+          "<r>\x01</r>",
+          "<r>]]></r>",
+          "<r><!-- -- --></r>",
+          "<r><?xml version='1.0'?></r>",
+          "<r:r:r xmlns:r='urn:r'/>",
+          "<r xmlns:p=''/>",
+          "<r xmlns:a='urn:a' xmlns:b='urn:a' a:x='' b:x=''/>",
+          "<r xmlns:xmlns='urn:a'/>",
+          "<r xmlns:xml='urn:a'/>",
+          "<r",
+          "<",
+          "<r>&amp</r>"}) {
+        EXPECT_NE(GetParseError(text), "accepted") << text;
+    }
+    EXPECT_EQ(GetParseError(""), "The document is empty at octet 0");
+    EXPECT_EQ(GetParseError("\xEF\xBB\xBF"), "The document is empty at octet 3");
+    EXPECT_THAT(GetParseError("<a>\n<b></a>"), testing::HasSubstr("line 2"));
+}
+
+TEST(Parse, LimitsTheSize)
+{
+    const std::size_t frame = std::string_view("<r></r>").size();
+    const std::string largest(ParserLimits::MaxDocumentBytes - frame, 'x');
+    EXPECT_EQ(GetParseError("<r>" + largest + "</r>"), "accepted");
+    EXPECT_EQ(
+        GetParseError("<r>x" + largest + "</r>"), "The document has more than 8388608 octets");
+    const Ref<DocumentHandler> handler = CreateXMLDocumentHandler();
+    const Ref<Reader> reader = CreateStringReader("<r>" + largest + largest + "</r>");
+    EXPECT_THROW(CreateXMLParser(handler.get())->Parse(reader.get()), XMLParseException);
+}
+
+TEST(Parse, LimitsTheDepth)
+{
+    const auto nest = [](std::size_t depth) {
+        return Repeat("<a>", depth) + Repeat("</a>", depth);
+    };
+    EXPECT_EQ(GetParseError(nest(ParserLimits::MaxDepth)), "accepted");
+    EXPECT_THAT(
+        GetParseError(nest(ParserLimits::MaxDepth + 1)),
+        testing::HasSubstr("More than 128 elements inside one another"));
+    EXPECT_THAT(GetParseError(nest(200000)), testing::HasSubstr("More than 128 elements"));
+}
+
+TEST(Parse, LimitsTheAttributesOfOneElement)
+{
+    EXPECT_EQ(GetParseError("<r" + MakeAttributes(ParserLimits::MaxAttributes) + "/>"), "accepted");
+    EXPECT_EQ(
+        GetParseError("<r" + MakeAttributes(ParserLimits::MaxAttributes + 1) + "/>"),
+        "More than 256 attributes in the tag at octet 0");
+    EXPECT_EQ(
+        GetParseError("<q><r" + MakeAttributes(200000) + "/></q>"),
+        "More than 256 attributes in the tag at octet 3");
+    // Broken off by an error, they must not be compared with one another either.
+    EXPECT_EQ(
+        GetParseError("<r" + MakeAttributes(200000) + " b='<'/>"),
+        "More than 256 attributes in the tag at octet 0");
+    EXPECT_EQ(
+        GetParseError("<r" + MakeAttributes(200000)),
+        "More than 256 attributes in the tag at octet 0");
+}
+
+TEST(Parse, TakesLongTextAndCommentsForNoTag)
+{
+    const std::string quotes = Repeat(" a=\"b\"", 2000);
+    EXPECT_EQ(
+        GetParseError("<r>" + quotes + "<!--" + quotes + "--><?p " + quotes + "?></r>"),
+        "accepted");
+    EXPECT_EQ(GetParseError("<r a='" + Repeat("b=c ", 2000) + "'/>"), "accepted");
+}
+
+TEST(Parse, LimitsTheNamespacesOfOneElementAndInScope)
+{
+    const auto declare = [](std::size_t count, const char* name) {
+        return MakeAttributes(count, std::string("xmlns:") + name);
+    };
+    EXPECT_EQ(GetParseError("<r" + declare(64, "n") + "/>"), "accepted");
+    EXPECT_THAT(
+        GetParseError("<r" + declare(65, "n") + "/>"),
+        testing::HasSubstr("More than 64 namespaces declared by one element"));
+    const std::string four = "<a" + declare(64, "a") + "><b" + declare(64, "b") + "><c"
+                             + declare(64, "c") + "><d" + declare(64, "d") + ">";
+    EXPECT_EQ(GetParseError(four + "</d></c></b></a>"), "accepted");
+    EXPECT_THAT(
+        GetParseError(four + "<e xmlns='urn:e'/></d></c></b></a>"),
+        testing::HasSubstr("More than 256 namespaces in scope"));
+    // What went out of scope does not count.
+    EXPECT_EQ(
+        GetParseError("<r>" + Repeat("<a" + declare(64, "a") + "/>", 10) + "</r>"), "accepted");
+}
+
+} // namespace
+
+} // namespace Quillon::Xml
