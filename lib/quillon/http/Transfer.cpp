@@ -137,6 +137,7 @@ void Transfer::SetTls()
     // Authorities and sessions are TlsPeer's.
     Set(CURLOPT_CAINFO, static_cast<char*>(nullptr));
     Set(CURLOPT_CAPATH, static_cast<char*>(nullptr));
+    Set(CURLOPT_CA_CACHE_TIMEOUT, 0L);
     Set(CURLOPT_SSL_SESSIONID_CACHE, 0L);
     Set(CURLOPT_SSL_CTX_FUNCTION, &Transfer::OnSslContext);
     Set(CURLOPT_SSL_CTX_DATA, _spec.tls.get());
