@@ -1,0 +1,71 @@
+#include "ssoClient/PrincipalId.h"
+
+#include <gtest/gtest.h>
+
+#include <csignal>
+
+using SsoClient::PrincipalId;
+
+TEST(PrincipalId, KeepsNameAndDomain)
+{
+    const PrincipalId id("Admin", "Example.Local");
+    EXPECT_EQ("Admin", id.GetName());
+    EXPECT_EQ("Example.Local", id.GetDomain());
+}
+
+TEST(PrincipalId, EqualsWithoutRegardToCase)
+{
+    EXPECT_TRUE(PrincipalId("Admin", "Example.Local") == PrincipalId("admin", "EXAMPLE.LOCAL"));
+    EXPECT_TRUE(PrincipalId("Jürgen", "Łódź") == PrincipalId("JÜRGEN", "łÓDŹ"));
+    const PrincipalId id("a", "b");
+    EXPECT_TRUE(id == id);
+    EXPECT_FALSE(id != id);
+}
+
+TEST(PrincipalId, DiffersByNameOrDomain)
+{
+    EXPECT_FALSE(PrincipalId("admin", "a") == PrincipalId("admin", "b"));
+    EXPECT_FALSE(PrincipalId("admin", "a") == PrincipalId("admins", "a"));
+    EXPECT_TRUE(PrincipalId("admin", "a") != PrincipalId("admins", "a"));
+    EXPECT_FALSE(PrincipalId("a", "b") == PrincipalId("b", "a"));
+}
+
+TEST(PrincipalId, NeverEqualsALookAlike)
+{
+    EXPECT_FALSE(PrincipalId("admin", "a") == PrincipalId("adm\u0131n", "a"));
+    EXPECT_FALSE(PrincipalId("sales", "a") == PrincipalId("\u017Fales", "a"));
+}
+
+TEST(ToString, HasNoBlankBeforeTheDomain)
+{
+    EXPECT_EQ("{Name: a; Domain:b}", PrincipalId("a", "b").ToString());
+}
+
+TEST(ASPrint, FormatsAPrincipal)
+{
+    const PrincipalId* none = nullptr;
+    EXPECT_EQ(
+        "{Name: a; Domain:b} (null)",
+        Quillon::MessageFormatter::ASPrint("%1 %2", PrincipalId("a", "b"), none));
+}
+
+TEST(PrincipalIdDeathTest, StopsWithoutName)
+{
+    EXPECT_EXIT(
+        PrincipalId("", "b"),
+        testing::KilledBySignal(SIGABRT),
+        "!name.empty\\(\\) \\(lib/public/ssoClient/PrincipalId:43\\)");
+}
+
+TEST(PrincipalIdDeathTest, StopsWithoutDomain)
+{
+    EXPECT_EXIT(
+        PrincipalId("a", ""),
+        testing::KilledBySignal(SIGABRT),
+        "!domain.empty\\(\\) \\(lib/public/ssoClient/PrincipalId:44\\)");
+}
+
+TEST(PrincipalIdDeathTest, ReportsTheNameFirst)
+{
+    EXPECT_EXIT(PrincipalId("", ""), testing::KilledBySignal(SIGABRT), "!name.empty\\(\\)");
+}
