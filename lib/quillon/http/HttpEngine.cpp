@@ -96,7 +96,7 @@ void HttpEngine::Start()
         throw std::bad_alloc();
     }
     // libcurl has initialised OpenSSL by now, so OpenSSL takes itself down after the threads.
-    static const Stopper AtExit;
+    static const Stopper atExit;
     const SignalBlock noSignals;
     try {
         _callbackThread.Start();
