@@ -3,6 +3,8 @@
 #include "quillon/PanicVerify.h"
 #include "quillon/StringUtil.h"
 
+#include <utility>
+
 namespace SsoClient {
 
 namespace {
@@ -19,14 +21,14 @@ bool EqualIgnoringCase(const std::string& a, const std::string& b)
 
 } // namespace
 
-PrincipalId::PrincipalId(const std::string& name, const std::string& domain)
-    : _name(name)
-    , _domain(domain)
+PrincipalId::PrincipalId(std::string name, std::string domain)
+    : _name(std::move(name))
+    , _domain(std::move(domain))
 {
-    if (name.empty()) {
+    if (_name.empty()) {
         Quillon::PanicVerify("!name.empty()", Unit, NameLine);
     }
-    if (domain.empty()) {
+    if (_domain.empty()) {
         Quillon::PanicVerify("!domain.empty()", Unit, DomainLine);
     }
 }

@@ -184,7 +184,7 @@ void SamlTokenImpl::Populate(SamlAssertionType& assertion)
         _advice = std::move(assertion.Advice->RSAAdvice);
     }
     if (assertion.AttributeStatement) {
-        for (const AttributeType& attribute : assertion.AttributeStatement->Attribute) {
+        for (AttributeType& attribute : assertion.AttributeStatement->Attribute) {
             PopulateTokenAttribute(attribute);
         }
     }
@@ -198,10 +198,10 @@ void SamlTokenImpl::Populate(SamlAssertionType& assertion)
     }
 }
 
-void SamlTokenImpl::PopulateTokenAttribute(const AttributeType& attribute)
+void SamlTokenImpl::PopulateTokenAttribute(AttributeType& attribute)
 {
     if (SamlAttributeIsGroupIdentity(attribute)) {
-        AppendGroups(attribute.AttributeValue);
+        AppendGroups(std::move(attribute.AttributeValue));
     } else if (SamlAttributeIsSolution(attribute)) {
         _isSolution = ParseIsSolutionAttribute(attribute);
     } else if (SamlAttributeIsGivenName(attribute)) {
@@ -211,11 +211,11 @@ void SamlTokenImpl::PopulateTokenAttribute(const AttributeType& attribute)
     }
 }
 
-void SamlTokenImpl::AppendGroups(const std::vector<std::string>& values)
+void SamlTokenImpl::AppendGroups(std::vector<std::string> values)
 {
     _groups.reserve(_groups.size() + values.size());
-    for (const std::string& value : values) {
-        _groups.push_back(ParseGroupIdentity(value));
+    for (std::string& value : values) {
+        _groups.push_back(ParseGroupIdentity(std::move(value)));
     }
 }
 
@@ -242,14 +242,17 @@ PrincipalId ParseSamlNameId(const NameIDType& nameId)
     return {nameId.Value.substr(0, at), nameId.Value.substr(at + 1)};
 }
 
-PrincipalId ParseGroupIdentity(const std::string& value)
+PrincipalId ParseGroupIdentity(std::string value)
 {
     const std::size_t backslash = value.find('\\');
     if (!SplitsInTwo(value, backslash)) {
         throw ParseException(
             "Failed to parse Group Identity value: `" + value + "'; domain or group missing");
     }
-    return {value.substr(backslash + 1), value.substr(0, backslash)};
+    // A token may have a thousand groups: the value's own memory becomes the name's.
+    std::string domain = value.substr(0, backslash);
+    value.erase(0, backslash + 1);
+    return {std::move(value), std::move(domain)};
 }
 
 Delegate ParseToDelegate(const DelegateType& delegate)

@@ -2,6 +2,7 @@
 
 #include "support/TestServer.h"
 
+#include <openssl/err.h>
 #include <openssl/evp.h>
 #include <openssl/pem.h>
 #include <openssl/ssl.h>

@@ -12,7 +12,7 @@ class SSOCLIENT_API PrincipalId
 {
 public:
     /** Stops the process if either is empty; check text from outside first. */
-    PrincipalId(const std::string& name, const std::string& domain);
+    PrincipalId(std::string name, std::string domain);
 
     const std::string& GetName() const noexcept { return _name; }
     const std::string& GetDomain() const noexcept { return _domain; }

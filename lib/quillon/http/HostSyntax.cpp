@@ -42,7 +42,7 @@ bool IsTargetCharacter(char character) noexcept
 
 bool IsIpAddress(const std::string& text) noexcept
 {
-    in6_addr address;
+    in6_addr address{};
     return text.find('\0') == std::string::npos
            && (inet_pton(AF_INET, text.c_str(), &address) == 1
                || inet_pton(AF_INET6, text.c_str(), &address) == 1);

@@ -96,7 +96,7 @@ void HttpEngine::Start()
         throw std::bad_alloc();
     }
     // libcurl has initialised OpenSSL by now, so OpenSSL takes itself down after the threads.
-    static const Stopper AtExit;
+    static const Stopper atExit;
     const SignalBlock noSignals;
     try {
         _callbackThread.Start();
@@ -194,15 +194,14 @@ void HttpEngine::StartTransfer(std::unique_ptr<Transfer> transfer)
     try {
         transfer->Prepare();
     } catch (const std::exception& error) {
-        Complete(*transfer, MakeFailure(error.what()));
+        Complete(std::move(transfer), MakeFailure(error.what()));
         return;
     }
     CURL* const easy = transfer->GetHandle();
     _transfers[easy] = std::move(transfer);
     const CURLMcode code = curl_multi_add_handle(_multi, easy);
     if (code != CURLM_OK) {
-        const std::unique_ptr<Transfer> failed = Remove(easy);
-        Complete(*failed, MakeFailure(curl_multi_strerror(code)));
+        Complete(Remove(easy), MakeFailure(curl_multi_strerror(code)));
     }
 }
 
@@ -230,14 +229,17 @@ void HttpEngine::CompleteFinished()
         }
         // Removing the handle frees the message.
         const CURLcode result = message->data.result;
-        const std::unique_ptr<Transfer> transfer = Remove(message->easy_handle);
-        Complete(*transfer, transfer->Finish(result));
+        std::unique_ptr<Transfer> transfer = Remove(message->easy_handle);
+        Outcome outcome = transfer->Finish(result);
+        Complete(std::move(transfer), std::move(outcome));
     }
 }
 
-void HttpEngine::Complete(Transfer& transfer, Outcome outcome)
+void HttpEngine::Complete(std::unique_ptr<Transfer> transfer, Outcome outcome)
 {
-    const Ref<Exchange>& exchange = transfer.GetExchange();
+    const Ref<Exchange> exchange = transfer->GetExchange();
+    // Before anyone hears of the end: the request with its secrets is gone by then.
+    transfer.reset();
     if (exchange->Complete(std::move(outcome))) {
         _callbackThread.Push(exchange);
     }

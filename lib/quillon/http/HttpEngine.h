@@ -72,7 +72,7 @@ private:
     void StartTransfer(std::unique_ptr<Transfer> transfer);
     void DropCancelled();
     void CompleteFinished();
-    void Complete(Transfer& transfer, Outcome outcome);
+    void Complete(std::unique_ptr<Transfer> transfer, Outcome outcome);
     std::unique_ptr<Transfer> Remove(CURL* easy);
     void CloseEverything();
 

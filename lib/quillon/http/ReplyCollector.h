@@ -18,7 +18,7 @@ class ReplyCollector
 public:
     /** What an XML document may have: a larger reply would be refused after it was read. */
     static constexpr std::size_t MaxBodyBytes = Xml::ParserLimits::MaxDocumentBytes;
-    static constexpr std::size_t MaxHeaderBytes = 64 * 1024;
+    static constexpr std::size_t MaxHeaderBytes = std::size_t{64} * 1024;
 
     /** Takes one line of a header, interim replies and trailers included. @return acceptance. */
     bool AddHeaderLine(std::string_view line);

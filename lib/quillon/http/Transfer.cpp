@@ -117,7 +117,9 @@ void Transfer::SetRequest()
     Set(CURLOPT_USERAGENT, Product);
     for (const auto& [name, value] : _request->GetHeaders()) {
         // libcurl takes a name with a colon and nothing else as an order to leave it out.
-        Append(_headers, value.empty() ? name + ";" : name + ": " + value);
+        std::string line = name + (value.empty() ? ";" : ": ");
+        line += value;
+        Append(_headers, line);
     }
     // Waiting for a go-ahead costs a second with servers that do not give one.
     Append(_headers, "Expect:");
@@ -137,6 +139,7 @@ void Transfer::SetTls()
     // Authorities and sessions are TlsPeer's.
     Set(CURLOPT_CAINFO, static_cast<char*>(nullptr));
     Set(CURLOPT_CAPATH, static_cast<char*>(nullptr));
+    Set(CURLOPT_CA_CACHE_TIMEOUT, 0L);
     Set(CURLOPT_SSL_SESSIONID_CACHE, 0L);
     Set(CURLOPT_SSL_CTX_FUNCTION, &Transfer::OnSslContext);
     Set(CURLOPT_SSL_CTX_DATA, _spec.tls.get());

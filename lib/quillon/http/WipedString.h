@@ -17,12 +17,15 @@ struct WipingAllocator
     explicit WipingAllocator(const WipingAllocator<U>& /*other*/) noexcept
     {}
 
+    // The names that the standard library asks for.
+    // NOLINTBEGIN(readability-identifier-naming)
     T* allocate(std::size_t count) { return std::allocator<T>().allocate(count); }
     void deallocate(T* memory, std::size_t count) noexcept
     {
         explicit_bzero(memory, count * sizeof(T));
         std::allocator<T>().deallocate(memory, count);
     }
+    // NOLINTEND(readability-identifier-naming)
 
     friend bool operator==(const WipingAllocator&, const WipingAllocator&) noexcept { return true; }
 };

@@ -79,7 +79,12 @@ SSLContextImpl::SSLContextImpl(const SSLContextOptions& options)
 
 bool SSLContextImpl::Apply(SSL_CTX* context) const noexcept
 {
-    SSL_CTX_set1_cert_store(context, _authorities.get());
+    // The store for verification takes precedence over the context's general one, which libcurl
+    // sets up behind our back, once the handshake is under way, with a store that it may have
+    // kept from another connection.
+    if (SSL_CTX_set1_verify_cert_store(context, _authorities.get()) != 1) {
+        return false;
+    }
     if (_clientKey == nullptr) {
         return true;
     }

@@ -12,8 +12,8 @@ constexpr std::size_t MaxSessions = 16;
 /** The slot of an `SSL_CTX` that points to its `TlsPeer`. */
 int GetPeerSlot()
 {
-    static const int Slot = SSL_CTX_get_ex_new_index(0, nullptr, nullptr, nullptr, nullptr);
-    return Slot;
+    static const int slot = SSL_CTX_get_ex_new_index(0, nullptr, nullptr, nullptr, nullptr);
+    return slot;
 }
 
 TlsPeer* GetPeer(const SSL* ssl)

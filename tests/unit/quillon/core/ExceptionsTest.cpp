@@ -45,7 +45,8 @@ TEST(Clone, KeepsDynamicTypeAndMessage)
     const InnerException error("deep");
     const Exception& base = error;
     const std::unique_ptr<Exception> copy(base.Clone());
-    EXPECT_EQ(typeid(InnerException), typeid(*copy));
+    const Exception& cloned = *copy;
+    EXPECT_EQ(typeid(InnerException), typeid(cloned));
     EXPECT_STREQ("deep", copy->what());
     EXPECT_NE(&base, copy.get());
 }
@@ -53,7 +54,8 @@ TEST(Clone, KeepsDynamicTypeAndMessage)
 TEST(Clone, KeepsThePrefixOfAnArgumentErrorOnce)
 {
     const std::unique_ptr<Exception> copy(InvalidArgumentException("x").Clone());
-    EXPECT_EQ(typeid(InvalidArgumentException), typeid(*copy));
+    const Exception& cloned = *copy;
+    EXPECT_EQ(typeid(InvalidArgumentException), typeid(cloned));
     EXPECT_STREQ("Invalid argument : x", copy->what());
 }
 

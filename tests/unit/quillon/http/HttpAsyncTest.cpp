@@ -1,4 +1,5 @@
 #include "HttpClient.h"
+#include "NameLookup.h"
 
 #include "quillon/service/Logger.h"
 
@@ -253,6 +254,20 @@ TEST(Cancel, IsTooLateInsideTheCompletion)
             cancelled.set_value(item->Cancel());
         });
     EXPECT_FALSE(cancelled.get_future().get());
+}
+
+TEST(Cancel, DoesNotWaitForANameLookup)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
+    NameLookup::Block block;
+    Ref<ConnectionSpec> spec;
+    CreateTCPConnectionSpec(NameLookup::BlockedHost, 80, false, spec);
+    HttpClient stuck(spec);
+    const Ref<PendingRequestItem> pending = stuck.Start(HttpClient::MakeRequest());
+    block.WaitUntilAsked();
+    EXPECT_TRUE(pending->Cancel());
+    // The I/O thread is free at once, although the look-up still hangs.
+    EXPECT_EQ("pong", HttpClient(server).Post().body);
 }
 
 TEST(PendingRequestItem, CallsTheExchangeOffWhenItGoes)

@@ -12,7 +12,7 @@
 #include <vector>
 
 /** A transport that answers every request with `reply`, or throws `failure` if there is one. */
-class FakeTransport : public SsoClient::Transport
+class FakeTransport final : public SsoClient::Transport
 {
 public:
     std::string reply;
@@ -28,7 +28,7 @@ public:
     }
 
 private:
-    class Session : public SsoClient::TransportSession
+    class Session final : public SsoClient::TransportSession
     {
     public:
         explicit Session(const FakeTransport& transport)
@@ -63,7 +63,7 @@ private:
 };
 
 /** A response handler that takes the whole reply for the assertion. */
-class ReplyIsToken : public SsoClient::ResponseHandler
+class ReplyIsToken final : public SsoClient::ResponseHandler
 {
 public:
     explicit ReplyIsToken(const FakeTransport& transport)

@@ -1,7 +1,7 @@
 #include "ssoClient/RequestBuilderImpl.h"
 
-#include "quillon/Exceptions.h"
 #include "quillon/xml/Parser.h"
+#include "support/Failure.h"
 #include "support/FakeSamlToken.h"
 #include "support/FixedClock.h"
 #include "support/TestData.h"
@@ -38,18 +38,6 @@ Request BuildUserPass(
 HolderOfKeyConfig GetIdentity()
 {
     return {GetTestKey("client"), GetTestCertificates("client").front()};
-}
-
-/** Class and text of what `operation` throws, as "class: text". */
-template <class Operation>
-std::string GetFailure(const Operation& operation)
-{
-    try {
-        operation();
-    } catch (const std::exception& error) {
-        return Quillon::GetClassName(error) + ": " + error.what();
-    }
-    return "none";
 }
 
 Quillon::Ref<Quillon::Xml::Document> Parse(const std::string& text)

@@ -8,6 +8,8 @@
 
 #include <gtest/gtest.h>
 
+#include <limits>
+
 using namespace SsoClient;
 using namespace TokenText;
 using Quillon::Ref;
@@ -18,7 +20,6 @@ namespace {
 constexpr char EndOfConditions[] = "</saml:Conditions>";
 constexpr char EndOfAssertion[] = "</saml:Assertion>";
 constexpr char StartAttribute[] = "NotBefore=\"2012-01-31T11:55:00Z\"";
-constexpr char EndOfValidity[] = "NotOnOrAfter=\"2012-01-31T12:05:00Z\"></saml:Conditions>";
 constexpr char ConfirmationEnd[] =
     "NotOnOrAfter=\"2012-01-31T12:05:00Z\"></saml:SubjectConfirmationData>";
 
@@ -244,12 +245,18 @@ TEST_F(CheckTokenPropertiesTest, RequiresAnIdWithAnUnderscore)
     EXPECT_EQ(ReachesSignature, judge("_abc"));
     EXPECT_EQ("ParseException: Invalid token ID", judge("abc"));
     EXPECT_EQ("ParseException: Invalid token ID", judge(""));
+}
+
+TEST_F(CheckTokenPropertiesTest, ChecksVersionThenIdThenTimes)
+{
+    std::string text = WithDummySignature(Bearer());
+    text = Replace(text, " ID=\"_token\"", " ID=\"token\"");
+    text = Replace(text, "URI=\"#_token\"", "URI=\"#token\"");
+    text = Replace(text, StartAttribute, "NotBefore=\"2013-01-31T11:55:00Z\"");
     EXPECT_EQ(
         "ParseException: Invalid token version",
-        JudgeUnsigned(Replace(
-            Replace(Replace(Bearer(), "2.0\">", "2.1\">"), "ID=\"_token", "ID=\"_token"),
-            "12:05:00Z\"></saml:Conditions>",
-            "10:05:00Z\"></saml:Conditions>")));
+        Judge(Replace(text, "Version=\"2.0\"", "Version=\"1.1\"")));
+    EXPECT_EQ("ParseException: Invalid token ID", Judge(text));
 }
 
 TEST_F(CheckTokenPropertiesTest, RequiresStartBeforeEnd)

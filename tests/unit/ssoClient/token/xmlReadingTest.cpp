@@ -108,9 +108,8 @@ TEST(MoveToChild, IsAtEndWithoutAcceptedChild)
 
 TEST(MoveToSibling, SkipsCommentsAndWhiteSpaceUntilTheEnd)
 {
-    NodeFilterIterator child = Parsed("<r><a/> <!-- c --><b/> </r>").iterator;
     const Parsed parsed("<r><a/> <!-- c --><b/> </r>");
-    child = parsed.iterator.GetChild();
+    NodeFilterIterator child = parsed.iterator.GetChild();
     EXPECT_EQ("b", LocalNameAt(child.MoveToSibling()));
     EXPECT_TRUE(child.MoveToSibling().IsAtEnd());
 }
