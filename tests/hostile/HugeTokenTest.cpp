@@ -9,7 +9,9 @@ namespace HostileTests {
 
 namespace {
 
+constexpr std::size_t Thousand = 1000;
 constexpr std::size_t Million = 1000000;
+constexpr std::size_t MaxBytes = 8388608;
 
 const char XmlError[] = "Quillon::Xml::XMLParseException";
 const std::vector<Refusal> OverLimit{{XmlError, "", "", ""}};
@@ -111,34 +113,34 @@ const std::vector<HugeCase> HugeCases{
      },
      OverLimit},
 
-    {"TwoHundredThousandLevels", BeforeSubject, [] { return Nested(200 * 1000); }, OverLimit},
+    {"TwoHundredThousandLevels", BeforeSubject, [] { return Nested(200 * Thousand); }, OverLimit},
     {"TwoHundredThousandLevelsInSignature",
      SignatureEnd,
-     [] { return InKeyInfo(Nested(200 * 1000)); },
+     [] { return InKeyInfo(Nested(200 * Thousand)); },
      OverLimit},
     {"TwoHundredThousandUnclosedLevels",
      BeforeSubject,
-     [] { return Repeat("<a>", 200 * 1000); },
+     [] { return Repeat("<a>", 200 * Thousand); },
      OverLimit},
     {"TwoHundredThousandAttributes",
      InIssuerTag,
-     [] { return Numbered(" a", "=\"\"", 200 * 1000); },
+     [] { return Numbered(" a", "=\"\"", 200 * Thousand); },
      OverLimit},
     {"TwoHundredThousandEqualAttributes",
      InIssuerTag,
-     [] { return Repeat(" a=\"\"", 200 * 1000); },
+     [] { return Repeat(" a=\"\"", 200 * Thousand); },
      OverLimit},
     {"TwoHundredThousandPrefixedAttributes",
      InIssuerTag,
-     [] { return " xmlns:p=\"urn:p\"" + Numbered(" p:a", "=\"\"", 200 * 1000); },
+     [] { return " xmlns:p=\"urn:p\"" + Numbered(" p:a", "=\"\"", 200 * Thousand); },
      OverLimit},
     {"HundredThousandNamespaces",
      InIssuerTag,
-     [] { return Numbered(" xmlns:a", "=\"urn:a\"", 100 * 1000); },
+     [] { return Numbered(" xmlns:a", "=\"urn:a\"", 100 * Thousand); },
      OverLimit},
     {"HundredThousandNamespacesOnNestedElements",
      BeforeSubject,
-     [] { return Numbered("<a xmlns:a", "=\"urn:a\">", 100 * 1000); },
+     [] { return Numbered("<a xmlns:a", "=\"urn:a\">", 100 * Thousand); },
      OverLimit},
     {"ThirtyMegabytesOfText",
      InGivenName,
@@ -195,7 +197,7 @@ const std::vector<HugeCase> HugeCases{
 
     {"TenThousandReferences",
      SignedInfoEnd,
-     [] { return Repeat("<ds:Reference URI=\"\"></ds:Reference>", 10 * 1000); },
+     [] { return Repeat("<ds:Reference URI=\"\"></ds:Reference>", 10 * Thousand); },
      BadSignature},
     {"TenThousandWholeReferences",
      SignedInfoEnd,
@@ -205,14 +207,15 @@ const std::vector<HugeCase> HugeCases{
              "2000/09/xmldsig#enveloped-signature\"/></ds:Transforms><ds:DigestMethod Algorithm="
              "\"http://www.w3.org/2001/04/xmlenc#sha256\"/><ds:DigestValue>"
              "AAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAA=</ds:DigestValue></ds:Reference>",
-             10 * 1000);
+             10 * Thousand);
      },
      BadSignature},
     {"HundredThousandTransforms",
      TransformsEnd,
      [] {
          return Repeat(
-             "<ds:Transform Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/>", 100 * 1000);
+             "<ds:Transform Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/>",
+             100 * Thousand);
      },
      BadSignature},
     {"HundredThousandListedPrefixes",
@@ -221,7 +224,7 @@ const std::vector<HugeCase> HugeCases{
          return "<ds:Transform Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\">"
                 "<ec:InclusiveNamespaces xmlns:ec=\"http://www.w3.org/2001/10/xml-exc-c14n#\" "
                 "PrefixList=\""
-                + Numbered(" p", "", 100 * 1000) + "\"/></ds:Transform>";
+                + Numbered(" p", "", 100 * Thousand) + "\"/></ds:Transform>";
      },
      BadSignature},
     {"SevenMegabytesOfSignatureValue",
@@ -256,7 +259,8 @@ const std::vector<HugeCase> HugeCases{
      SignatureEnd,
      [] {
          return InKeyInfo(
-             "<ds:X509Data>" + Repeat("<ds:X509Certificate>AAAA</ds:X509Certificate>", 100 * 1000)
+             "<ds:X509Data>"
+             + Repeat("<ds:X509Certificate>AAAA</ds:X509Certificate>", 100 * Thousand)
              + "</ds:X509Data>");
      },
      BadSignature},
@@ -293,7 +297,7 @@ TEST(HugeDocument, IsAcceptedUpToTheLimit)
 {
     const TokenCase& line = GetTokenCase("accepted/bearer.xml");
     const std::string token = ReadToken(line);
-    const std::string xml = token + std::string(8 * 1024 * 1024 - token.size(), ' ');
+    const std::string xml = token + std::string(MaxBytes - token.size(), ' ');
     const Verdict verdict = Judge(xml, GetConditions(line));
     ASSERT_TRUE(verdict.IsAccepted()) << Describe(verdict);
     EXPECT_EQ(*verdict.facts, line.facts);
@@ -303,7 +307,7 @@ TEST(HugeDocument, IsRefusedAByteOverTheLimit)
 {
     const TokenCase& line = GetTokenCase("accepted/bearer.xml");
     const std::string token = ReadToken(line);
-    const std::string xml = token + std::string(8 * 1024 * 1024 - token.size() + 1, ' ');
+    const std::string xml = token + std::string(MaxBytes - token.size() + 1, ' ');
     EXPECT_EQ(Judge(xml, GetConditions(line)).className, XmlError);
 }
 

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <functional>
 #include <ostream>
 
@@ -48,20 +49,26 @@ const std::vector<Subject> Subjects{
     {"Inclusive", "accepted/c14n-inc-inc.xml", {SignatureValueEnd}},
 };
 
-/** Whether position lies in an unsigned part, its marks and the byte before it included. */
-bool IsUnsigned(const std::string& xml, std::size_t position, const Subject& subject)
+/** Whether position lies in such a part, its marks and the byte before it included. */
+bool IsInside(const Stretch& part, const std::string& xml, std::size_t position)
 {
-    for (const Stretch& part : subject.unsignedParts) {
-        std::size_t begin = xml.find(part.begin);
-        while (begin != std::string::npos) {
-            const std::size_t end = xml.find(part.end, begin + part.begin.size());
-            if (position + 1 >= begin && position < end + part.end.size()) {
-                return true;
-            }
-            begin = xml.find(part.begin, end);
+    std::size_t begin = xml.find(part.begin);
+    while (begin != std::string::npos) {
+        const std::size_t end = xml.find(part.end, begin + part.begin.size());
+        if (position + 1 >= begin && position < end + part.end.size()) {
+            return true;
         }
+        begin = xml.find(part.begin, end);
     }
     return false;
+}
+
+bool IsUnsigned(const std::string& xml, std::size_t position, const Subject& subject)
+{
+    return std::any_of(
+        subject.unsignedParts.begin(), subject.unsignedParts.end(), [&](const Stretch& part) {
+            return IsInside(part, xml, position);
+        });
 }
 
 using Mutation = std::function<void(std::string& xml, std::size_t position)>;

@@ -35,16 +35,21 @@ std::string QuotePair(const Json& pair)
     return Quote(pair[0].get<std::string>()) + " in " + Quote(pair[1].get<std::string>());
 }
 
+void DescribeAttribute(const Json& attribute, std::ostream& out)
+{
+    out << "  " << Quote(attribute[0].get<std::string>()) << ":";
+    for (const Json& value : attribute[1]) {
+        out << " " << Quote(value.get<std::string>());
+    }
+    out << "\n";
+}
+
 void DescribeAdvice(const Json& facts, std::ostream& out)
 {
     for (const Json& advice : facts.at("advice")) {
         out << "advice: " << Quote(advice.at("source").get<std::string>()) << "\n";
         for (const Json& attribute : advice.at("attributes")) {
-            out << "  " << Quote(attribute[0].get<std::string>()) << ":";
-            for (const Json& value : attribute[1]) {
-                out << " " << Quote(value.get<std::string>());
-            }
-            out << "\n";
+            DescribeAttribute(attribute, out);
         }
     }
 }

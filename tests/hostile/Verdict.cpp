@@ -38,18 +38,23 @@ std::string QuoteId(const SsoClient::PrincipalId& id)
     return Quote(id.GetName()) + " in " + Quote(id.GetDomain());
 }
 
+void DescribeAttribute(const SsoClient::AdviceAttribute& attribute, std::ostream& out)
+{
+    out << "  " << Quote(attribute.name) << ":";
+    for (const std::string& value : attribute.values) {
+        out << " " << Quote(value);
+    }
+    out << "\n";
+}
+
 void DescribeAdvice(const SsoClient::SamlToken& token, std::ostream& out)
 {
-    std::vector<SsoClient::Advice> advices;
+    std::vector<SsoClient::Advice> advices{SsoClient::Advice{"left over", {}}};
     token.GetAdvice(advices);
     for (const SsoClient::Advice& advice : advices) {
         out << "advice: " << Quote(advice.source) << "\n";
         for (const SsoClient::AdviceAttribute& attribute : advice.attributes) {
-            out << "  " << Quote(attribute.name) << ":";
-            for (const std::string& value : attribute.values) {
-                out << " " << Quote(value);
-            }
-            out << "\n";
+            DescribeAttribute(attribute, out);
         }
     }
 }

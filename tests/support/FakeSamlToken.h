@@ -3,7 +3,7 @@
 #include "ssoClient/SamlToken.h"
 
 /** A token that says what the test wants, and counts how often it is asked for its description. */
-class FakeSamlToken : public SsoClient::SamlToken
+class FakeSamlToken final : public SsoClient::SamlToken
 {
 public:
     std::string id = "_fake";

@@ -5,7 +5,7 @@
 #include <string_view>
 
 /** Makes the whole process read one fixed time as long as it lives. */
-class FixedClock : public Quillon::System::Clock
+class FixedClock final : public Quillon::System::Clock
 {
 public:
     explicit FixedClock(std::string_view now)

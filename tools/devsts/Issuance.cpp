@@ -80,6 +80,8 @@ std::string RequireProvenKey(const Sender& sender, const TokenRequest& wanted)
     return sender.proof->certificateDer;
 }
 
+// Clients ask for these in requests that are not signed: not their key counts, but that of the
+// delegate, who will have to prove it.
 std::string RequireDelegatesKey(const TokenRequest& wanted, const Users& users)
 {
     const User& delegate = RequireDelegate(*wanted.delegateTo, users);

@@ -9,6 +9,7 @@
 #include <mutex>
 #include <openssl/ssl.h>
 #include <stdexcept>
+#include <sys/socket.h>
 #include <thread>
 
 namespace DevSts {
@@ -20,7 +21,7 @@ constexpr std::size_t LargestRequest = 1U << 20U;
 // One thread serves one connection for as long as it stays open.
 constexpr std::size_t Threads = 32;
 // Stop waits this long for connections that are idle.
-constexpr time_t IdleSeconds = 1;
+constexpr time_t IdleSeconds = 5;
 constexpr std::size_t RequestsPerConnection = 1000000;
 
 constexpr int StatusNotFound = 404;
@@ -84,6 +85,8 @@ public:
             throw std::runtime_error(
                 "Cannot listen on " + _options.host + ":" + std::to_string(_options.port));
         }
+        // The HTTP library listens with room for five; a second call makes more.
+        listen(_listener, SOMAXCONN);
         _thread = std::thread([this] { _http->listen_after_bind(); });
         // The HTTP server ignores a stop that comes before its loop runs.
         while (!_http->is_running()) {
@@ -145,9 +148,18 @@ private:
         _http->set_keep_alive_max_count(RequestsPerConnection);
         _http->set_keep_alive_timeout(IdleSeconds);
         _http->set_tcp_nodelay(true);
+        _http->set_socket_options([this](socket_t listener) { SetUpListener(listener); });
         _http->new_task_queue = [] {
             return std::make_unique<httplib::ThreadPool>(Threads).release();
         };
+    }
+
+    // A port is taken over from a server that has ended, but never shared with one that runs.
+    void SetUpListener(socket_t listener)
+    {
+        const int yes = 1;
+        setsockopt(listener, SOL_SOCKET, SO_REUSEADDR, &yes, sizeof yes);
+        _listener = listener;
     }
 
     bool SetUpTls(SSL_CTX& context)
@@ -207,6 +219,7 @@ private:
     std::unique_ptr<httplib::Server> _http;
     std::thread _thread;
     int _port = 0;
+    socket_t _listener = INVALID_SOCKET;
     std::atomic<std::chrono::milliseconds> _delay{std::chrono::milliseconds(0)};
     mutable std::mutex _mutex;
     std::deque<ReplyHook> _hooks;

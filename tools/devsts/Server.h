@@ -49,7 +49,8 @@ public:
      */
     int Start();
 
-    /** Answers the requests under way, waits at most a second for idle connections, and ends. */
+    /** Answers the requests under way, waits at most five seconds for idle connections, and ends.
+     */
     void Stop();
 
     /** Where requests go; known once started. */

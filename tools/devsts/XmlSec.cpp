@@ -20,7 +20,7 @@ bool IsPlain(const std::string& id)
 
 std::string RegisterId(xmlNode* element, const XmlName& name)
 {
-    const std::string id = RequireAttribute(element, name);
+    std::string id = RequireAttribute(element, name);
     const auto* local = reinterpret_cast<const xmlChar*>(name.local);
     xmlAttr* attribute =
         *name.ns == '\0' ? xmlHasNsProp(element, local, nullptr)

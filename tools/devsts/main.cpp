@@ -2,6 +2,7 @@
 
 #include <CLI/CLI.hpp>
 #include <csignal>
+#include <cstdio>
 #include <exception>
 #include <iostream>
 #include <pthread.h>
@@ -46,9 +47,7 @@ void Serve(const DevSts::Options& options)
     server.Stop();
 }
 
-} // namespace
-
-int main(int argc, char** argv)
+int Run(int argc, char** argv)
 {
     CLI::App app("A WS-Trust 1.3 security token service for development and tests.");
     app.footer(
@@ -64,12 +63,19 @@ int main(int argc, char** argv)
         ->capture_default_str();
     app.add_flag("--http", options.plainHttp, "serve plain HTTP instead of HTTPS");
     CLI11_PARSE(app, argc, argv);
+    SetAddress(options, listen);
+    Serve(options);
+    return 0;
+}
+
+} // namespace
+
+int main(int argc, char** argv)
+{
     try {
-        SetAddress(options, listen);
-        Serve(options);
+        return Run(argc, argv);
     } catch (const std::exception& error) {
-        std::cerr << "ssoclient-devsts: " << error.what() << std::endl;
+        std::fprintf(stderr, "ssoclient-devsts: %s\n", error.what());
         return 1;
     }
-    return 0;
 }

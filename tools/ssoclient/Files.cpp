@@ -18,7 +18,7 @@ namespace {
 
 // Far more than the library reads of a token, so that an oversized one is refused there; this only
 // bounds what an endless input can take up.
-constexpr std::size_t MaxFileBytes = 64 * 1024 * 1024;
+constexpr std::size_t MaxFileBytes = std::size_t{64} * 1024 * 1024;
 
 std::string ReadAll(int descriptor, const std::string& name)
 {

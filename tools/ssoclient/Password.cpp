@@ -100,8 +100,8 @@ public:
     }
 
 private:
-    std::array<struct sigaction, TerminalSignals.size()> _actionsBefore;
-    sigset_t _maskBefore;
+    std::array<struct sigaction, TerminalSignals.size()> _actionsBefore = {};
+    sigset_t _maskBefore = {};
 };
 
 /** Keeps a terminal from echoing what is typed, for as long as it lives. */

@@ -69,20 +69,28 @@ constexpr std::string_view AttributeEscape(char byte) noexcept
     }
 }
 
+Word LoadWord(const char* bytes) noexcept
+{
+    Word word = 0;
+    std::memcpy(&word, bytes, sizeof word);
+    return word;
+}
+
 /** The length of the part of `text` before the first byte that has an escape. */
 template <bool (*NeedsEscape)(Word), std::string_view (*Escape)(char)>
 std::size_t FindEscape(std::string_view text) noexcept
 {
+    const std::size_t size = text.size();
     std::size_t position = 0;
-    Word word = 0;
-    while (position + sizeof word <= text.size()) {
-        std::memcpy(&word, text.data() + position, sizeof word);
-        if (NeedsEscape(word)) {
-            break;
-        }
-        position += sizeof word;
+    while (position + sizeof(Word) <= size && !NeedsEscape(LoadWord(text.data() + position))) {
+        position += sizeof(Word);
     }
-    while (position < text.size() && Escape(text[position]).empty()) {
+    // The rest of a longer text is the end of its last word.
+    const bool isRest = size >= sizeof(Word) && position + sizeof(Word) > size;
+    if (isRest && !NeedsEscape(LoadWord(text.data() + size - sizeof(Word)))) {
+        return size;
+    }
+    while (position < size && Escape(text[position]).empty()) {
         ++position;
     }
     return position;

@@ -59,7 +59,7 @@ public:
                 return;
             }
         }
-        std::memcpy(_bytes.data() + _size, text.data(), text.size());
+        Copy(_bytes.data() + _size, text.data(), text.size());
         _size += text.size();
     }
 
@@ -73,6 +73,34 @@ public:
     }
 
 private:
+    /** Most pieces are names of a few octets, for which a call costs more than the copy. */
+    static void Copy(char* to, const char* from, std::size_t size)
+    {
+        if (size > 16) {
+            std::memcpy(to, from, size);
+        } else if (size >= 8) {
+            CopyEnds<8>(to, from, size);
+        } else if (size >= 4) {
+            CopyEnds<4>(to, from, size);
+        } else {
+            for (std::size_t i = 0; i < size; ++i) {
+                to[i] = from[i];
+            }
+        }
+    }
+
+    /** Copies the first and the last `Half` octets, which overlap or touch. */
+    template <std::size_t Half>
+    static void CopyEnds(char* to, const char* from, std::size_t size)
+    {
+        std::array<char, Half> first;
+        std::array<char, Half> last;
+        std::memcpy(first.data(), from, Half);
+        std::memcpy(last.data(), from + size - Half, Half);
+        std::memcpy(to, first.data(), Half);
+        std::memcpy(to + size - Half, last.data(), Half);
+    }
+
     ByteSink& _sink;
     std::size_t _size = 0;
     std::size_t _used = 0;

@@ -29,12 +29,12 @@ std::string JoinName(std::string_view prefix, std::string_view localName)
 /** Whether `attribute` declares `prefix`, the empty one being the default namespace. */
 bool Declares(const Attribute& attribute, std::string_view prefix) noexcept
 {
-    if (prefix.empty()) {
-        return attribute.name == "xmlns";
+    if (!attribute.IsNamespaceDeclaration()) {
+        return false;
     }
-    return attribute.name.size() == XmlnsPrefix.size() + prefix.size()
-           && attribute.name.compare(0, XmlnsPrefix.size(), XmlnsPrefix) == 0
-           && attribute.name.compare(XmlnsPrefix.size(), prefix.size(), prefix) == 0;
+    return prefix.empty() ? attribute.name.size() == XmlnsPrefix.size() - 1
+                          : attribute.name.size() == XmlnsPrefix.size() + prefix.size()
+                                && attribute.name.substr(XmlnsPrefix.size()) == prefix;
 }
 
 } // namespace
@@ -85,11 +85,6 @@ std::string_view Attribute::GetLocalName() const noexcept
 {
     const std::size_t colon = name.find(':');
     return colon == std::string_view::npos ? name : name.substr(colon + 1);
-}
-
-bool Attribute::IsNamespaceDeclaration() const noexcept
-{
-    return name.compare(0, 5, "xmlns") == 0 && (name.size() == 5 || name[5] == ':');
 }
 
 ElementNode::ElementNode(Arena* arena, std::string_view name) noexcept

@@ -89,6 +89,7 @@ private:
     {
         arguments.insert(arguments.begin(), DEVSTS_PROGRAM);
         std::vector<char*> pointers;
+        pointers.reserve(arguments.size() + 1);
         for (std::string& argument : arguments) {
             pointers.push_back(argument.data());
         }

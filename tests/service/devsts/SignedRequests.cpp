@@ -41,7 +41,7 @@ Identity Client()
 Identity Stranger()
 {
     static const TempDir dir;
-    const Identity identity{dir.Path() / "key.pem", dir.Path() / "certificate.pem"};
+    Identity identity{dir.Path() / "key.pem", dir.Path() / "certificate.pem"};
     if (!std::filesystem::exists(identity.certificate)) {
         const CommandResult result = RunCommand(
             std::string(OPENSSL_PROGRAM)

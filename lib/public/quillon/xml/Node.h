@@ -146,7 +146,13 @@ struct QUILLON_API Attribute
     std::string_view GetLocalName() const noexcept;
 
     /** Whether this is `xmlns` or `xmlns:prefix`. */
-    bool IsNamespaceDeclaration() const noexcept;
+    bool IsNamespaceDeclaration() const noexcept
+    {
+        constexpr std::string_view Xmlns = "xmlns";
+        return name.size() >= Xmlns.size()
+               && std::char_traits<char>::compare(name.data(), Xmlns.data(), Xmlns.size()) == 0
+               && (name.size() == Xmlns.size() || name[Xmlns.size()] == ':');
+    }
 };
 
 /** A view of an element's attributes in the order in which they are written. */
@@ -195,6 +201,9 @@ public:
 
     /** Whether the element has the local name and its prefix resolves to `namespaceUri`. */
     bool HasQName(std::string_view localName, std::string_view namespaceUri) const noexcept;
+
+    /** Whether any of the attributes is a namespace declaration. */
+    bool DeclaresNamespaces() const noexcept { return _declaresNamespaces; }
 
     AttributeRange GetAttributes() const noexcept { return {_attributes, _attributeCount}; }
 

@@ -13,7 +13,7 @@ namespace {
 
 constexpr std::string_view XmlNamespace = "http://www.w3.org/XML/1998/namespace";
 
-/** A namespace declaration; the empty prefix is the default namespace. */
+/** A declaration to be written; the empty prefix is the default namespace. */
 struct Binding
 {
     std::string_view prefix;
@@ -51,34 +51,90 @@ bool IsAbsolute(std::string_view uri) noexcept
                });
 }
 
-/** The namespaces in force at some point of a walk, innermost last. */
-class BindingStack
+/** Prefixes are a few octets long: comparing them in place beats a call. */
+bool IsSamePrefix(std::string_view a, std::string_view b) noexcept
+{
+    if (a.size() != b.size()) {
+        return false;
+    }
+    for (std::size_t i = 0; i < a.size(); ++i) {
+        if (a[i] != b[i]) {
+            return false;
+        }
+    }
+    return true;
+}
+
+/** What a prefix is bound to at some point of a walk; an empty URI is none. */
+struct PrefixState
+{
+    std::string_view prefix;
+    std::string_view inScope;
+    /** The URI that the nearest output ancestor has rendered for the prefix. */
+    std::string_view rendered;
+};
+
+/**
+ * The states of all prefixes met so far, with a log to bring back how they were: one look-up tells
+ * everything about a prefix.
+ */
+class PrefixTable
 {
 public:
-    void Push(const Binding& binding) { _bindings.push_back(binding); }
-    std::size_t GetSize() const noexcept { return _bindings.size(); }
-    void Shrink(std::size_t size) { _bindings.resize(size); }
-
-    const Binding* Find(std::string_view prefix) const noexcept
+    PrefixState* Find(std::string_view prefix) noexcept
     {
-        const auto found =
-            std::find_if(_bindings.rbegin(), _bindings.rend(), [prefix](const Binding& binding) {
-                return binding.prefix == prefix;
-            });
-        return found == _bindings.rend() ? nullptr : &*found;
+        for (PrefixState& state : _states) {
+            if (IsSamePrefix(state.prefix, prefix)) {
+                return &state;
+            }
+        }
+        return nullptr;
     }
 
-    /** The URI that `prefix` is bound to; empty if to none. */
-    std::string_view GetUri(std::string_view prefix) const noexcept
+    void Bind(std::string_view prefix, std::string_view uri)
     {
-        const Binding* binding = Find(prefix);
-        return binding == nullptr ? std::string_view() : binding->uri;
+        PrefixState* state = Find(prefix);
+        if (state == nullptr) {
+            _states.push_back(PrefixState{prefix, {}, {}});
+            state = &_states.back();
+        }
+        Log(*state);
+        state->inScope = uri;
     }
 
-    const std::vector<Binding>& GetAll() const noexcept { return _bindings; }
+    void SetRendered(PrefixState& state)
+    {
+        Log(state);
+        state.rendered = state.inScope;
+    }
+
+    std::vector<PrefixState>& GetAll() noexcept { return _states; }
+
+    std::size_t GetMark() const noexcept { return _log.size(); }
+
+    /** Undoes every change since the mark was taken. */
+    void Restore(std::size_t mark) noexcept
+    {
+        while (_log.size() > mark) {
+            _states[_log.back().index] = _log.back().state;
+            _log.pop_back();
+        }
+    }
 
 private:
-    std::vector<Binding> _bindings;
+    struct Change
+    {
+        std::size_t index;
+        PrefixState state;
+    };
+
+    void Log(const PrefixState& state)
+    {
+        _log.push_back(Change{static_cast<std::size_t>(&state - _states.data()), state});
+    }
+
+    std::vector<PrefixState> _states;
+    std::vector<Change> _log;
 };
 
 /** Writes the nodes of one walk in canonical form. */
@@ -96,12 +152,13 @@ public:
 
     void Enter(const ElementNode& element)
     {
-        _frames.push_back(Frame{_inScope.GetSize(), _rendered.GetSize()});
+        _marks.push_back(_prefixes.GetMark());
         DeclareNamespaces(element);
         _out.Append('<');
         _out.Append(element.GetName());
-        CollectAttributes(element);
+        _namespaces.clear();
         CollectNamespaces(element);
+        CollectAttributes(element);
         WriteNamespaces();
         WriteAttributes();
         _out.Append('>');
@@ -112,9 +169,8 @@ public:
         _out.Append("</");
         _out.Append(element.GetName());
         _out.Append('>');
-        _inScope.Shrink(_frames.back().inScope);
-        _rendered.Shrink(_frames.back().rendered);
-        _frames.pop_back();
+        _prefixes.Restore(_marks.back());
+        _marks.pop_back();
     }
 
     void Visit(const TextNode& text) { AppendText(_out, text.GetText()); }
@@ -125,12 +181,6 @@ public:
     }
 
 private:
-    struct Frame
-    {
-        std::size_t inScope;
-        std::size_t rendered;
-    };
-
     /** Brings the declarations of the apex's ancestors into scope, outermost first. */
     void EnterAncestors(const ElementNode* nearest)
     {
@@ -146,6 +196,9 @@ private:
 
     void DeclareNamespaces(const ElementNode& element)
     {
+        if (!element.DeclaresNamespaces()) {
+            return;
+        }
         for (const Attribute& attribute : element.GetAttributes()) {
             if (!attribute.IsNamespaceDeclaration() || attribute.name == "xmlns:xml") {
                 continue;
@@ -155,29 +208,30 @@ private:
                 throw XmlSecurityException(
                     "The namespace URI '" + std::string(attribute.value) + "' is relative");
             }
-            _inScope.Push(Binding{GetDeclaredPrefix(attribute), attribute.value});
+            _prefixes.Bind(GetDeclaredPrefix(attribute), attribute.value);
+            if (!_method.isExclusive) {
+                _declared.push_back(GetDeclaredPrefix(attribute));
+            }
         }
     }
 
-    std::string_view RequireUri(std::string_view prefix, const ElementNode& element) const
+    /** The state of a prefix that a name uses, which must be bound. */
+    PrefixState& RequireBound(std::string_view prefix, const ElementNode& element)
     {
-        if (prefix == "xml") {
-            return XmlNamespace;
-        }
-        const Binding* binding = _inScope.Find(prefix);
-        if (binding == nullptr || binding->uri.empty()) {
+        PrefixState* state = _prefixes.Find(prefix);
+        if (state == nullptr || state->inScope.empty()) {
             throw XmlSecurityException(
                 "Element '" + std::string(element.GetName()) + "' uses the undeclared prefix '"
                 + std::string(prefix) + "'");
         }
-        return binding->uri;
+        return *state;
     }
 
     void CollectAttributes(const ElementNode& element)
     {
         _attributes.clear();
         for (const Attribute& attribute : element.GetAttributes()) {
-            if (!attribute.IsNamespaceDeclaration()) {
+            if (!element.DeclaresNamespaces() || !attribute.IsNamespaceDeclaration()) {
                 AddAttribute(attribute, element);
             }
         }
@@ -198,12 +252,20 @@ private:
     void AddAttribute(const Attribute& attribute, const ElementNode& element)
     {
         const std::string_view prefix = attribute.GetPrefix();
+        if (prefix.empty()) {
+            _attributes.push_back(SortedAttribute{{}, attribute.name, &attribute});
+            return;
+        }
+        std::string_view uri = XmlNamespace;
+        if (prefix != "xml") {
+            PrefixState& state = RequireBound(prefix, element);
+            uri = state.inScope;
+            if (_method.isExclusive) {
+                Render(state);
+            }
+        }
         _attributes.push_back(
-            prefix.empty() ? SortedAttribute{{}, attribute.name, &attribute}
-                           : SortedAttribute{
-                               RequireUri(prefix, element),
-                               attribute.name.substr(prefix.size() + 1),
-                               &attribute});
+            SortedAttribute{uri, attribute.name.substr(prefix.size() + 1), &attribute});
     }
 
     /** [C14N 2.4]: the apex of a subset takes on the `xml:` attributes of its ancestors. */
@@ -227,70 +289,74 @@ private:
             });
     }
 
-    /** Gathers the declarations that this element's canonical form carries. */
+    /**
+     * Gathers the declarations that this element's canonical form carries, but for those that
+     * only its attributes utilize.
+     */
     void CollectNamespaces(const ElementNode& element)
     {
-        _namespaces.clear();
-        // Looked up in both forms: an undeclared prefix must fail in both.
         const std::string_view prefix = element.GetPrefix();
-        if (!prefix.empty()) {
-            RequireUri(prefix, element);
-        }
+        // Looked up in both forms: an undeclared prefix must fail in both.
+        PrefixState* state = prefix.empty()    ? _prefixes.Find(prefix)
+                             : prefix == "xml" ? nullptr
+                                               : &RequireBound(prefix, element);
         if (!_method.isExclusive) {
             CollectInclusive();
-        } else {
-            CollectExclusive(prefix);
+            return;
         }
+        // [EXC-C14N 3]: the prefixes that the element visibly utilizes, and those on the list.
+        if (state != nullptr) {
+            Render(*state);
+        }
+        for (const std::string& listed : _method.inclusivePrefixes) {
+            RenderIfKnown(listed);
+        }
+    }
+
+    /**
+     * [C14N 2.3]: every namespace in scope that the output ancestor does not render the same.
+     * Below the apex, only what the element itself declares can differ.
+     */
+    void CollectInclusive()
+    {
+        if (_marks.size() == 1) {
+            for (PrefixState& state : _prefixes.GetAll()) {
+                Render(state);
+            }
+        } else {
+            for (const std::string_view prefix : _declared) {
+                RenderIfKnown(prefix);
+            }
+        }
+        _declared.clear();
+    }
+
+    void RenderIfKnown(std::string_view prefix)
+    {
+        if (PrefixState* state = _prefixes.Find(prefix)) {
+            Render(*state);
+        }
+    }
+
+    /** Renders a binding in scope, unless an output ancestor rendered the same. */
+    void Render(PrefixState& state)
+    {
+        // Only the default namespace can be undeclared [XML Names 6.2].
+        if (state.inScope == state.rendered || (state.inScope.empty() && !state.prefix.empty())) {
+            return;
+        }
+        _namespaces.push_back(Binding{state.prefix, state.inScope});
+        _prefixes.SetRendered(state);
+    }
+
+    void WriteNamespaces()
+    {
         if (_namespaces.size() > 1) {
             std::sort(
                 _namespaces.begin(), _namespaces.end(), [](const Binding& a, const Binding& b) {
                     return a.prefix < b.prefix;
                 });
         }
-    }
-
-    /** [C14N 2.3]: every namespace in scope that the output ancestor does not render the same. */
-    void CollectInclusive()
-    {
-        const std::vector<Binding>& all = _inScope.GetAll();
-        // Below the apex, what was in scope before this element has been rendered already.
-        const std::size_t first = _frames.size() == 1 ? 0 : _frames.back().inScope;
-        for (std::size_t i = all.size(); i > first; --i) {
-            Render(all[i - 1].prefix);
-        }
-    }
-
-    /** [EXC-C14N 3]: the prefixes that this element visibly utilizes, and those on the list. */
-    void CollectExclusive(std::string_view elementPrefix)
-    {
-        Render(elementPrefix);
-        for (const SortedAttribute& sorted : _attributes) {
-            if (!sorted.uri.empty()) {
-                Render(sorted.attribute->GetPrefix());
-            }
-        }
-        for (const std::string& prefix : _method.inclusivePrefixes) {
-            Render(prefix);
-        }
-    }
-
-    /** Renders the binding of `prefix` in scope, unless an output ancestor rendered the same. */
-    void Render(std::string_view prefix)
-    {
-        const std::string_view uri = _inScope.GetUri(prefix);
-        if (prefix == "xml" || uri == _rendered.GetUri(prefix)) {
-            return;
-        }
-        // Only the default namespace can be undeclared [XML Names 6.2].
-        if (uri.empty() && !prefix.empty()) {
-            return;
-        }
-        _namespaces.push_back(Binding{prefix, uri});
-        _rendered.Push(_namespaces.back());
-    }
-
-    void WriteNamespaces()
-    {
         for (const Binding& binding : _namespaces) {
             _out.Append(" xmlns");
             if (!binding.prefix.empty()) {
@@ -320,10 +386,10 @@ private:
     const CanonicalizationMethod& _method;
     const ElementNode& _apex;
     OutputBuffer& _out;
-    BindingStack _inScope;
-    BindingStack _rendered;
-    std::vector<Frame> _frames;
+    PrefixTable _prefixes;
+    std::vector<std::size_t> _marks;
     // Of the element being written; kept to be used again.
+    std::vector<std::string_view> _declared;
     std::vector<SortedAttribute> _attributes;
     std::vector<Binding> _namespaces;
 };

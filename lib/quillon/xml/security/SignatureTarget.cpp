@@ -44,8 +44,7 @@ class IdFinder
 public:
     explicit IdFinder(std::string_view id) noexcept
         : _id(id)
-    {
-    }
+    {}
 
     void Enter(const ElementNode& element) noexcept
     {
@@ -57,8 +56,7 @@ public:
     void Leave(const ElementNode& /*element*/) noexcept {}
     template <class Leaf>
     void Visit(const Leaf& /*leaf*/) noexcept
-    {
-    }
+    {}
 
     const ElementNode* GetFound() const noexcept { return _found; }
     unsigned GetCount() const noexcept { return _count; }

@@ -3,18 +3,18 @@
 #include "logCapture.h"
 #include "quillon/Exceptions.h"
 #include "quillon/xml/Parser.h"
+#include "serviceFakes.h"
 #include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/Descriptions.h"
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/RequestBuilderImpl.h"
 #include "ssoClient/ResponseHandlerImpl.h"
+#include "support/Failure.h"
 #include "support/FixedClock.h"
+#include "support/TestData.h"
 
 #include <boost/smart_ptr/make_shared.hpp>
 #include <gmock/gmock.h>
-
-#include <fstream>
-#include <sstream>
 
 using namespace SsoClient;
 using testing::ElementsAre;
@@ -22,26 +22,6 @@ using testing::HasSubstr;
 using testing::Not;
 
 namespace {
-
-constexpr char WhenTokensAreValid[] = "2026-06-15T12:00:00Z";
-
-std::string ReadTestData(const std::string& name)
-{
-    std::ifstream file(std::string(TEST_DATA_DIR) + "/" + name, std::ios::binary);
-    std::ostringstream text;
-    text << file.rdbuf();
-    return text.str();
-}
-
-std::string GetSignedAssertion()
-{
-    return ReadTestData("tokens/accepted/bearer.xml");
-}
-
-std::list<Quillon::Ref<const Quillon::Crypto::Certificate>> GetCertificates(const char* name)
-{
-    return Quillon::Crypto::ParsePemCertificates(ReadTestData(std::string("keys/") + name));
-}
 
 std::string IssueReply(const std::string& assertion)
 {
@@ -53,86 +33,6 @@ std::string IssueReply(const std::string& assertion)
            + "</t:RequestedSecurityToken></t:RequestSecurityTokenResponse>"
              "</t:RequestSecurityTokenResponseCollection></S:Body></S:Envelope>";
 }
-
-/** A transport that answers every request with `reply`, or throws `failure` if there is one. */
-class FakeTransport : public Transport
-{
-public:
-    std::string reply;
-    boost::shared_ptr<Quillon::Exception> failure;
-
-    mutable std::vector<Request> sent;
-    mutable int sessionsMade = 0;
-    mutable int sessionsAlive = 0;
-
-    boost::shared_ptr<TransportSession> CreateSession() const override
-    {
-        return boost::make_shared<Session>(*this);
-    }
-
-private:
-    class Session : public TransportSession
-    {
-    public:
-        explicit Session(const FakeTransport& transport)
-            : _transport(transport)
-        {
-            ++_transport.sessionsMade;
-            ++_transport.sessionsAlive;
-        }
-        ~Session() { --_transport.sessionsAlive; }
-
-        void SendRequest(const Request& request, Quillon::Ref<Quillon::Reader>& response) override
-        {
-            _transport.sent.push_back(request);
-            if (_transport.failure) {
-                _transport.failure->Throw();
-            }
-            response = Quillon::CreateStringReader(_transport.reply);
-        }
-
-        void SendRequestAsync(
-            const Request&,
-            const ResponseCallback&,
-            Quillon::Ref<Quillon::System::ScheduledItem>&) override
-        {
-            FAIL() << "A blocking operation sent asynchronously.";
-        }
-
-    private:
-        const FakeTransport& _transport;
-    };
-};
-
-/** A response handler that takes the whole reply for the assertion. */
-class ReplyIsToken : public ResponseHandler
-{
-public:
-    explicit ReplyIsToken(const FakeTransport& transport)
-        : _transport(transport)
-    {}
-
-    mutable int sessionsAliveWhenCalled = -1;
-
-    void HandleAcquireTokenResponse(Quillon::Reader* body, std::string& tokenXml) const override
-    {
-        sessionsAliveWhenCalled = _transport.sessionsAlive;
-        char buffer[1024];
-        while (const std::size_t size = body->Read(buffer, sizeof(buffer))) {
-            tokenXml.append(buffer, size);
-        }
-    }
-
-    bool HandleValidateSubjectResponse(Quillon::Reader*) const override { return false; }
-
-    void HandleRenewTokenResponse(Quillon::Reader* body, std::string& tokenXml) const override
-    {
-        HandleAcquireTokenResponse(body, tokenXml);
-    }
-
-private:
-    const FakeTransport& _transport;
-};
 
 class AcquireToken : public testing::Test
 {
@@ -149,14 +49,9 @@ protected:
             .AcquireToken("jdoe", "s3cret", spec);
     }
 
-    std::string GetFailure(const boost::shared_ptr<const ResponseHandler>& handler) const
+    std::string GetFailureThrough(const boost::shared_ptr<const ResponseHandler>& handler) const
     {
-        try {
-            AcquireThrough(handler);
-        } catch (const std::exception& error) {
-            return Quillon::GetClassName(error) + ": " + error.what();
-        }
-        return "none";
+        return GetFailure([&] { AcquireThrough(handler); });
     }
 
     TokenSpec spec;
@@ -166,7 +61,6 @@ protected:
     FixedClock clock{WhenTokensAreValid};
 };
 
-constexpr char Uuid[] = "[0-9a-f]{8}-[0-9a-f]{4}-4[0-9a-f]{3}-[89ab][0-9a-f]{3}-[0-9a-f]{12}";
 constexpr char RequestLine[] =
     "SsoClient[64]: Requested token for subject `jdoe', spec `TokenSpec [tokenLifetimeSec=300, "
     "delegable=false, delegateTo=<unset>, renewable=false, "
@@ -174,14 +68,7 @@ constexpr char RequestLine[] =
 
 std::string FrameLine(const std::string& step)
 {
-    return "SsoClient\\[64\\]: opId=" + std::string(Uuid) + " " + step
-           + " operation SecurityTokenServiceImpl::AcquireToken";
-}
-
-std::string GetOpId(const std::string& line)
-{
-    const std::size_t start = line.find("opId=");
-    return line.substr(start, line.find(' ', start) - start);
+    return FrameLinePattern(step, "AcquireToken");
 }
 
 } // namespace
@@ -214,7 +101,7 @@ TEST_F(AcquireToken, GivesNullForEmptyAssertion)
 TEST_F(AcquireToken, GivesVerifiedToken)
 {
     transport->reply = IssueReply(GetSignedAssertion());
-    trusted = GetCertificates("sts-cert.pem");
+    trusted = GetTestCertificates("sts");
     const auto token = AcquireThrough(boost::make_shared<ResponseHandlerImpl>());
     ASSERT_NE(token, nullptr);
     EXPECT_EQ(token->GetId(), "_7d1f6a52-9c61");
@@ -224,7 +111,7 @@ TEST_F(AcquireToken, GivesVerifiedToken)
 TEST_F(AcquireToken, GivesTokenWhoseXmlVerifiesAgain)
 {
     transport->reply = IssueReply(GetSignedAssertion());
-    trusted = GetCertificates("sts-cert.pem");
+    trusted = GetTestCertificates("sts");
     const auto token = AcquireThrough(boost::make_shared<ResponseHandlerImpl>());
     ASSERT_NE(token, nullptr);
     EXPECT_EQ(CreateSamlToken(token->ToXml(), trusted)->GetId(), token->GetId());
@@ -233,19 +120,19 @@ TEST_F(AcquireToken, GivesTokenWhoseXmlVerifiesAgain)
 TEST_F(AcquireToken, LogsEveryStepInOrder)
 {
     transport->reply = GetSignedAssertion();
-    trusted = GetCertificates("sts-cert.pem");
+    trusted = GetTestCertificates("sts");
     LogCapture log(64);
     const auto token = Acquire();
     ASSERT_NE(token, nullptr);
     EXPECT_THAT(
         log.lines,
         ElementsAre(
-            testing::ContainsRegex("^" + FrameLine("START") + "$"),
+            testing::ContainsRegex(FrameLine("START")),
             RequestLine,
             "SsoClient[64]: SecurityTokenServiceImpl::AcquireToken sending request",
             "SsoClient[64]: SecurityTokenServiceImpl::AcquireToken processing response",
             "SsoClient[64]: Successfully acquired token: " + CreateRedactedDescription(*token),
-            testing::ContainsRegex("^" + FrameLine("END") + "$")));
+            testing::ContainsRegex(FrameLine("END"))));
     EXPECT_EQ(GetOpId(log.lines.front()), GetOpId(log.lines.back()));
 }
 
@@ -263,12 +150,12 @@ TEST_F(AcquireToken, LogsTheEndWhenTheRequestIsRefused)
     spec.tokenLifetimeSec = 0;
     LogCapture log(64);
     EXPECT_EQ(
-        GetFailure(responseHandler),
+        GetFailureThrough(responseHandler),
         "InvalidArgumentException: Invalid argument : Token lifetime must be positive");
     ASSERT_EQ(log.lines.size(), 3U);
-    EXPECT_THAT(log.lines[0], testing::ContainsRegex("^" + FrameLine("START") + "$"));
+    EXPECT_THAT(log.lines[0], testing::ContainsRegex(FrameLine("START")));
     EXPECT_THAT(log.lines[1], HasSubstr("tokenLifetimeSec=0"));
-    EXPECT_THAT(log.lines[2], testing::ContainsRegex("^" + FrameLine("END") + "$"));
+    EXPECT_THAT(log.lines[2], testing::ContainsRegex(FrameLine("END")));
     EXPECT_EQ(GetOpId(log.lines[0]), GetOpId(log.lines[2]));
     EXPECT_EQ(transport->sessionsMade, 0);
 }
@@ -277,7 +164,7 @@ TEST_F(AcquireToken, LogsTheEndWhenSendingFails)
 {
     transport->failure = boost::make_shared<CommunicationException>("no route");
     LogCapture log(64);
-    EXPECT_EQ(GetFailure(responseHandler), "CommunicationException: no route");
+    EXPECT_EQ(GetFailureThrough(responseHandler), "CommunicationException: no route");
     EXPECT_THAT(
         log.lines,
         ElementsAre(
@@ -293,7 +180,7 @@ TEST_F(AcquireToken, LogsTheEndWhenTheReplyIsBad)
     transport->reply = "no markup";
     LogCapture log(64);
     EXPECT_THAT(
-        GetFailure(boost::make_shared<ResponseHandlerImpl>()),
+        GetFailureThrough(boost::make_shared<ResponseHandlerImpl>()),
         testing::StartsWith("SsoException: Response is not well-formed XML: "));
     EXPECT_THAT(
         log.lines,
@@ -308,7 +195,7 @@ TEST_F(AcquireToken, LogsTheEndWhenTheReplyIsBad)
 TEST_F(AcquireToken, LogsNothingBelowLevel64)
 {
     transport->reply = GetSignedAssertion();
-    trusted = GetCertificates("sts-cert.pem");
+    trusted = GetTestCertificates("sts");
     LogCapture log(63);
     ASSERT_NE(Acquire(), nullptr);
     EXPECT_TRUE(log.lines.empty());
@@ -317,7 +204,7 @@ TEST_F(AcquireToken, LogsNothingBelowLevel64)
 TEST_F(AcquireToken, NeverLogsPasswordOrAssertion)
 {
     transport->reply = GetSignedAssertion();
-    trusted = GetCertificates("sts-cert.pem");
+    trusted = GetTestCertificates("sts");
     LogCapture log(64);
     ASSERT_NE(Acquire(), nullptr);
     for (const std::string& line : log.lines) {
@@ -337,13 +224,13 @@ TEST_F(AcquireToken, ReportsMalformedAssertionAsFailureOfTheService)
         parserText = error.what();
     }
     EXPECT_NE(parserText, "");
-    EXPECT_EQ(GetFailure(responseHandler), "SsoException: " + parserText);
+    EXPECT_EQ(GetFailureThrough(responseHandler), "SsoException: " + parserText);
 }
 
 TEST_F(AcquireToken, ReportsAssertionThatDoesNotVerify)
 {
     transport->reply = GetSignedAssertion();
-    trusted = GetCertificates("foreign-cert.pem");
+    trusted = GetTestCertificates("foreign");
     EXPECT_THROW(Acquire(), InvalidSignatureException);
 }
 
@@ -363,14 +250,10 @@ TEST(CreateSecurityTokenService, RefusesHttpsWithoutContext)
 {
     SecurityTokenServiceConfig config;
     config.url = "https://sts.example.com/STS";
-    try {
-        CreateSecurityTokenService(config);
-        FAIL();
-    } catch (const Quillon::InvalidArgumentException& error) {
-        EXPECT_STREQ(
-            error.what(),
-            "Invalid argument : HTTPS connection requested but no SSLContext provided.");
-    }
+    EXPECT_EQ(
+        GetFailure([&config] { CreateSecurityTokenService(config); }),
+        "InvalidArgumentException: Invalid argument : "
+        "HTTPS connection requested but no SSLContext provided.");
 }
 
 TEST(CreateSecurityTokenService, AcceptsEmptyTrustAndOutlivesTheConfiguration)

@@ -1,12 +1,17 @@
 #include "ssoClient/RequestBuilderImpl.h"
 
-#include "quillon/Exceptions.h"
 #include "quillon/xml/Parser.h"
+#include "support/Failure.h"
+#include "support/FakeSamlToken.h"
 #include "support/FixedClock.h"
+#include "support/TestData.h"
+#include "support/Xmlsec1.h"
 
 #include <gmock/gmock.h>
 
 using namespace SsoClient;
+using Quillon::Xml::ElementNode;
+using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::Not;
 
@@ -30,15 +35,42 @@ Request BuildUserPass(
     return request;
 }
 
-std::string GetMessageOfRefusal(const TokenSpec& spec)
+HolderOfKeyConfig GetIdentity()
 {
-    try {
-        BuildUserPass(spec);
-    } catch (const Quillon::InvalidArgumentException& error) {
-        return error.what();
-    }
-    return "accepted";
+    return {GetTestKey("client"), GetTestCertificates("client").front()};
 }
+
+Quillon::Ref<Quillon::Xml::Document> Parse(const std::string& text)
+{
+    const auto handler = Quillon::Xml::CreateXMLDocumentHandler();
+    Quillon::Xml::CreateXMLParser(handler.get())->Parse(std::string_view(text));
+    return handler->GetDocument();
+}
+
+std::vector<std::string> GetHeaderParts(const std::string& envelope)
+{
+    const auto document = Parse(envelope);
+    const ElementNode* const security =
+        document->GetRootElement()->FindChildElement("Header")->FindChildElement("Security");
+    std::vector<std::string> names;
+    for (const auto* child = security->GetFirstChild(); child; child = child->GetNextSibling()) {
+        names.emplace_back(Quillon::Xml::AsElement(child)->GetName());
+    }
+    return names;
+}
+
+FakeSamlToken GetToken(const std::string& file)
+{
+    FakeSamlToken token;
+    token.id = "_7d1f6a52-9c61";
+    token.xml = ReadTestData("tokens/accepted/" + file + ".xml");
+    return token;
+}
+
+constexpr char BadLifetime[] =
+    "InvalidArgumentException: Invalid argument : Token lifetime must be positive";
+constexpr char PublicKeyType[] = "<wst:KeyType>" WST "/PublicKey</wst:KeyType>";
+constexpr char BearerKeyType[] = "<wst:KeyType>" WST "/Bearer</wst:KeyType>";
 
 } // namespace
 
@@ -84,14 +116,11 @@ TEST(BuildUserPassTokenRequest, EscapesWhatTheCallerGives)
     Request request;
     RequestBuilderImpl(boost::none)
         .BuildUserPassTokenRequest("</wsse:Username><x>", "a&b<c", SpecWithLifetime(300), request);
-    const Quillon::Ref<Quillon::Xml::DocumentHandler> handler =
-        Quillon::Xml::CreateXMLDocumentHandler();
-    Quillon::Xml::CreateXMLParser(handler.get())->Parse(std::string_view(request.body));
-    const Quillon::Xml::ElementNode* const token = handler->GetDocument()
-                                                       ->GetRootElement()
-                                                       ->FindChildElement("Header")
-                                                       ->FindChildElement("Security")
-                                                       ->FindChildElement("UsernameToken");
+    const auto document = Parse(request.body);
+    const ElementNode* const token = document->GetRootElement()
+                                         ->FindChildElement("Header")
+                                         ->FindChildElement("Security")
+                                         ->FindChildElement("UsernameToken");
     EXPECT_EQ(
         Quillon::Xml::AsText(token->FindChildElement("Username")->GetFirstChild())->GetText(),
         "</wsse:Username><x>");
@@ -102,13 +131,22 @@ TEST(BuildUserPassTokenRequest, EscapesWhatTheCallerGives)
 
 TEST(BuildUserPassTokenRequest, RefusesLifetimeThatIsNotPositive)
 {
-    EXPECT_EQ(
-        GetMessageOfRefusal(SpecWithLifetime(0)),
-        "Invalid argument : Token lifetime must be positive");
-    EXPECT_EQ(
-        GetMessageOfRefusal(SpecWithLifetime(-1)),
-        "Invalid argument : Token lifetime must be positive");
-    EXPECT_EQ(GetMessageOfRefusal(SpecWithLifetime(1)), "accepted");
+    EXPECT_EQ(GetFailure([] { BuildUserPass(SpecWithLifetime(0)); }), BadLifetime);
+    EXPECT_EQ(GetFailure([] { BuildUserPass(SpecWithLifetime(-1)); }), BadLifetime);
+    EXPECT_EQ(GetFailure([] { BuildUserPass(SpecWithLifetime(1)); }), "none");
+}
+
+TEST(BuildUserPassTokenRequest, WithIdentityIsSignedHolderOfKey)
+{
+    const Request request = BuildUserPass(SpecWithLifetime(300), GetIdentity());
+    EXPECT_EQ(request.soapAction, WST "/RST/Issue");
+    EXPECT_THAT(request.body, HasSubstr(PublicKeyType));
+    EXPECT_THAT(request.body, HasSubstr("<wst:UseKey Sig=\"holderOfKeyProofSignature\"/>"));
+    EXPECT_THAT(
+        GetHeaderParts(request.body),
+        ElementsAre(
+            "wsu:Timestamp", "wsse:UsernameToken", "wsse:BinarySecurityToken", "ds:Signature"));
+    EXPECT_TRUE(Xmlsec1Verifies(request.body, "client", RequestSignature));
 }
 
 TEST(BuildUserPassTokenRequest, LeavesTheRequestUntouchedOnBadLifetime)
@@ -143,6 +181,181 @@ TEST(BuildUserPassTokenRequest, WithIdentityAndDelegationIsUnsignedHolderOfKey)
     EXPECT_THAT(request.body, HasSubstr("<wst:KeyType>" WST "/PublicKey</wst:KeyType>"));
     EXPECT_THAT(request.body, Not(HasSubstr("Signature")));
     EXPECT_THAT(request.body, Not(HasSubstr("UseKey")));
+}
+
+TEST(BuildCertificateTokenRequest, IsSignedWithTheCertificate)
+{
+    Request request;
+    RequestBuilderImpl(GetIdentity()).BuildCertificateTokenRequest(SpecWithLifetime(300), request);
+    EXPECT_EQ(request.soapAction, WST "/RST/Issue");
+    EXPECT_THAT(request.body, HasSubstr(PublicKeyType));
+    EXPECT_THAT(request.body, HasSubstr("<wst:UseKey Sig=\"holderOfKeyProofSignature\"/>"));
+    EXPECT_THAT(
+        GetHeaderParts(request.body),
+        ElementsAre("wsu:Timestamp", "wsse:BinarySecurityToken", "ds:Signature"));
+    EXPECT_TRUE(Xmlsec1Verifies(request.body, "client", RequestSignature));
+}
+
+TEST(BuildCertificateTokenRequest, IsSignedEvenIfDelegated)
+{
+    TokenSpec spec = SpecWithLifetime(300);
+    spec.delegateTo = "proxy";
+    Request request;
+    RequestBuilderImpl(GetIdentity()).BuildCertificateTokenRequest(spec, request);
+    EXPECT_THAT(request.body, Not(HasSubstr("UseKey")));
+    EXPECT_TRUE(Xmlsec1Verifies(request.body, "client", RequestSignature));
+}
+
+TEST(BuildCertificateTokenRequest, ChecksLifetimeThenIdentityThenConfirmation)
+{
+    const RequestBuilderImpl without(boost::none);
+    const RequestBuilderImpl with(GetIdentity());
+    TokenSpec spec = SpecWithLifetime(0);
+    spec.confirmation = TokenSpec::CONFIRMATION_BEARER;
+    Request request;
+    EXPECT_EQ(
+        GetFailure([&] { without.BuildCertificateTokenRequest(spec, request); }), BadLifetime);
+    spec.tokenLifetimeSec = 300;
+    EXPECT_EQ(
+        GetFailure([&] { without.BuildCertificateTokenRequest(spec, request); }),
+        "InvalidStateException: "
+        "No HolderOfKeyConfig provided. Unable to acquire token by certificate");
+    for (const int confirmation : {1, 7}) {
+        spec.confirmation = static_cast<TokenSpec::Confirmation>(confirmation);
+        EXPECT_EQ(
+            GetFailure([&] { with.BuildCertificateTokenRequest(spec, request); }),
+            "InvalidArgumentException: Invalid argument : TokenSpec::confirmation must be "
+            "CONFIRMATION_DEFAULT for acquire token by certificate");
+    }
+    EXPECT_EQ(request.soapAction, "");
+    EXPECT_EQ(request.body, "");
+}
+
+TEST(BuildExchangeTokenRequest, PresentsTheTokenAndRefersToIt)
+{
+    Request request;
+    RequestBuilderImpl(GetIdentity())
+        .BuildExchangeTokenRequest(GetToken("holder-of-key"), SpecWithLifetime(300), request);
+    EXPECT_EQ(request.soapAction, WST "/RST/Issue");
+    EXPECT_THAT(request.body, HasSubstr(PublicKeyType));
+    EXPECT_THAT(request.body, Not(HasSubstr("UseKey")));
+    EXPECT_THAT(
+        GetHeaderParts(request.body),
+        ElementsAre("wsu:Timestamp", "saml:Assertion", "ds:Signature"));
+    EXPECT_THAT(request.body, HasSubstr(">_7d1f6a52-9c61</wsse:KeyIdentifier>"));
+    EXPECT_TRUE(Xmlsec1Verifies(request.body, "client", RequestSignature));
+    EXPECT_TRUE(Xmlsec1Verifies(request.body, "sts", AssertionSignature));
+}
+
+TEST(BuildExchangeTokenRequest, TakesBearerTokenAndBearerConfirmation)
+{
+    TokenSpec spec = SpecWithLifetime(300);
+    spec.confirmation = TokenSpec::CONFIRMATION_BEARER;
+    Request request;
+    RequestBuilderImpl(GetIdentity()).BuildExchangeTokenRequest(GetToken("bearer"), spec, request);
+    EXPECT_THAT(request.body, HasSubstr(BearerKeyType));
+    EXPECT_TRUE(Xmlsec1Verifies(request.body, "client", RequestSignature));
+    EXPECT_TRUE(Xmlsec1Verifies(request.body, "sts", AssertionSignature));
+}
+
+TEST(BuildExchangeTokenRequest, ChecksLifetimeThenIdentity)
+{
+    const RequestBuilderImpl without(boost::none);
+    const FakeSamlToken token = GetToken("bearer");
+    Request request;
+    EXPECT_EQ(
+        GetFailure(
+            [&] { without.BuildExchangeTokenRequest(token, SpecWithLifetime(-1), request); }),
+        BadLifetime);
+    EXPECT_EQ(
+        GetFailure(
+            [&] { without.BuildExchangeTokenRequest(token, SpecWithLifetime(300), request); }),
+        "InvalidStateException: No HolderOfKeyConfig provided. Unable to acquire token by token");
+}
+
+TEST(BuildValidateSubjectRequest, IsUnsigned)
+{
+    const FixedClock clock("2011-07-05T09:03:07.042Z");
+    FakeSamlToken token;
+    token.xml = "<a:A xmlns:a=\"urn:a\"/>";
+    Request request;
+    RequestBuilderImpl(GetIdentity()).BuildValidateSubjectRequest(token, request);
+    EXPECT_EQ(request.soapAction, WST "/RST/Validate");
+    EXPECT_EQ(
+        request.body,
+        "<soapenv:Envelope xmlns:soapenv=\"http://schemas.xmlsoap.org/soap/envelope/\">"
+        "<soapenv:Header>"
+        "<wsse:Security xmlns:wsse=\"" WSS "wssecurity-secext-1.0.xsd\">"
+        "<wsu:Timestamp xmlns:wsu=\"" WSS "wssecurity-utility-1.0.xsd\">"
+        "<wsu:Created>2011-07-05T09:03:07.042Z</wsu:Created>"
+        "<wsu:Expires>2011-07-05T09:13:07.042Z</wsu:Expires>"
+        "</wsu:Timestamp>"
+        "</wsse:Security>"
+        "</soapenv:Header>"
+        "<soapenv:Body xmlns:wst=\"" WST "\">"
+        "<wst:RequestSecurityToken xmlns:wst=\"" WST "\">"
+        "<wst:TokenType>" WST "/RSTR/Status</wst:TokenType>"
+        "<wst:RequestType>" WST "/Validate</wst:RequestType>"
+        "<wst:ValidateTarget><a:A xmlns:a=\"urn:a\"/></wst:ValidateTarget>"
+        "</wst:RequestSecurityToken>"
+        "</soapenv:Body>"
+        "</soapenv:Envelope>");
+}
+
+TEST(BuildValidateSubjectRequest, NeedsNoIdentityAndKeepsTheTokenVerifiable)
+{
+    Request request;
+    RequestBuilderImpl(boost::none).BuildValidateSubjectRequest(GetToken("bearer"), request);
+    EXPECT_TRUE(Xmlsec1Verifies(request.body, "sts", AssertionSignature));
+}
+
+TEST(BuildValidateSubjectRequest, SetsTheActionBeforeItReadsTheToken)
+{
+    FakeSamlToken token;
+    token.xml = "not XML";
+    Request request;
+    EXPECT_THROW(
+        RequestBuilderImpl(boost::none).BuildValidateSubjectRequest(token, request),
+        Quillon::Xml::XMLParseException);
+    EXPECT_EQ(request.soapAction, WST "/RST/Validate");
+    EXPECT_EQ(request.body, "");
+}
+
+TEST(BuildRenewRequest, IsSignedWithTheCertificate)
+{
+    const FixedClock clock("2011-07-05T09:03:07.042Z");
+    FakeSamlToken token = GetToken("holder-of-key");
+    token.confirmationMethod = SamlToken::CONFIRM_HOLDER_OF_KEY;
+    Request request;
+    RequestBuilderImpl(GetIdentity()).BuildRenewRequest(token, 600, request);
+    EXPECT_EQ(request.soapAction, WST "/RST/Renew");
+    EXPECT_THAT(request.body, HasSubstr("<wst:RequestType>" WST "/Renew</wst:RequestType>"));
+    EXPECT_THAT(
+        request.body,
+        HasSubstr("<wsu:Expires>2011-07-05T09:13:07.042Z</wsu:Expires></wst:Lifetime>"
+                  "<wst:RenewTarget><saml:Assertion "));
+    EXPECT_THAT(
+        GetHeaderParts(request.body),
+        ElementsAre("wsu:Timestamp", "wsse:BinarySecurityToken", "ds:Signature"));
+    EXPECT_TRUE(Xmlsec1Verifies(request.body, "client", RequestSignature));
+    EXPECT_TRUE(Xmlsec1Verifies(request.body, "sts", AssertionSignature));
+}
+
+TEST(BuildRenewRequest, ChecksLifetimeThenIdentityThenToken)
+{
+    const RequestBuilderImpl without(boost::none);
+    const RequestBuilderImpl with(GetIdentity());
+    const FakeSamlToken bearer = GetToken("bearer");
+    Request request;
+    EXPECT_EQ(GetFailure([&] { without.BuildRenewRequest(bearer, 0, request); }), BadLifetime);
+    EXPECT_EQ(
+        GetFailure([&] { without.BuildRenewRequest(bearer, 1, request); }),
+        "InvalidStateException: No HolderOfKeyConfig provided. Unable to renew token");
+    EXPECT_EQ(
+        GetFailure([&] { with.BuildRenewRequest(bearer, 1, request); }),
+        "InvalidArgumentException: Invalid argument : "
+        "Unable to renew token: the provided token must be Holder Of Key");
+    EXPECT_EQ(request.soapAction, "");
 }
 
 TEST(Request, IsIndependentOfItsCopy)

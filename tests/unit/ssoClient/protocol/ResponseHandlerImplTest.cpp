@@ -3,10 +3,9 @@
 #include "quillon/xml/Parser.h"
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/xmlReading.h"
+#include "support/Failure.h"
 
 #include <gmock/gmock.h>
-
-#include <typeinfo>
 
 using namespace SsoClient;
 
@@ -61,16 +60,10 @@ bool Validate(const std::string& reply)
         Quillon::CreateStringReader(reply).get());
 }
 
-/** Class and text of what `handle` throws for `reply`, as "class: text". */
 template <class Handle>
 std::string GetFailure(const Handle& handle, const std::string& reply)
 {
-    try {
-        handle(reply);
-    } catch (const std::exception& error) {
-        return Quillon::GetClassName(error) + ": " + error.what();
-    }
-    return "none";
+    return ::GetFailure([&] { handle(reply); });
 }
 
 std::string GetParserText(const std::string& text)

@@ -1,0 +1,50 @@
+#pragma once
+
+#include "http/WipedString.h"
+
+#include "quillon/http/ClientRequest.h"
+
+#include <map>
+#include <string>
+
+namespace Quillon::Http {
+
+/** Header names are the same whatever their case [RFC 9110 5.1]. */
+struct HeaderNameLess
+{
+    bool operator()(const std::string& a, const std::string& b) const;
+};
+
+class ClientRequestImpl final : public ClientRequest
+{
+public:
+    explicit ClientRequestImpl(std::string path);
+
+    void SetHeader(const std::string& name, const std::string& value) override;
+    Writer* GetBodyWriter() noexcept override { return _writer.get(); }
+    void SetTimeout(long long timeout) override;
+
+    const std::string& GetPath() const noexcept { return _path; }
+    const std::map<std::string, std::string, HeaderNameLess>& GetHeaders() const noexcept
+    {
+        return _headers;
+    }
+    const WipedBytes& GetBody() const noexcept { return _writer->bytes; }
+    long long GetTimeout() const noexcept { return _timeout; }
+
+private:
+    class BodyWriter final : public Writer
+    {
+    public:
+        void Write(const char* text, std::size_t size) override;
+
+        WipedBytes bytes;
+    };
+
+    const std::string _path;
+    std::map<std::string, std::string, HeaderNameLess> _headers;
+    const Ref<BodyWriter> _writer;
+    long long _timeout;
+};
+
+} // namespace Quillon::Http

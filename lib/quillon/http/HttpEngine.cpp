@@ -1,0 +1,292 @@
+#include "http/HttpEngine.h"
+
+#include <csignal>
+#include <unistd.h>
+#include <utility>
+
+namespace Quillon::Http {
+
+namespace {
+
+/** The poll returns for every event; this only bounds the harm of one that got lost. */
+constexpr int LongestPollMs = 60'000;
+
+/** Never destroyed, see the class. */
+union ImmortalEngine {
+    ImmortalEngine() { new (&engine) HttpEngine(); }
+    ~ImmortalEngine() {} // NOLINT(modernize-use-equals-default): the member is left alone
+    ImmortalEngine(const ImmortalEngine&) = delete;
+    ImmortalEngine& operator=(const ImmortalEngine&) = delete;
+
+    HttpEngine engine;
+};
+
+struct Stopper
+{
+    Stopper() = default;
+    ~Stopper() { HttpEngine::Get().Stop(); }
+    Stopper(const Stopper&) = delete;
+    Stopper& operator=(const Stopper&) = delete;
+};
+
+/**
+ * Threads that start inside the scope take no signals: the host's handlers stay on the host's
+ * threads, and a broken connection raises no SIGPIPE, which libcurl leaves to us.
+ */
+class SignalBlock
+{
+public:
+    SignalBlock() noexcept
+    {
+        sigset_t all;
+        sigfillset(&all);
+        pthread_sigmask(SIG_SETMASK, &all, &_old);
+    }
+    ~SignalBlock() { pthread_sigmask(SIG_SETMASK, &_old, nullptr); }
+    SignalBlock(const SignalBlock&) = delete;
+    SignalBlock& operator=(const SignalBlock&) = delete;
+
+private:
+    sigset_t _old{};
+};
+
+Outcome MakeFailure(const std::string& text)
+{
+    return {std::make_shared<HttpException>(text), {}};
+}
+
+[[noreturn]] void ThrowEnded()
+{
+    throw HttpException("The process is about to end and sends nothing any more.");
+}
+
+} // namespace
+
+HttpEngine& HttpEngine::Get() noexcept
+{
+    static ImmortalEngine immortal;
+    return immortal.engine;
+}
+
+void HttpEngine::RequireRunning()
+{
+    const std::lock_guard<std::mutex> lock(_mutex);
+    if (HasForked()) {
+        throw HttpException("The process has forked after its first HTTP exchange; the child "
+                            "cannot send. Fork first.");
+    }
+    if (_state == State::ENDED) {
+        ThrowEnded();
+    }
+    if (_state == State::IDLE) {
+        Start();
+        _state = State::RUNNING;
+    }
+}
+
+void HttpEngine::Start()
+{
+    if (_multi == nullptr) {
+        if (curl_global_init(CURL_GLOBAL_SSL) != CURLE_OK) {
+            throw HttpException("libcurl cannot be initialised.");
+        }
+        _multi = curl_multi_init();
+    }
+    if (_multi == nullptr) {
+        throw std::bad_alloc();
+    }
+    // libcurl has initialised OpenSSL by now, so OpenSSL takes itself down after the threads.
+    static const Stopper atExit;
+    const SignalBlock noSignals;
+    try {
+        _callbackThread.Start();
+        _ioThread = std::thread([this] { Run(); });
+    } catch (const std::system_error& error) {
+        throw HttpException(std::string("The HTTP threads cannot be started: ") + error.what());
+    }
+    _pid = getpid();
+}
+
+void HttpEngine::Submit(std::unique_ptr<Transfer> transfer)
+{
+    {
+        const std::lock_guard<std::mutex> lock(_mutex);
+        if (_state != State::RUNNING) {
+            ThrowEnded();
+        }
+        _submitted.push_back(std::move(transfer));
+    }
+    Wake();
+}
+
+void HttpEngine::NoteCancellation() noexcept
+{
+    _hasCancelled = true;
+    Wake();
+}
+
+std::list<Connections>::iterator HttpEngine::AddConnections(Ref<const ConnectionSpecImpl> spec)
+{
+    const std::lock_guard<std::mutex> lock(_mutex);
+    return _connections.emplace(_connections.end(), std::move(spec));
+}
+
+void HttpEngine::RetireConnections(std::list<Connections>::iterator connections) noexcept
+{
+    std::list<Connections> unused; // goes after the lock
+    const std::lock_guard<std::mutex> lock(_mutex);
+    const bool areOpen = connections->share != nullptr;
+    std::list<Connections>& target = areOpen ? _retired : unused;
+    target.splice(target.end(), _connections, connections);
+    if (areOpen) {
+        Wake();
+    }
+}
+
+bool HttpEngine::HasForked() const noexcept
+{
+    return _pid != 0 && _pid != getpid();
+}
+
+void HttpEngine::Wake() noexcept
+{
+    CURLM* const multi = _multi;
+    // The wake-up channel of a forked child is still that of its parent.
+    if (multi != nullptr && !HasForked()) {
+        curl_multi_wakeup(multi);
+    }
+}
+
+void HttpEngine::Run()
+{
+    std::vector<std::unique_ptr<Transfer>> submitted;
+    while (TakeWork(submitted)) {
+        for (std::unique_ptr<Transfer>& transfer : submitted) {
+            StartTransfer(std::move(transfer));
+        }
+        submitted.clear();
+        DropCancelled();
+        int running = 0;
+        curl_multi_perform(_multi, &running);
+        CompleteFinished();
+        curl_multi_poll(_multi, nullptr, 0, LongestPollMs, nullptr);
+    }
+    CloseEverything();
+}
+
+bool HttpEngine::TakeWork(std::vector<std::unique_ptr<Transfer>>& submitted)
+{
+    std::list<Connections> retired; // closed after the lock
+    const std::lock_guard<std::mutex> lock(_mutex);
+    retired.swap(_retired);
+    if (_state == State::ENDED) {
+        return false;
+    }
+    submitted.swap(_submitted);
+    return true;
+}
+
+void HttpEngine::StartTransfer(std::unique_ptr<Transfer> transfer)
+{
+    if (transfer->GetExchange()->IsCancelled()) {
+        return;
+    }
+    try {
+        transfer->Prepare();
+    } catch (const std::exception& error) {
+        Complete(std::move(transfer), MakeFailure(error.what()));
+        return;
+    }
+    CURL* const easy = transfer->GetHandle();
+    _transfers[easy] = std::move(transfer);
+    const CURLMcode code = curl_multi_add_handle(_multi, easy);
+    if (code != CURLM_OK) {
+        Complete(Remove(easy), MakeFailure(curl_multi_strerror(code)));
+    }
+}
+
+void HttpEngine::DropCancelled()
+{
+    if (!_hasCancelled.exchange(false)) {
+        return;
+    }
+    for (auto position = _transfers.begin(); position != _transfers.end();) {
+        if (position->second->GetExchange()->IsCancelled()) {
+            curl_multi_remove_handle(_multi, position->first);
+            position = _transfers.erase(position);
+        } else {
+            ++position;
+        }
+    }
+}
+
+void HttpEngine::CompleteFinished()
+{
+    int left = 0;
+    while (const CURLMsg* message = curl_multi_info_read(_multi, &left)) {
+        if (message->msg != CURLMSG_DONE) {
+            continue;
+        }
+        // Removing the handle frees the message.
+        const CURLcode result = message->data.result;
+        std::unique_ptr<Transfer> transfer = Remove(message->easy_handle);
+        Outcome outcome = transfer->Finish(result);
+        Complete(std::move(transfer), std::move(outcome));
+    }
+}
+
+void HttpEngine::Complete(std::unique_ptr<Transfer> transfer, Outcome outcome)
+{
+    const Ref<Exchange> exchange = transfer->GetExchange();
+    // Before anyone hears of the end: the request with its secrets is gone by then.
+    transfer.reset();
+    if (exchange->Complete(std::move(outcome))) {
+        _callbackThread.Push(exchange);
+    }
+}
+
+std::unique_ptr<Transfer> HttpEngine::Remove(CURL* easy)
+{
+    curl_multi_remove_handle(_multi, easy);
+    return std::move(_transfers.extract(easy).mapped());
+}
+
+void HttpEngine::CloseEverything()
+{
+    std::vector<std::unique_ptr<Transfer>> transfers;
+    {
+        const std::lock_guard<std::mutex> lock(_mutex);
+        transfers.swap(_submitted);
+    }
+    while (!_transfers.empty()) {
+        transfers.push_back(Remove(_transfers.begin()->first));
+    }
+    for (const std::unique_ptr<Transfer>& transfer : transfers) {
+        // Whoever waits is told; completions do not run in a process that ends.
+        transfer->GetExchange()->Complete(MakeFailure("The process is about to end."));
+    }
+    transfers.clear();
+    std::list<Connections> retired;
+    const std::lock_guard<std::mutex> lock(_mutex);
+    retired.swap(_retired);
+    for (Connections& connections : _connections) {
+        connections.share.reset();
+    }
+    // The multi handle stays: freeing it would change the disposition of SIGPIPE for a moment.
+}
+
+void HttpEngine::Stop()
+{
+    {
+        const std::lock_guard<std::mutex> lock(_mutex);
+        if (_state != State::RUNNING || HasForked()) {
+            return;
+        }
+        _state = State::ENDED;
+    }
+    Wake();
+    _ioThread.join();
+    _callbackThread.Stop();
+}
+
+} // namespace Quillon::Http

@@ -1,0 +1,94 @@
+#pragma once
+
+#include "http/CallbackThread.h"
+#include "http/ConnectionPoolImpl.h"
+#include "http/Curl.h"
+#include "http/Transfer.h"
+
+#include <atomic>
+#include <list>
+#include <map>
+#include <memory>
+#include <mutex>
+#include <thread>
+#include <vector>
+
+namespace Quillon::Http {
+
+/**
+ * Drives all transfers of the process through one multi handle of libcurl on one I/O thread.
+ *
+ * The engine itself is never destroyed, because objects of the host may still refer to it while
+ * the process runs its static destructors. Its threads stop before that: they must not use
+ * OpenSSL while OpenSSL takes itself down.
+ *
+ * Thread safety: any thread.
+ */
+class HttpEngine
+{
+public:
+    /** The engine of the process. Its threads start with the first transfer. */
+    static HttpEngine& Get() noexcept;
+
+    HttpEngine() = default;
+    HttpEngine(const HttpEngine&) = delete;
+    HttpEngine& operator=(const HttpEngine&) = delete;
+
+    /**
+     * Initialises libcurl, starts the threads if they do not run, and makes sure that they do.
+     * To be called before any handle of libcurl is made.
+     *
+     * @throws HttpException  the process has forked since they started, or is about to end.
+     */
+    void RequireRunning();
+
+    /** @throws HttpException  the process is about to end. */
+    void Submit(std::unique_ptr<Transfer> transfer);
+
+    /** Makes the I/O thread look for exchanges that were called off. */
+    void NoteCancellation() noexcept;
+
+    std::list<Connections>::iterator AddConnections(Ref<const ConnectionSpecImpl> spec);
+    void RetireConnections(std::list<Connections>::iterator connections) noexcept;
+
+    /** Stops the threads; what is in flight fails. Called once, when the process ends. */
+    void Stop();
+
+private:
+    enum class State
+    {
+        IDLE,
+        RUNNING,
+        ENDED
+    };
+
+    void Start();
+    bool HasForked() const noexcept;
+    void Wake() noexcept;
+
+    // On the I/O thread.
+    void Run();
+    bool TakeWork(std::vector<std::unique_ptr<Transfer>>& submitted);
+    void StartTransfer(std::unique_ptr<Transfer> transfer);
+    void DropCancelled();
+    void CompleteFinished();
+    void Complete(std::unique_ptr<Transfer> transfer, Outcome outcome);
+    std::unique_ptr<Transfer> Remove(CURL* easy);
+    void CloseEverything();
+
+    std::mutex _mutex; // guards the next group
+    State _state = State::IDLE;
+    std::vector<std::unique_ptr<Transfer>> _submitted;
+    std::list<Connections> _connections;
+    std::list<Connections> _retired;
+
+    std::atomic<bool> _hasCancelled{false};
+    std::atomic<CURLM*> _multi{nullptr};
+    std::atomic<int> _pid{0};
+    std::thread _ioThread;
+    CallbackThread _callbackThread;
+
+    std::map<CURL*, std::unique_ptr<Transfer>> _transfers; // on the I/O thread only
+};
+
+} // namespace Quillon::Http

@@ -1,0 +1,70 @@
+#pragma once
+
+#include "http/ClientRequestImpl.h"
+#include "http/ConnectionPoolImpl.h"
+#include "http/CookieStoreImpl.h"
+#include "http/Curl.h"
+#include "http/Exchange.h"
+#include "http/ReplyCollector.h"
+
+#include <array>
+
+namespace Quillon::Http {
+
+/**
+ * One exchange as libcurl sees it. Made on the caller's thread, then only used and destroyed by
+ * the engine.
+ */
+class Transfer
+{
+public:
+    /** @param cookies  may be null. @throws HttpException  libcurl does not take an option. */
+    Transfer(
+        Ref<ClientRequestImpl> request,
+        Ref<ConnectionPoolImpl> pool,
+        Ref<CookieStoreImpl> cookies,
+        Ref<Exchange> exchange);
+
+    /** Attaches what is shared with other transfers. On the I/O thread. */
+    void Prepare();
+
+    /** Judges the result of the transfer. On the I/O thread. */
+    Outcome Finish(CURLcode result);
+
+    CURL* GetHandle() const noexcept { return _easy.get(); }
+    const Ref<Exchange>& GetExchange() const noexcept { return _exchange; }
+
+private:
+    static std::size_t OnHeader(char* data, std::size_t size, std::size_t count, void* self);
+    static std::size_t OnBody(char* data, std::size_t size, std::size_t count, void* self);
+    static CURLcode OnSslContext(CURL* easy, void* context, void* self);
+
+    template <class T>
+    void Set(CURLoption option, T value);
+
+    void SetLimits();
+    void SetTarget();
+    void SetRequest();
+    void SetTls();
+    void SetCallbacks();
+
+    CookieLines ReadCookies() const;
+    std::string Describe(CURLcode result) const;
+    std::string DescribeTlsRefusal() const;
+    std::string DescribeRefusedConnection() const;
+
+    const Ref<ClientRequestImpl> _request;
+    const Ref<ConnectionPoolImpl> _pool;
+    const ConnectionSpecImpl& _spec; // kept by the pool
+    const Ref<CookieStoreImpl> _cookies;
+    const Ref<Exchange> _exchange;
+
+    CookieLines _givenCookies;
+    ReplyCollector _reply;
+    std::array<char, CURL_ERROR_SIZE> _errorText{};
+    StringListOwner _headers;
+    StringListOwner _connectTo;
+    EasyOwner _easy; // last, because it refers to what stands above
+};
+
+} // namespace Quillon::Http

@@ -1,0 +1,325 @@
+#include "HttpClient.h"
+#include "NameLookup.h"
+#include "support/TestTls.h"
+
+#include "quillon/ssl/SSLContext.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <csignal>
+#include <cstdlib>
+#include <fstream>
+#include <future>
+#include <latch>
+#include <sys/wait.h>
+#include <vector>
+
+using namespace Quillon::Http;
+using namespace Testing;
+using Quillon::Exception;
+using Quillon::Ref;
+
+// In a child that was forked from a process with threads, what only a thread's stack refers to
+// looks like a leak.
+static bool leakCheckIsOff = false;
+
+extern "C" int __lsan_is_turned_off() // NOLINT(bugprone-reserved-identifier): the sanitizer's
+{
+    return leakCheckIsOff ? 1 : 0;
+}
+
+// What concerns a whole process runs in a fresh one: a "death test" that ends with exit code 0.
+
+namespace {
+
+class ProcessTest : public testing::Test
+{
+protected:
+    ProcessTest() { GTEST_FLAG_SET(death_test_style, "threadsafe"); }
+};
+
+/** Ends the process with plain, TLS and name look-up exchanges under way. */
+[[noreturn]] void ExitInFlight()
+{
+    constexpr int Count = 8;
+    static std::latch asked(Count);
+    const TestServer::Handler handler = [](ServerConnection& connection) {
+        connection.ReadRequest();
+        asked.count_down();
+        connection.WaitForClose();
+    };
+    static const Identity identity = MakeIdentity({"test", "IP:127.0.0.1"});
+    static TlsServer tls(identity);
+    static const TestServer plainServer(handler);
+    static const TestServer tlsServer(handler, tls.GetStreams());
+    static NameLookup::Block block;
+
+    Quillon::Ssl::SSLContextOptions options;
+    options.useSystemAuthorities = false;
+    const std::vector<unsigned char> der = identity.GetDer();
+    options.authorities.push_back(Quillon::Crypto::CreateCertificate(der.data(), der.size()));
+    const Ref<Quillon::Ssl::SSLContext> context = Quillon::Ssl::CreateSSLContext(options);
+    Ref<ConnectionSpec> tlsSpec;
+    CreateSSLConnectionSpec(MakeTcpSpec(tlsServer).get(), context.get(), "127.0.0.1", "", tlsSpec);
+    Ref<ConnectionSpec> lookupSpec;
+    CreateTCPConnectionSpec(NameLookup::BlockedHost, 80, false, lookupSpec);
+
+    static std::vector<HttpClient> clients;
+    static std::vector<Ref<PendingRequestItem>> pending;
+    const auto completion = [](const Exception*, ClientResponse*, PendingRequestItem*) {
+        std::abort();
+    };
+    for (int index = 0; index < Count; ++index) {
+        clients.emplace_back(index % 2 == 0 ? MakeTcpSpec(plainServer) : tlsSpec);
+        pending.push_back(clients.back().Start(HttpClient::MakeRequest(), completion));
+    }
+    clients.emplace_back(lookupSpec);
+    pending.push_back(clients.back().Start(HttpClient::MakeRequest(), completion));
+    asked.wait();
+    block.WaitUntilAsked();
+    std::exit(0);
+}
+
+TEST_F(ProcessTest, ExitsWithExchangesInFlight)
+{
+    EXPECT_EXIT(ExitInFlight(), testing::ExitedWithCode(0), "^$");
+}
+
+/** Leaves a thread waiting for an exchange while static objects are destroyed. */
+[[noreturn]] void ExitWithAWaiter()
+{
+    static std::promise<void> asked;
+    static const TestServer server([](ServerConnection& connection) {
+        connection.ReadRequest();
+        connection.Write(MakeReply("200 OK", "pong"));
+        if (connection.ReadRequest()) {
+            asked.set_value();
+        }
+        connection.WaitForClose();
+    });
+    // Older than the HTTP threads, so that it is destroyed after they have stopped.
+    static struct Joiner
+    {
+        std::thread thread;
+        ~Joiner() { thread.join(); }
+    } joiner;
+    static HttpClient client(server);
+    client.Post();
+    joiner.thread = std::thread([] {
+        if (client.PostAndFail() != "The process is about to end.") {
+            std::abort();
+        }
+    });
+    asked.get_future().wait();
+    std::exit(0);
+}
+
+TEST_F(ProcessTest, ReleasesThoseWhoWaitWhenItExits)
+{
+    EXPECT_EXIT(ExitWithAWaiter(), testing::ExitedWithCode(0), "^$");
+}
+
+[[noreturn]] void ExitInsideACompletion()
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
+    HttpClient client(server);
+    const Ref<PendingRequestItem> pending = client.Start(
+        HttpClient::MakeRequest(),
+        [](const Exception*, ClientResponse*, PendingRequestItem*) { std::exit(0); });
+    std::promise<void>().get_future().wait();
+    std::abort();
+}
+
+TEST_F(ProcessTest, MayExitInsideACompletion)
+{
+    EXPECT_EXIT(ExitInsideACompletion(), testing::ExitedWithCode(0), "^$");
+}
+
+[[noreturn]] void ExitWithABlockedCompletion()
+{
+    static std::promise<void> entered;
+    static std::promise<void> never;
+    static const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
+    static HttpClient client(server);
+    static const Ref<PendingRequestItem> pending = client.Start(
+        HttpClient::MakeRequest(), [](const Exception*, ClientResponse*, PendingRequestItem*) {
+            entered.set_value();
+            never.get_future().wait();
+        });
+    entered.get_future().wait();
+    std::exit(0);
+}
+
+TEST_F(ProcessTest, ExitsWhileACompletionBlocks)
+{
+    EXPECT_EXIT(ExitWithABlockedCompletion(), testing::ExitedWithCode(0), "^$");
+}
+
+TEST_F(ProcessTest, SendsNothingAfterItsEnd)
+{
+    EXPECT_EXIT(
+        {
+            // Destroyed after the HTTP threads have stopped, because it is older.
+            static struct Late
+            {
+                std::unique_ptr<TestServer> server;
+                ~Late()
+                {
+                    const std::string text = HttpClient(*server).PostAndFail();
+                    if (text != "The process is about to end and sends nothing any more.") {
+                        std::abort();
+                    }
+                }
+            } late;
+            late.server = std::make_unique<TestServer>(AnswerAll(MakeReply("200 OK", "pong")));
+            HttpClient(*late.server).Post();
+            std::exit(0);
+        },
+        testing::ExitedWithCode(0),
+        "^$");
+}
+
+/** The exit code of a forked child that runs `action`. */
+template <class Action>
+int RunInChild(const Action& action)
+{
+    const pid_t child = fork();
+    if (child == 0) {
+        std::exit(action() ? 0 : 1);
+    }
+    int status = 0;
+    waitpid(child, &status, 0);
+    return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+}
+
+/** A server in a process of its own, so that a fork takes no server thread away. */
+int ServeInChild(pid_t& server)
+{
+    int channel[2];
+    if (pipe(channel) != 0) {
+        std::abort();
+    }
+    server = fork();
+    if (server == 0) {
+        const TestServer testServer(AnswerAll(MakeReply("200 OK", "pong")));
+        const int port = testServer.GetPort();
+        if (write(channel[1], &port, sizeof port) != sizeof port) {
+            std::abort();
+        }
+        for (;;) {
+            pause();
+        }
+    }
+    int port = 0;
+    if (read(channel[0], &port, sizeof port) != sizeof port) {
+        std::abort();
+    }
+    return port;
+}
+
+std::string PostTo(int port)
+{
+    Ref<ConnectionSpec> spec;
+    CreateTCPConnectionSpec("127.0.0.1", port, false, spec);
+    HttpClient client(spec);
+    try {
+        return client.Post().body;
+    } catch (const HttpException& error) {
+        return error.what();
+    }
+}
+
+[[noreturn]] void ForkBeforeTheFirstExchange()
+{
+    pid_t server = 0;
+    const int port = ServeInChild(server);
+    const bool childIsGood = RunInChild([&] { return PostTo(port) == "pong"; }) == 0;
+    const bool parentIsGood = PostTo(port) == "pong";
+    kill(server, SIGKILL);
+    std::exit(childIsGood && parentIsGood ? 0 : 1);
+}
+
+TEST_F(ProcessTest, MayForkBeforeItsFirstExchange)
+{
+    EXPECT_EXIT(ForkBeforeTheFirstExchange(), testing::ExitedWithCode(0), "^$");
+}
+
+[[noreturn]] void ForkAfterTheFirstExchange()
+{
+    pid_t server = 0;
+    const int port = ServeInChild(server);
+    const bool parentIsGood = PostTo(port) == "pong";
+    const bool childIsGood = RunInChild([&] {
+                                 leakCheckIsOff = true;
+                                 return PostTo(port)
+                                        == "The process has forked after its first HTTP exchange; "
+                                           "the child cannot send. "
+                                           "Fork first.";
+                             })
+                             == 0;
+    const bool parentIsStillGood = PostTo(port) == "pong";
+    kill(server, SIGKILL);
+    std::exit(childIsGood && parentIsGood && parentIsStillGood ? 0 : 1);
+}
+
+TEST_F(ProcessTest, TellsAChildThatForkedTooLate)
+{
+    EXPECT_EXIT(ForkAfterTheFirstExchange(), testing::ExitedWithCode(0), "^$");
+}
+
+bool signalCame = false;
+
+TEST_F(ProcessTest, SurvivesBrokenConnectionsWithoutASignal)
+{
+    EXPECT_EXIT(
+        {
+            std::signal(SIGPIPE, [](int) { signalCame = true; });
+            // The request is larger than what the connection buffers, and nobody reads it.
+            const TestServer server([](ServerConnection&) {});
+            for (int count = 0; count < 20; ++count) {
+                HttpClient(server).PostAndFail(
+                    HttpClient::MakeRequest(std::string(8 * 1024 * 1024, 'x')));
+            }
+            std::exit(signalCame ? 1 : 0);
+        },
+        testing::ExitedWithCode(0),
+        "^$");
+}
+
+[[noreturn]] void PostWithKeyLog(const std::string& path)
+{
+    setenv("SSLKEYLOGFILE", path.c_str(), 1);
+    const Identity identity = MakeIdentity({"test", "IP:127.0.0.1"});
+    TlsServer tls(identity);
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")), tls.GetStreams());
+    Quillon::Ssl::SSLContextOptions options;
+    options.useSystemAuthorities = false;
+    const std::vector<unsigned char> der = identity.GetDer();
+    options.authorities.push_back(Quillon::Crypto::CreateCertificate(der.data(), der.size()));
+    const Ref<Quillon::Ssl::SSLContext> context = Quillon::Ssl::CreateSSLContext(options);
+    Ref<ConnectionSpec> spec;
+    CreateSSLConnectionSpec(MakeTcpSpec(server).get(), context.get(), "127.0.0.1", "", spec);
+    std::exit(HttpClient(spec).Post().body == "pong" ? 0 : 1);
+}
+
+TEST_F(ProcessTest, WritesNoTlsKeysForTheEnvironment)
+{
+    const std::string path = testing::TempDir() + "keylog-" + std::to_string(getpid());
+    EXPECT_EXIT(PostWithKeyLog(path), testing::ExitedWithCode(0), "^$");
+    std::ifstream file(path);
+    std::string line;
+    EXPECT_FALSE(std::getline(file, line)) << line;
+    std::remove(path.c_str());
+}
+
+TEST_F(ProcessTest, TakesNoAuthoritiesFromTheEnvironment)
+{
+    setenv("SSL_CERT_FILE", "/nonexistent", 1);
+    setenv("SSL_CERT_DIR", "/nonexistent", 1);
+    EXPECT_NO_THROW(Quillon::Ssl::CreateSSLContext({}));
+    unsetenv("SSL_CERT_FILE");
+    unsetenv("SSL_CERT_DIR");
+}
+
+} // namespace

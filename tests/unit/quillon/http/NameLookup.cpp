@@ -1,0 +1,61 @@
+#include "NameLookup.h"
+
+#include <condition_variable>
+#include <cstring>
+#include <dlfcn.h>
+#include <mutex>
+#include <netdb.h>
+
+namespace {
+
+std::mutex lookupMutex;
+std::condition_variable lookupChanged;
+bool isBlocked = false;
+int waiting = 0;
+
+} // namespace
+
+namespace Testing::NameLookup {
+
+Block::Block()
+{
+    const std::lock_guard<std::mutex> lock(lookupMutex);
+    isBlocked = true;
+}
+
+Block::~Block()
+{
+    std::unique_lock<std::mutex> lock(lookupMutex);
+    isBlocked = false;
+    lookupChanged.notify_all();
+    lookupChanged.wait(lock, [] { return waiting == 0; });
+}
+
+void Block::WaitUntilAsked()
+{
+    std::unique_lock<std::mutex> lock(lookupMutex);
+    lookupChanged.wait(lock, [] { return waiting > 0; });
+}
+
+} // namespace Testing::NameLookup
+
+// Stands in for the C library's: the tests depend on no name server.
+extern "C" __attribute__((visibility("default"))) int getaddrinfo(
+    const char* node, const char* service, const addrinfo* hints, addrinfo** result)
+{
+    if (node != nullptr && std::strcmp(node, Testing::NameLookup::UnknownHost) == 0) {
+        return EAI_NONAME;
+    }
+    if (node != nullptr && std::strcmp(node, Testing::NameLookup::BlockedHost) == 0) {
+        std::unique_lock<std::mutex> lock(lookupMutex);
+        ++waiting;
+        lookupChanged.notify_all();
+        lookupChanged.wait(lock, [] { return !isBlocked; });
+        --waiting;
+        lookupChanged.notify_all();
+        return EAI_NONAME;
+    }
+    static const auto original =
+        reinterpret_cast<decltype(&getaddrinfo)>(dlsym(RTLD_NEXT, "getaddrinfo"));
+    return original(node, service, hints, result);
+}
