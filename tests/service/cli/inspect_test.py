@@ -2,6 +2,7 @@
 
 import datetime
 import json
+import re
 import unittest
 
 from programs import DATA, DONE, REFUSED, ProgramTest, ssoclient
@@ -12,10 +13,12 @@ ANY_TIME = ("--clock-tolerance", "3153600000")
 
 
 def entries(folder):
-    """The tokens of a folder that do not depend on the time, with what is expected of them."""
+    """The tokens of a folder that depend neither on the time nor on an empty list of trusted
+    certificates, which the command line cannot give; with what is expected of them."""
     expected = json.loads((TOKENS / "expected.json").read_text("utf-8"))
     found = [entry for entry in expected["tokens"]
-             if entry["file"].startswith(folder) and "now" not in entry]
+             if entry["file"].startswith(folder) and "now" not in entry and entry.get("trust") != []
+             and "The token has expired" not in str(entry.get("refusals"))]
     assert len(found) > 50
     return found
 
@@ -72,6 +75,8 @@ class RefusedTokens(ProgramTest):
 
     @staticmethod
     def says(line, refusal):
+        if refusal["class"] == "Quillon::Exception":  # any class of the foundation's
+            return re.match(r"ssoclient: \w+Exception: ", line) is not None
         start = f"ssoclient: {refusal['class'].rpartition('::')[2]}: "
         if "message" in refusal:
             return line == f"{start}{refusal['message']}\n"
@@ -97,8 +102,8 @@ class Inspect(ProgramTest):
         self.assertEqual((DONE, ""), (result.code, result.err))
         self.assertRegex(result.out, r"\ASamlToken \[")
 
-    def test_file_may_stand_after_the_trusted_certificates(self):
-        result = ssoclient("inspect", *self.TRUST, self.TOKEN, *ANY_TIME)
+    def test_file_may_stand_last(self):
+        result = ssoclient("inspect", *ANY_TIME, *self.TRUST, self.TOKEN)
         self.assertEqual((DONE, ""), (result.code, result.err))
 
     def test_tells_a_foreign_signature(self):
