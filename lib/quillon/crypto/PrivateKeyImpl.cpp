@@ -3,6 +3,7 @@
 #include "crypto/Handles.h"
 #include "crypto/Keys.h"
 
+#include <algorithm>
 #include <cstring>
 #include <exception>
 
