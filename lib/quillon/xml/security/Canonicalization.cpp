@@ -65,6 +65,28 @@ bool IsSamePrefix(std::string_view a, std::string_view b) noexcept
     return true;
 }
 
+/** Whether the element is empty or holds one text and nothing else. */
+bool IsLeaf(const ElementNode& element) noexcept
+{
+    const Node* child = element.GetFirstChild();
+    return child == nullptr || (AsText(child) != nullptr && child->GetNextSibling() == nullptr);
+}
+
+bool HaveSameTag(const ElementNode& a, const ElementNode& b) noexcept
+{
+    const AttributeRange ofA = a.GetAttributes();
+    const AttributeRange ofB = b.GetAttributes();
+    return a.GetName() == b.GetName()
+           && std::equal(
+               ofA.begin(),
+               ofA.end(),
+               ofB.begin(),
+               ofB.end(),
+               [](const Attribute& x, const Attribute& y) {
+                   return x.name == y.name && x.value == y.value;
+               });
+}
+
 /** What a prefix is bound to at some point of a walk; an empty URI is none. */
 struct PrefixState
 {
@@ -153,15 +175,13 @@ public:
     void Enter(const ElementNode& element)
     {
         _marks.push_back(_prefixes.GetMark());
-        DeclareNamespaces(element);
-        _out.Append('<');
-        _out.Append(element.GetName());
-        _namespaces.clear();
-        CollectNamespaces(element);
-        CollectAttributes(element);
-        WriteNamespaces();
-        WriteAttributes();
-        _out.Append('>');
+        if (RepeatsLastLeaf(element)) {
+            _out.Append(_leafTag);
+            return;
+        }
+        const std::size_t start = _out.GetPosition();
+        WriteStartTag(element);
+        _lastLeaf = IsLeaf(element) && _out.ReadBack(start, _leafTag) ? &element : nullptr;
     }
 
     void Leave(const ElementNode& element)
@@ -181,6 +201,30 @@ public:
     }
 
 private:
+    /**
+     * Whether the start tag is that of the last leaf, a sibling: as for the thousand values of one
+     * attribute. The prefixes are in the state in which that leaf was entered, because a leaf
+     * holds no element that could use what it renders.
+     */
+    bool RepeatsLastLeaf(const ElementNode& element) const noexcept
+    {
+        return _lastLeaf != nullptr && element.GetParent() == _lastLeaf->GetParent()
+               && IsLeaf(element) && HaveSameTag(element, *_lastLeaf);
+    }
+
+    void WriteStartTag(const ElementNode& element)
+    {
+        DeclareNamespaces(element);
+        _out.Append('<');
+        _out.Append(element.GetName());
+        _namespaces.clear();
+        CollectNamespaces(element);
+        CollectAttributes(element);
+        WriteNamespaces();
+        WriteAttributes();
+        _out.Append('>');
+    }
+
     /** Brings the declarations of the apex's ancestors into scope, outermost first. */
     void EnterAncestors(const ElementNode* nearest)
     {
@@ -388,6 +432,8 @@ private:
     OutputBuffer& _out;
     PrefixTable _prefixes;
     std::vector<std::size_t> _marks;
+    const ElementNode* _lastLeaf = nullptr;
+    std::string _leafTag;
     // Of the element being written; kept to be used again.
     std::vector<std::string_view> _declared;
     std::vector<SortedAttribute> _attributes;
