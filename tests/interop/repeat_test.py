@@ -3,8 +3,8 @@
 import re
 import unittest
 
-import requests
-from requests import SIGNED, UNSIGNED
+import messages
+from messages import SIGNED, UNSIGNED
 
 UUID = "[0-9a-f]{8}-[0-9a-f]{4}-4[0-9a-f]{3}-[89ab][0-9a-f]{3}-[0-9a-f]{12}"
 VALUE = r"[^<>]+(?=</ds:{}>)"
@@ -33,13 +33,13 @@ def without(found, text):
 
 class Repeat(unittest.TestCase):
     def test_at_the_same_time_nothing_differs_in_unsigned_requests(self):
-        first, second = requests.write(), requests.write()
+        first, second = messages.write(), messages.write()
         for name in UNSIGNED:
             with self.subTest(request=name):
                 self.assertEqual(first[name], second[name])
 
     def test_at_the_same_time_ids_digests_and_signature_value_differ(self):
-        first, second = requests.write(), requests.write()
+        first, second = messages.write(), messages.write()
         for name in SIGNED:
             with self.subTest(request=name):
                 one, other = values(first[name]), values(second[name])
@@ -47,7 +47,7 @@ class Repeat(unittest.TestCase):
                 self.assertEqual(without(one, first[name]), without(other, second[name]))
 
     def test_at_another_time_created_and_expires_differ_too(self):
-        first, second = requests.write(), requests.write("2026-06-15T12:34:56.789Z")
+        first, second = messages.write(), messages.write("2026-06-15T12:34:56.789Z")
         for name in SIGNED + UNSIGNED:
             with self.subTest(request=name):
                 one, other = first[name], second[name]

@@ -11,9 +11,9 @@ import unittest
 
 from lxml import etree
 
-import requests
+import messages
 import schemas
-from requests import substitute
+from messages import substitute
 
 # The ids that signing gives are plain UUIDs, of which those that begin with a digit are no names.
 # Receivers only ever compare them, so this is the one complaint that does not count.
@@ -28,7 +28,7 @@ class Schemas(unittest.TestCase):
     @classmethod
     def setUpClass(cls):
         cls.schema = schemas.load(pathlib.Path(os.environ["SCHEMA_DIR"]))
-        cls.requests = requests.write()
+        cls.requests = messages.write()
 
     def errors(self, text):
         self.schema.validate(etree.fromstring(text.encode()))

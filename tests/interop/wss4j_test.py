@@ -7,8 +7,8 @@ import subprocess
 import tempfile
 import unittest
 
-import requests
-from requests import SIGNED_BY_CERTIFICATE, UNSIGNED
+import messages
+from messages import SIGNED_BY_CERTIFICATE, UNSIGNED
 
 SOURCE = pathlib.Path(__file__).with_name("WssCheck.java")
 JARS = [pathlib.Path("/usr/share/java", name + ".jar")
@@ -40,7 +40,7 @@ class Wss(unittest.TestCase):
             ["javac", "-Xlint:all,-path", "-Werror", "-cp", cls.class_path, "-d", cls.classes,
              SOURCE], check=True)
         # WSS4J reads the clock of the machine, and gives a message some minutes.
-        cls.requests = requests.write(requests.minutes_from_now(0))
+        cls.requests = messages.write(messages.minutes_from_now(0))
 
     def verdicts(self, texts):
         """What WSS4J says of each text, if only the key `client` is trusted."""
@@ -50,7 +50,7 @@ class Wss(unittest.TestCase):
                 files.append(pathlib.Path(folder, name))
                 files[-1].write_text(text, "utf-8")
             said = subprocess.run(
-                ["java", "-cp", self.class_path, "WssCheck", requests.KEYS / "client-cert.pem",
+                ["java", "-cp", self.class_path, "WssCheck", messages.KEYS / "client-cert.pem",
                  *files], capture_output=True, text=True, check=True).stdout
         return dict(line.split(" ", 1) for line in said.splitlines())
 
@@ -71,35 +71,35 @@ class Wss(unittest.TestCase):
         self.assert_refused(UNSIGNED, "no signature", lambda text: text)
 
     def test_refuses_changed_body(self):
-        self.assert_refused(SIGNED, BAD_SIGNATURE, requests.change_body)
+        self.assert_refused(SIGNED, BAD_SIGNATURE, messages.change_body)
 
     def test_refuses_changed_timestamp(self):
-        self.assert_refused(SIGNED, BAD_SIGNATURE, requests.change_timestamp)
+        self.assert_refused(SIGNED, BAD_SIGNATURE, messages.change_timestamp)
 
     def test_finds_that_the_body_is_not_the_signed_one(self):
         self.assert_refused(
-            SIGNED, "signed is something other than body and timestamp", requests.move_body)
+            SIGNED, "signed is something other than body and timestamp", messages.move_body)
 
     def test_refuses_key_nobody_trusts(self):
-        foreign = requests.write(requests.minutes_from_now(0), "foreign")
+        foreign = messages.write(messages.minutes_from_now(0), "foreign")
         self.assert_refused(SIGNED_BY_CERTIFICATE, UNTRUSTED, lambda text: text, foreign)
 
     def test_refuses_key_other_than_that_of_the_certificate(self):
-        foreign = requests.write(requests.minutes_from_now(0), "foreign")
+        foreign = messages.write(messages.minutes_from_now(0), "foreign")
         pattern = r"[^>]+(?=</wsse:BinarySecurityToken>)"
         trusted = re.search(pattern, self.requests["certificate"])[0]
         self.assert_refused(
             SIGNED_BY_CERTIFICATE, BAD_SIGNATURE,
-            lambda text: requests.substitute(pattern, trusted, text), foreign)
+            lambda text: messages.substitute(pattern, trusted, text), foreign)
 
     def test_refuses_key_other_than_that_of_the_token(self):
-        foreign = requests.write(requests.minutes_from_now(0), "foreign")
+        foreign = messages.write(messages.minutes_from_now(0), "foreign")
         self.assert_refused(SIGNED_BY_HOLDER, BAD_SIGNATURE, lambda text: text, foreign)
 
     def test_refuses_key_identifier_of_another_token(self):
         self.assert_refused(
             SIGNED_BY_HOLDER, BAD_SIGNATURE,
-            lambda text: requests.substitute("</wsse:KeyIdentifier>", "x</wsse:KeyIdentifier>", text))
+            lambda text: messages.substitute("</wsse:KeyIdentifier>", "x</wsse:KeyIdentifier>", text))
 
     def test_finds_no_key_in_bearer_token(self):
         self.assert_refused(
@@ -107,7 +107,7 @@ class Wss(unittest.TestCase):
 
     def test_refuses_request_of_an_hour_ago_and_of_an_hour_ahead(self):
         for minutes in (-60, 60):
-            texts = requests.write(requests.minutes_from_now(minutes))
+            texts = messages.write(messages.minutes_from_now(minutes))
             self.assert_refused(SIGNED, BAD_TIMESTAMP, lambda text: text, texts)
 
 

@@ -4,12 +4,12 @@ import subprocess
 import tempfile
 import unittest
 
-import requests
-from requests import SIGNED
+import messages
+from messages import SIGNED
 
 REQUEST_SIGNATURE = '//*[@Id="holderOfKeyProofSignature"]'
 TOKEN_SIGNATURE = '//*[local-name()="Assertion"]/*[local-name()="Signature"]'
-WITH_TOKEN = requests.SIGNED_BY_TOKEN + ["renew", "validate"]
+WITH_TOKEN = messages.SIGNED_BY_TOKEN + ["renew", "validate"]
 
 
 def verifies(text, key="client", signature=REQUEST_SIGNATURE):
@@ -17,7 +17,7 @@ def verifies(text, key="client", signature=REQUEST_SIGNATURE):
         file.write(text)
         file.flush()
         result = subprocess.run(
-            ["xmlsec1", "--verify", "--pubkey-cert-pem", requests.KEYS / f"{key}-cert.pem",
+            ["xmlsec1", "--verify", "--pubkey-cert-pem", messages.KEYS / f"{key}-cert.pem",
              "--id-attr:Id", "Body", "--id-attr:Id", "Timestamp", "--id-attr:ID", "Assertion",
              "--node-xpath", signature, file.name], capture_output=True, text=True)
     # The word is looked for, so that a failure to read is not taken for a failure to verify.
@@ -30,7 +30,7 @@ def verifies(text, key="client", signature=REQUEST_SIGNATURE):
 class XmlSec(unittest.TestCase):
     @classmethod
     def setUpClass(cls):
-        cls.requests = requests.write()
+        cls.requests = messages.write()
 
     def assert_all(self, expected, verdict):
         for name in SIGNED:
@@ -46,10 +46,10 @@ class XmlSec(unittest.TestCase):
                 self.assertTrue(verifies(self.requests[name], "sts", TOKEN_SIGNATURE))
 
     def test_refuses_changed_body(self):
-        self.assert_all(False, lambda text: verifies(requests.change_body(text)))
+        self.assert_all(False, lambda text: verifies(messages.change_body(text)))
 
     def test_refuses_changed_timestamp(self):
-        self.assert_all(False, lambda text: verifies(requests.change_timestamp(text)))
+        self.assert_all(False, lambda text: verifies(messages.change_timestamp(text)))
 
     def test_refuses_foreign_key(self):
         self.assert_all(False, lambda text: verifies(text, "foreign"))
