@@ -23,7 +23,8 @@ ONE_UNIT = {
 }
 
 # What Quillon takes from the platform beside the standard library.
-PLATFORM_HEADERS = {"cxxabi.h", "dlfcn.h", "execinfo.h", "poll.h", "sys/random.h", "unistd.h"}
+PLATFORM_HEADERS = {"arpa/inet.h", "cxxabi.h", "dlfcn.h", "execinfo.h", "poll.h", "sys/random.h",
+                    "sys/socket.h", "unistd.h"}
 
 
 def is_boost_or_standard(include):

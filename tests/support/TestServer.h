@@ -161,12 +161,13 @@ public:
         {
             const std::lock_guard<std::mutex> lock(_mutex);
             for (const Client& client : _clients) {
-                shutdown(client.descriptor, SHUT_RDWR);
+                if (client.descriptor >= 0) {
+                    shutdown(client.descriptor, SHUT_RDWR);
+                }
             }
         }
         for (Client& client : _clients) {
             client.thread.join();
-            close(client.descriptor);
         }
         close(_listener);
     }
@@ -192,7 +193,7 @@ public:
 private:
     struct Client
     {
-        int descriptor;
+        int descriptor; ///< -1 when it is closed
         std::thread thread;
     };
 
@@ -213,8 +214,13 @@ private:
             }
             ++_connectionCount;
             const std::lock_guard<std::mutex> lock(_mutex);
-            _clients.push_back(
-                {descriptor, std::thread([this, descriptor] { Serve(descriptor); })});
+            Client& client = _clients.emplace_back(Client{descriptor, std::thread()});
+            client.thread = std::thread([this, &client, descriptor] {
+                Serve(descriptor);
+                const std::lock_guard<std::mutex> closeLock(_mutex);
+                close(descriptor);
+                client.descriptor = -1;
+            });
         }
     }
 
@@ -229,7 +235,6 @@ private:
             ServerConnection connection(std::move(stream));
             _handler(connection);
         }
-        shutdown(descriptor, SHUT_RDWR);
     }
 
     const Handler _handler;

@@ -6,11 +6,13 @@
 #include "ssoClient/SecurityTokenService.h"
 
 #include <iostream>
+#include <list>
 
 int main()
 {
+    const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>> nobody;
     try {
-        SsoClient::CreateSamlToken("this is no XML", {});
+        SsoClient::CreateSamlToken("this is no XML", nobody);
     } catch (const Quillon::Xml::XMLParseException& error) {
         std::cout << Quillon::GetClassName(error) << "\n";
     }

@@ -102,8 +102,8 @@ class Inspect(ProgramTest):
         self.assertEqual((DONE, ""), (result.code, result.err))
         self.assertRegex(result.out, r"\ASamlToken \[")
 
-    def test_file_may_stand_after_the_trusted_certificates(self):
-        result = ssoclient("inspect", *self.TRUST, self.TOKEN, *ANY_TIME)
+    def test_file_may_stand_last(self):
+        result = ssoclient("inspect", *ANY_TIME, *self.TRUST, self.TOKEN)
         self.assertEqual((DONE, ""), (result.code, result.err))
 
     def test_tells_a_foreign_signature(self):

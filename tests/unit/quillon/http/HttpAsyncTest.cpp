@@ -120,6 +120,31 @@ TEST(SendRequestAsync, LogsWhatTheCompletionThrows)
     EXPECT_EQ("pong", client.Post().body);
 }
 
+TEST(SendRequestAsync, RunsCompletionsWhereNoSignalGoes)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
+    HttpClient client(server);
+    std::promise<bool> blocked;
+    const Ref<PendingRequestItem> pending = client.Start(
+        HttpClient::MakeRequest(), [&](const Exception*, ClientResponse*, PendingRequestItem*) {
+            blocked.set_value(NameLookup::AreSignalsBlocked());
+        });
+    EXPECT_TRUE(blocked.get_future().get());
+    EXPECT_FALSE(NameLookup::AreSignalsBlocked());
+}
+
+TEST(SendRequestAsync, RunsTheExchangeWhereNoSignalGoes)
+{
+    // A write to a broken TLS connection raises SIGPIPE, and the thread that looks the name up
+    // has the signal mask of the I/O thread that started it.
+    NameLookup::Block block;
+    Ref<ConnectionSpec> spec;
+    CreateTCPConnectionSpec(NameLookup::BlockedHost, 80, false, spec);
+    HttpClient stuck(spec);
+    const Ref<PendingRequestItem> pending = stuck.Start(HttpClient::MakeRequest());
+    EXPECT_TRUE(block.WaitUntilAsked().withoutSignals);
+}
+
 TEST(SendRequestAsync, LetsACompletionSendAndWait)
 {
     const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));

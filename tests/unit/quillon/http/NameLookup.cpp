@@ -1,6 +1,7 @@
 #include "NameLookup.h"
 
 #include <condition_variable>
+#include <csignal>
 #include <cstring>
 #include <dlfcn.h>
 #include <mutex>
@@ -12,6 +13,7 @@ std::mutex lookupMutex;
 std::condition_variable lookupChanged;
 bool isBlocked = false;
 int waiting = 0;
+Testing::NameLookup::Lookup latest;
 
 } // namespace
 
@@ -31,10 +33,19 @@ Block::~Block()
     lookupChanged.wait(lock, [] { return waiting == 0; });
 }
 
-void Block::WaitUntilAsked()
+Lookup Block::WaitUntilAsked()
 {
     std::unique_lock<std::mutex> lock(lookupMutex);
     lookupChanged.wait(lock, [] { return waiting > 0; });
+    return latest;
+}
+
+bool AreSignalsBlocked()
+{
+    sigset_t mask;
+    pthread_sigmask(SIG_SETMASK, nullptr, &mask);
+    return sigismember(&mask, SIGPIPE) == 1 && sigismember(&mask, SIGINT) == 1
+           && sigismember(&mask, SIGTERM) == 1 && sigismember(&mask, SIGCHLD) == 1;
 }
 
 } // namespace Testing::NameLookup
@@ -49,6 +60,7 @@ extern "C" __attribute__((visibility("default"))) int getaddrinfo(
     if (node != nullptr && std::strcmp(node, Testing::NameLookup::BlockedHost) == 0) {
         std::unique_lock<std::mutex> lock(lookupMutex);
         ++waiting;
+        latest.withoutSignals = Testing::NameLookup::AreSignalsBlocked();
         lookupChanged.notify_all();
         lookupChanged.wait(lock, [] { return !isBlocked; });
         --waiting;

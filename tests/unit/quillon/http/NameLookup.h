@@ -8,6 +8,15 @@ inline constexpr char BlockedHost[] = "blocked.invalid";
 /** A host that is not known. */
 inline constexpr char UnknownHost[] = "unknown.invalid";
 
+/** Whether the calling thread takes none of the signals that concern a library. */
+bool AreSignalsBlocked();
+
+/** What is known of a look-up that hangs. */
+struct Lookup
+{
+    bool withoutSignals = false; ///< of the thread that looks up
+};
+
 class Block
 {
 public:
@@ -17,7 +26,7 @@ public:
     Block& operator=(const Block&) = delete;
 
     /** Returns when someone looks the host up. */
-    void WaitUntilAsked();
+    Lookup WaitUntilAsked();
 };
 
 } // namespace Testing::NameLookup

@@ -163,7 +163,8 @@ TEST_F(ReadAssertion, RequiresAReferenceToTheWholeToken)
 {
     const std::string text = WithDummySignature(Bearer());
     EXPECT_EQ(ReachesSignature, Judge(Replace(text, "URI=\"#_token\"", "URI=\"\"")));
-    for (const char* uri : {"#_other", "_token", "#", "#_token2", "##_token", "#_TOKEN"}) {
+    for (const char* uri :
+         {"#_other", "_token", "x_token", "#", "#_token2", "##_token", "#_TOKEN"}) {
         EXPECT_EQ(
             "ParseException: Token's signature must cover the entire token",
             Judge(Replace(text, "URI=\"#_token\"", std::string("URI=\"") + uri + "\"")))
@@ -304,6 +305,16 @@ TEST_F(ReadHolderOfKey, RequiresTheTypeAndNothingElse)
     EXPECT_EQ(
         "ParseException: Unexpected attribute 'type' on element 'SubjectConfirmationData'",
         JudgeReplaced(" xsi:type=", " type="));
+}
+
+TEST_F(ReadHolderOfKey, RefusesTwoAttributesOfOneName)
+{
+    const std::string text = Replace(
+        Token(),
+        "xsi:type=\"saml:",
+        "xmlns:x=\"http://www.w3.org/2001/XMLSchema-instance\" x:type=\"saml:Other\" "
+        "xsi:type=\"saml:");
+    EXPECT_EQ("XMLParseException", JudgeUnsigned(text).substr(0, 17));
 }
 
 TEST_F(ReadHolderOfKey, ReadsTheKeyInfoStrictly)
