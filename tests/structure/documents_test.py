@@ -43,6 +43,7 @@ class Documents(unittest.TestCase):
         self.assertEqual([], [text for text in texts
                               if any(piece.strip() not in code for piece in text.split("…"))])
 
+    @unittest.skipUnless("SSOCLIENT" in os.environ, "the command line is not built")
     def test_every_option_of_the_command_line_is_described(self):
         text = read("docs/usage.md")
         for command in (["acquire", "password"], ["inspect"]):

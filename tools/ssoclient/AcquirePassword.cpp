@@ -1,5 +1,6 @@
 #include "Commands.h"
-#include "Password.h"
+#include "IdentityOptions.h"
+#include "Secret.h"
 #include "ServiceOptions.h"
 #include "TokenOutput.h"
 #include "TokenSpecOptions.h"
@@ -11,6 +12,7 @@ namespace {
 struct AcquirePasswordOptions
 {
     ServiceOptions service;
+    IdentityOptions identity;
     TokenSpecOptions token;
     OutputOptions output;
     std::string user;
@@ -19,10 +21,11 @@ struct AcquirePasswordOptions
 
 ExitCode AcquirePassword(const AcquirePasswordOptions& options)
 {
-    const auto service = options.service.CreateService();
+    const auto service = options.service.CreateService(
+        ReadCertificates(options.service.trustFiles), options.identity.Read());
     TokenOutput output(options.output);
     SecretText password;
-    GetPassword(options.passwordFile, password);
+    GetSecret(Password, options.passwordFile, password);
     output.Show(service->AcquireToken(options.user, password.Get(), options.token.spec));
     return ExitCode::DONE;
 }
@@ -42,7 +45,9 @@ void AddAcquirePasswordCommand(CLI::App& parent, Action& action)
             options->passwordFile,
             "File whose first line is the password, - for standard input (default: ask for it)")
         ->type_name("FILE");
+    options->identity.AddTo(*command);
     options->token.AddTo(*command);
+    options->token.AddBearerTo(*command);
     options->output.AddOutTo(*command);
     options->output.AddJsonTo(*command);
     command->callback(

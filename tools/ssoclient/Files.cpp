@@ -20,21 +20,27 @@ namespace {
 // bounds what an endless input can take up.
 constexpr std::size_t MaxFileBytes = std::size_t{64} * 1024 * 1024;
 
+// Larger than a key file, which therefore is read in one piece and leaves no copies behind.
+constexpr std::size_t FirstReadBytes = std::size_t{16} * 1024;
+
 std::string ReadAll(int descriptor, const std::string& name)
 {
-    std::string text;
-    char buffer[16 * 1024];
-    for (;;) {
-        const ssize_t count =
-            RetryInterrupted([&] { return ::read(descriptor, buffer, sizeof buffer); });
+    std::string text(FirstReadBytes, '\0');
+    for (std::size_t used = 0;;) {
+        if (used == text.size()) {
+            text.resize(2 * used);
+        }
+        const ssize_t count = RetryInterrupted(
+            [&] { return ::read(descriptor, text.data() + used, text.size() - used); });
         if (count < 0) {
             ThrowSystemError("cannot read " + name);
         }
         if (count == 0) {
+            text.resize(used);
             return text;
         }
-        text.append(buffer, static_cast<std::size_t>(count));
-        if (text.size() > MaxFileBytes) {
+        used += static_cast<std::size_t>(count);
+        if (used > MaxFileBytes) {
             throw UsageError(
                 MessageFormatter::ASPrint("%1 is larger than %2 bytes", name, MaxFileBytes));
         }

@@ -58,7 +58,9 @@ void ServiceOptions::AddTo(CLI::App& command)
     command.add_flag("--verbose", verbose, "Write the library's trace lines to standard error");
 }
 
-boost::shared_ptr<SsoClient::SecurityTokenService> ServiceOptions::CreateService() const
+boost::shared_ptr<SsoClient::SecurityTokenService> ServiceOptions::CreateService(
+    const CertificateList& trusted,
+    const boost::optional<SsoClient::HolderOfKeyConfig>& identity) const
 {
     if (verbose) {
         EnableTraceLines();
@@ -68,8 +70,9 @@ boost::shared_ptr<SsoClient::SecurityTokenService> ServiceOptions::CreateService
 
     SsoClient::SecurityTokenServiceConfig config;
     config.url = url;
-    config.trustedCertificates = ReadCertificates(trustFiles);
+    config.trustedCertificates = trusted;
     config.sslPeerParameter = peer;
+    config.holderOfKeyConfig = identity;
     config.sslContext = context.get();
     return SsoClient::CreateSecurityTokenService(config);
 }

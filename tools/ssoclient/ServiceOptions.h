@@ -21,6 +21,13 @@ struct ServiceOptions
 
     void AddTo(CLI::App& command);
 
-    /** Creates the service, and turns its trace lines on if that is asked for. */
-    boost::shared_ptr<SsoClient::SecurityTokenService> CreateService() const;
+    /**
+     * Creates the service, and turns its trace lines on if that is asked for.
+     *
+     * @param trusted   what `trustFiles` hold.
+     * @param identity  of the caller, if there is one.
+     */
+    boost::shared_ptr<SsoClient::SecurityTokenService> CreateService(
+        const CertificateList& trusted,
+        const boost::optional<SsoClient::HolderOfKeyConfig>& identity = boost::none) const;
 };

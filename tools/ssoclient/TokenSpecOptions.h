@@ -10,4 +10,7 @@ struct TokenSpecOptions
     SsoClient::TokenSpec spec;
 
     void AddTo(CLI::App& command);
+
+    /** Adds `--bearer`, for the commands that may ask for either kind of confirmation. */
+    void AddBearerTo(CLI::App& command);
 };

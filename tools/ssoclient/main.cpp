@@ -9,16 +9,22 @@ namespace {
 void AddCommands(CLI::App& app, Action& action)
 {
     app.set_version_flag("--version", std::string("ssoclient ") + SSOCLIENT_VERSION);
-    app.require_subcommand(1);
+    // None is an error too, which `Run` tells: the parser would tell it of an unknown one as well,
+    // without naming the word.
+    app.require_subcommand(0, 1);
     CLI::App* acquire = app.add_subcommand("acquire", "Acquire a token from a token service");
-    acquire->require_subcommand(1);
+    acquire->require_subcommand(0, 1);
     AddAcquirePasswordCommand(*acquire, action);
+    AddAcquireCertificateCommand(*acquire, action);
+    AddAcquireTokenCommand(*acquire, action);
+    AddRenewCommand(app, action);
+    AddValidateCommand(app, action);
     AddInspectCommand(app, action);
 }
 
 ExitCode Run(int argc, char** argv)
 {
-    CLI::App app("Obtains and verifies SAML 2.0 tokens.", "ssoclient");
+    CLI::App app("Obtains, renews, validates and verifies SAML 2.0 tokens.", "ssoclient");
     Action action;
     AddCommands(app, action);
     try {
@@ -28,6 +34,9 @@ ExitCode Run(int argc, char** argv)
         return ExitCode::DONE;
     } catch (const CLI::ParseError& error) {
         throw UsageError(error.what());
+    }
+    if (!action) {
+        throw UsageError("A subcommand is required");
     }
     return action();
 }

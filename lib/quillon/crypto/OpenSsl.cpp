@@ -2,6 +2,8 @@
 
 #include "crypto/Handles.h"
 
+#include <system_error>
+
 namespace Quillon::Crypto {
 
 std::string GetOpenSslError()
@@ -9,6 +11,10 @@ std::string GetOpenSslError()
     const unsigned long code = ERR_peek_last_error();
     if (code == 0) {
         return "unknown error";
+    }
+    // OpenSSL has no texts for what the system refuses.
+    if (ERR_SYSTEM_ERROR(code)) {
+        return std::system_category().message(ERR_GET_REASON(code));
     }
     const char* reason = ERR_reason_error_string(code);
     return reason != nullptr ? reason : "error " + std::to_string(code);

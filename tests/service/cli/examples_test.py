@@ -3,8 +3,7 @@
 import os
 import unittest
 
-from acquire_password_test import DESCRIPTION, ServiceTest
-from programs import DONE, DevelopmentSts, run
+from programs import DESCRIPTION, DONE, DevelopmentSts, ServiceTest, run
 
 
 class Examples(ServiceTest):

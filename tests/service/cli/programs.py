@@ -1,6 +1,7 @@
 """Runs the programs under test."""
 
 import collections
+import json
 import os
 import pathlib
 import subprocess
@@ -11,6 +12,12 @@ SSOCLIENT = os.environ["SSOCLIENT"]
 DATA = pathlib.Path(os.environ["TEST_DATA_DIR"])
 
 DONE, REFUSED, USAGE, BAD_CREDENTIALS, COMMUNICATION = range(5)
+
+# Of a token that Alice acquires with her password.
+DESCRIPTION = (
+    r"\ASamlToken \[subject=\{Name: alice; Domain:example\.test\}, groups=\[.+\], "
+    r"delegationChain=\[\], startTime=\S+Z, expirationTime=\S+Z, renewable=false, "
+    r"delegable=false, isSolution=false,confirmationType=0\]\n\Z")
 
 Result = collections.namedtuple("Result", "code out err")
 
@@ -67,6 +74,8 @@ class DevelopmentSts:
         self.url = self._read_url()
         self.ca = self.state / "ca.pem"
         self.trust = self.state / "sts.pem"
+        self.key = self.state / "client.key"
+        self.certificate = self.state / "client.pem"
 
     def _read_url(self):
         for line in self._process.stdout:
@@ -78,8 +87,76 @@ class DevelopmentSts:
     def service_options(self):
         return ["--url", self.url, "--ca", self.ca, "--trust", self.trust]
 
+    @property
+    def identity(self):
+        """The options of the service user that the state directory has a key for."""
+        return ["--key", self.key, "--cert", self.certificate]
+
     def stop(self):
         self._process.terminate()
         self._process.wait(timeout=60)
         self._process.stdout.close()
         self._folder.cleanup()
+
+
+class ServiceTest(ProgramTest):
+    """A test with a development STS, which all tests of its class share."""
+
+    SWITCHES = ()
+
+    @classmethod
+    def setUpClass(cls):
+        cls.sts = DevelopmentSts(*cls.SWITCHES)
+        cls.addClassCleanup(cls.sts.stop)
+
+    def setUp(self):
+        super().setUp()
+        self.password = self.write("password", DevelopmentSts.PASSWORD + "\n")
+
+    @property
+    def nowhere(self):
+        """Service options for failures before anything is sent: the port is closed, and had
+        anything been sent, that would be the error."""
+        return ["--url", "https://127.0.0.1:1/sts", "--ca", self.sts.ca, "--trust", self.sts.trust]
+
+    def acquire(self, *options, service=None, user=DevelopmentSts.USER, password=None, stdin=""):
+        return ssoclient(
+            "acquire", "password", *(service or self.sts.service_options), "--user", user,
+            "--password-file", password or self.password, *options, stdin=stdin)
+
+    def acquire_by_certificate(self, *options, service=None, identity=None, stdin=""):
+        return ssoclient("acquire", "certificate", *(service or self.sts.service_options),
+                         *(identity or self.sts.identity), *options, stdin=stdin)
+
+    def exchange(self, token, *options, service=None, identity=None, stdin=""):
+        return ssoclient("acquire", "token", *(service or self.sts.service_options), "--token",
+                         token, *(identity or self.sts.identity), *options, stdin=stdin)
+
+    def token_file(self, acquire, *options):
+        """The file of a token that `acquire` obtains."""
+        path = self.folder / f"token-{len(list(self.folder.iterdir()))}.xml"
+        result = acquire(*options, "--out", path)
+        self.assertEqual((DONE, ""), (result.code, result.err))
+        return path
+
+    def changed(self, token):
+        """The file of the same token with another group."""
+        text = token.read_text("utf-8")
+        self.assertEqual(1, text.count("\\SolutionUsers"))
+        return self.write("changed.xml", text.replace("\\SolutionUsers", "\\Administrators"))
+
+    def encrypted_key(self, passphrase):
+        path = self.folder / "encrypted.key"
+        result = run("openssl", "pkcs8", "-topk8", "-in", self.sts.key, "-out", path,
+                     "-passout", f"pass:{passphrase}")
+        self.assertEqual(DONE, result.code, result.err)
+        return path
+
+    def facts(self, result):
+        """What a command printed as JSON."""
+        self.assertEqual((DONE, ""), (result.code, result.err))
+        return json.loads(result.out)
+
+    def assert_done(self, result):
+        self.assertEqual((DONE, ""), (result.code, result.err))
+        self.assertRegex(result.out, DESCRIPTION)

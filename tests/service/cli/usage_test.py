@@ -8,21 +8,32 @@ STS_CERTIFICATE = DATA / "keys" / "sts-cert.pem"
 
 
 class Help(unittest.TestCase):
+    SERVICE = ("--url", "--trust", "--ca", "--peer", "--verbose")
+    IDENTITY = ("--key", "--cert", "--key-passphrase-file")
+    SPEC = ("--lifetime", "--renewable", "--delegable", "--delegate-to", "--audience", "--advice")
+    OUTPUT = ("--out", "--json")
+
     def assert_prints(self, result, *texts):
         self.assertEqual((0, ""), (result.code, result.err))
         for text in texts:
             self.assertIn(text, result.out)
 
     def test_of_the_program_names_the_commands(self):
-        self.assert_prints(ssoclient("--help"), "acquire", "inspect")
+        self.assert_prints(ssoclient("--help"), "acquire", "renew", "validate", "inspect")
+        self.assert_prints(ssoclient("acquire", "--help"), "password", "certificate", "token")
 
     def test_of_a_command_names_its_options(self):
-        self.assert_prints(ssoclient("acquire", "password", "--help"), "--url", "--user",
-                           "--password-file", "--trust", "--ca", "--peer", "--lifetime",
-                           "--renewable", "--delegable", "--delegate-to", "--audience", "--out",
-                           "--json", "--verbose")
-        self.assert_prints(ssoclient("inspect", "--help"), "FILE", "--trust", "--clock-tolerance",
-                           "--json")
+        for command, options in (
+                ("acquire password", ("--user", "--password-file", "--bearer", *self.IDENTITY,
+                                      *self.SERVICE, *self.SPEC, *self.OUTPUT)),
+                ("acquire certificate", (*self.IDENTITY, *self.SERVICE, *self.SPEC, *self.OUTPUT)),
+                ("acquire token", ("--token", "--bearer", *self.IDENTITY, *self.SERVICE,
+                                   *self.SPEC, *self.OUTPUT)),
+                ("renew", ("--token", "--lifetime", *self.IDENTITY, *self.SERVICE, *self.OUTPUT)),
+                ("validate", ("--token", *self.SERVICE)),
+                ("inspect", ("FILE", "--trust", "--clock-tolerance", "--json"))):
+            with self.subTest(command=command):
+                self.assert_prints(ssoclient(*command.split(), "--help"), *options)
 
     def test_version(self):
         result = ssoclient("--version")
@@ -38,7 +49,10 @@ class UsageErrors(ProgramTest):
         self.assert_usage_error("A subcommand is required")
 
     def test_unknown_command(self):
-        self.assert_usage_error("A subcommand is required", "wish")
+        for command in ((), ("acquire",)):
+            with self.subTest(command=command):
+                self.assert_usage_error("The following argument was not expected: wish",
+                                        *command, "wish")
 
     def test_acquire_without_a_way(self):
         self.assert_usage_error("A subcommand is required", "acquire")
@@ -47,12 +61,19 @@ class UsageErrors(ProgramTest):
         self.assert_usage_error(".*--wish.*", "inspect", "x", "--trust", "y", "--wish")
 
     def test_missing_options(self):
-        options = {"--url": "https://127.0.0.1:1/sts", "--user": "u", "--trust": STS_CERTIFICATE}
-        for missing in options:
-            with self.subTest(missing=missing):
-                rest = [part for name, value in options.items() if name != missing
-                        for part in (name, value)]
-                self.assert_usage_error(f"{missing} is required", "acquire", "password", *rest)
+        service = {"--url": "https://127.0.0.1:1/sts", "--trust": STS_CERTIFICATE}
+        identity = {"--key": "k", "--cert": "c"}
+        for command, options in (
+                ("acquire password", {**service, "--user": "u"}),
+                ("acquire certificate", {**service, **identity}),
+                ("acquire token", {**service, **identity, "--token": "t"}),
+                ("renew", {**service, **identity, "--token": "t", "--lifetime": "1"}),
+                ("validate", {**service, "--token": "t"})):
+            for missing in options:
+                with self.subTest(command=command, missing=missing):
+                    rest = [part for name, value in options.items() if name != missing
+                            for part in (name, value)]
+                    self.assert_usage_error(f"{missing} is required", *command.split(), *rest)
         self.assert_usage_error("--trust is required", "inspect", "x")
         self.assert_usage_error("FILE is required", "inspect", "--trust", STS_CERTIFICATE)
 

@@ -23,7 +23,7 @@ public:
  */
 struct ParserLimits
 {
-    static constexpr std::size_t MaxDocumentBytes = 8 * 1024 * 1024;
+    static constexpr std::size_t MaxDocumentBytes = std::size_t{8} * 1024 * 1024;
     static constexpr unsigned MaxDepth = 128;
     static constexpr unsigned MaxAttributes = 256; ///< on one element, declarations included
     static constexpr unsigned MaxNamespaces = 64;  ///< declared on one element

@@ -1,16 +1,13 @@
-"""The password prompt of `ssoclient acquire password`, at a terminal of the test's own."""
+"""What `ssoclient` asks for, at a terminal of the test's own."""
 
-import fcntl
 import os
-import pty
 import signal
 import subprocess
 import sys
-import termios
 import unittest
 
-from acquire_password_test import DESCRIPTION, ServiceTest
-from programs import DONE, SSOCLIENT, USAGE, DevelopmentSts
+from programs import DESCRIPTION, DONE, USAGE, DevelopmentSts
+from terminals import TerminalTest
 
 PROMPT = b"Password: "
 
@@ -35,47 +32,13 @@ sys.exit(os.waitstatus_to_exitcode(status))
 """
 
 
-class PasswordPrompt(ServiceTest):
-    def setUp(self):
-        super().setUp()
-        self.terminal, self.far_end = pty.openpty()
-        self.addCleanup(os.close, self.terminal)
-        self.addCleanup(os.close, self.far_end)
-
-    def start(self, *launcher, stdin=subprocess.DEVNULL):
-        """Starts the program with the terminal as its controlling one, not as its output."""
-        def take_terminal():
-            os.setsid()
-            fcntl.ioctl(self.far_end, termios.TIOCSCTTY, 0)
-
-        process = subprocess.Popen(
-            [*launcher, SSOCLIENT, "acquire", "password", *map(str, self.sts.service_options),
-             "--user", DevelopmentSts.USER],
-            stdin=stdin, stdout=subprocess.PIPE, stderr=subprocess.PIPE, text=True,
-            preexec_fn=take_terminal, pass_fds=[self.far_end])
-        self.addCleanup(self.end, process)
-        return process
-
-    @staticmethod
-    def end(process):
-        if process.poll() is None:
-            process.kill()
-        process.wait()
-        process.stdout.close()
-        process.stderr.close()
-
-    def read_until(self, text):
-        """What the terminal shows, up to and including the text."""
-        shown = b""
-        while not shown.endswith(text):
-            shown += os.read(self.terminal, 1)
-        return shown
-
-    def echoes(self):
-        return bool(termios.tcgetattr(self.far_end)[3] & termios.ECHO)
+class PasswordPrompt(TerminalTest):
+    def acquire_at_terminal(self, **others):
+        return self.start("acquire", "password", *self.sts.service_options,
+                          "--user", DevelopmentSts.USER, **others)
 
     def test_reads_without_echo(self):
-        process = self.start()
+        process = self.acquire_at_terminal()
         self.assertEqual(PROMPT, self.read_until(PROMPT))
         self.assertFalse(self.echoes())
         os.write(self.terminal, DevelopmentSts.PASSWORD.encode() + b"\n")
@@ -88,7 +51,7 @@ class PasswordPrompt(ServiceTest):
     def test_signals_find_the_terminal_echoing(self):
         for number in (signal.SIGINT, signal.SIGTERM, signal.SIGHUP, signal.SIGQUIT):
             with self.subTest(signal=number):
-                process = self.start()
+                process = self.acquire_at_terminal()
                 self.read_until(PROMPT)
                 os.write(self.terminal, b"half a pass")
                 process.send_signal(number)
@@ -96,8 +59,9 @@ class PasswordPrompt(ServiceTest):
                 self.assertTrue(self.echoes())
 
     def test_asks_again_after_a_stop(self):
-        process = self.start(sys.executable, "-c", JOB_CONTROL, str(self.far_end),
-                             stdin=subprocess.PIPE)
+        process = self.acquire_at_terminal(
+            launcher=[sys.executable, "-c", JOB_CONTROL, str(self.far_end)],
+            stdin=subprocess.PIPE)
         self.addCleanup(process.stdin.close)
         self.read_until(PROMPT)
         os.write(self.terminal, b"half a pass\x1a")  # the terminal's stop character
@@ -112,13 +76,60 @@ class PasswordPrompt(ServiceTest):
         self.assertEqual(DONE, process.wait(timeout=120))
 
     def test_end_of_input_is_an_empty_password(self):
-        process = self.start()
+        process = self.acquire_at_terminal()
         self.read_until(PROMPT)
         os.write(self.terminal, b"\x04")
         _, err = process.communicate(timeout=120)
         self.assertEqual((USAGE, "ssoclient: UsageError: the password is empty\n"),
                          (process.returncode, err))
         self.assertTrue(self.echoes())
+
+
+class KeyPassphrasePrompt(TerminalTest):
+    PROMPT = b"Key passphrase: "
+    PASSPHRASE = "key-secret"
+
+    def setUp(self):
+        super().setUp()
+        self.key = self.encrypted_key(self.PASSPHRASE)
+
+    def start_with_key(self, key, *command):
+        return self.start("acquire", *command, *self.sts.service_options, "--key", key,
+                          "--cert", self.sts.certificate)
+
+    def answer(self, prompt, text):
+        self.assertTrue(self.read_until(prompt).endswith(prompt))
+        self.assertFalse(self.echoes())
+        os.write(self.terminal, text.encode() + b"\n")
+
+    def assert_done(self, process):
+        out, err = process.communicate(timeout=120)
+        self.assertEqual((DONE, ""), (process.returncode, err))
+        self.assertRegex(out, r"confirmationType=1\]\n\Z")
+        shown = os.read(self.terminal, 100)
+        self.assertEqual(b"\r\n", shown)
+        self.assertTrue(self.echoes())
+
+    def test_reads_without_echo_once(self):
+        for key in (self.key, f"file:{self.key}"):
+            with self.subTest(key=key):
+                process = self.start_with_key(key, "certificate")
+                self.answer(self.PROMPT, self.PASSPHRASE)
+                self.assert_done(process)
+
+    def test_comes_before_the_password(self):
+        process = self.start_with_key(self.key, "password", "--user", DevelopmentSts.USER)
+        self.answer(self.PROMPT, self.PASSPHRASE)
+        self.answer(PROMPT, DevelopmentSts.PASSWORD)
+        self.assert_done(process)
+
+    def test_wrong_passphrase(self):
+        process = self.start_with_key(self.key, "certificate")
+        self.answer(self.PROMPT, "wrong-secret")
+        _, err = process.communicate(timeout=120)
+        self.assertEqual(
+            (USAGE, "ssoclient: UsageError: cannot use the private key: "
+             "Cannot read the private key: the passphrase is wrong\n"), (process.returncode, err))
 
 
 if __name__ == "__main__":

@@ -25,10 +25,22 @@ private:
     std::string _text;
 };
 
+/** A secret by the words that questions and errors use for it. */
+struct SecretKind
+{
+    const char* name;
+    const char* prompt;
+    const char* fileOption; ///< the option that names a file with it
+};
+
+inline constexpr SecretKind Password = {"password", "Password: ", "--password-file"};
+inline constexpr SecretKind KeyPassphrase = {
+    "key passphrase", "Key passphrase: ", "--key-passphrase-file"};
+
 /**
- * Gets the password into `password`: the first line of the file, of standard input for `-`, or
- * what the user types at the terminal without echo if `file` is empty.
+ * Gets a secret: the first line of the file, of standard input for `-`, or what the user types at
+ * the terminal without echo if `file` is empty.
  *
  * @throws UsageError  it cannot be read, is empty or too long.
  */
-void GetPassword(const std::string& file, SecretText& password);
+void GetSecret(const SecretKind& kind, const std::string& file, SecretText& secret);

@@ -1,4 +1,4 @@
-#include "Password.h"
+#include "Secret.h"
 
 #include "ExitCode.h"
 #include "FileDescriptor.h"
@@ -9,6 +9,7 @@
 #include <cerrno>
 #include <csignal>
 #include <cstring>
+#include <string_view>
 
 #include <fcntl.h>
 #include <poll.h>
@@ -19,9 +20,9 @@ using Quillon::MessageFormatter;
 
 namespace {
 
-[[noreturn]] void ThrowReadError(const std::string& name)
+[[noreturn]] void ThrowReadError(const SecretKind& kind, const std::string& source)
 {
-    ThrowSystemError("cannot read the password from " + name);
+    ThrowSystemError(MessageFormatter::ASPrint("cannot read the %1 from %2", kind.name, source));
 }
 
 /**
@@ -29,20 +30,21 @@ namespace {
  * gives what `read` gives for one byte.
  */
 template <class ReadByte>
-void ReadLine(ReadByte readByte, const std::string& name, SecretText& line)
+void ReadLine(
+    const SecretKind& kind, ReadByte readByte, const std::string& source, SecretText& line)
 {
     for (;;) {
         char c = 0;
         const ssize_t count = readByte(c);
         if (count < 0) {
-            ThrowReadError(name);
+            ThrowReadError(kind, source);
         }
         if (count == 0 || c == '\n') {
             break;
         }
         if (!line.Append(c)) {
             throw UsageError(MessageFormatter::ASPrint(
-                "the password from %1 is longer than %2 bytes", name, SecretText::MaxBytes));
+                "the %1 from %2 is longer than %3 bytes", kind.name, source, SecretText::MaxBytes));
         }
     }
     if (!line.Get().empty() && line.Get().back() == '\r') {
@@ -108,11 +110,11 @@ private:
 class EchoSwitch
 {
 public:
-    explicit EchoSwitch(int terminal)
+    EchoSwitch(const SecretKind& kind, int terminal)
         : _terminal(terminal)
     {
         if (::tcgetattr(terminal, &_before) != 0) {
-            ThrowReadError("the terminal");
+            ThrowReadError(kind, "the terminal");
         }
         termios silent = _before;
         silent.c_lflag &= ~static_cast<tcflag_t>(ECHO);
@@ -128,56 +130,57 @@ private:
     termios _before = {};
 };
 
-void WritePrompt(int terminal)
+void WritePrompt(const SecretKind& kind, int terminal)
 {
-    constexpr char Prompt[] = "Password: ";
-    if (RetryInterrupted([&] { return ::write(terminal, Prompt, sizeof Prompt - 1); }) < 0) {
-        ThrowReadError("the terminal");
+    const std::string_view prompt = kind.prompt;
+    if (RetryInterrupted([&] { return ::write(terminal, prompt.data(), prompt.size()); }) < 0) {
+        ThrowReadError(kind, "the terminal");
     }
 }
 
 /** One prompt. @return the signal that interrupted it, with the terminal as it was; 0 for none. */
-int AskOnce(int terminal, SecretText& password)
+int AskOnce(const SecretKind& kind, int terminal, SecretText& secret)
 {
     const SignalGuard signals;
-    const EchoSwitch silence(terminal);
-    WritePrompt(terminal);
+    const EchoSwitch silence(kind, terminal);
+    WritePrompt(kind, terminal);
     // A signal ends the line; what was typed of it is thrown away by the caller.
     const auto readByte = [&](char& c) -> ssize_t {
         return signals.WaitForInput(terminal) ? ::read(terminal, &c, 1) : 0;
     };
-    ReadLine(readByte, "the terminal", password);
+    ReadLine(kind, readByte, "the terminal", secret);
     return caughtSignal;
 }
 
-void AskPassword(SecretText& password)
+void Ask(const SecretKind& kind, SecretText& secret)
 {
     const FileDescriptor terminal(::open("/dev/tty", O_RDWR | O_CLOEXEC));
     if (!terminal.IsOpen()) {
-        throw UsageError("no terminal to ask for the password: use --password-file");
+        throw UsageError(MessageFormatter::ASPrint(
+            "no terminal to ask for the %1: use %2", kind.name, kind.fileOption));
     }
     // A signal takes its usual course once the terminal echoes again; after a stop and a
     // continuation the question is asked anew.
-    while (const int signal = AskOnce(terminal.Get(), password)) {
-        password.Clear();
+    while (const int signal = AskOnce(kind, terminal.Get(), secret)) {
+        secret.Clear();
         ::raise(signal);
     }
 }
 
-void ReadPasswordFile(const std::string& file, SecretText& password)
+void ReadSecretFile(const SecretKind& kind, const std::string& file, SecretText& secret)
 {
     FileDescriptor opened;
     if (file != "-") {
         opened = FileDescriptor(::open(file.c_str(), O_RDONLY | O_CLOEXEC));
         if (!opened.IsOpen()) {
-            ThrowReadError("`" + file + "'");
+            ThrowReadError(kind, "`" + file + "'");
         }
     }
     const int descriptor = opened.IsOpen() ? opened.Get() : STDIN_FILENO;
     const auto readByte = [descriptor](char& c) {
         return RetryInterrupted([&] { return ::read(descriptor, &c, 1); });
     };
-    ReadLine(readByte, file == "-" ? "standard input" : "`" + file + "'", password);
+    ReadLine(kind, readByte, file == "-" ? "standard input" : "`" + file + "'", secret);
 }
 
 } // namespace
@@ -204,14 +207,14 @@ void SecretText::Clear()
     _text.clear();
 }
 
-void GetPassword(const std::string& file, SecretText& password)
+void GetSecret(const SecretKind& kind, const std::string& file, SecretText& secret)
 {
     if (file.empty()) {
-        AskPassword(password);
+        Ask(kind, secret);
     } else {
-        ReadPasswordFile(file, password);
+        ReadSecretFile(kind, file, secret);
     }
-    if (password.Get().empty()) {
-        throw UsageError("the password is empty");
+    if (secret.Get().empty()) {
+        throw UsageError(MessageFormatter::ASPrint("the %1 is empty", kind.name));
     }
 }

@@ -1,0 +1,49 @@
+"""A terminal for programs that ask."""
+
+import fcntl
+import os
+import pty
+import subprocess
+import termios
+
+from programs import SSOCLIENT, ServiceTest
+
+
+class TerminalTest(ServiceTest):
+    """A test with a terminal of its own."""
+
+    def setUp(self):
+        super().setUp()
+        self.terminal, self.far_end = pty.openpty()
+        self.addCleanup(os.close, self.terminal)
+        self.addCleanup(os.close, self.far_end)
+
+    def start(self, *arguments, launcher=(), stdin=subprocess.DEVNULL):
+        """Starts the program with the terminal as its controlling one, not as its output."""
+        def take_terminal():
+            os.setsid()
+            fcntl.ioctl(self.far_end, termios.TIOCSCTTY, 0)
+
+        process = subprocess.Popen(
+            [*launcher, SSOCLIENT, *map(str, arguments)], stdin=stdin, stdout=subprocess.PIPE, stderr=subprocess.PIPE, text=True,
+            preexec_fn=take_terminal, pass_fds=[self.far_end])
+        self.addCleanup(self.end, process)
+        return process
+
+    @staticmethod
+    def end(process):
+        if process.poll() is None:
+            process.kill()
+        process.wait()
+        process.stdout.close()
+        process.stderr.close()
+
+    def read_until(self, text):
+        """What the terminal shows, up to and including the text."""
+        shown = b""
+        while not shown.endswith(text):
+            shown += os.read(self.terminal, 1)
+        return shown
+
+    def echoes(self):
+        return bool(termios.tcgetattr(self.far_end)[3] & termios.ECHO)

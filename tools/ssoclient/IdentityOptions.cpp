@@ -1,0 +1,164 @@
+#include "IdentityOptions.h"
+
+#include "ExitCode.h"
+#include "Files.h"
+#include "Secret.h"
+#include "Trust.h"
+
+#include "quillon/MessageFormatter.h"
+
+#include <algorithm>
+#include <array>
+#include <cstring>
+#include <random>
+
+using Quillon::MessageFormatter;
+using Quillon::Crypto::Certificate;
+using Quillon::Crypto::PassphraseCallback;
+using Quillon::Crypto::PrivateKey;
+
+namespace {
+
+constexpr int MinRsaBits = 2048;
+
+/** Whether `key` begins with a scheme [RFC 3986 3.1], and so is not the name of a file. */
+bool IsUri(const std::string& key)
+{
+    constexpr char SchemeCharacters[] =
+        "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+-.";
+    const std::size_t end = key.find_first_not_of(SchemeCharacters);
+    return end != 0 && end != std::string::npos && key[end] == ':';
+}
+
+/** The text of a key file, which is overwritten when it is no longer needed. */
+class KeyFile
+{
+public:
+    explicit KeyFile(const std::string& path)
+        : _text(ReadFile(path))
+    {}
+    KeyFile(const KeyFile&) = delete;
+    KeyFile& operator=(const KeyFile&) = delete;
+    ~KeyFile() { ::explicit_bzero(_text.data(), _text.size()); }
+
+    const std::string& GetText() const noexcept { return _text; }
+
+private:
+    std::string _text;
+};
+
+Quillon::Ref<const PrivateKey> ReadKey(const IdentityOptions& options)
+{
+    // A store may ask more than once; the user is asked once.
+    SecretText passphrase;
+    const PassphraseCallback getPassphrase = [&] {
+        if (passphrase.Get().empty()) {
+            GetSecret(KeyPassphrase, options.keyPassphraseFile, passphrase);
+        }
+        return passphrase.Get();
+    };
+    if (IsUri(*options.key)) {
+        return Quillon::Crypto::LoadPrivateKey(*options.key, getPassphrase);
+    }
+    return Quillon::Crypto::CreatePrivateKey(KeyFile(*options.key).GetText(), getPassphrase);
+}
+
+// The service would refuse the request, or, with a key that cannot sign at all, there would be
+// none: either is known here already.
+void RequireSigningKey(const PrivateKey& key)
+{
+    if (key.GetKeyType() != Quillon::Crypto::KeyType::RSA || key.GetBits() < MinRsaBits) {
+        throw UsageError(MessageFormatter::ASPrint(
+            "requests are signed with an RSA key of %1 bits or more, not with one of type %2",
+            MinRsaBits,
+            key.GetDescription()));
+    }
+}
+
+bool IsKeyOf(const PrivateKey& key, const Certificate& certificate)
+{
+    constexpr auto Hash = Quillon::Crypto::HashAlgorithm::SHA256;
+    std::array<unsigned char, Quillon::Crypto::GetDigestLength(Hash)> digest = {};
+    std::random_device random;
+    std::generate(
+        digest.begin(), digest.end(), [&] { return static_cast<unsigned char>(random()); });
+    const std::vector<unsigned char> signature = key.SignDigest(Hash, digest.data());
+    return certificate.GetPublicKey().VerifyDigest(
+        Hash, digest.data(), signature.data(), signature.size());
+}
+
+Quillon::Ref<const PrivateKey> ReadSigningKey(
+    const IdentityOptions& options, const Certificate& certificate)
+{
+    try {
+        Quillon::Ref<const PrivateKey> key = ReadKey(options);
+        RequireSigningKey(*key);
+        if (!IsKeyOf(*key, certificate)) {
+            throw UsageError(MessageFormatter::ASPrint(
+                "the private key is not that of the certificate in `%1'", options.certificateFile));
+        }
+        return key;
+    } catch (const Quillon::Crypto::CryptoException& error) {
+        throw UsageError(MessageFormatter::ASPrint("cannot use the private key: %1", error.what()));
+    }
+}
+
+struct AddedOptions
+{
+    CLI::Option* key;
+    CLI::Option* certificate;
+};
+
+AddedOptions AddOptions(CLI::App& command, IdentityOptions& options)
+{
+    const AddedOptions added = {
+        command
+            .add_option(
+                "--key",
+                options.key,
+                "The caller's own private key: a PEM or DER file, or the URI of a key in an "
+                "OpenSSL store (file:..., pkcs11:...)")
+            ->type_name("KEY"),
+        command
+            .add_option(
+                "--cert",
+                options.certificateFile,
+                "PEM file whose first certificate is that of the key")
+            ->type_name("PEM")};
+    command
+        .add_option(
+            "--key-passphrase-file",
+            options.keyPassphraseFile,
+            "File whose first line is the passphrase of an encrypted key, - for standard input "
+            "(default: ask for it)")
+        ->needs(added.key)
+        ->type_name("FILE");
+    return added;
+}
+
+} // namespace
+
+void IdentityOptions::AddTo(CLI::App& command)
+{
+    const AddedOptions added = AddOptions(command, *this);
+    added.key->needs(added.certificate);
+    added.certificate->needs(added.key);
+}
+
+void IdentityOptions::AddRequiredTo(CLI::App& command)
+{
+    const AddedOptions added = AddOptions(command, *this);
+    added.key->required();
+    added.certificate->required();
+}
+
+boost::optional<SsoClient::HolderOfKeyConfig> IdentityOptions::Read() const
+{
+    if (!key) {
+        return boost::none;
+    }
+    SsoClient::HolderOfKeyConfig identity;
+    identity.certificate = ReadCertificates({certificateFile}).front();
+    identity.privateKey = ReadSigningKey(*this, *identity.certificate);
+    return identity;
+}

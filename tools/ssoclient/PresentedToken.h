@@ -1,0 +1,18 @@
+#pragma once
+
+#include "Trust.h"
+
+#include "ssoClient/SamlToken.h"
+
+#include <CLI/App.hpp>
+
+#include <boost/smart_ptr/shared_ptr.hpp>
+
+#include <string>
+
+/** Adds the required `--token FILE`. */
+void AddTokenTo(CLI::App& command, std::string& tokenFile);
+
+/** Reads a token that is to be presented to the service, and verifies it; `-` is standard input. */
+boost::shared_ptr<const SsoClient::SamlToken> ReadToken(
+    const std::string& tokenFile, const CertificateList& trusted);

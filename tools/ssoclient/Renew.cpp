@@ -1,0 +1,47 @@
+#include "Commands.h"
+#include "IdentityOptions.h"
+#include "PresentedToken.h"
+#include "ServiceOptions.h"
+#include "TokenOutput.h"
+
+#include <memory>
+
+namespace {
+
+struct RenewOptions
+{
+    ServiceOptions service;
+    IdentityOptions identity;
+    OutputOptions output;
+    std::string tokenFile;
+    long long lifetimeSec = 0;
+};
+
+ExitCode Renew(const RenewOptions& options)
+{
+    const CertificateList trusted = ReadCertificates(options.service.trustFiles);
+    const auto service = options.service.CreateService(trusted, options.identity.Read());
+    TokenOutput output(options.output);
+    const auto presented = ReadToken(options.tokenFile, trusted);
+    output.Show(service->RenewToken(*presented, options.lifetimeSec));
+    return ExitCode::DONE;
+}
+
+} // namespace
+
+void AddRenewCommand(CLI::App& parent, Action& action)
+{
+    CLI::App* command = parent.add_subcommand("renew", "Renew a holder-of-key token");
+    const auto options = std::make_shared<RenewOptions>();
+    options->service.AddTo(*command);
+    AddTokenTo(*command, options->tokenFile);
+    command
+        ->add_option(
+            "--lifetime", options->lifetimeSec, "Lifetime of the new token, from now, in seconds")
+        ->required()
+        ->type_name("SEC");
+    options->identity.AddRequiredTo(*command);
+    options->output.AddOutTo(*command);
+    options->output.AddJsonTo(*command);
+    command->callback([options, &action] { action = [options] { return Renew(*options); }; });
+}
