@@ -32,7 +32,7 @@ TokenSpec MakeDelegatingSpec()
     return spec;
 }
 
-/** A specification that leaves nothing out. */
+/** A token spec with every field set. */
 TokenSpec MakeFullSpec()
 {
     TokenSpec spec = MakeDelegatingSpec();
