@@ -24,12 +24,12 @@ const EVP_MD* GetDigest(HashAlgorithm algorithm)
 {
     // A fetch walks the providers; the first one is kept, and its result lives as long as the
     // process, so that verifying never depends on the order of static destruction.
-    static const EVP_MD* const Sha256 = EVP_MD_fetch(nullptr, "SHA256", nullptr);
-    static const EVP_MD* const Sha384 = EVP_MD_fetch(nullptr, "SHA384", nullptr);
-    static const EVP_MD* const Sha512 = EVP_MD_fetch(nullptr, "SHA512", nullptr);
-    const EVP_MD* digest = algorithm == HashAlgorithm::SHA256   ? Sha256
-                           : algorithm == HashAlgorithm::SHA384 ? Sha384
-                                                                : Sha512;
+    static const EVP_MD* const sha256 = EVP_MD_fetch(nullptr, "SHA256", nullptr);
+    static const EVP_MD* const sha384 = EVP_MD_fetch(nullptr, "SHA384", nullptr);
+    static const EVP_MD* const sha512 = EVP_MD_fetch(nullptr, "SHA512", nullptr);
+    const EVP_MD* digest = algorithm == HashAlgorithm::SHA256   ? sha256
+                           : algorithm == HashAlgorithm::SHA384 ? sha384
+                                                                : sha512;
     if (digest == nullptr) {
         throw CryptoException("OpenSSL offers no SHA-2 digest: " + GetOpenSslError());
     }

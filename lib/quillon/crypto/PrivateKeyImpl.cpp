@@ -111,7 +111,7 @@ private:
     {
         const bool fits = passphrase.size() <= static_cast<std::size_t>(size);
         if (fits) {
-            std::memcpy(buffer, passphrase.data(), passphrase.size());
+            std::copy(passphrase.begin(), passphrase.end(), buffer);
         }
         const int length = fits ? static_cast<int>(passphrase.size()) : -1;
         explicit_bzero(passphrase.data(), passphrase.size());
