@@ -4,11 +4,13 @@
 #include <libxml/parser.h>
 
 #include <openssl/evp.h>
+#include <openssl/pem.h>
 #include <openssl/rsa.h>
 
 #include <array>
 #include <cstring>
 #include <stdexcept>
+#include <utility>
 
 namespace Benchmarks {
 
@@ -30,6 +32,7 @@ using KeyOwner = std::unique_ptr<EVP_PKEY, Deleter<EVP_PKEY_free>>;
 using ContextOwner = std::unique_ptr<EVP_PKEY_CTX, Deleter<EVP_PKEY_CTX_free>>;
 using MdOwner = std::unique_ptr<EVP_MD, Deleter<EVP_MD_free>>;
 using MdContextOwner = std::unique_ptr<EVP_MD_CTX, Deleter<EVP_MD_CTX_free>>;
+using BioOwner = std::unique_ptr<BIO, Deleter<BIO_free_all>>;
 
 void Require(bool condition)
 {
@@ -73,22 +76,17 @@ bool ParsePass(const std::string& xml)
            && characters != 0;
 }
 
-} // namespace
-
-struct VerifyFloor::Handles
+// An RSA key and the digest that it signs.
+struct RsaOperation
 {
-    MdOwner sha256;
+    MdOwner sha256{EVP_MD_fetch(nullptr, "SHA256", nullptr)};
     KeyOwner key;
     DigestBytes signedDigest{};
-    std::vector<unsigned char> signature;
 
-    bool HashPass(const std::string& xml) const
+    explicit RsaOperation(KeyOwner ownKey)
+        : key(std::move(ownKey))
     {
-        const MdContextOwner context(EVP_MD_CTX_new());
-        DigestBytes digest{};
-        return EVP_DigestInit_ex2(context.get(), sha256.get(), nullptr) == 1
-               && EVP_DigestUpdate(context.get(), xml.data(), xml.size()) == 1
-               && EVP_DigestFinal_ex(context.get(), digest.data(), nullptr) == 1;
+        Require(sha256 != nullptr && key != nullptr);
     }
 
     ContextOwner MakeContext(int (*init)(EVP_PKEY_CTX*)) const
@@ -101,7 +99,20 @@ struct VerifyFloor::Handles
         return context;
     }
 
-    bool RsaPass() const
+    bool Sign(std::vector<unsigned char>& signature) const
+    {
+        std::size_t length = static_cast<std::size_t>(EVP_PKEY_get_size(key.get()));
+        signature.resize(length);
+        return EVP_PKEY_sign(
+                   MakeContext(&EVP_PKEY_sign_init).get(),
+                   signature.data(),
+                   &length,
+                   signedDigest.data(),
+                   signedDigest.size())
+               == 1;
+    }
+
+    bool Verify(const std::vector<unsigned char>& signature) const
     {
         return EVP_PKEY_verify(
                    MakeContext(&EVP_PKEY_verify_init).get(),
@@ -113,22 +124,33 @@ struct VerifyFloor::Handles
     }
 };
 
+KeyOwner ReadKey(const std::string& pem)
+{
+    const BioOwner text(BIO_new_mem_buf(pem.data(), static_cast<int>(pem.size())));
+    return KeyOwner(PEM_read_bio_PrivateKey(text.get(), nullptr, nullptr, nullptr));
+}
+
+} // namespace
+
+struct VerifyFloor::Handles
+{
+    RsaOperation rsa{KeyOwner(EVP_RSA_gen(2048))};
+    std::vector<unsigned char> signature;
+
+    bool HashPass(const std::string& xml) const
+    {
+        const MdContextOwner context(EVP_MD_CTX_new());
+        DigestBytes digest{};
+        return EVP_DigestInit_ex2(context.get(), rsa.sha256.get(), nullptr) == 1
+               && EVP_DigestUpdate(context.get(), xml.data(), xml.size()) == 1
+               && EVP_DigestFinal_ex(context.get(), digest.data(), nullptr) == 1;
+    }
+};
+
 VerifyFloor::VerifyFloor()
     : _handles(std::make_unique<Handles>())
 {
-    _handles->sha256.reset(EVP_MD_fetch(nullptr, "SHA256", nullptr));
-    _handles->key.reset(EVP_RSA_gen(2048));
-    Require(_handles->sha256 != nullptr && _handles->key != nullptr);
-    std::size_t length = static_cast<std::size_t>(EVP_PKEY_get_size(_handles->key.get()));
-    _handles->signature.resize(length);
-    Require(
-        EVP_PKEY_sign(
-            _handles->MakeContext(&EVP_PKEY_sign_init).get(),
-            _handles->signature.data(),
-            &length,
-            _handles->signedDigest.data(),
-            _handles->signedDigest.size())
-        == 1);
+    Require(_handles->rsa.Sign(_handles->signature));
 }
 
 VerifyFloor::~VerifyFloor() = default;
@@ -136,7 +158,28 @@ VerifyFloor::~VerifyFloor() = default;
 bool VerifyFloor::Run(const std::string& xml) const
 {
     return ParsePass(xml) && _handles->HashPass(xml) && _handles->HashPass(xml)
-           && _handles->RsaPass();
+           && _handles->rsa.Verify(_handles->signature);
+}
+
+struct SignFloor::Handles
+{
+    RsaOperation rsa;
+
+    explicit Handles(KeyOwner key)
+        : rsa(std::move(key))
+    {}
+};
+
+SignFloor::SignFloor(const std::string& keyPem)
+    : _handles(std::make_unique<Handles>(ReadKey(keyPem)))
+{}
+
+SignFloor::~SignFloor() = default;
+
+bool SignFloor::Run() const
+{
+    std::vector<unsigned char> signature;
+    return _handles->rsa.Sign(signature);
 }
 
 } // namespace Benchmarks

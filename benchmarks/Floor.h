@@ -25,4 +25,21 @@ private:
     std::unique_ptr<Handles> _handles;
 };
 
+/** What no signing can do without: one RSA operation. */
+class SignFloor
+{
+public:
+    explicit SignFloor(const std::string& keyPem);
+    ~SignFloor();
+    SignFloor(const SignFloor&) = delete;
+    SignFloor& operator=(const SignFloor&) = delete;
+
+    /** @return false if it failed. */
+    bool Run() const;
+
+private:
+    struct Handles;
+    std::unique_ptr<Handles> _handles;
+};
+
 } // namespace Benchmarks

@@ -1,30 +1,16 @@
 #include "VerifyBenchmark.h"
 
 #include "Floor.h"
+#include "TestData.h"
 
 #include "quillon/system/Clock.h"
 #include "ssoClient/CreateSamlToken.h"
 
 #include <benchmark/benchmark.h>
 
-#include <fstream>
-#include <sstream>
-#include <stdexcept>
-
 namespace Benchmarks {
 
 namespace {
-
-std::string ReadFile(const std::string& name)
-{
-    std::ifstream file(std::string(TEST_DATA_DIR) + "/" + name, std::ios::binary);
-    std::ostringstream text;
-    text << file.rdbuf();
-    if (!file || text.str().empty()) {
-        throw std::runtime_error("Cannot read " + name);
-    }
-    return text.str();
-}
 
 /** A moment inside the validity of the tokens. */
 class TokenClock final : public Quillon::System::Clock

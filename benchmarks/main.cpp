@@ -1,4 +1,5 @@
 #include "RatioReporter.h"
+#include "SignBenchmark.h"
 #include "VerifyBenchmark.h"
 
 #include <benchmark/benchmark.h>
@@ -10,6 +11,7 @@ int main(int argc, char** argv)
         return 2;
     }
     Benchmarks::RegisterVerifyBenchmarks();
+    Benchmarks::RegisterSignBenchmarks();
     Benchmarks::RatioReporter reporter;
     benchmark::RunSpecifiedBenchmarks(&reporter);
     benchmark::Shutdown();

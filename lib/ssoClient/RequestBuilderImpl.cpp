@@ -191,6 +191,10 @@ const HolderOfKeyConfig& RequestBuilderImpl::GetHolderOfKeyConfig() const
     if (!_holderOfKeyConfig.is_initialized()) {
         Quillon::PanicVerify("_holderOfKeyConfig.is_initialized()", Unit, __LINE__);
     }
+    if (!_holderOfKeyConfig->privateKey || !_holderOfKeyConfig->certificate) {
+        throw Quillon::InvalidArgumentException(
+            "HolderOfKeyConfig must hold a private key and a certificate");
+    }
     return *_holderOfKeyConfig;
 }
 

@@ -5,6 +5,7 @@
 
 #include <boost/smart_ptr/make_shared.hpp>
 
+#include <string.h>
 #include <utility>
 
 using Quillon::Ref;
@@ -52,15 +53,17 @@ class TextElementBuilderImpl final : public XMLBaseBuilder
 {
 public:
     TextElementBuilderImpl(
-        std::string prefix,
-        std::string localName,
-        AttributeMap attributes,
-        std::string text) noexcept
+        std::string prefix, std::string localName, AttributeMap attributes, const std::string& text)
         : _prefix(std::move(prefix))
         , _localName(std::move(localName))
         , _attributes(std::move(attributes))
-        , _text(std::move(text))
+        , _text(text)
     {}
+
+    /** The text may be a password: the builder keeps the only copy, and wipes it. */
+    ~TextElementBuilderImpl() { explicit_bzero(_text.data(), _text.size()); }
+    TextElementBuilderImpl(const TextElementBuilderImpl&) = delete;
+    TextElementBuilderImpl& operator=(const TextElementBuilderImpl&) = delete;
 
     void build(Ref<ElementNode>& out) const override
     {
@@ -128,17 +131,16 @@ XMLBuilderPtr ElementBuilder(std::string prefix, std::string localName, Attribut
         std::move(prefix), std::move(localName), std::move(attributes));
 }
 
-XMLBuilderPtr TextElementBuilder(std::string prefix, std::string localName, std::string text)
+XMLBuilderPtr TextElementBuilder(std::string prefix, std::string localName, const std::string& text)
 {
-    return TextElementBuilder(
-        std::move(prefix), std::move(localName), AttributeMap(), std::move(text));
+    return TextElementBuilder(std::move(prefix), std::move(localName), AttributeMap(), text);
 }
 
 XMLBuilderPtr TextElementBuilder(
-    std::string prefix, std::string localName, AttributeMap attributes, std::string text)
+    std::string prefix, std::string localName, AttributeMap attributes, const std::string& text)
 {
     return boost::make_shared<TextElementBuilderImpl>(
-        std::move(prefix), std::move(localName), std::move(attributes), std::move(text));
+        std::move(prefix), std::move(localName), std::move(attributes), text);
 }
 
 XMLBuilderPtr InsertSamlTokenBuilder(const SamlToken& token)

@@ -66,9 +66,10 @@ XMLBuilderPtr ElementBuilder(std::string prefix, std::string localName);
 XMLBuilderPtr ElementBuilder(std::string prefix, std::string localName, AttributeMap attributes);
 
 /** An element with one text node, also for an empty text. */
-XMLBuilderPtr TextElementBuilder(std::string prefix, std::string localName, std::string text);
 XMLBuilderPtr TextElementBuilder(
-    std::string prefix, std::string localName, AttributeMap attributes, std::string text);
+    std::string prefix, std::string localName, const std::string& text);
+XMLBuilderPtr TextElementBuilder(
+    std::string prefix, std::string localName, AttributeMap attributes, const std::string& text);
 
 /**
  * The assertion element of `token`, parsed once from its XML and otherwise untouched, so that its

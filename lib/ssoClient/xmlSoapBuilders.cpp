@@ -42,6 +42,16 @@ ElementNode* RequireChild(
     return child;
 }
 
+/** An xs:ID is a name and begins with no digit [XML Schema Part 2, 3.3.8], as most UUIDs do. */
+std::string GenerateUuidThatIsAName()
+{
+    std::string uuid = Quillon::StringUtil::GenerateUuid();
+    while (uuid.front() <= '9') {
+        uuid = Quillon::StringUtil::GenerateUuid();
+    }
+    return uuid;
+}
+
 } // namespace
 
 XMLBuilderPtr SoapBuilder(XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder)
@@ -142,7 +152,7 @@ std::string CreateWssuId(ElementNode* element)
     if (const auto* const attribute = element->FindAttribute("Id", Wire::WsuNamespace)) {
         return std::string(attribute->value);
     }
-    std::string id = Quillon::StringUtil::GenerateUuid();
+    std::string id = GenerateUuidThatIsAName();
     element->DefineAttribute("xmlns:wsu", Wire::WsuNamespace);
     element->DefineAttribute("wsu:Id", id);
     return id;

@@ -38,6 +38,14 @@ bool IsTargetCharacter(char character) noexcept
     return IsLetterOrDigit(character) || Others.find(character) != std::string_view::npos;
 }
 
+/** What ends in a number would be read as an abbreviated IPv4 address: decimal or `0x` form. */
+bool IsNumber(std::string_view label) noexcept
+{
+    const bool isHex = label.size() >= 2 && label[0] == '0' && (label[1] == 'x' || label[1] == 'X');
+    return isHex ? label.find_first_not_of("0123456789abcdefABCDEF", 2) == std::string_view::npos
+                 : std::all_of(label.begin(), label.end(), IsDigit);
+}
+
 } // namespace
 
 bool IsIpAddress(const std::string& text) noexcept
@@ -63,8 +71,7 @@ bool IsHost(const std::string& text) noexcept
         }
         rest.remove_prefix(dot + 1);
     }
-    // What ends in a number would be read as an abbreviated IPv4 address.
-    return IsLabel(rest) && !IsDigit(rest.front());
+    return IsLabel(rest) && !IsNumber(rest);
 }
 
 bool IsRequestTarget(std::string_view text) noexcept

@@ -70,11 +70,12 @@ HttpEngine& HttpEngine::Get() noexcept
 
 void HttpEngine::RequireRunning()
 {
-    const std::lock_guard<std::mutex> lock(_mutex);
+    // Before the lock, which a thread of the parent may have held at the fork.
     if (HasForked()) {
         throw HttpException("The process has forked after its first HTTP exchange; the child "
                             "cannot send. Fork first.");
     }
+    const std::lock_guard<std::mutex> lock(_mutex);
     if (_state == State::ENDED) {
         ThrowEnded();
     }
@@ -133,6 +134,9 @@ std::list<Connections>::iterator HttpEngine::AddConnections(Ref<const Connection
 
 void HttpEngine::RetireConnections(std::list<Connections>::iterator connections) noexcept
 {
+    if (HasForked()) {
+        return; // they are the parent's, and its threads' lock may never be free here
+    }
     std::list<Connections> unused; // goes after the lock
     const std::lock_guard<std::mutex> lock(_mutex);
     const bool areOpen = connections->share != nullptr;
@@ -277,9 +281,12 @@ void HttpEngine::CloseEverything()
 
 void HttpEngine::Stop()
 {
+    if (HasForked()) {
+        return;
+    }
     {
         const std::lock_guard<std::mutex> lock(_mutex);
-        if (_state != State::RUNNING || HasForked()) {
+        if (_state != State::RUNNING) {
             return;
         }
         _state = State::ENDED;

@@ -51,7 +51,9 @@ bool TlsPeer::RequireName(SSL_CTX* connection) const noexcept
     X509_VERIFY_PARAM* const rules = SSL_CTX_get0_param(connection);
     // A certificate that the host trusts is an anchor, self-signed or not.
     X509_VERIFY_PARAM_set_flags(rules, X509_V_FLAG_PARTIAL_CHAIN);
-    X509_VERIFY_PARAM_set_hostflags(rules, X509_CHECK_FLAG_NO_PARTIAL_WILDCARDS);
+    // [RFC 9525 2]: the subject's common name is no name of a server.
+    X509_VERIFY_PARAM_set_hostflags(
+        rules, X509_CHECK_FLAG_NO_PARTIAL_WILDCARDS | X509_CHECK_FLAG_NEVER_CHECK_SUBJECT);
     return (_nameIsAddress ? X509_VERIFY_PARAM_set1_ip_asc(rules, _name.c_str())
                            : X509_VERIFY_PARAM_set1_host(rules, _name.data(), _name.size()))
            == 1;

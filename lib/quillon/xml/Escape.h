@@ -5,6 +5,7 @@
 
 #include <array>
 #include <cstring>
+#include <string>
 #include <string_view>
 
 namespace Quillon::Xml {
@@ -56,6 +57,7 @@ public:
             Flush();
             if (text.size() > _bytes.size()) {
                 _sink.Write(text.data(), text.size());
+                _flushed += text.size();
                 return;
             }
         }
@@ -63,11 +65,29 @@ public:
         _size += text.size();
     }
 
+    /** How much has been appended in all. */
+    std::size_t GetPosition() const noexcept { return _flushed + _size; }
+
+    /**
+     * Reads back what has been appended since `position`.
+     *
+     * @return false, and `text` untouched, if a part of it has gone to the sink already.
+     */
+    bool ReadBack(std::size_t position, std::string& text) const
+    {
+        if (position < _flushed) {
+            return false;
+        }
+        text.assign(_bytes.data() + (position - _flushed), GetPosition() - position);
+        return true;
+    }
+
     void Flush()
     {
         if (_size != 0) {
             _sink.Write(_bytes.data(), _size);
         }
+        _flushed += _size;
         _used = _size > _used ? _size : _used;
         _size = 0;
     }
@@ -104,6 +124,7 @@ private:
     ByteSink& _sink;
     std::size_t _size = 0;
     std::size_t _used = 0;
+    std::size_t _flushed = 0;
     std::array<char, 4096> _bytes;
 };
 

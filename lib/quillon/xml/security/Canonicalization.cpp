@@ -3,6 +3,7 @@
 #include "quillon/xml/security/Canonicalizer.h"
 #include "quillon/xml/security/Identifiers.h"
 #include "xml/TreeWalk.h"
+#include "xml/security/PrefixTable.h"
 
 #include <algorithm>
 #include <tuple>
@@ -51,91 +52,27 @@ bool IsAbsolute(std::string_view uri) noexcept
                });
 }
 
-/** Prefixes are a few octets long: comparing them in place beats a call. */
-bool IsSamePrefix(std::string_view a, std::string_view b) noexcept
+/** Whether the element is empty or holds one text and nothing else. */
+bool IsLeaf(const ElementNode& element) noexcept
 {
-    if (a.size() != b.size()) {
-        return false;
-    }
-    for (std::size_t i = 0; i < a.size(); ++i) {
-        if (a[i] != b[i]) {
-            return false;
-        }
-    }
-    return true;
+    const Node* child = element.GetFirstChild();
+    return child == nullptr || (AsText(child) != nullptr && child->GetNextSibling() == nullptr);
 }
 
-/** What a prefix is bound to at some point of a walk; an empty URI is none. */
-struct PrefixState
+bool HaveSameTag(const ElementNode& a, const ElementNode& b) noexcept
 {
-    std::string_view prefix;
-    std::string_view inScope;
-    /** The URI that the nearest output ancestor has rendered for the prefix. */
-    std::string_view rendered;
-};
-
-/**
- * The states of all prefixes met so far, with a log to bring back how they were: one look-up tells
- * everything about a prefix.
- */
-class PrefixTable
-{
-public:
-    PrefixState* Find(std::string_view prefix) noexcept
-    {
-        for (PrefixState& state : _states) {
-            if (IsSamePrefix(state.prefix, prefix)) {
-                return &state;
-            }
-        }
-        return nullptr;
-    }
-
-    void Bind(std::string_view prefix, std::string_view uri)
-    {
-        PrefixState* state = Find(prefix);
-        if (state == nullptr) {
-            _states.push_back(PrefixState{prefix, {}, {}});
-            state = &_states.back();
-        }
-        Log(*state);
-        state->inScope = uri;
-    }
-
-    void SetRendered(PrefixState& state)
-    {
-        Log(state);
-        state.rendered = state.inScope;
-    }
-
-    std::vector<PrefixState>& GetAll() noexcept { return _states; }
-
-    std::size_t GetMark() const noexcept { return _log.size(); }
-
-    /** Undoes every change since the mark was taken. */
-    void Restore(std::size_t mark) noexcept
-    {
-        while (_log.size() > mark) {
-            _states[_log.back().index] = _log.back().state;
-            _log.pop_back();
-        }
-    }
-
-private:
-    struct Change
-    {
-        std::size_t index;
-        PrefixState state;
-    };
-
-    void Log(const PrefixState& state)
-    {
-        _log.push_back(Change{static_cast<std::size_t>(&state - _states.data()), state});
-    }
-
-    std::vector<PrefixState> _states;
-    std::vector<Change> _log;
-};
+    const AttributeRange ofA = a.GetAttributes();
+    const AttributeRange ofB = b.GetAttributes();
+    return a.GetName() == b.GetName()
+           && std::equal(
+               ofA.begin(),
+               ofA.end(),
+               ofB.begin(),
+               ofB.end(),
+               [](const Attribute& x, const Attribute& y) {
+                   return x.name == y.name && x.value == y.value;
+               });
+}
 
 /** Writes the nodes of one walk in canonical form. */
 class CanonicalVisitor
@@ -153,15 +90,13 @@ public:
     void Enter(const ElementNode& element)
     {
         _marks.push_back(_prefixes.GetMark());
-        DeclareNamespaces(element);
-        _out.Append('<');
-        _out.Append(element.GetName());
-        _namespaces.clear();
-        CollectNamespaces(element);
-        CollectAttributes(element);
-        WriteNamespaces();
-        WriteAttributes();
-        _out.Append('>');
+        if (RepeatsLastLeaf(element)) {
+            _out.Append(_leafTag);
+            return;
+        }
+        const std::size_t start = _out.GetPosition();
+        WriteStartTag(element);
+        _lastLeaf = IsLeaf(element) && _out.ReadBack(start, _leafTag) ? &element : nullptr;
     }
 
     void Leave(const ElementNode& element)
@@ -181,6 +116,30 @@ public:
     }
 
 private:
+    /**
+     * Whether the start tag is that of the last leaf, a sibling: as for the thousand values of one
+     * attribute. The prefixes are in the state in which that leaf was entered, because a leaf
+     * holds no element that could use what it renders.
+     */
+    bool RepeatsLastLeaf(const ElementNode& element) const noexcept
+    {
+        return _lastLeaf != nullptr && element.GetParent() == _lastLeaf->GetParent()
+               && IsLeaf(element) && HaveSameTag(element, *_lastLeaf);
+    }
+
+    void WriteStartTag(const ElementNode& element)
+    {
+        DeclareNamespaces(element);
+        _out.Append('<');
+        _out.Append(element.GetName());
+        _namespaces.clear();
+        CollectNamespaces(element);
+        CollectAttributes(element);
+        WriteNamespaces();
+        WriteAttributes();
+        _out.Append('>');
+    }
+
     /** Brings the declarations of the apex's ancestors into scope, outermost first. */
     void EnterAncestors(const ElementNode* nearest)
     {
@@ -388,6 +347,8 @@ private:
     OutputBuffer& _out;
     PrefixTable _prefixes;
     std::vector<std::size_t> _marks;
+    const ElementNode* _lastLeaf = nullptr;
+    std::string _leafTag;
     // Of the element being written; kept to be used again.
     std::vector<std::string_view> _declared;
     std::vector<SortedAttribute> _attributes;

@@ -203,6 +203,18 @@ TEST_F(TlsTest, RefusesAnExpiredCertificate)
         HttpClient(MakeSpec(context.get(), Host, "", other)).PostAndFail());
 }
 
+// [RFC 9525 2]: only the alternative names count, and a certificate may have none.
+TEST_F(TlsTest, RefusesTheHostAsACommonName)
+{
+    CertificateOptions options;
+    options.commonName = Host;
+    TlsServer nameless(MakeIdentity(options, &authority));
+    const TestServer other(AnswerAll(MakeReply("200 OK", "pong")), nameless.GetStreams());
+    EXPECT_THAT(
+        HttpClient(MakeSpec(context.get(), Host, "", other)).PostAndFail(),
+        StartsWith("The TLS certificate of " + Describe(other, Host) + " is refused: "));
+}
+
 TEST_F(TlsTest, RefusesACertificateThatIsNotYetValid)
 {
     CertificateOptions options;

@@ -78,6 +78,25 @@ void RandomDocument::AddElement(unsigned depth)
     _scope.resize(outerScope);
 }
 
+void RandomDocument::AddRepeatedTags(unsigned depth)
+{
+    const std::size_t outerScope = _scope.size();
+    std::vector<std::string> declared;
+    const std::string declarations = Chance(50) ? MakeDeclarations(declared) : "";
+    const std::string prefix = PickPrefix(false);
+    const std::string name =
+        (prefix.empty() ? "" : prefix + ":") + LocalNames[Pick(LocalNames.size())];
+    const std::string tag = name + declarations + MakeAttributes();
+    for (unsigned i = 2 + Pick(3); i > 0; --i) {
+        _text += "<" + tag + ">" + MakeText();
+        if (Chance(30)) {
+            AddElement(depth + 1);
+        }
+        _text += "</" + name + ">" + (Chance(30) ? "\n" : "");
+    }
+    _scope.resize(outerScope);
+}
+
 std::string RandomDocument::MakeDeclarations(std::vector<std::string>& declared)
 {
     std::string text;
@@ -155,6 +174,8 @@ void RandomDocument::AddContent(unsigned depth)
             _text += "<!-- no & markup -->";
         } else if (Chance(10)) {
             _text += "<?target some  data?>";
+        } else if (depth < 5 && Chance(15)) {
+            AddRepeatedTags(depth + 1);
         } else if (depth < 5) {
             AddElement(depth + 1);
         }

@@ -8,8 +8,8 @@ namespace Quillon::Xml {
 
 /**
  * Makes namespace-well-formed documents out of a seed: namespaces redeclared and undeclared, the
- * default namespace on and off, attributes that sort by namespace, special characters, comments,
- * CDATA and processing instructions.
+ * default namespace on and off, attributes that sort by namespace, siblings with the same tag,
+ * special characters, comments, CDATA and processing instructions.
  */
 class RandomDocument
 {
@@ -31,6 +31,7 @@ private:
     bool Chance(unsigned percent) { return Pick(100) < percent; }
     std::string Lookup(const std::string& prefix) const;
     void AddElement(unsigned depth);
+    void AddRepeatedTags(unsigned depth);
     std::string MakeDeclarations(std::vector<std::string>& declared);
     std::string MakeAttributes();
     std::string MakeAttributeValue();

@@ -128,6 +128,16 @@ TEST(CreateWssuId, GivesNewUuidToElementWithoutId)
     EXPECT_EQ(CreateWssuId(element.get()), id);
 }
 
+// [XML Schema Part 2, 3.3.8]: an xs:ID is a name. Of plain UUIDs, ten in sixteen are none.
+TEST(CreateWssuId, GivesIdsThatAreNames)
+{
+    for (int i = 0; i < 100; ++i) {
+        Ref<ElementNode> element;
+        CreateElementNode("e", "Element", element);
+        EXPECT_THAT(CreateWssuId(element.get()), testing::MatchesRegex("[a-f].{35}"));
+    }
+}
+
 TEST(CreateWssuId, KeepsIdUnderAnyPrefix)
 {
     const Ref<ElementNode> element =

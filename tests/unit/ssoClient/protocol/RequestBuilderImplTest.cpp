@@ -183,6 +183,24 @@ TEST(BuildUserPassTokenRequest, WithIdentityAndDelegationIsUnsignedHolderOfKey)
     EXPECT_THAT(request.body, Not(HasSubstr("UseKey")));
 }
 
+TEST(BuildCertificateTokenRequest, NeedsBothHalvesOfTheIdentity)
+{
+    const std::string expected =
+        "InvalidArgumentException: Invalid argument : HolderOfKeyConfig must "
+        "hold a private key and a certificate";
+    for (const bool hasKey : {false, true}) {
+        HolderOfKeyConfig identity = hasKey ? GetIdentity() : HolderOfKeyConfig();
+        identity.certificate.reset();
+        Request request;
+        EXPECT_EQ(
+            GetFailure([&] {
+                RequestBuilderImpl(identity).BuildCertificateTokenRequest(
+                    SpecWithLifetime(300), request);
+            }),
+            expected);
+    }
+}
+
 TEST(BuildCertificateTokenRequest, IsSignedWithTheCertificate)
 {
     Request request;

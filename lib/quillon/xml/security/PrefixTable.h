@@ -1,0 +1,95 @@
+#pragma once
+
+#include <cstddef>
+#include <string_view>
+#include <vector>
+
+namespace Quillon::Xml::Security {
+
+/** What a prefix is bound to at some point of a walk; an empty URI is none. */
+struct PrefixState
+{
+    std::string_view prefix;
+    std::string_view inScope;
+    /** The URI that the nearest output ancestor has rendered for the prefix. */
+    std::string_view rendered;
+};
+
+/**
+ * The states of all prefixes met so far, with a log to bring back how they were: one look-up tells
+ * everything about a prefix.
+ */
+class PrefixTable
+{
+public:
+    PrefixState* Find(std::string_view prefix) noexcept
+    {
+        for (PrefixState& state : _states) {
+            if (HasPrefix(state, prefix)) {
+                return &state;
+            }
+        }
+        return nullptr;
+    }
+
+    void Bind(std::string_view prefix, std::string_view uri)
+    {
+        PrefixState* state = Find(prefix);
+        if (state == nullptr) {
+            _states.push_back(PrefixState{prefix, {}, {}});
+            state = &_states.back();
+        }
+        Log(*state);
+        state->inScope = uri;
+    }
+
+    void SetRendered(PrefixState& state)
+    {
+        Log(state);
+        state.rendered = state.inScope;
+    }
+
+    std::vector<PrefixState>& GetAll() noexcept { return _states; }
+
+    std::size_t GetMark() const noexcept { return _log.size(); }
+
+    /** Undoes every change since the mark was taken. */
+    void Restore(std::size_t mark) noexcept
+    {
+        while (_log.size() > mark) {
+            _states[_log.back().index] = _log.back().state;
+            _log.pop_back();
+        }
+    }
+
+private:
+    struct Change
+    {
+        std::size_t index;
+        PrefixState state;
+    };
+
+    /** Prefixes are a few octets long: comparing them in place beats a call. */
+    static bool HasPrefix(const PrefixState& state, std::string_view prefix) noexcept
+    {
+        if (state.prefix.size() != prefix.size()) {
+            return false;
+        }
+        for (std::size_t i = 0; i < prefix.size(); ++i) {
+            if (state.prefix[i] != prefix[i]) {
+                return false;
+            }
+        }
+        return true;
+    }
+
+    void Log(const PrefixState& state)
+    {
+        _log.push_back(Change{static_cast<std::size_t>(&state - _states.data()), state});
+    }
+
+    std::vector<PrefixState> _states;
+    std::vector<Change> _log;
+};
+
+} // namespace Quillon::Xml::Security

@@ -1,0 +1,143 @@
+// Writes every kind of request that the library builds to a file of its own, for other programs
+// to judge: interop_requests FOLDER KEY TIME, where KEY names a key of the test data.
+
+#include "ssoClient/CreateSamlToken.h"
+#include "ssoClient/RequestBuilderImpl.h"
+#include "support/FixedClock.h"
+#include "support/TestData.h"
+
+#include <exception>
+#include <fstream>
+#include <functional>
+#include <iostream>
+
+using namespace SsoClient;
+
+namespace {
+
+using TokenPtr = boost::shared_ptr<const SamlToken>;
+
+TokenPtr ReadToken(const std::string& name)
+{
+    // The tokens of the test data are valid at this time.
+    const FixedClock clock("2026-06-15T12:00:00Z");
+    return CreateSamlToken(
+        ReadTestData("tokens/accepted/" + name + ".xml"), GetTestCertificates("sts"));
+}
+
+TokenSpec MakeDelegatingSpec()
+{
+    TokenSpec spec;
+    spec.delegateTo = "proxy";
+    return spec;
+}
+
+/** A token spec with every field set. */
+TokenSpec MakeFullSpec()
+{
+    TokenSpec spec = MakeDelegatingSpec();
+    spec.renewable = true;
+    spec.delegable = true;
+    spec.audienceRestriction = {"https://one.example.com", "https://two.example.com/a?b&c"};
+    spec.advice = {
+        {"urn:source", {{"urn:name", {"value", "<&\">"}}, {"urn:empty", {}}}}, {"urn:nothing", {}}};
+    return spec;
+}
+
+class RequestWriter
+{
+public:
+    RequestWriter(const std::string& folder, const std::string& key)
+        : _folder(folder)
+        , _withoutKey(boost::none)
+        , _withKey(HolderOfKeyConfig{GetTestKey(key), GetTestCertificates(key).front()})
+    {}
+
+    void WriteAll() const
+    {
+        WritePasswordRequests();
+        WriteCertificateRequests();
+        WriteExchangeRequests();
+        WriteTokenRequests();
+    }
+
+private:
+    void WritePasswordRequests() const
+    {
+        const auto build =
+            [](const RequestBuilder& builder, const TokenSpec& spec, Request& request) {
+                builder.BuildUserPassTokenRequest("jdoe", "s3cret", spec, request);
+            };
+        Write("password", [&](Request& out) { build(_withoutKey, TokenSpec(), out); });
+        Write("password-full", [&](Request& out) { build(_withoutKey, MakeFullSpec(), out); });
+        Write("password-signed", [&](Request& out) { build(_withKey, TokenSpec(), out); });
+        Write("password-delegating", [&](Request& out) {
+            build(_withKey, MakeDelegatingSpec(), out);
+        });
+    }
+
+    void WriteCertificateRequests() const
+    {
+        Write("certificate", [&](Request& out) {
+            _withKey.BuildCertificateTokenRequest(TokenSpec(), out);
+        });
+        Write("certificate-full", [&](Request& out) {
+            _withKey.BuildCertificateTokenRequest(MakeFullSpec(), out);
+        });
+    }
+
+    void WriteExchangeRequests() const
+    {
+        Write("exchange", [&](Request& out) {
+            _withKey.BuildExchangeTokenRequest(*_holderOfKey, TokenSpec(), out);
+        });
+        Write("exchange-full", [&](Request& out) {
+            _withKey.BuildExchangeTokenRequest(*_holderOfKey, MakeFullSpec(), out);
+        });
+        Write("exchange-bearer", [&](Request& out) {
+            _withKey.BuildExchangeTokenRequest(*_bearer, TokenSpec(), out);
+        });
+    }
+
+    void WriteTokenRequests() const
+    {
+        Write("renew", [&](Request& out) { _withKey.BuildRenewRequest(*_holderOfKey, 600, out); });
+        Write("validate", [&](Request& out) {
+            _withoutKey.BuildValidateSubjectRequest(*_holderOfKey, out);
+        });
+    }
+
+    void Write(const std::string& name, const std::function<void(Request&)>& build) const
+    {
+        Request request;
+        build(request);
+        std::ofstream file(_folder + "/" + name + ".xml", std::ios::binary);
+        file.exceptions(std::ios::failbit | std::ios::badbit);
+        file << request.body << std::flush;
+    }
+
+    const std::string _folder;
+    const RequestBuilderImpl _withoutKey;
+    const RequestBuilderImpl _withKey;
+    const TokenPtr _holderOfKey = ReadToken("holder-of-key");
+    const TokenPtr _bearer = ReadToken("bearer");
+};
+
+} // namespace
+
+int main(int argc, char** argv)
+{
+    if (argc != 4) {
+        std::cerr << "usage: interop_requests FOLDER KEY TIME\n";
+        return 2;
+    }
+    try {
+        const RequestWriter writer(argv[1], argv[2]);
+        const FixedClock clock(argv[3]);
+        writer.WriteAll();
+    } catch (const std::exception& error) {
+        std::cerr << "interop_requests: " << error.what() << "\n";
+        return 1;
+    }
+    return 0;
+}
