@@ -100,10 +100,22 @@ ProcessingInstructionNode* Arena::NewProcessingInstruction(
         ProcessingInstructionNode(this, target, data);
 }
 
+void Arena::RemoveTopLevel(Node* node) noexcept
+{
+    Node** link = &_firstTopLevel;
+    while (*link != nullptr && *link != node) {
+        link = &(*link)->_nextSibling;
+    }
+    if (*link != nullptr) {
+        *link = node->_nextSibling;
+    }
+}
+
 void Arena::Merge(Arena& other)
 {
-    _merged.reserve(_merged.size() + other._merged.size() + 1);
-    std::move(other._merged.begin(), other._merged.end(), std::back_inserter(_merged));
+    for (auto& merged : other._merged) {
+        _merged.push_back(std::move(merged));
+    }
     other._merged.clear();
     _merged.emplace_back(&other, [](Arena* arena) { delete arena; });
     other._mergedInto = this;

@@ -11,7 +11,6 @@ namespace Quillon::Xml {
 namespace {
 
 constexpr std::string_view XmlnsPrefix = "xmlns:";
-constexpr std::string_view XmlNamespace = "http://www.w3.org/XML/1998/namespace";
 
 /** An element with a few attributes and a short text fits in without a second allocation. */
 constexpr std::size_t ComposedChunkSize = 512;
@@ -243,9 +242,8 @@ void ElementNode::AppendChild(Node* child)
     }
     if (child->_parent != nullptr) {
         child->_parent->RemoveChild(child);
-    } else if (child->_arena->GetFirstTopLevel() != nullptr) {
-        // The document around a parsed root is dissolved; nothing else refers to its other nodes.
-        child->_arena->SetFirstTopLevel(nullptr);
+    } else {
+        child->_arena->RemoveTopLevel(child);
     }
     Arena& arena = _arena->GetRoot();
     Arena& childArena = child->_arena->GetRoot();

@@ -2,9 +2,11 @@
 
 #include "quillon/xml/Parser.h"
 
+#include <algorithm>
 #include <cstdint>
 #include <cstring>
 #include <string>
+#include <utility>
 
 namespace Quillon::Xml {
 
@@ -113,11 +115,6 @@ void RequireAsciiStart(std::string_view source)
     }
 }
 
-bool IsBlank(char byte) noexcept
-{
-    return byte == ' ' || byte == '\t' || byte == '\n' || byte == '\r';
-}
-
 /** Counts the attributes of the tag that starts at the front of `text`, up to its end. */
 std::size_t CountAttributes(std::string_view text)
 {
@@ -135,12 +132,50 @@ std::size_t CountAttributes(std::string_view text)
     return count;
 }
 
+/** Tells tags from what only looks like one inside comments, CDATA and instructions. */
+class TagFinder
+{
+public:
+    explicit TagFinder(std::string_view source) noexcept
+        : _source(source)
+    {}
+
+    /** Whether a tag starts at `position`. Asked for rising positions only: linear in all. */
+    bool IsTag(std::size_t position) noexcept
+    {
+        while (_next < position) {
+            _next = _source.find('<', SkipMarkup(_next));
+        }
+        return _next == position && SkipMarkup(_next) == _next + 1;
+    }
+
+private:
+    /** The end of a comment, CDATA section or instruction; of anything else its first octet. */
+    std::size_t SkipMarkup(std::size_t start) const noexcept
+    {
+        const std::string_view rest = _source.substr(start);
+        for (const auto& [open, close] :
+             {std::pair<std::string_view, std::string_view>{"<!--", "-->"},
+              {"<![CDATA[", "]]>"},
+              {"<?", "?>"}}) {
+            if (rest.compare(0, open.size(), open) == 0) {
+                return std::min(_source.find(close, start + open.size()), _source.size());
+            }
+        }
+        return start + 1;
+    }
+
+    std::string_view _source;
+    std::size_t _next = 0;
+};
+
 /**
  * A tag holds no `<` but its first [XML 3.1], so only a long stretch without one can be a tag
  * with too many attributes. Stretches are found from their far end: cheap on any real document.
  */
 void LimitAttributes(std::string_view source)
 {
+    TagFinder tags(source);
     std::size_t start = source.find('<');
     while (start != std::string_view::npos) {
         const std::size_t next = source.substr(0, start + HarmlessTagLength).rfind('<');
@@ -148,11 +183,9 @@ void LimitAttributes(std::string_view source)
             start = next;
             continue;
         }
-        const char first = static_cast<char>(ByteAt(source, start + 1));
-        const bool isTag = !IsBlank(first) && first != '!' && first != '?' && first != '/';
         const std::size_t end = source.find('<', start + 1);
-        if (isTag
-            && CountAttributes(source.substr(start, end - start)) > ParserLimits::MaxAttributes) {
+        if (CountAttributes(source.substr(start, end - start)) > ParserLimits::MaxAttributes
+            && tags.IsTag(start)) {
             Fail(
                 start,
                 "More than " + std::to_string(ParserLimits::MaxAttributes)
