@@ -11,7 +11,7 @@ namespace Quillon::Xml {
 
 namespace {
 
-constexpr std::size_t MaxChunkSize = 256 * 1024;
+constexpr std::size_t MaxChunkSize = std::size_t{256} * 1024;
 
 // Nodes are never destroyed one by one.
 static_assert(std::is_trivially_destructible_v<Attribute>);

@@ -36,6 +36,16 @@ bool Declares(const Attribute& attribute, std::string_view prefix) noexcept
                                 && attribute.name.substr(XmlnsPrefix.size()) == prefix;
 }
 
+const Attribute* FindDeclaration(const AttributeRange& attributes, std::string_view prefix) noexcept
+{
+    for (const Attribute& attribute : attributes) {
+        if (Declares(attribute, prefix)) {
+            return &attribute;
+        }
+    }
+    return nullptr;
+}
+
 } // namespace
 
 const char* ToString(NodeType type) noexcept
@@ -121,11 +131,9 @@ bool ElementNode::LookupNamespace(std::string_view prefix, std::string_view& uri
         if (!element->_declaresNamespaces) {
             continue;
         }
-        for (const Attribute& attribute : element->GetAttributes()) {
-            if (Declares(attribute, prefix)) {
-                uri = attribute.value;
-                return true;
-            }
+        if (const Attribute* found = FindDeclaration(element->GetAttributes(), prefix)) {
+            uri = found->value;
+            return true;
         }
     }
     if (prefix == "xml") {

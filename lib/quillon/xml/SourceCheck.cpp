@@ -76,18 +76,24 @@ unsigned GetSequenceLength(std::string_view source, std::size_t position) noexce
     return rule.length;
 }
 
-void RequireUtf8(std::string_view source)
+/** Whether a whole word of octets starts at `position`, and all of them are ASCII. */
+bool IsAsciiWord(std::string_view source, std::size_t position) noexcept
 {
     constexpr std::uint64_t NotAscii = 0x8080808080808080U;
+    std::uint64_t word = NotAscii;
+    if (position + sizeof word <= source.size()) {
+        std::memcpy(&word, source.data() + position, sizeof word);
+    }
+    return (word & NotAscii) == 0;
+}
+
+void RequireUtf8(std::string_view source)
+{
     std::size_t position = 0;
     while (position < source.size()) {
-        std::uint64_t word = 0;
-        if (position + sizeof word <= source.size()) {
-            std::memcpy(&word, source.data() + position, sizeof word);
-            if ((word & NotAscii) == 0) {
-                position += sizeof word;
-                continue;
-            }
+        if (IsAsciiWord(source, position)) {
+            position += sizeof(std::uint64_t);
+            continue;
         }
         if (ByteAt(source, position) < 0x80U) {
             ++position;

@@ -231,10 +231,15 @@ private:
     {
         for (const ElementNode* ancestor = _apex.GetParent(); ancestor != nullptr;
              ancestor = ancestor->GetParent()) {
-            for (const Attribute& attribute : ancestor->GetAttributes()) {
-                if (attribute.GetPrefix() == "xml" && !HasAttribute(attribute.name)) {
-                    AddAttribute(attribute, *ancestor);
-                }
+            InheritXmlAttributesOf(*ancestor);
+        }
+    }
+
+    void InheritXmlAttributesOf(const ElementNode& ancestor)
+    {
+        for (const Attribute& attribute : ancestor.GetAttributes()) {
+            if (attribute.GetPrefix() == "xml" && !HasAttribute(attribute.name)) {
+                AddAttribute(attribute, ancestor);
             }
         }
     }

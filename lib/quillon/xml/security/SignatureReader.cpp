@@ -180,18 +180,22 @@ void ReadSignedInfo(const ElementNode& element, SignatureModel& model)
     }
 }
 
+void ReadX509Data(const ElementNode& element, KeyInfo& keyInfo)
+{
+    for (ChildCursor child(element); child.Get() != nullptr; child.Advance()) {
+        if (child.IsAt("X509Certificate")) {
+            keyInfo.certificates.push_back(ReadBase64(*child.Get()));
+        }
+    }
+}
+
 /** Gathers the certificates; whatever else a key information may hold picks no trusted key. */
 KeyInfo ReadKeyInfo(const ElementNode& element)
 {
     KeyInfo keyInfo;
     for (ChildCursor data(element); data.Get() != nullptr; data.Advance()) {
-        if (!data.IsAt("X509Data")) {
-            continue;
-        }
-        for (ChildCursor item(*data.Get()); item.Get() != nullptr; item.Advance()) {
-            if (item.IsAt("X509Certificate")) {
-                keyInfo.certificates.push_back(ReadBase64(*item.Get()));
-            }
+        if (data.IsAt("X509Data")) {
+            ReadX509Data(*data.Get(), keyInfo);
         }
     }
     return keyInfo;
