@@ -31,6 +31,14 @@ def says(message):
     return [{"class": PARSE, "message": message}]
 
 
+def syntax(message):
+    return says("Signature syntax error: " + message)
+
+
+def outside(message):
+    return [{"class": SIGNATURE, "message": "Signature verification error. " + message}]
+
+
 def begins(prefix):
     return [{"class": PARSE, "prefix": prefix}]
 
