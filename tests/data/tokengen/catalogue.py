@@ -58,6 +58,11 @@ def signed(token, *edits, key="sts", **forms):
     return signing.sign(text, keys.private_key(key), **forms)
 
 
+def value_of(text, element):
+    start = text.index(f"<ds:{element}>") + len(f"<ds:{element}>")
+    return text[start:text.index(f"</ds:{element}>", start)]
+
+
 class Catalogue:
     def __init__(self, directory):
         self._directory = directory

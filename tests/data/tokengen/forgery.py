@@ -9,7 +9,7 @@ from .accepted import DELEGATES, LEAN, LEAN_HOLDER, rsa_key_value
 from .assertion import ID, key_info
 from .catalogue import (
     MALFORMED, NOT_COVERED, OUTSIDE_PROFILE, SIGNATURE_SYNTAX, TAMPERED, outside, replaced, says,
-    signed, syntax)
+    signed, syntax, value_of)
 
 SYNTAX_OR_OUTSIDE = SIGNATURE_SYNTAX + OUTSIDE_PROFILE
 BASE64_DIGITS = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/"
@@ -70,11 +70,6 @@ def elsewhere(uri):
     return outside(f"Reference '{uri}' does not name the element that encloses the signature")
 
 
-def _value_of(text, element):
-    start = text.index(f"<ds:{element}>") + len(f"<ds:{element}>")
-    return text[start:text.index(f"</ds:{element}>", start)]
-
-
 def _changed_digit(value, position):
     old = value[position]
     new = BASE64_DIGITS[(BASE64_DIGITS.index(old) + 1) % 64]
@@ -88,13 +83,13 @@ def _tampering(c):
         for edit in edits:
             text = replaced(text, *edit)
         c.refuse("tampered-" + name, "changed after it was signed", text, refusals, "invalid")
-    digest, value = _value_of(good, "DigestValue"), _value_of(good, "SignatureValue")
+    digest, value = value_of(good, "DigestValue"), value_of(good, "SignatureValue")
     for name, position in (("first", 0), ("middle", 20)):
         add(f"digest-{name}-digit", (digest, _changed_digit(digest, position)))
     for name, position in (("first", 0), ("middle", 170), ("last", 340)):
         add(f"signature-{name}-digit", (value, _changed_digit(value, position)))
     add("digest-of-another", (digest, base64.b64encode(bytes(32)).decode()))
-    add("signature-of-another", (value, _value_of(signed(LEAN), "SignatureValue")))
+    add("signature-of-another", (value, value_of(signed(LEAN), "SignatureValue")))
     short = OUTSIDE_PROFILE + TAMPERED + SIGNATURE_SYNTAX
     add("digest-empty", (digest, ""), refusals=short)
     add("digest-cut", (digest, digest[:40]), refusals=short)
@@ -190,7 +185,7 @@ def _other_keys(c):
              signed(LEAN.signed_as(key_info=key_info("weak")), key="weak"), OUTSIDE_PROFILE,
              "valid", trust=["sts", "weak"])
     ecdsa = signed(LEAN.signed_as(method=names.ECDSA_SHA256), key="sts-p256")
-    value = _value_of(ecdsa, "SignatureValue")
+    value = value_of(ecdsa, "SignatureValue")
     for name, forged in (("zeros", bytes(64)), ("odd-length", base64.b64decode(value)[:-1]),
                          ("longer", base64.b64decode(value) + b"\0"),
                          ("der", _der(base64.b64decode(value)))):
@@ -289,7 +284,7 @@ def _references(c):
     # The second, genuine SignedInfo stands where a careless search finds it first.
     good = signed(LEAN)
     info = good[good.index("<ds:SignedInfo>"):good.index("<ds:SignatureValue>")]
-    forged = replaced(info, _value_of(good, "DigestValue"), base64.b64encode(bytes(32)).decode())
+    forged = replaced(info, value_of(good, "DigestValue"), base64.b64encode(bytes(32)).decode())
     for name, order in (("genuine-first", info + forged), ("forged-first", forged + info)):
         c.refuse(f"reference-two-signed-infos-{name}", "a second SignedInfo",
                  replaced(good, info, order), second_info)
