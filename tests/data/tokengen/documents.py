@@ -26,6 +26,8 @@ def write_all(directory):
         "whole-signed-in-a-part": f"<r><p>a{_signature('')}</p>b</r>",
         "uri-without-hash": f'<r ID="_r">a{_signature("x_r")}</r>',
         "uri-of-hash-only": f'<r ID="">a{_signature("#")}</r>',
+        "namespace-like-an-id": f'<r ID="urn:r"><p xmlns:id="urn:r"/>{_signature("#urn:r")}</r>',
+        "id-twice": f'<r ID="urn:r"><p xmlns:x="urn:x" x:id="urn:r"/>{_signature("#urn:r")}</r>',
         "uri-of-another": f'<r xmlns:w="urn:w" ID="_r"><p w:Id="_p"/>{_signature("#_p")}</r>',
     }
     for stale in set(directory.glob("*.xml")) - {directory / f"{name}.xml" for name in texts}:
