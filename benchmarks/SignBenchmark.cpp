@@ -18,7 +18,7 @@ SsoClient::HolderOfKeyConfig MakeIdentity()
         Quillon::Crypto::ParsePemCertificates(ReadFile("keys/client-cert.pem")).front()};
 }
 
-void BM_Own(benchmark::State& state, const SsoClient::RequestBuilderImpl& builder)
+void MeasureOwn(benchmark::State& state, const SsoClient::RequestBuilderImpl& builder)
 {
     SsoClient::TokenSpec spec;
     spec.tokenLifetimeSec = 300;
@@ -29,7 +29,7 @@ void BM_Own(benchmark::State& state, const SsoClient::RequestBuilderImpl& builde
     }
 }
 
-void BM_Floor(benchmark::State& state, const SignFloor& floor)
+void MeasureFloor(benchmark::State& state, const SignFloor& floor)
 {
     for (auto _ : state) {
         if (!floor.Run()) {
@@ -42,12 +42,12 @@ void BM_Floor(benchmark::State& state, const SignFloor& floor)
 
 void RegisterSignBenchmarks()
 {
-    static const SignFloor Floor(ReadFile("keys/client-key.pem"));
-    static const SsoClient::RequestBuilderImpl Builder(MakeIdentity());
+    static const SignFloor floor(ReadFile("keys/client-key.pem"));
+    static const SsoClient::RequestBuilderImpl builder(MakeIdentity());
     benchmark::RegisterBenchmark(
-        "Floor/Sign/certificate", [](benchmark::State& state) { BM_Floor(state, Floor); });
+        "Floor/Sign/certificate", [](benchmark::State& state) { MeasureFloor(state, floor); });
     benchmark::RegisterBenchmark(
-        "Own/Sign/certificate", [](benchmark::State& state) { BM_Own(state, Builder); });
+        "Own/Sign/certificate", [](benchmark::State& state) { MeasureOwn(state, builder); });
 }
 
 } // namespace Benchmarks

@@ -39,7 +39,7 @@ void RequireSignature(
     const std::string& id,
     const std::string& certificateDer)
 {
-    const SignatureParts parts = ReadSignature(signature, SignatureKind::Assertion);
+    const SignatureParts parts = ReadSignature(signature, SignatureKind::ASSERTION);
     if (parts.references.size() != 1 || parts.references.front().uri != "#" + id) {
         throw ShapeError("The signature of the token must cover the token and nothing else");
     }

@@ -100,7 +100,7 @@ std::string RequireDelegatesKey(const TokenRequest& wanted, const Users& users)
 void SetConfirmation(
     Assertion& assertion, const Sender& sender, const TokenRequest& wanted, const Users& users)
 {
-    if (wanted.keyType == KeyType::PublicKey) {
+    if (wanted.keyType == KeyType::PUBLIC_KEY) {
         assertion.confirmationCertificateDer = wanted.delegateTo
                                                    ? RequireDelegatesKey(wanted, users)
                                                    : RequireProvenKey(sender, wanted);

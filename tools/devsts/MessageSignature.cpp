@@ -86,7 +86,7 @@ MessageSignature::MessageSignature(const Request& request)
     : _request(request)
 {
     try {
-        const SignatureParts parts = ReadSignature(request.signature, SignatureKind::Message);
+        const SignatureParts parts = ReadSignature(request.signature, SignatureKind::MESSAGE);
         RequireReferences(parts, request);
         _id = parts.id;
         _value = parts.value;

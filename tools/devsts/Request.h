@@ -14,14 +14,14 @@ namespace DevSts {
 
 enum class Operation
 {
-    Issue,
-    Renew,
-    Validate
+    ISSUE,
+    RENEW,
+    VALIDATE
 };
 enum class KeyType
 {
-    Bearer,
-    PublicKey
+    BEARER,
+    PUBLIC_KEY
 };
 
 struct Interval
@@ -51,7 +51,7 @@ struct Advice
 /** The content of wst:RequestSecurityToken, as far as the operation has it. */
 struct TokenRequest
 {
-    KeyType keyType = KeyType::Bearer;
+    KeyType keyType = KeyType::BEARER;
     std::optional<Interval> lifetime;
     bool renewable = false;
     bool delegable = false;
@@ -65,7 +65,7 @@ struct TokenRequest
 struct Request
 {
     XmlDocument doc; ///< owns every node below
-    Operation operation = Operation::Issue;
+    Operation operation = Operation::ISSUE;
     xmlNode* body = nullptr;
     xmlNode* timestamp = nullptr;
     Interval freshness;

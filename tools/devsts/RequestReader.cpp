@@ -18,9 +18,9 @@ struct OperationNames
 };
 
 constexpr std::array<OperationNames, 3> Operations{{
-    {Operation::Issue, Names::ActionIssue, Names::RequestIssue, Names::Saml},
-    {Operation::Renew, Names::ActionRenew, Names::RequestRenew, Names::Saml},
-    {Operation::Validate, Names::ActionValidate, Names::RequestValidate, Names::TokenStatus},
+    {Operation::ISSUE, Names::ActionIssue, Names::RequestIssue, Names::Saml},
+    {Operation::RENEW, Names::ActionRenew, Names::RequestRenew, Names::Saml},
+    {Operation::VALIDATE, Names::ActionValidate, Names::RequestValidate, Names::TokenStatus},
 }};
 
 const OperationNames& ReadAction(const std::optional<std::string>& soapAction)
@@ -144,10 +144,10 @@ KeyType ReadKeyType(const xmlNode* element)
 {
     const std::string text = PlainText(element);
     if (text == Names::KeyBearer) {
-        return KeyType::Bearer;
+        return KeyType::BEARER;
     }
     if (text == Names::KeyPublic) {
-        return KeyType::PublicKey;
+        return KeyType::PUBLIC_KEY;
     }
     throw ShapeError(
         "The KeyType must be the Bearer or the PublicKey identifier, not '" + text + "'");
@@ -301,14 +301,14 @@ void ReadBody(Request& request, const OperationNames& names)
     RequireText(children.Take({Names::Wst, "TokenType"}), names.tokenType);
     RequireText(children.Take({Names::Wst, "RequestType"}), names.requestType);
     switch (names.operation) {
-    case Operation::Issue:
+    case Operation::ISSUE:
         ReadIssueRequest(children, request.token);
         break;
-    case Operation::Renew:
+    case Operation::RENEW:
         request.token.lifetime = ReadLifetime(children.Take({Names::Wst, "Lifetime"}));
         request.token.target = ReadTarget(children.Take({Names::Wst, "RenewTarget"}));
         break;
-    case Operation::Validate:
+    case Operation::VALIDATE:
         request.token.target = ReadTarget(children.Take({Names::Wst, "ValidateTarget"}));
         break;
     }

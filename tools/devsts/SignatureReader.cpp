@@ -55,7 +55,7 @@ void RequireTransforms(const xmlNode* element, SignatureKind kind)
 {
     AllowAttributes(element, {});
     ChildCursor children(element);
-    if (kind == SignatureKind::Assertion) {
+    if (kind == SignatureKind::ASSERTION) {
         RequirePlainAlgorithm(children.Take({Names::Ds, "Transform"}), Enveloped);
         RequireListedPrefixes(children.Take({Names::Ds, "Transform"}));
     } else {

@@ -11,8 +11,8 @@ namespace DevSts {
 /** How each reference of a signature has to be transformed. */
 enum class SignatureKind
 {
-    Message,  ///< exclusive canonicalization
-    Assertion ///< enveloped signature, then exclusive canonicalization, which may list prefixes
+    MESSAGE,  ///< exclusive canonicalization
+    ASSERTION ///< enveloped signature, then exclusive canonicalization, which may list prefixes
 };
 
 struct SignedReference

@@ -3,6 +3,7 @@
 #include "devsts/Names.h"
 #include "devsts/XmlSec.h"
 
+#include <libxml/parser.h>
 #include <mutex>
 #include <stdexcept>
 #include <xmlsec/errors.h>
@@ -70,6 +71,8 @@ void InitializeXmlSec()
 {
     static std::once_flag once;
     std::call_once(once, [] {
+        // Neither libxml2 nor xmlsec1 makes its first use safe for several threads.
+        xmlInitParser();
         Require(
             xmlSecInit() == 0 && xmlSecOpenSSLAppInit(nullptr) == 0 && xmlSecOpenSSLInit() == 0,
             "initialisation");

@@ -61,11 +61,11 @@ std::string TokenService::Handle(const ReceivedRequest& received)
     const Users users = Users::Load(_state.Dir());
     Authenticate(users, now).RequireFresh(request);
     switch (request.operation) {
-    case Operation::Issue:
+    case Operation::ISSUE:
         return Issue(request, users, now);
-    case Operation::Renew:
+    case Operation::RENEW:
         return Renew(request, users, now);
-    case Operation::Validate:
+    case Operation::VALIDATE:
         return Validate(request, users, now);
     }
     throw std::runtime_error("unknown operation");

@@ -11,7 +11,7 @@ namespace Quillon::Xml {
 
 namespace {
 
-constexpr std::size_t MaxChunkSize = 256 * 1024;
+constexpr std::size_t MaxChunkSize = std::size_t{256} * 1024;
 
 // Nodes are never destroyed one by one.
 static_assert(std::is_trivially_destructible_v<Attribute>);
@@ -100,10 +100,22 @@ ProcessingInstructionNode* Arena::NewProcessingInstruction(
         ProcessingInstructionNode(this, target, data);
 }
 
+void Arena::RemoveTopLevel(Node* node) noexcept
+{
+    Node** link = &_firstTopLevel;
+    while (*link != nullptr && *link != node) {
+        link = &(*link)->_nextSibling;
+    }
+    if (*link != nullptr) {
+        *link = node->_nextSibling;
+    }
+}
+
 void Arena::Merge(Arena& other)
 {
-    _merged.reserve(_merged.size() + other._merged.size() + 1);
-    std::move(other._merged.begin(), other._merged.end(), std::back_inserter(_merged));
+    for (auto& merged : other._merged) {
+        _merged.push_back(std::move(merged));
+    }
     other._merged.clear();
     _merged.emplace_back(&other, [](Arena* arena) { delete arena; });
     other._mergedInto = this;

@@ -68,6 +68,9 @@ public:
     Node* GetFirstTopLevel() const noexcept { return _firstTopLevel; }
     void SetFirstTopLevel(Node* node) noexcept { _firstTopLevel = node; }
 
+    /** Takes `node` out of the document's top level, if it stands there. */
+    void RemoveTopLevel(Node* node) noexcept;
+
     friend void intrusive_ptr_add_ref(Arena* arena) noexcept
     {
         arena->GetRoot()._count.fetch_add(1, std::memory_order_relaxed);

@@ -11,7 +11,6 @@ namespace Quillon::Xml {
 namespace {
 
 constexpr std::string_view XmlnsPrefix = "xmlns:";
-constexpr std::string_view XmlNamespace = "http://www.w3.org/XML/1998/namespace";
 
 /** An element with a few attributes and a short text fits in without a second allocation. */
 constexpr std::size_t ComposedChunkSize = 512;
@@ -35,6 +34,16 @@ bool Declares(const Attribute& attribute, std::string_view prefix) noexcept
     return prefix.empty() ? attribute.name.size() == XmlnsPrefix.size() - 1
                           : attribute.name.size() == XmlnsPrefix.size() + prefix.size()
                                 && attribute.name.substr(XmlnsPrefix.size()) == prefix;
+}
+
+const Attribute* FindDeclaration(const AttributeRange& attributes, std::string_view prefix) noexcept
+{
+    for (const Attribute& attribute : attributes) {
+        if (Declares(attribute, prefix)) {
+            return &attribute;
+        }
+    }
+    return nullptr;
 }
 
 } // namespace
@@ -122,11 +131,9 @@ bool ElementNode::LookupNamespace(std::string_view prefix, std::string_view& uri
         if (!element->_declaresNamespaces) {
             continue;
         }
-        for (const Attribute& attribute : element->GetAttributes()) {
-            if (Declares(attribute, prefix)) {
-                uri = attribute.value;
-                return true;
-            }
+        if (const Attribute* found = FindDeclaration(element->GetAttributes(), prefix)) {
+            uri = found->value;
+            return true;
         }
     }
     if (prefix == "xml") {
@@ -243,9 +250,8 @@ void ElementNode::AppendChild(Node* child)
     }
     if (child->_parent != nullptr) {
         child->_parent->RemoveChild(child);
-    } else if (child->_arena->GetFirstTopLevel() != nullptr) {
-        // The document around a parsed root is dissolved; nothing else refers to its other nodes.
-        child->_arena->SetFirstTopLevel(nullptr);
+    } else {
+        child->_arena->RemoveTopLevel(child);
     }
     Arena& arena = _arena->GetRoot();
     Arena& childArena = child->_arena->GetRoot();

@@ -2,9 +2,11 @@
 
 #include "quillon/xml/Parser.h"
 
+#include <algorithm>
 #include <cstdint>
 #include <cstring>
 #include <string>
+#include <utility>
 
 namespace Quillon::Xml {
 
@@ -74,18 +76,24 @@ unsigned GetSequenceLength(std::string_view source, std::size_t position) noexce
     return rule.length;
 }
 
-void RequireUtf8(std::string_view source)
+/** Whether a whole word of octets starts at `position`, and all of them are ASCII. */
+bool IsAsciiWord(std::string_view source, std::size_t position) noexcept
 {
     constexpr std::uint64_t NotAscii = 0x8080808080808080U;
+    std::uint64_t word = NotAscii;
+    if (position + sizeof word <= source.size()) {
+        std::memcpy(&word, source.data() + position, sizeof word);
+    }
+    return (word & NotAscii) == 0;
+}
+
+void RequireUtf8(std::string_view source)
+{
     std::size_t position = 0;
     while (position < source.size()) {
-        std::uint64_t word = 0;
-        if (position + sizeof word <= source.size()) {
-            std::memcpy(&word, source.data() + position, sizeof word);
-            if ((word & NotAscii) == 0) {
-                position += sizeof word;
-                continue;
-            }
+        if (IsAsciiWord(source, position)) {
+            position += sizeof(std::uint64_t);
+            continue;
         }
         if (ByteAt(source, position) < 0x80U) {
             ++position;
@@ -113,11 +121,6 @@ void RequireAsciiStart(std::string_view source)
     }
 }
 
-bool IsBlank(char byte) noexcept
-{
-    return byte == ' ' || byte == '\t' || byte == '\n' || byte == '\r';
-}
-
 /** Counts the attributes of the tag that starts at the front of `text`, up to its end. */
 std::size_t CountAttributes(std::string_view text)
 {
@@ -135,12 +138,50 @@ std::size_t CountAttributes(std::string_view text)
     return count;
 }
 
+/** Tells tags from what only looks like one inside comments, CDATA and instructions. */
+class TagFinder
+{
+public:
+    explicit TagFinder(std::string_view source) noexcept
+        : _source(source)
+    {}
+
+    /** Whether a tag starts at `position`. Asked for rising positions only: linear in all. */
+    bool IsTag(std::size_t position) noexcept
+    {
+        while (_next < position) {
+            _next = _source.find('<', SkipMarkup(_next));
+        }
+        return _next == position && SkipMarkup(_next) == _next + 1;
+    }
+
+private:
+    /** The end of a comment, CDATA section or instruction; of anything else its first octet. */
+    std::size_t SkipMarkup(std::size_t start) const noexcept
+    {
+        const std::string_view rest = _source.substr(start);
+        for (const auto& [open, close] :
+             {std::pair<std::string_view, std::string_view>{"<!--", "-->"},
+              {"<![CDATA[", "]]>"},
+              {"<?", "?>"}}) {
+            if (rest.compare(0, open.size(), open) == 0) {
+                return std::min(_source.find(close, start + open.size()), _source.size());
+            }
+        }
+        return start + 1;
+    }
+
+    std::string_view _source;
+    std::size_t _next = 0;
+};
+
 /**
  * A tag holds no `<` but its first [XML 3.1], so only a long stretch without one can be a tag
  * with too many attributes. Stretches are found from their far end: cheap on any real document.
  */
 void LimitAttributes(std::string_view source)
 {
+    TagFinder tags(source);
     std::size_t start = source.find('<');
     while (start != std::string_view::npos) {
         const std::size_t next = source.substr(0, start + HarmlessTagLength).rfind('<');
@@ -148,11 +189,9 @@ void LimitAttributes(std::string_view source)
             start = next;
             continue;
         }
-        const char first = static_cast<char>(ByteAt(source, start + 1));
-        const bool isTag = !IsBlank(first) && first != '!' && first != '?' && first != '/';
         const std::size_t end = source.find('<', start + 1);
-        if (isTag
-            && CountAttributes(source.substr(start, end - start)) > ParserLimits::MaxAttributes) {
+        if (CountAttributes(source.substr(start, end - start)) > ParserLimits::MaxAttributes
+            && tags.IsTag(start)) {
             Fail(
                 start,
                 "More than " + std::to_string(ParserLimits::MaxAttributes)

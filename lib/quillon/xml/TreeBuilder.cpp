@@ -39,13 +39,22 @@ std::string_view TakeName(std::string_view& text) noexcept
     return name;
 }
 
+/** The tag was read twice, by the parser and here, with different results. */
+[[noreturn]] void ThrowUnlikeTheParser()
+{
+    throw XMLParseException("A tag is not what the parser found in it");
+}
+
 /** Takes `= "value"` off the front of a tag's text, and gives the value as it is written. */
 std::string_view TakeRawValue(std::string_view& text) noexcept
 {
     SkipBlanks(text);
-    text.remove_prefix(1);
+    text.remove_prefix(std::min<std::size_t>(1, text.size()));
     SkipBlanks(text);
-    const std::size_t close = text.find(text.front(), 1);
+    const std::size_t close = text.empty() ? std::string_view::npos : text.find(text.front(), 1);
+    if (close == std::string_view::npos) {
+        ThrowUnlikeTheParser();
+    }
     const std::string_view value = text.substr(1, close - 1);
     text.remove_prefix(close + 1);
     return value;
@@ -70,9 +79,15 @@ TreeBuilder::TreeBuilder(Ref<Arena> arena, std::string_view source)
 void TreeBuilder::StartElement(const TagEvent& tag)
 {
     FlushText();
+    if (!IsInSource({tag.tagEnd, 0})) {
+        throw XMLParseException("The parser does not read the text in place");
+    }
     // A tag holds no `<` but its first, so the one before the end is its start [XML 3.1].
     const std::size_t length = static_cast<std::size_t>(tag.tagEnd - _source.data());
     const auto* start = static_cast<const char*>(memrchr(_source.data(), '<', length));
+    if (start == nullptr) {
+        throw XMLParseException("A tag does not start where the parser found one");
+    }
     std::string_view text(start + 1, static_cast<std::size_t>(tag.tagEnd - start) - 1);
 
     ElementNode* element = _arena->NewElement(TakeName(text));
@@ -184,11 +199,15 @@ void TreeBuilder::ReadAttributes(ElementNode& element, std::string_view text, Ta
         const std::string_view raw = TakeRawValue(text);
         if (attribute.IsNamespaceDeclaration()) {
             element._declaresNamespaces = true;
-            attribute.value = attribute.name == "xmlns:xml" ? raw : TakeNamespace(raw, tag);
+            attribute.value =
+                attribute.name == "xmlns:xml" ? XmlNamespace : TakeNamespace(raw, tag);
         } else {
             attribute.value = TakeAttribute(raw, tag);
         }
         _attributes.push_back(attribute);
+    }
+    if (tag.namespaceCount != 0 || tag.attributeCount != 0) {
+        ThrowUnlikeTheParser();
     }
     if (_attributes.empty()) {
         return;
@@ -203,16 +222,24 @@ void TreeBuilder::ReadAttributes(ElementNode& element, std::string_view text, Ta
 
 std::string_view TreeBuilder::TakeNamespace(std::string_view raw, TagEvent& tag)
 {
+    if (tag.namespaceCount == 0) {
+        ThrowUnlikeTheParser();
+    }
     const std::string_view uri = ToView(tag.namespaces[1]);
     tag.namespaces += 2;
+    --tag.namespaceCount;
     return uri == raw ? raw : _arena->CopyText(uri);
 }
 
 std::string_view TreeBuilder::TakeAttribute(std::string_view raw, TagEvent& tag)
 {
+    if (tag.attributeCount == 0) {
+        ThrowUnlikeTheParser();
+    }
     const auto* begin = reinterpret_cast<const char*>(tag.attributes[3]);
     const auto* end = reinterpret_cast<const char*>(tag.attributes[4]);
     tag.attributes += 5;
+    --tag.attributeCount;
     // The parser points into the text where the value stands there as it is.
     return begin == raw.data() && end == raw.data() + raw.size()
                ? raw

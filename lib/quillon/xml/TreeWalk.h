@@ -34,12 +34,9 @@ void WalkTree(const ElementNode& apex, const Node* excluded, Visitor& visitor)
     const ElementNode* parent = &apex;
     visitor.Enter(apex);
     const Node* node = apex.GetFirstChild();
-    while (true) {
+    while (node != nullptr || parent != &apex) {
         if (node == nullptr) {
             visitor.Leave(*parent);
-            if (parent == &apex) {
-                return;
-            }
             node = parent->GetNextSibling();
             parent = parent->GetParent();
         } else if (node == excluded) {
@@ -53,6 +50,7 @@ void WalkTree(const ElementNode& apex, const Node* excluded, Visitor& visitor)
             node = node->GetNextSibling();
         }
     }
+    visitor.Leave(apex);
 }
 
 } // namespace Quillon::Xml

@@ -8,6 +8,7 @@
 #include <libxml/parserInternals.h>
 #include <libxml/xmlerror.h>
 
+#include <algorithm>
 #include <cstring>
 #include <exception>
 #include <memory>
@@ -84,6 +85,7 @@ private:
         handlers.startElementNs = &OnStartElement;
         handlers.endElementNs = &OnEndElement;
         handlers.characters = &OnCharacters;
+        // Called where the host has turned off libxml2's global default to keep blanks.
         handlers.ignorableWhitespace = &OnCharacters;
         handlers.cdataBlock = &OnCharacters;
         handlers.comment = &OnComment;
@@ -103,20 +105,23 @@ private:
         }
         try {
             step();
-        } catch (const XMLParseException& error) {
-            Fail(std::string(error.what()) + GetPosition());
         } catch (...) {
             _failure = std::current_exception();
             xmlStopParser(&_context);
         }
     }
 
-    void Fail(const std::string& message) noexcept
+    /** The same for a step whose failures do not say where they are. */
+    template <class Step>
+    void GuardHere(Step step) noexcept
     {
-        if (!_failure) {
-            _failure = std::make_exception_ptr(XMLParseException(message));
-        }
-        xmlStopParser(&_context);
+        Guard([&] {
+            try {
+                step();
+            } catch (const XMLParseException& error) {
+                throw XMLParseException(error.what() + GetPosition());
+            }
+        });
     }
 
     std::string GetPosition() const
@@ -128,7 +133,7 @@ private:
     static void OnStartDocument(void* data)
     {
         SaxRun& run = From(data);
-        run.Guard([&run] { run.RequireDeclaration(); });
+        run.GuardHere([&run] { run.RequireDeclaration(); });
     }
 
     /** [XML 2.8]: whatever the declaration says must be what the text was checked to be. */
@@ -152,7 +157,7 @@ private:
         const xmlChar* /*publicId*/,
         const xmlChar* /*systemId*/)
     {
-        From(data).Guard([] { throw XMLParseException("A DOCTYPE is not accepted"); });
+        From(data).GuardHere([] { throw XMLParseException("A DOCTYPE is not accepted"); });
     }
 
     static void OnStartElement(
@@ -167,7 +172,7 @@ private:
         const xmlChar** attributes)
     {
         SaxRun& run = From(data);
-        run.Guard([&] {
+        run.GuardHere([&] {
             run._builder.StartElement(TagEvent{
                 reinterpret_cast<const char*>(run._context.input->cur),
                 namespaces,
@@ -181,13 +186,13 @@ private:
         void* data, const xmlChar* /*localName*/, const xmlChar* /*prefix*/, const xmlChar* /*uri*/)
     {
         SaxRun& run = From(data);
-        run.Guard([&run] { run._builder.EndElement(); });
+        run.GuardHere([&run] { run._builder.EndElement(); });
     }
 
     static void OnCharacters(void* data, const xmlChar* text, int length)
     {
         SaxRun& run = From(data);
-        run.Guard([&] {
+        run.GuardHere([&] {
             run._builder.Characters(
                 {reinterpret_cast<const char*>(text), static_cast<std::size_t>(length)});
         });
@@ -196,13 +201,13 @@ private:
     static void OnComment(void* data, const xmlChar* text)
     {
         SaxRun& run = From(data);
-        run.Guard([&] { run._builder.Comment(ToView(text)); });
+        run.GuardHere([&] { run._builder.Comment(ToView(text)); });
     }
 
     static void OnProcessingInstruction(void* data, const xmlChar* target, const xmlChar* text)
     {
         SaxRun& run = From(data);
-        run.Guard([&] { run._builder.ProcessingInstruction(ToView(target), ToView(text)); });
+        run.GuardHere([&] { run._builder.ProcessingInstruction(ToView(target), ToView(text)); });
     }
 
     static void OnError(void* data, xmlError* error)
@@ -212,10 +217,11 @@ private:
                                  || (error->domain == XML_FROM_NAMESPACE
                                      && error->code == XML_NS_ERR_UNDEFINED_NAMESPACE);
         if (!isTolerated) {
-            SaxRun& run = From(data);
-            run.Fail(
-                CleanMessage(error->message) + " at line " + std::to_string(error->line)
-                + ", column " + std::to_string(error->int2));
+            From(data).Guard([error] {
+                throw XMLParseException(
+                    CleanMessage(error->message) + " at line " + std::to_string(error->line)
+                    + ", column " + std::to_string(error->int2));
+            });
         }
     }
 
@@ -302,7 +308,9 @@ std::string ReadAll(Reader& reader)
     std::string text;
     std::size_t size = 0;
     while (size <= ParserLimits::MaxDocumentBytes) {
-        text.resize(size + std::max<std::size_t>(reader.GetSizeHint(), 4096));
+        text.resize(
+            size
+            + std::clamp<std::size_t>(reader.GetSizeHint(), 4096, ParserLimits::MaxDocumentBytes));
         const std::size_t count = reader.Read(text.data() + size, text.size() - size);
         size += count;
         if (count == 0) {

@@ -237,13 +237,20 @@ protected:
         const auto& [operation, course] = GetParam();
         server.OnNextReply([this, &change = course.change](
                                const DevSts::ReceivedRequest& request, DevSts::Reply& reply) {
-            received = request.body;
-            if (reply.body.find("<saml:Assertion") != std::string::npos) {
-                PlantAssertion(reply.body);
+            {
+                const std::lock_guard<std::mutex> lock(mutex);
+                seenRequest = request.body;
+                seenReply = reply.body;
             }
             change(request, reply);
         });
-        return RunWithoutHook(operation);
+        const std::string text = RunWithoutHook(operation);
+        const std::lock_guard<std::mutex> lock(mutex);
+        if (operation.givesToken) {
+            PlantAssertion(seenReply);
+        }
+        received = seenRequest;
+        return text;
     }
 
     std::string RunWithoutHook(const Operation& operation)
@@ -276,6 +283,9 @@ protected:
     TokenPtr presented;
     std::vector<std::string> secrets;
     std::string received;
+    std::mutex mutex;
+    std::string seenRequest; ///< by the server's thread, which gave `seenReply`
+    std::string seenReply;
     bool succeeded = false;
     LogRecorder log;
 };

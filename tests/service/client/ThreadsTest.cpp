@@ -128,11 +128,13 @@ private:
 void ExpectRightResults(const SecurityTokenService& service, int operationsPerThread)
 {
     std::vector<Worker> workers;
+    workers.reserve(ThreadCount);
     for (int index = 0; index < ThreadCount; ++index) {
         workers.emplace_back(service, index, operationsPerThread);
     }
     std::latch start(ThreadCount);
     std::vector<std::thread> threads;
+    threads.reserve(ThreadCount);
     for (Worker& worker : workers) {
         threads.emplace_back([&worker, &start] {
             start.arrive_and_wait();

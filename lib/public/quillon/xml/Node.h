@@ -25,6 +25,9 @@ namespace Quillon::Xml {
 class Arena;
 class ElementNode;
 
+/** What the prefix `xml` is bound to [XML Names 3]. */
+inline constexpr std::string_view XmlNamespace = "http://www.w3.org/XML/1998/namespace";
+
 enum class NodeType : std::uint8_t
 {
     ELEMENT,
@@ -187,7 +190,10 @@ public:
         return _prefixLength == 0 ? _name : _name.substr(_prefixLength + 1);
     }
 
-    /** Where the element's tag starts in the parsed text, from 1; 0 for a composed element. */
+    /**
+     * Where the element's tag starts in the parsed text, from 1, the column in octets; 0 for a
+     * composed element.
+     */
     unsigned GetLine() const noexcept;
     unsigned GetColumn() const noexcept;
 

@@ -1,4 +1,5 @@
 #include "xml/security/Algorithms.h"
+#include "core/Quote.h"
 
 #include "quillon/xml/security/Exceptions.h"
 #include "quillon/xml/security/Identifiers.h"
@@ -37,8 +38,7 @@ const SignatureAlgorithm& GetSignatureAlgorithm(std::string_view identifier)
             return identifier == algorithm.identifier;
         });
     if (found == SignatureAlgorithms.end()) {
-        throw XmlSecurityException(
-            "Signature algorithm '" + std::string(identifier) + "' is not accepted");
+        throw XmlSecurityException("Signature algorithm " + Quote(identifier) + " is not accepted");
     }
     return *found;
 }
@@ -54,8 +54,7 @@ Crypto::HashAlgorithm GetDigestAlgorithm(std::string_view identifier)
     if (identifier == DigestSha512) {
         return HashAlgorithm::SHA512;
     }
-    throw XmlSecurityException(
-        "Digest algorithm '" + std::string(identifier) + "' is not accepted");
+    throw XmlSecurityException("Digest algorithm " + Quote(identifier) + " is not accepted");
 }
 
 bool IsAcceptedKey(const SignatureAlgorithm& algorithm, Crypto::KeyType type, int bits) noexcept

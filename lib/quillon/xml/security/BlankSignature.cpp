@@ -1,3 +1,4 @@
+#include "core/Quote.h"
 #include "quillon/StringUtil.h"
 #include "quillon/xml/security/Identifiers.h"
 #include "quillon/xml/security/Signature.h"
@@ -16,7 +17,7 @@ void RequireExclusive(const std::string& identifier)
 {
     if (identifier != ExclusiveC14n) {
         throw XmlSecurityException(
-            "Signing uses Exclusive XML Canonicalization, not '" + identifier + "'");
+            "Signing uses Exclusive XML Canonicalization, not " + Quote(identifier));
     }
 }
 
@@ -90,7 +91,7 @@ public:
     Reference* AddReference(const std::string& uri) override
     {
         if (uri.size() < 2 || uri.front() != '#') {
-            throw XmlSecurityException("Reference '" + uri + "' is not of the form '#ID'");
+            throw XmlSecurityException("Reference " + Quote(uri) + " is not of the form '#ID'");
         }
         return &_references.emplace_back(uri);
     }
@@ -103,8 +104,8 @@ public:
     {
         if (!IsAcceptedKey(_algorithm, key->GetKeyType(), key->GetBits())) {
             throw XmlSecurityException(
-                "A key of type " + key->GetDescription() + " cannot sign with '"
-                + _algorithm.identifier + "'");
+                "A key of type " + key->GetDescription() + " cannot sign with "
+                + Quote(_algorithm.identifier));
         }
         if (_element->GetFirstChild() != nullptr) {
             throw InvalidStateException("A signature is signed only once");

@@ -1,4 +1,5 @@
 #include "xml/security/Canonicalization.h"
+#include "core/Quote.h"
 
 #include "quillon/xml/security/Canonicalizer.h"
 #include "quillon/xml/security/Identifiers.h"
@@ -11,8 +12,6 @@
 namespace Quillon::Xml::Security {
 
 namespace {
-
-constexpr std::string_view XmlNamespace = "http://www.w3.org/XML/1998/namespace";
 
 /** A declaration to be written; the empty prefix is the default namespace. */
 struct Binding
@@ -165,7 +164,7 @@ private:
             // [C14N 1.3]: what a relative URI names depends on where the document lies.
             if (!attribute.value.empty() && !IsAbsolute(attribute.value)) {
                 throw XmlSecurityException(
-                    "The namespace URI '" + std::string(attribute.value) + "' is relative");
+                    "The namespace URI " + Quote(attribute.value) + " is relative");
             }
             _prefixes.Bind(GetDeclaredPrefix(attribute), attribute.value);
             if (!_method.isExclusive) {
@@ -180,8 +179,8 @@ private:
         PrefixState* state = _prefixes.Find(prefix);
         if (state == nullptr || state->inScope.empty()) {
             throw XmlSecurityException(
-                "Element '" + std::string(element.GetName()) + "' uses the undeclared prefix '"
-                + std::string(prefix) + "'");
+                "Element " + Quote(element.GetName()) + " uses the undeclared prefix "
+                + Quote(prefix));
         }
         return *state;
     }
@@ -232,10 +231,15 @@ private:
     {
         for (const ElementNode* ancestor = _apex.GetParent(); ancestor != nullptr;
              ancestor = ancestor->GetParent()) {
-            for (const Attribute& attribute : ancestor->GetAttributes()) {
-                if (attribute.GetPrefix() == "xml" && !HasAttribute(attribute.name)) {
-                    AddAttribute(attribute, *ancestor);
-                }
+            InheritXmlAttributesOf(*ancestor);
+        }
+    }
+
+    void InheritXmlAttributesOf(const ElementNode& ancestor)
+    {
+        for (const Attribute& attribute : ancestor.GetAttributes()) {
+            if (attribute.GetPrefix() == "xml" && !HasAttribute(attribute.name)) {
+                AddAttribute(attribute, ancestor);
             }
         }
     }
@@ -267,8 +271,11 @@ private:
         if (state != nullptr) {
             Render(*state);
         }
-        for (const std::string& listed : _method.inclusivePrefixes) {
-            RenderIfKnown(listed);
+        // Where nothing is declared, the parent has rendered the listed ones as they are.
+        if (_marks.size() == 1 || element.DeclaresNamespaces()) {
+            for (const std::string& listed : _method.inclusivePrefixes) {
+                RenderIfKnown(listed);
+            }
         }
     }
 
@@ -393,8 +400,15 @@ std::vector<std::string> ParsePrefixList(std::string_view list)
     std::size_t start = list.find_first_not_of(Blanks);
     while (start != std::string_view::npos) {
         const std::size_t end = std::min(list.find_first_of(Blanks, start), list.size());
-        const std::string_view prefix = list.substr(start, end - start);
-        prefixes.emplace_back(prefix == "#default" ? std::string_view() : prefix);
+        const std::string_view written = list.substr(start, end - start);
+        const std::string_view prefix = written == "#default" ? std::string_view() : written;
+        if (std::find(prefixes.begin(), prefixes.end(), prefix) == prefixes.end()) {
+            prefixes.emplace_back(prefix);
+        }
+        if (prefixes.size() > MaxListedPrefixes) {
+            throw XmlSecurityException(
+                "More than " + std::to_string(MaxListedPrefixes) + " prefixes in a PrefixList");
+        }
         start = list.find_first_not_of(Blanks, end);
     }
     return prefixes;
@@ -437,7 +451,7 @@ Ref<Canonicalizer> CreateCanonicalizer(
     method.isExclusive = identifier == ExclusiveC14n;
     if (!method.isExclusive && identifier != InclusiveC14n
         && identifier != std::string(InclusiveC14n) + "#") {
-        throw XmlSecurityException("Canonicalization '" + identifier + "' is not supported");
+        throw XmlSecurityException("Canonicalization " + Quote(identifier) + " is not supported");
     }
     for (const std::string& prefix : inclusivePrefixes) {
         method.inclusivePrefixes.push_back(prefix == "#default" ? std::string() : prefix);

@@ -17,7 +17,14 @@ struct CanonicalizationMethod
     std::vector<std::string> inclusivePrefixes;
 };
 
-/** Reads an `InclusiveNamespaces` prefix list: blanks between, `#default` for the default. */
+/** Each listed prefix costs a look-up at every element that declares a namespace. */
+inline constexpr std::size_t MaxListedPrefixes = 64;
+
+/**
+ * Reads an `InclusiveNamespaces` prefix list: blanks between, `#default` for the default.
+ *
+ * @throws XmlSecurityException  more than `MaxListedPrefixes` different ones.
+ */
 std::vector<std::string> ParsePrefixList(std::string_view list);
 
 /**

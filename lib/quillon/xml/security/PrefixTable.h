@@ -16,8 +16,8 @@ struct PrefixState
 };
 
 /**
- * The states of all prefixes met so far, with a log to bring back how they were: one look-up tells
- * everything about a prefix.
+ * The states of the prefixes that are in scope, with a log to bring back how they were: one look-up
+ * tells everything about a prefix. It holds no more of them than a document may have in scope.
  */
 class PrefixTable
 {
@@ -36,8 +36,9 @@ public:
     {
         PrefixState* state = Find(prefix);
         if (state == nullptr) {
-            _states.push_back(PrefixState{prefix, {}, {}});
-            state = &_states.back();
+            _log.push_back(Change{_states.size(), {}, true});
+            _states.push_back(PrefixState{prefix, uri, {}});
+            return;
         }
         Log(*state);
         state->inScope = uri;
@@ -57,7 +58,11 @@ public:
     void Restore(std::size_t mark) noexcept
     {
         while (_log.size() > mark) {
-            _states[_log.back().index] = _log.back().state;
+            if (_log.back().isNew) {
+                _states.pop_back();
+            } else {
+                _states[_log.back().index] = _log.back().state;
+            }
             _log.pop_back();
         }
     }
@@ -66,7 +71,8 @@ private:
     struct Change
     {
         std::size_t index;
-        PrefixState state;
+        PrefixState state; ///< what it was
+        bool isNew;        ///< it was not there
     };
 
     /** Prefixes are a few octets long: comparing them in place beats a call. */
@@ -85,7 +91,7 @@ private:
 
     void Log(const PrefixState& state)
     {
-        _log.push_back(Change{static_cast<std::size_t>(&state - _states.data()), state});
+        _log.push_back(Change{static_cast<std::size_t>(&state - _states.data()), state, false});
     }
 
     std::vector<PrefixState> _states;

@@ -1,3 +1,4 @@
+#include "core/Quote.h"
 #include "quillon/xml/security/Identifiers.h"
 #include "xml/security/Algorithms.h"
 #include "xml/security/CanonicalDigest.h"
@@ -19,9 +20,8 @@ void RequireNoChild(const AlgorithmUse& use)
 {
     if (!use.foreignChild.empty() || use.prefixList != nullptr) {
         throw XmlSecurityException(
-            "Algorithm '" + std::string(use.identifier) + "' does not take the parameter '"
-            + std::string(use.prefixList != nullptr ? "InclusiveNamespaces" : use.foreignChild)
-            + "'");
+            "Algorithm " + Quote(use.identifier) + " does not take the parameter "
+            + Quote(use.prefixList != nullptr ? "InclusiveNamespaces" : use.foreignChild));
     }
 }
 
@@ -31,7 +31,7 @@ CanonicalizationMethod GetCanonicalization(const AlgorithmUse& use)
     method.isExclusive = use.identifier == ExclusiveC14n;
     if (!method.isExclusive && use.identifier != InclusiveC14n) {
         throw XmlSecurityException(
-            "Canonicalization '" + std::string(use.identifier) + "' is not accepted");
+            "Canonicalization " + Quote(use.identifier) + " is not accepted");
     }
     AlgorithmUse other = use;
     if (method.isExclusive && use.prefixList != nullptr) {
@@ -56,13 +56,13 @@ CanonicalizationMethod CheckTransforms(const std::vector<AlgorithmUse>& transfor
     if (transforms.empty() || transforms.front().identifier != EnvelopedSignature) {
         throw XmlSecurityException(
             transforms.empty() ? "The reference has no enveloped-signature transform"
-                               : "Transform '" + std::string(transforms.front().identifier)
-                                     + "' stands where enveloped-signature must");
+                               : "Transform " + Quote(transforms.front().identifier)
+                                     + " stands where enveloped-signature must");
     }
     RequireNoChild(transforms.front());
     if (transforms.size() > 2) {
         throw XmlSecurityException(
-            "Transform '" + std::string(transforms[2].identifier) + "' follows a canonicalization");
+            "Transform " + Quote(transforms[2].identifier) + " follows a canonicalization");
     }
     return transforms.size() == 1 ? CanonicalizationMethod() : GetCanonicalization(transforms[1]);
 }
@@ -92,8 +92,8 @@ std::vector<const Crypto::PublicKey*> SelectKeys(
     }
     if (keys.empty()) {
         throw XmlSecurityException(
-            "No trusted key fits signature algorithm '" + std::string(algorithm.identifier)
-            + "'; the first one tried is " + certificates.front()->GetPublicKey().GetDescription());
+            "No trusted key fits signature algorithm " + Quote(algorithm.identifier)
+            + "; the first one tried is " + certificates.front()->GetPublicKey().GetDescription());
     }
     return keys;
 }

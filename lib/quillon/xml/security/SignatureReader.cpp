@@ -1,3 +1,4 @@
+#include "core/Quote.h"
 #include "quillon/StringUtil.h"
 #include "quillon/xml/security/Identifiers.h"
 #include "xml/security/SignatureModel.h"
@@ -41,8 +42,8 @@ public:
     {
         if (!IsAt(localName)) {
             Fail(
-                "Expected element '" + std::string(localName) + "' in '"
-                + std::string(_parent.GetLocalName()) + "', found " + DescribeNext());
+                "Expected element " + Quote(localName) + " in " + Quote(_parent.GetLocalName())
+                + ", found " + DescribeNext());
         }
         const ElementNode& element = *Get();
         Advance();
@@ -58,9 +59,7 @@ public:
     void RequireEnd() const
     {
         if (_node != nullptr) {
-            Fail(
-                "Unexpected " + DescribeNext() + " in '" + std::string(_parent.GetLocalName())
-                + "'");
+            Fail("Unexpected " + DescribeNext() + " in " + Quote(_parent.GetLocalName()));
         }
     }
 
@@ -73,14 +72,14 @@ private:
         }
         if (_node != nullptr && Get() == nullptr) {
             Fail(
-                std::string("Unexpected ") + ToString(_node->GetNodeType()) + " in '"
-                + std::string(_parent.GetLocalName()) + "'");
+                std::string("Unexpected ") + ToString(_node->GetNodeType()) + " in "
+                + Quote(_parent.GetLocalName()));
         }
     }
 
     std::string DescribeNext() const
     {
-        return _node == nullptr ? "nothing" : "'" + std::string(Get()->GetName()) + "'";
+        return _node == nullptr ? "nothing" : Quote(Get()->GetName());
     }
 
     const ElementNode& _parent;
@@ -91,9 +90,7 @@ std::string_view RequireAttribute(const ElementNode& element, std::string_view n
 {
     const Attribute* attribute = element.FindAttribute(name);
     if (attribute == nullptr) {
-        Fail(
-            "'" + std::string(element.GetLocalName()) + "' has no attribute '" + std::string(name)
-            + "'");
+        Fail(Quote(element.GetLocalName()) + " has no attribute " + Quote(name));
     }
     return attribute->value;
 }
@@ -103,15 +100,34 @@ std::vector<unsigned char> ReadBase64(const ElementNode& element)
 {
     const TextNode* text = AsText(element.GetFirstChild());
     if (text == nullptr || text->GetNextSibling() != nullptr) {
-        Fail("'" + std::string(element.GetLocalName()) + "' must hold text and nothing else");
+        Fail(Quote(element.GetLocalName()) + " must hold text and nothing else");
     }
     std::vector<unsigned char> bytes;
     try {
         StringUtil::Base64Decode(text->GetText(), bytes);
     } catch (const Base64FormatException& error) {
-        Fail("'" + std::string(element.GetLocalName()) + "' is not Base64: " + error.what());
+        Fail(Quote(element.GetLocalName()) + " is not Base64: " + error.what());
     }
     return bytes;
+}
+
+/**
+ * [EXC-C14N 4]: `InclusiveNamespaces` carries a list and nothing else. Whatever stands in
+ * SignedInfo is canonicalized before the signature value is known to be genuine, so nothing may
+ * stand in it unread.
+ */
+const Attribute* ReadPrefixList(const ElementNode& element)
+{
+    RequireAttribute(element, "PrefixList");
+    if (element.GetFirstChild() != nullptr) {
+        Fail("'InclusiveNamespaces' must be empty");
+    }
+    for (const Attribute& attribute : element.GetAttributes()) {
+        if (attribute.name != "PrefixList" && !attribute.IsNamespaceDeclaration()) {
+            Fail("Unexpected attribute " + Quote(attribute.name) + " on 'InclusiveNamespaces'");
+        }
+    }
+    return element.FindAttribute("PrefixList");
 }
 
 AlgorithmUse ReadAlgorithm(const ElementNode& element)
@@ -121,7 +137,7 @@ AlgorithmUse ReadAlgorithm(const ElementNode& element)
     for (ChildCursor child(element); child.Get() != nullptr; child.Advance()) {
         if (use.prefixList == nullptr
             && child.Get()->HasQName("InclusiveNamespaces", ExclusiveC14n)) {
-            use.prefixList = child.Get()->FindAttribute("PrefixList");
+            use.prefixList = ReadPrefixList(*child.Get());
         } else {
             use.foreignChild = child.Get()->GetName();
         }
@@ -164,18 +180,22 @@ void ReadSignedInfo(const ElementNode& element, SignatureModel& model)
     }
 }
 
+void ReadX509Data(const ElementNode& element, KeyInfo& keyInfo)
+{
+    for (ChildCursor child(element); child.Get() != nullptr; child.Advance()) {
+        if (child.IsAt("X509Certificate")) {
+            keyInfo.certificates.push_back(ReadBase64(*child.Get()));
+        }
+    }
+}
+
 /** Gathers the certificates; whatever else a key information may hold picks no trusted key. */
 KeyInfo ReadKeyInfo(const ElementNode& element)
 {
     KeyInfo keyInfo;
     for (ChildCursor data(element); data.Get() != nullptr; data.Advance()) {
-        if (!data.IsAt("X509Data")) {
-            continue;
-        }
-        for (ChildCursor item(*data.Get()); item.Get() != nullptr; item.Advance()) {
-            if (item.IsAt("X509Certificate")) {
-                keyInfo.certificates.push_back(ReadBase64(*item.Get()));
-            }
+        if (data.IsAt("X509Data")) {
+            ReadX509Data(*data.Get(), keyInfo);
         }
     }
     return keyInfo;
@@ -188,7 +208,7 @@ SignatureSyntaxException::~SignatureSyntaxException() = default;
 SignatureModel ReadSignature(const ElementNode& signature)
 {
     if (!signature.HasQName("Signature", DsNamespace)) {
-        Fail("Expected element 'Signature', found '" + std::string(signature.GetName()) + "'");
+        Fail("Expected element 'Signature', found " + Quote(signature.GetName()));
     }
     SignatureModel model;
     ChildCursor child(signature);

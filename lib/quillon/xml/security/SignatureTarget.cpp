@@ -1,4 +1,5 @@
 #include "xml/security/SignatureTarget.h"
+#include "core/Quote.h"
 
 #include "quillon/xml/security/Exceptions.h"
 #include "xml/Arena.h"
@@ -81,7 +82,7 @@ void RequireTarget(const std::string& uri, const ElementNode& parent)
     const std::string_view id = std::string_view(uri).substr(1);
     if (uri.front() != '#' || id.empty() || !HasId(parent, id)) {
         throw XmlSecurityException(
-            "Reference '" + uri + "' does not name the element that encloses the signature");
+            "Reference " + Quote(uri) + " does not name the element that encloses the signature");
     }
     FindTarget(uri, parent);
 }
@@ -92,7 +93,7 @@ const ElementNode& FindTarget(const std::string& uri, const ElementNode& context
     WalkTree(GetRoot(context), nullptr, finder);
     if (finder.GetCount() != 1) {
         throw XmlSecurityException(
-            "Reference '" + uri + "' names " + std::to_string(finder.GetCount())
+            "Reference " + Quote(uri) + " names " + std::to_string(finder.GetCount())
             + " elements of the document");
     }
     return *finder.GetFound();

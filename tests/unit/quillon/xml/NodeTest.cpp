@@ -141,6 +141,16 @@ TEST(AppendChild, KeepsAParsedTreeAliveInsideAComposedOne)
     EXPECT_EQ(parent->GetFirstChild()->GetNextSibling(), nullptr);
 }
 
+TEST(AppendChild, TakesANodeBesideTheRootOutOfItsDocument)
+{
+    const Ref<ElementNode> parent = MakeElement("", "parent");
+    const Ref<Document> document = ParseText("<?a?><!--b--><r/>");
+    parent->AppendChild(document->GetFirstChild()->GetNextSibling());
+    EXPECT_EQ(SerializeToText(parent.get()), "<parent><!--b--></parent>");
+    EXPECT_EQ(document->GetFirstChild()->GetNodeType(), NodeType::PROCESSING_INSTRUCTION);
+    EXPECT_EQ(document->GetFirstChild()->GetNextSibling(), document->GetRootElement());
+}
+
 TEST(AppendChild, KeepsTheWholeTreeAliveThroughARefToAnyNode)
 {
     Ref<TextNode> text = MakeText("deep");

@@ -108,6 +108,14 @@ TEST(Parse, TellsWhereATagStarts)
     EXPECT_EQ(root->FindChildElement("b")->GetColumn(), 11U);
 }
 
+TEST(Parse, KnowsWhatTheXmlPrefixIsHoweverItIsDeclared)
+{
+    const Ref<Document> document =
+        ParseText("<r xmlns:xml='http://www.w3.org/XML/1998/name&#115;pace' xml:lang='en'/>");
+    ASSERT_NE(document->GetRootElement()->FindAttribute("lang", XmlNamespace), nullptr);
+    EXPECT_EQ(GetParseError(SerializeToText(document->GetRootElement())), "accepted");
+}
+
 TEST(Parse, LeavesAnUndeclaredPrefixReadable)
 {
     const Ref<Document> document = ParseText("<p:r q:a='1'/>");
@@ -306,6 +314,16 @@ TEST(Parse, TakesLongTextAndCommentsForNoTag)
         GetParseError("<r>" + quotes + "<!--" + quotes + "--><?p " + quotes + "?></r>"),
         "accepted");
     EXPECT_EQ(GetParseError("<r a='" + Repeat("b=c ", 2000) + "'/>"), "accepted");
+    // What looks like a tag inside a comment, a CDATA section or an instruction is none.
+    EXPECT_EQ(GetParseError("<r><!-- <x" + quotes + "--></r>"), "accepted");
+    EXPECT_EQ(GetParseError("<r><![CDATA[ <x" + quotes + "]]></r>"), "accepted");
+    EXPECT_EQ(GetParseError("<r><?p <x" + quotes + "?></r>"), "accepted");
+    EXPECT_THAT(
+        GetParseError("<r><!-- - --><x" + quotes + "/></r>"),
+        testing::StartsWith("More than 256 attributes in the tag"));
+    EXPECT_THAT(
+        GetParseError("<r><!-- <x" + quotes + "--><x" + quotes + "/></r>"),
+        testing::StartsWith("More than 256 attributes in the tag"));
 }
 
 TEST(Parse, LimitsTheNamespacesOfOneElementAndInScope)
