@@ -46,7 +46,7 @@ std::string_view TakeName(std::string_view& text) noexcept
 }
 
 /** Takes `= "value"` off the front of a tag's text, and gives the value as it is written. */
-std::string_view TakeRawValue(std::string_view& text) noexcept
+std::string_view TakeRawValue(std::string_view& text)
 {
     SkipBlanks(text);
     text.remove_prefix(std::min<std::size_t>(1, text.size()));
@@ -79,7 +79,7 @@ TreeBuilder::TreeBuilder(Ref<Arena> arena, std::string_view source)
 void TreeBuilder::StartElement(const TagEvent& tag)
 {
     FlushText();
-    if (!IsInSource({tag.tagEnd, 0})) {
+    if (!IsInSource(std::string_view(tag.tagEnd, 1))) {
         throw XMLParseException("The parser does not read the text in place");
     }
     // A tag holds no `<` but its first, so the one before the end is its start [XML 3.1].
