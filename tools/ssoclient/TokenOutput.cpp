@@ -85,7 +85,7 @@ void TokenOutput::Show(const boost::shared_ptr<const SsoClient::SamlToken>& toke
         throw SsoClient::SsoException("The token service answered without a token");
     }
     if (_file) {
-        _file->Commit(token->ToXml());
+        _file->Write(token->ToXml());
     }
     PrintLine(
         _json ? CreateJsonDescription(*token)

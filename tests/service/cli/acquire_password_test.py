@@ -124,9 +124,19 @@ class OutputFiles(ServiceTest):
         self.assertEqual({out, self.password}, set(self.folder.iterdir()))
 
     def test_that_cannot_be_written_is_found_before_anything_is_sent(self):
-        for out, why in ((self.folder / "no" / "token.xml", "No such file or directory"),):
-            result = self.acquire("--out", out, service=self.nowhere)
-            self.assert_fails(result, USAGE, "UsageError", f"cannot write `{out}': {why}")
+        for out, why in ((self.folder / "no" / "token.xml", "No such file or directory"),
+                         (self.password / "token.xml", "Not a directory"),
+                         (self.folder / ("x" * 256), "File name too long")):
+            with self.subTest(why=why):
+                result = self.acquire("--out", out, service=self.nowhere)
+                self.assert_fails(result, USAGE, "UsageError", f"cannot write `{out}': {why}")
+
+    def test_in_the_working_folder_needs_no_folder_name(self):
+        before = os.getcwd()
+        self.addCleanup(os.chdir, before)
+        os.chdir(self.folder)
+        self.assert_done(self.acquire("--out", "x" * 255))
+        self.assertEqual({self.folder / ("x" * 255), self.password}, set(self.folder.iterdir()))
 
     def test_must_not_be_a_device_or_a_folder(self):
         for out in ("/dev/null", self.folder):
