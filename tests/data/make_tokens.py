@@ -1,18 +1,21 @@
 #!/usr/bin/python3
-"""Makes the keys that are missing, all the test tokens, and the table of expected results."""
+"""Makes the keys that are missing, all the test tokens, the table of expected results, and the
+signed documents that are no tokens."""
 
 from pathlib import Path
 
-from tokengen import accepted, keys, refused
+from tokengen import accepted, documents, keys, refused
 from tokengen.catalogue import Catalogue
 
 
 def main():
     keys.make_missing_keys()
-    catalogue = Catalogue(Path(__file__).resolve().parent / "tokens")
+    data = Path(__file__).resolve().parent
+    catalogue = Catalogue(data / "tokens")
     accepted.add_all(catalogue)
     refused.add_all(catalogue)
     print(f"{catalogue.save()} tokens")
+    print(f"{documents.write_all(data / 'documents')} documents")
 
 
 if __name__ == "__main__":

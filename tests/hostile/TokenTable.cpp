@@ -164,4 +164,13 @@ Conditions GetConditions(const TokenCase& tokenCase)
     return conditions;
 }
 
+std::string ReplaceOnce(const std::string& text, const std::string& from, const std::string& to)
+{
+    const std::size_t position = text.find(from);
+    if (position == std::string::npos || text.find(from, position + 1) != std::string::npos) {
+        throw std::runtime_error(from + " does not stand once in the text");
+    }
+    return std::string(text).replace(position, from.size(), to);
+}
+
 } // namespace HostileTests

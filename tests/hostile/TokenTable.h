@@ -31,4 +31,7 @@ const TokenCase& GetTokenCase(const std::string& file);
 std::string ReadToken(const TokenCase& tokenCase);
 Conditions GetConditions(const TokenCase& tokenCase);
 
+/** `text` with `to` in the one place where `from` stands. Throws unless there is just one. */
+std::string ReplaceOnce(const std::string& text, const std::string& from, const std::string& to);
+
 } // namespace HostileTests

@@ -2,6 +2,7 @@
 
 #include "quillon/Exceptions.h"
 #include "quillon/system/Clock.h"
+#include "quillon/xml/Parser.h"
 #include "ssoClient/CreateSamlToken.h"
 
 #include <boost/core/demangle.hpp>
@@ -80,6 +81,20 @@ void DescribeLists(const SsoClient::SamlToken& token, std::ostream& out)
     }
 }
 
+template <class GetFacts>
+Verdict GetVerdict(const Conditions& conditions, const GetFacts& getFacts)
+{
+    const StoppedClock clock(conditions.nowMicros);
+    Verdict verdict;
+    try {
+        verdict.facts = getFacts();
+    } catch (const Quillon::Exception& error) {
+        verdict.className = boost::core::demangle(typeid(error).name());
+        verdict.message = error.what();
+    }
+    return verdict;
+}
+
 bool Matches(const Verdict& verdict, const Refusal& refusal)
 {
     const bool anyClass = refusal.className == "Quillon::Exception";
@@ -131,20 +146,22 @@ std::string DescribeFacts(const SsoClient::SamlToken& token)
 
 Verdict Judge(const std::string& xml, const Conditions& conditions)
 {
-    const StoppedClock clock(conditions.nowMicros);
-    Verdict verdict;
-    try {
+    return GetVerdict(conditions, [&] {
         const auto token =
             SsoClient::CreateSamlToken(xml, conditions.trusted, conditions.toleranceSec);
-        verdict.facts = DescribeFacts(*token);
-        if (token->ToXml() != xml) {
-            verdict.facts->append("its XML is not what was given\n");
-        }
-    } catch (const Quillon::Exception& error) {
-        verdict.className = boost::core::demangle(typeid(error).name());
-        verdict.message = error.what();
-    }
-    return verdict;
+        return DescribeFacts(*token)
+               + (token->ToXml() == xml ? "" : "its XML is not what was given\n");
+    });
+}
+
+Verdict JudgeInDom(const std::string& xml, const Conditions& conditions)
+{
+    return GetVerdict(conditions, [&] {
+        const auto handler = Quillon::Xml::CreateXMLDocumentHandler();
+        Quillon::Xml::CreateXMLParser(handler.get())->Parse(xml);
+        return DescribeFacts(*SsoClient::CreateSamlTokenFromDom(
+            handler->GetDocument()->GetRootElement(), conditions.trusted, conditions.toleranceSec));
+    });
 }
 
 bool IsAmong(const Verdict& verdict, const std::vector<Refusal>& refusals)

@@ -45,6 +45,9 @@ struct Conditions
  */
 Verdict Judge(const std::string& xml, const Conditions& conditions);
 
+/** The same from a parsed document, of which the token is the root. */
+Verdict JudgeInDom(const std::string& xml, const Conditions& conditions);
+
 /** Everything that a token answers, one line each, as the table's facts are put too. */
 std::string DescribeFacts(const SsoClient::SamlToken& token);
 

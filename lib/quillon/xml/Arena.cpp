@@ -11,6 +11,7 @@ namespace Quillon::Xml {
 
 namespace {
 
+constexpr std::size_t MinChunkSize = 1024;
 constexpr std::size_t MaxChunkSize = std::size_t{256} * 1024;
 
 // Nodes are never destroyed one by one.
@@ -25,16 +26,19 @@ constexpr std::size_t RoundUp(std::size_t size) noexcept
 
 } // namespace
 
-Ref<Arena> Arena::Create(ArenaContent content, std::size_t firstChunkSize)
+Ref<Arena> Arena::Create(ArenaContent content, std::size_t expectedSize)
 {
     Ref<Arena> arena(new Arena(content));
-    arena->AddChunk(firstChunkSize);
+    if (expectedSize > InnerSize) {
+        arena->AddChunk(expectedSize);
+    }
     return arena;
 }
 
 Arena::~Arena()
 {
     if (_content == ArenaContent::COMPOSED) {
+        explicit_bzero(_inner.data(), _inner.size());
         for (const Chunk& chunk : _chunks) {
             explicit_bzero(chunk.memory.get(), chunk.size);
         }
@@ -60,7 +64,8 @@ void* Arena::Allocate(std::size_t size)
 {
     size = RoundUp(size);
     if (size > _left) {
-        AddChunk(std::max(size, std::min(2 * _chunks.back().size, MaxChunkSize)));
+        const std::size_t grown = _chunks.empty() ? MinChunkSize : 2 * _chunks.back().size;
+        AddChunk(std::max(size, std::min(grown, MaxChunkSize)));
     }
     void* memory = _next;
     _next += size;

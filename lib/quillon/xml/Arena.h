@@ -2,6 +2,7 @@
 
 #include "quillon/xml/Node.h"
 
+#include <array>
 #include <atomic>
 #include <cstddef>
 #include <memory>
@@ -28,7 +29,8 @@ enum class ArenaContent
 class Arena
 {
 public:
-    static Ref<Arena> Create(ArenaContent content, std::size_t firstChunkSize);
+    /** @param expectedSize  how much is going to be allocated, as far as that is known. */
+    static Ref<Arena> Create(ArenaContent content, std::size_t expectedSize = 0);
 
     Arena(const Arena&) = delete;
     Arena& operator=(const Arena&) = delete;
@@ -84,7 +86,8 @@ private:
         std::size_t size;
     };
 
-    explicit Arena(ArenaContent content) noexcept
+    // The inner memory is left as it is: what is allocated of it is written first.
+    explicit Arena(ArenaContent content) noexcept // NOLINT(cppcoreguidelines-pro-type-member-init)
         : _content(content)
     {}
     ~Arena();
@@ -96,8 +99,11 @@ private:
     std::vector<std::unique_ptr<Arena, void (*)(Arena*)>> _merged;
     ArenaContent _content;
     std::vector<Chunk> _chunks;
-    char* _next = nullptr;
-    std::size_t _left = 0;
+    // A composed element with a few attributes and a short text needs no other memory.
+    static constexpr std::size_t InnerSize = 384;
+    alignas(std::max_align_t) std::array<char, InnerSize> _inner;
+    char* _next = _inner.data();
+    std::size_t _left = InnerSize;
     std::string_view _source;
     Node* _firstTopLevel = nullptr;
 };

@@ -12,9 +12,6 @@ namespace {
 
 constexpr std::string_view XmlnsPrefix = "xmlns:";
 
-/** An element with a few attributes and a short text fits in without a second allocation. */
-constexpr std::size_t ComposedChunkSize = 512;
-
 std::string JoinName(std::string_view prefix, std::string_view localName)
 {
     std::string name;
@@ -280,13 +277,13 @@ void ElementNode::RemoveChild(Node* child) noexcept
 
 void CreateElementNode(std::string_view prefix, std::string_view localName, Ref<ElementNode>& out)
 {
-    const Ref<Arena> arena = Arena::Create(ArenaContent::COMPOSED, ComposedChunkSize);
+    const Ref<Arena> arena = Arena::Create(ArenaContent::COMPOSED);
     out = arena->NewElement(arena->CopyText(JoinName(prefix, localName)));
 }
 
 void CreateTextNode(Ref<TextNode>& out)
 {
-    const Ref<Arena> arena = Arena::Create(ArenaContent::COMPOSED, ComposedChunkSize);
+    const Ref<Arena> arena = Arena::Create(ArenaContent::COMPOSED);
     out = arena->NewText({});
 }
 

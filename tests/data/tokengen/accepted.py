@@ -27,6 +27,20 @@ EVERYTHING = Token(
     groups=[("Users", "example.com"), ("Administrators", "example.local")])
 
 
+def listed(prefixes):
+    return (f'<ec:InclusiveNamespaces xmlns:ec="{names.EXC_C14N}" PrefixList="{prefixes}"/>')
+
+
+def listed_prefixes(count):
+    """Prefixes of which the last one counts: it makes another canonical form."""
+    return [f"p{i}" for i in range(count - 1)] + ["xs"]
+
+
+def good_reference(token):
+    text = token.signature.text()
+    return text[text.index("<ds:Reference "):text.index("</ds:SignedInfo>")]
+
+
 def add_all(catalogue):
     _confirmations(catalogue)
     _references_and_transforms(catalogue)
@@ -82,6 +96,19 @@ def _references_and_transforms(c):
         _add(c, f"prefix-list-{name}-default-namespace",
              "InclusiveNamespaces under a default namespace",
              EVERYTHING.but(prefix="").signed_as(**form))
+    sixty_four = " ".join(listed_prefixes(64))
+    for name, prefixes in (("64", sixty_four), ("64-twice", sixty_four + " " + sixty_four)):
+        _add(c, f"prefix-list-{name}", "as many different prefixes as are looked up",
+             BASE.signed_as(c14n_prefixes=prefixes, transform_prefixes=prefixes))
+    one = good_reference(BASE)
+    for name, count in (("two", 2), ("eight", 8)):
+        _add(c, f"references-{name}", "references that name the assertion, each with its digest",
+             BASE, (one, one * count))
+    for name, second in (("inclusive", f'Algorithm="{names.C14N}"'),
+                         ("sha512", f'Algorithm="{names.SHA512}"')):
+        old = names.EXC_C14N if name == "inclusive" else names.SHA256
+        _add(c, f"references-two-{name}", "two references that digest differently", BASE,
+             (one, one + one.replace(f'Algorithm="{old}"', second)))
     _add(c, "prefix-list-transform-only", "InclusiveNamespaces in the transform alone",
          BASE.signed_as(transform_prefixes="xs xsi"))
     _add(c, "prefix-list-ds", "PrefixList names the signature's own prefix",
@@ -371,6 +398,15 @@ def _attributes(c):
     _add(c, "value-attributes", "attributes of a value are not looked at", BASE,
          ('<saml:AttributeValue xsi:type="xs:string">Ada',
           '<saml:AttributeValue xsi:type="xs:anyURI" a="b">Ada'))
+    # The attributes look like IDs and carry the assertion's, but nobody would look an ID up there.
+    _add(c, "value-attributes-like-ids", "attributes whose names merely end in or begin with Id",
+         BASE, ('<saml:AttributeValue xsi:type="xs:string">Ada',
+                f'<saml:AttributeValue xmlns:x="urn:x" valid="{ID}" PAID="{ID}" x:valid="{ID}" '
+                f'Ids="{ID}" I="{ID}" d="{ID}" x:d="{ID}" Identifier="{ID}" IDREF="{ID}" '
+                f'_Id="{ID}" x:a-id="{ID}" href="#{ID}" xsi:type="xs:string">Ada'))
+    _add(c, "blank-ends", "values with blanks at their ends, which belong to them",
+         BASE.but(subject=(" user", "example.com "), groups=[("Users ", " example.com")],
+                  advice=[("urn:source", [("urn:name", [" \tvalue "])])]))
     _add(c, "advice-two", "two advices, in document order", BASE.but(advice=ADVICE))
     blank = [("urn:source", [("urn:blank", [""]), ("urn:name", ["a", "", "b"])])]
     _add(c, "advice-empty-values", "empty values stay in their places", BASE.but(advice=blank))

@@ -31,6 +31,14 @@ def says(message):
     return [{"class": PARSE, "message": message}]
 
 
+def syntax(message):
+    return says("Signature syntax error: " + message)
+
+
+def outside(message):
+    return [{"class": SIGNATURE, "message": "Signature verification error. " + message}]
+
+
 def begins(prefix):
     return [{"class": PARSE, "prefix": prefix}]
 
@@ -48,6 +56,11 @@ def signed(token, *edits, key="sts", **forms):
     for edit in edits:
         text = replaced(text, *edit)
     return signing.sign(text, keys.private_key(key), **forms)
+
+
+def value_of(text, element):
+    start = text.index(f"<ds:{element}>") + len(f"<ds:{element}>")
+    return text[start:text.index(f"</ds:{element}>", start)]
 
 
 class Catalogue:

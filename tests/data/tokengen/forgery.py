@@ -8,8 +8,8 @@ from . import keys, names
 from .accepted import DELEGATES, LEAN, LEAN_HOLDER, rsa_key_value
 from .assertion import ID, key_info
 from .catalogue import (
-    MALFORMED, NOT_COVERED, OUTSIDE_PROFILE, PARSE, SIGNATURE_SYNTAX, TAMPERED, replaced, says,
-    signed)
+    MALFORMED, NOT_COVERED, OUTSIDE_PROFILE, SIGNATURE_SYNTAX, TAMPERED, outside, replaced, says,
+    signed, syntax, value_of)
 
 SYNTAX_OR_OUTSIDE = SIGNATURE_SYNTAX + OUTSIDE_PROFILE
 BASE64_DIGITS = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/"
@@ -21,6 +21,7 @@ BASE64_TRANSFORM = names.DS + "base64"
 DECRYPT = "http://www.w3.org/2002/07/decrypt#XML"
 STR_TRANSFORM = ("http://docs.oasis-open.org/wss/2004/01/"
                  "oasis-200401-wss-soap-message-security-1.0#STR-Transform")
+TWICE = outside(f"Reference '#{ID}' names 2 elements of the document")
 WSU = "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd"
 
 
@@ -37,9 +38,36 @@ def add_all(catalogue):
     _wrapping(catalogue)
 
 
-def _value_of(text, element):
-    start = text.index(f"<ds:{element}>") + len(f"<ds:{element}>")
-    return text[start:text.index(f"</ds:{element}>", start)]
+def expected(child, parent, found):
+    return syntax(f"Expected element '{child}' in '{parent}', found {found}")
+
+
+def surplus(child, parent):
+    return syntax(f"Unexpected '{child}' in '{parent}'")
+
+
+def only_text(element):
+    return syntax(f"'{element}' must hold text and nothing else")
+
+
+def no_algorithm(element):
+    return syntax(f"'{element}' has no attribute 'Algorithm'")
+
+
+def no_parameter(algorithm, parameter):
+    return outside(f"Algorithm '{algorithm}' does not take the parameter '{parameter}'")
+
+
+def no_canonicalization(algorithm):
+    return outside(f"Canonicalization '{algorithm}' is not accepted")
+
+
+def follows(algorithm):
+    return outside(f"Transform '{algorithm}' follows a canonicalization")
+
+
+def elsewhere(uri):
+    return outside(f"Reference '{uri}' does not name the element that encloses the signature")
 
 
 def _changed_digit(value, position):
@@ -55,13 +83,13 @@ def _tampering(c):
         for edit in edits:
             text = replaced(text, *edit)
         c.refuse("tampered-" + name, "changed after it was signed", text, refusals, "invalid")
-    digest, value = _value_of(good, "DigestValue"), _value_of(good, "SignatureValue")
+    digest, value = value_of(good, "DigestValue"), value_of(good, "SignatureValue")
     for name, position in (("first", 0), ("middle", 20)):
         add(f"digest-{name}-digit", (digest, _changed_digit(digest, position)))
     for name, position in (("first", 0), ("middle", 170), ("last", 340)):
         add(f"signature-{name}-digit", (value, _changed_digit(value, position)))
     add("digest-of-another", (digest, base64.b64encode(bytes(32)).decode()))
-    add("signature-of-another", (value, _value_of(signed(LEAN), "SignatureValue")))
+    add("signature-of-another", (value, value_of(signed(LEAN), "SignatureValue")))
     short = OUTSIDE_PROFILE + TAMPERED + SIGNATURE_SYNTAX
     add("digest-empty", (digest, ""), refusals=short)
     add("digest-cut", (digest, digest[:40]), refusals=short)
@@ -157,7 +185,7 @@ def _other_keys(c):
              signed(LEAN.signed_as(key_info=key_info("weak")), key="weak"), OUTSIDE_PROFILE,
              "valid", trust=["sts", "weak"])
     ecdsa = signed(LEAN.signed_as(method=names.ECDSA_SHA256), key="sts-p256")
-    value = _value_of(ecdsa, "SignatureValue")
+    value = value_of(ecdsa, "SignatureValue")
     for name, forged in (("zeros", bytes(64)), ("odd-length", base64.b64decode(value)[:-1]),
                          ("longer", base64.b64decode(value) + b"\0"),
                          ("der", _der(base64.b64decode(value)))):
@@ -232,7 +260,7 @@ def _references(c):
             ("document-and-id", f"token.xml#{ID}"), ("query-and-id", f"?#{ID}"),
             ("two-hashes", f"##{ID}"), ("blank", " "), ("cid", "cid:token")):
         add(name, NOT_COVERED, token=uri(value))
-    add("absent-uri", NOT_COVERED + SYNTAX_OR_OUTSIDE, (f' URI="#{ID}"', ""))
+    add("absent-uri", syntax("'Reference' has no attribute 'URI'"), (f' URI="#{ID}"', ""))
     child = ("<saml:AuthnContextClassRef>", '<saml:AuthnContextClassRef ID="_child">')
     add("child", NOT_COVERED, child, token=uri("#_child"))
     value = ("<ds:SignatureValue>", '<ds:SignatureValue ID="_child">')
@@ -247,23 +275,23 @@ def _references(c):
                         ("unknown-id", "#_nowhere"), ("child", "#_child"),
                         ("xpointer", "#xpointer(/)")):
         second = replaced(reference, f"#{ID}", other)
-        refusals = OUTSIDE_PROFILE + SIGNATURE_SYNTAX
-        add(f"second-{name}", refusals, child, (reference, reference + second))
-        add(f"first-{name}", refusals, child, (reference, second + reference))
-    add("none", NOT_COVERED + SYNTAX_OR_OUTSIDE, (reference, ""))
-    add("two-signed-infos", SYNTAX_OR_OUTSIDE,
+        add(f"second-{name}", elsewhere(other), child, (reference, reference + second))
+        add(f"first-{name}", elsewhere(other), child, (reference, second + reference))
+    add("none", NOT_COVERED, (reference, ""))
+    second_info = expected("SignatureValue", "Signature", "'ds:SignedInfo'")
+    add("two-signed-infos", second_info,
         ("</ds:SignedInfo>", f"</ds:SignedInfo><ds:SignedInfo>{reference}</ds:SignedInfo>"))
     # The second, genuine SignedInfo stands where a careless search finds it first.
     good = signed(LEAN)
     info = good[good.index("<ds:SignedInfo>"):good.index("<ds:SignatureValue>")]
-    forged = replaced(info, _value_of(good, "DigestValue"), base64.b64encode(bytes(32)).decode())
+    forged = replaced(info, value_of(good, "DigestValue"), base64.b64encode(bytes(32)).decode())
     for name, order in (("genuine-first", info + forged), ("forged-first", forged + info)):
         c.refuse(f"reference-two-signed-infos-{name}", "a second SignedInfo",
-                 replaced(good, info, order), SYNTAX_OR_OUTSIDE)
+                 replaced(good, info, order), second_info)
     hidden = replaced(good, info, forged).replace(
         "</ds:Signature>", f"<ds:Object>{info}</ds:Object></ds:Signature>")
     c.refuse("reference-signed-info-in-object", "the genuine SignedInfo hides in an Object", hidden,
-             SYNTAX_OR_OUTSIDE + TAMPERED)
+             surplus("ds:Object", "Signature"))
 
 
 def _transforms(c):
@@ -278,48 +306,52 @@ def _transforms(c):
     def transform(algorithm, content=""):
         return f'<ds:Transform Algorithm="{algorithm}">{content}</ds:Transform>'
     not_signature = transform(XPATH, "<ds:XPath>not(ancestor-or-self::ds:Signature)</ds:XPath>")
-    add("xpath", OUTSIDE_PROFILE, (enveloped, enveloped + not_signature), xmlsec1="valid")
-    add("xpath-everything", OUTSIDE_PROFILE,
+    third = follows(names.EXC_C14N)
+    add("xpath", third, (enveloped, enveloped + not_signature), xmlsec1="valid")
+    add("xpath-everything", third,
         (enveloped, enveloped + transform(XPATH, "<ds:XPath>true()</ds:XPath>")), xmlsec1="valid")
-    add("xpath-nothing", OUTSIDE_PROFILE,
+    add("xpath-nothing", third,
         (enveloped, enveloped + transform(XPATH, "<ds:XPath>false()</ds:XPath>")))
-    add("xpath-filter2", OUTSIDE_PROFILE,
+    add("xpath-filter2", third,
         (enveloped, enveloped + transform(
             XPATH_FILTER2, f'<f:XPath xmlns:f="{XPATH_FILTER2}" Filter="intersect">/</f:XPath>')))
     stylesheet = ('<x:stylesheet xmlns:x="http://www.w3.org/1999/XSL/Transform" version="1.0">'
                   '<x:template match="/"><x:copy-of select="."/></x:template></x:stylesheet>')
-    add("xslt", OUTSIDE_PROFILE, (exclusive, transform(XSLT, stylesheet) + exclusive))
-    add("base64", OUTSIDE_PROFILE, (exclusive, transform(BASE64_TRANSFORM)))
-    add("decrypt", OUTSIDE_PROFILE, (exclusive, transform(DECRYPT) + exclusive))
-    add("str", OUTSIDE_PROFILE, (exclusive, transform(STR_TRANSFORM)))
-    add("unknown", OUTSIDE_PROFILE, (exclusive, transform("urn:unknown")))
-    add("empty-name", OUTSIDE_PROFILE, (exclusive, transform("")))
-    add("no-name", SYNTAX_OR_OUTSIDE, (exclusive, "<ds:Transform></ds:Transform>"))
-    add("c14n11", OUTSIDE_PROFILE, token=LEAN.signed_as(
-        transforms=(names.ENVELOPED, "http://www.w3.org/2006/12/xml-c14n11")))
-    add("c14n-before-enveloped", OUTSIDE_PROFILE, token=LEAN.signed_as(
+    add("xslt", third, (exclusive, transform(XSLT, stylesheet) + exclusive))
+    add("base64", no_canonicalization(BASE64_TRANSFORM), (exclusive, transform(BASE64_TRANSFORM)))
+    add("decrypt", third, (exclusive, transform(DECRYPT) + exclusive))
+    add("str", no_canonicalization(STR_TRANSFORM), (exclusive, transform(STR_TRANSFORM)))
+    add("unknown", no_canonicalization("urn:unknown"), (exclusive, transform("urn:unknown")))
+    add("empty-name", no_canonicalization(""), (exclusive, transform("")))
+    add("no-name", no_algorithm("Transform"), (exclusive, "<ds:Transform></ds:Transform>"))
+    c14n11 = "http://www.w3.org/2006/12/xml-c14n11"
+    add("c14n11", no_canonicalization(c14n11),
+        token=LEAN.signed_as(transforms=(names.ENVELOPED, c14n11)))
+    first = outside(
+        f"Transform '{names.EXC_C14N}' stands where enveloped-signature must")
+    add("c14n-before-enveloped", first, token=LEAN.signed_as(
         transforms=(names.EXC_C14N, names.ENVELOPED)))
-    add("c14n-twice", OUTSIDE_PROFILE, token=LEAN.signed_as(
+    add("c14n-twice", third, token=LEAN.signed_as(
         transforms=(names.ENVELOPED, names.EXC_C14N, names.EXC_C14N)))
-    add("c14n-two-kinds", OUTSIDE_PROFILE, token=LEAN.signed_as(
+    add("c14n-two-kinds", follows(names.C14N), token=LEAN.signed_as(
         transforms=(names.ENVELOPED, names.EXC_C14N, names.C14N)))
-    add("enveloped-twice", OUTSIDE_PROFILE, token=LEAN.signed_as(
+    add("enveloped-twice", third, token=LEAN.signed_as(
         transforms=(names.ENVELOPED, names.ENVELOPED, names.EXC_C14N)))
     # Without removing the signature first no digest can match either.
-    add("c14n-only", OUTSIDE_PROFILE + TAMPERED, token=LEAN.signed_as(transforms=(names.EXC_C14N,)))
+    add("c14n-only", first, token=LEAN.signed_as(transforms=(names.EXC_C14N,)))
     for name, algorithm in (("inclusive", names.C14N + "#WithComments"),
                             ("exclusive", names.EXC_C14N + "WithComments")):
-        add(f"{name}-with-comments", OUTSIDE_PROFILE,
+        add(f"{name}-with-comments", no_canonicalization(algorithm),
             token=LEAN.signed_as(transforms=(names.ENVELOPED, algorithm)), xmlsec1="valid")
-    add("none", SYNTAX_OR_OUTSIDE + TAMPERED, (enveloped + exclusive, ""))
-    add("no-list", OUTSIDE_PROFILE + TAMPERED,
+    add("none", expected("Transform", "Transforms", "nothing"), (enveloped + exclusive, ""))
+    add("no-list", outside("The reference has no enveloped-signature transform"),
         (f"<ds:Transforms>{enveloped}{exclusive}{end}", ""))
-    add("list-twice", SYNTAX_OR_OUTSIDE, (end, end + f"<ds:Transforms>{exclusive}{end}"))
-    add("other-child", SYNTAX_OR_OUTSIDE, (end, f"<ds:Other></ds:Other>{end}"))
-    add("many", OUTSIDE_PROFILE + SIGNATURE_SYNTAX, (exclusive, exclusive * 50))
-    add("enveloped-with-content", SYNTAX_OR_OUTSIDE,
+    add("list-twice", expected("DigestMethod", "Reference", "'ds:Transforms'"), (end, end + f"<ds:Transforms>{exclusive}{end}"))
+    add("other-child", expected("Transform", "Transforms", "'ds:Other'"), (end, f"<ds:Other></ds:Other>{end}"))
+    add("many", third, (exclusive, exclusive * 50))
+    add("enveloped-with-content", no_parameter(names.ENVELOPED, "ds:XPath"),
         (enveloped, transform(names.ENVELOPED, "<ds:XPath>1</ds:XPath>")))
-    add("c14n-with-xpath", SYNTAX_OR_OUTSIDE,
+    add("c14n-with-xpath", no_parameter(names.EXC_C14N, "ds:XPath"),
         (exclusive, transform(names.EXC_C14N, "<ds:XPath>1</ds:XPath>")))
 
 
@@ -332,62 +364,78 @@ def _signature_shape(c):
     digest_method = f'<ds:DigestMethod Algorithm="{names.SHA256}"/>'
     digest = "<ds:DigestValue>@DIGEST@</ds:DigestValue>"
 
-    def add(name, *edits, refusals=SYNTAX_OR_OUTSIDE):
+    def add(name, refusals, *edits):
         c.refuse("shape-" + name, "how the signature is built", signed(LEAN, *edits), refusals)
 
-    def add_changed(name, *edits, refusals=SYNTAX_OR_OUTSIDE):
+    def add_changed(name, refusals, *edits):
         text = good
         for edit in edits:
             text = replaced(text, *edit)
         c.refuse("shape-" + name, "how the signature is built", text, refusals)
-    add_changed("empty", (info + value, ""), refusals=SIGNATURE_SYNTAX)
-    add_changed("no-signed-info", (info, ""), refusals=SIGNATURE_SYNTAX)
-    add_changed("no-value", (value, ""), refusals=SIGNATURE_SYNTAX)
-    add_changed("value-first", (info + value, value + info), refusals=SIGNATURE_SYNTAX)
-    add_changed("value-twice", (value, value * 2), refusals=SIGNATURE_SYNTAX)
-    add_changed("key-info-twice", (value, value + key_info("sts") * 2))
-    add_changed("key-info-first", (info, key_info("sts") + info), refusals=SIGNATURE_SYNTAX)
-    add_changed("text", (value, value + "text"), refusals=SIGNATURE_SYNTAX)
-    add_changed("unknown-last", (value, value + "<ds:Other/>"))
-    add_changed("foreign-last", (value, value + '<x:Other xmlns:x="urn:x"/>'))
-    add_changed("value-with-element",
-                (value, value.replace("</ds:SignatureValue>", "<ds:a/></ds:SignatureValue>")),
-                refusals=SIGNATURE_SYNTAX)
-    add_changed("key-info-empty-certificate",
+    no_object = surplus("ds:Object", "Signature")
+    add_changed("empty", expected("SignedInfo", "Signature", "nothing"), (info + value, ""))
+    add_changed("no-signed-info", expected("SignedInfo", "Signature", "'ds:SignatureValue'"), (info, ""))
+    add_changed("no-value", expected("SignatureValue", "Signature", "nothing"), (value, ""))
+    add_changed("value-first", expected("SignedInfo", "Signature", "'ds:SignatureValue'"),
+                (info + value, value + info))
+    add_changed("value-twice", surplus("ds:SignatureValue", "Signature"), (value, value * 2))
+    add_changed("key-info-twice", surplus("ds:KeyInfo", "Signature"),
+                (value, value + key_info("sts") * 2))
+    add_changed("key-info-first", expected("SignedInfo", "Signature", "'ds:KeyInfo'"),
+                (info, key_info("sts") + info))
+    add_changed("text", syntax("Unexpected text in 'Signature'"), (value, value + "text"))
+    add_changed("unknown-last", surplus("ds:Other", "Signature"), (value, value + "<ds:Other/>"))
+    add_changed("foreign-last", surplus("x:Other", "Signature"),
+                (value, value + '<x:Other xmlns:x="urn:x"/>'))
+    add_changed("value-with-element", only_text("SignatureValue"),
+                (value, value.replace("</ds:SignatureValue>", "<ds:a/></ds:SignatureValue>")))
+    add_changed("key-info-empty-certificate", only_text("X509Certificate"),
                 (value, value + "<ds:KeyInfo><ds:X509Data><ds:X509Certificate/></ds:X509Data>"
-                 "</ds:KeyInfo>"), refusals=SIGNATURE_SYNTAX + OUTSIDE_PROFILE)
+                 "</ds:KeyInfo>"))
     add_changed("key-info-bad-base64",
+                syntax("'X509Certificate' is not Base64: Base64 text has a character that is no "
+                       "digit at position 0"),
                 (value, value + "<ds:KeyInfo><ds:X509Data><ds:X509Certificate>*?*"
                  "</ds:X509Certificate></ds:X509Data></ds:KeyInfo>"))
-    add_changed("object-empty", (value, value + "<ds:Object/>"))
-    add_changed("object-twice", (value, value + "<ds:Object>a</ds:Object><ds:Object/>"))
+    add_changed("object-empty", no_object, (value, value + "<ds:Object/>"))
+    add_changed("object-twice", no_object, (value, value + "<ds:Object>a</ds:Object><ds:Object/>"))
     manifest = ('<ds:Manifest Id="m">'
                 + good[good.index("<ds:Reference "):good.index("</ds:SignedInfo>")]
                 + "</ds:Manifest>")
-    add_changed("manifest-in-object", (value, value + f"<ds:Object>{manifest}</ds:Object>"))
-    add_changed("properties-in-object",
+    add_changed("manifest-in-object", no_object, (value, value + f"<ds:Object>{manifest}</ds:Object>"))
+    add_changed("properties-in-object", no_object,
                 (value, value + "<ds:Object><ds:SignatureProperties/></ds:Object>"))
-    add("manifest-reference", (f'URI="#{ID}"', 'URI="#m" Type="' + names.DS + 'Manifest"'),
-        ("</ds:Signature>", f"<ds:Object>{manifest}</ds:Object></ds:Signature>"),
-        refusals=NOT_COVERED + SYNTAX_OR_OUTSIDE)
-    add("no-c14n", (c14n, ""))
-    add("no-method", (method, ""))
-    add("no-digest-method", (digest_method, ""))
-    add("c14n-after-method", (c14n + method, method + c14n))
-    add("method-twice", (method, method * 2))
-    add("c14n-twice", (c14n, c14n * 2))
-    add("digest-method-twice", (digest_method, digest_method * 2))
-    add("digest-first", (digest_method + digest, digest + digest_method))
-    add("method-no-algorithm", (method, "<ds:SignatureMethod/>"))
-    add("digest-no-algorithm", (digest_method, "<ds:DigestMethod/>"))
-    add("digest-in-two-elements", (digest, digest + "<ds:DigestValue>AAAA</ds:DigestValue>"))
-    add("digest-with-element", (digest, digest.replace("</", "<ds:a></ds:a></")))
-    add("text-in-signed-info", ("<ds:SignedInfo>", "<ds:SignedInfo>text"))
-    add("text-in-reference", ("<ds:Transforms>", "text<ds:Transforms>"))
-    add("other-in-signed-info", (method, method + "<ds:Other></ds:Other>"))
-    add_changed("signed-info-other-namespace",
+    add("manifest-reference", no_object,
+        (f'URI="#{ID}"', 'URI="#m" Type="' + names.DS + 'Manifest"'),
+        ("</ds:Signature>", f"<ds:Object>{manifest}</ds:Object></ds:Signature>"))
+    no_c14n = expected("CanonicalizationMethod", "SignedInfo", "'ds:SignatureMethod'")
+    add("no-c14n", no_c14n, (c14n, ""))
+    add("no-method", expected("SignatureMethod", "SignedInfo", "'ds:Reference'"), (method, ""))
+    no_digest_method = expected("DigestMethod", "Reference", "'ds:DigestValue'")
+    add("no-digest-method", no_digest_method, (digest_method, ""))
+    add("c14n-after-method", no_c14n, (c14n + method, method + c14n))
+    add("method-twice", expected("Reference", "SignedInfo", "'ds:SignatureMethod'"),
+        (method, method * 2))
+    add("c14n-twice", expected("SignatureMethod", "SignedInfo", "'ds:CanonicalizationMethod'"),
+        (c14n, c14n * 2))
+    add("digest-method-twice", expected("DigestValue", "Reference", "'ds:DigestMethod'"),
+        (digest_method, digest_method * 2))
+    add("digest-first", no_digest_method, (digest_method + digest, digest + digest_method))
+    add("method-no-algorithm", no_algorithm("SignatureMethod"), (method, "<ds:SignatureMethod/>"))
+    add("digest-no-algorithm", no_algorithm("DigestMethod"), (digest_method, "<ds:DigestMethod/>"))
+    add("digest-in-two-elements", surplus("ds:DigestValue", "Reference"),
+        (digest, digest + "<ds:DigestValue>AAAA</ds:DigestValue>"))
+    add("digest-with-element", only_text("DigestValue"),
+        (digest, digest.replace("</", "<ds:a></ds:a></")))
+    add("text-in-signed-info", syntax("Unexpected text in 'SignedInfo'"),
+        ("<ds:SignedInfo>", "<ds:SignedInfo>text"))
+    add("text-in-reference", syntax("Unexpected text in 'Reference'"),
+        ("<ds:Transforms>", "text<ds:Transforms>"))
+    add("other-in-signed-info", expected("Reference", "SignedInfo", "'ds:Other'"),
+        (method, method + "<ds:Other></ds:Other>"))
+    add_changed("signed-info-other-namespace", expected("SignedInfo", "Signature", "'x:SignedInfo'"),
                 ("<ds:SignedInfo>", '<x:SignedInfo xmlns:x="urn:x">'),
-                ("</ds:SignedInfo>", "</x:SignedInfo>"), refusals=SIGNATURE_SYNTAX)
+                ("</ds:SignedInfo>", "</x:SignedInfo>"))
 
 
 def _comments(c):
@@ -410,20 +458,22 @@ def _comments(c):
 
 
 def _duplicate_ids(c):
-    def add(name, refusals, *edits, token=LEAN):
+    def add(name, *edits, token=LEAN):
         c.refuse("duplicate-" + name, "the signed ID stands twice in the document",
-                 signed(token, *edits), refusals)
+                 signed(token, *edits), TWICE)
     value = '<saml:AttributeValue xsi:type="xs:string">Ada'
     for name, attribute in (
             ("id", f'ID="{ID}"'), ("id-mixed-case", f'Id="{ID}"'), ("id-lower-case", f'id="{ID}"'),
-            ("wsu-id", f'xmlns:wsu="{WSU}" wsu:Id="{ID}"'), ("xml-id", f'xml:id="{ID}"')):
-        add(name, OUTSIDE_PROFILE, (value, value.replace(" xsi:", f" {attribute} xsi:")))
-    add("id-in-class-ref", OUTSIDE_PROFILE,
+            ("wsu-id", f'xmlns:wsu="{WSU}" wsu:Id="{ID}"'), ("xml-id", f'xml:id="{ID}"'),
+            ("foreign-id", f'xmlns:x="urn:x" x:Id="{ID}"'),
+            ("odd-case", f'iD="{ID}"')):
+        add(name, (value, value.replace(" xsi:", f" {attribute} xsi:")))
+    add("id-in-class-ref",
         ("<saml:AuthnContextClassRef>", f'<saml:AuthnContextClassRef ID="{ID}">'))
-    add("id-in-signature", SYNTAX_OR_OUTSIDE, ("<ds:Signature ", f'<ds:Signature Id="{ID}" '))
-    add("id-in-key-info", SYNTAX_OR_OUTSIDE, ("<ds:KeyInfo>", f'<ds:KeyInfo Id="{ID}">'),
+    add("id-in-signature", ("<ds:Signature ", f'<ds:Signature Id="{ID}" '))
+    add("id-in-key-info", ("<ds:KeyInfo>", f'<ds:KeyInfo Id="{ID}">'),
         token=LEAN.signed_as(key_info=key_info("sts")))
-    add("id-in-signature-value", SYNTAX_OR_OUTSIDE,
+    add("id-in-signature-value",
         ("<ds:SignatureValue>", f'<ds:SignatureValue Id="{ID}">'))
 
 
@@ -445,25 +495,28 @@ def _wrap_all(c, name, evil_id, uri, whole_too):
     evil_start = evil.index("<ds:Signature ")
     evil = evil[:evil_start] + "@SIGNATURE@" + evil[evil.index("</ds:Signature>") + 15:]
     not_covered = evil_id != ID and uri != ""
-    verdict = TAMPERED + OUTSIDE_PROFILE
+    if not_covered:
+        judged = NOT_COVERED
+    else:
+        judged = TWICE if uri else TAMPERED
 
     def add(place, refusals, before, after):
         text = replaced(evil, before, after).replace("@SIGNATURE@", signature)
         c.refuse(f"wrapped-{place}-{name}", "the signed assertion is moved aside", text,
                  NOT_COVERED if not_covered else refusals)
 
-    def in_signature(place, open_tag, close_tag, content):
+    def in_signature(place, refusals, open_tag, close_tag, content):
         inside = signature.replace("</ds:Signature>", open_tag + content + close_tag
                                    + "</ds:Signature>")
         text = evil.replace("@SIGNATURE@", inside)
-        c.refuse(f"wrapped-{place}-{name}", "the signed assertion is moved aside", text,
-                 SYNTAX_OR_OUTSIDE + verdict + (NOT_COVERED if not_covered else []))
-    in_signature("signature-child", "", "", bare)
+        c.refuse(f"wrapped-{place}-{name}", "the signed assertion is moved aside", text, refusals)
+    in_signature("signature-child", surplus("saml:Assertion", "Signature"), "", "", bare)
     for form, moved in (("", bare), ("-with-signature", original))[:1 + whole_too]:
-        in_signature("object" + form, "<ds:Object>", "</ds:Object>", moved)
-        in_signature("key-info" + form, "<ds:KeyInfo>", "</ds:KeyInfo>", moved)
-        # What follows a delegate's NameID is not read, so only the signature can tell.
-        add("delegate" + form, verdict + [{"class": PARSE}],
+        in_signature("object" + form, surplus("ds:Object", "Signature"),
+                     "<ds:Object>", "</ds:Object>", moved)
+        # Nothing of KeyInfo is looked at but certificates, so only the reference can tell.
+        in_signature("key-info" + form, judged, "<ds:KeyInfo>", "</ds:KeyInfo>", moved)
+        add("delegate" + form, says("Unexpected elements after NameID"),
             "</del:Delegate>", f"{moved}</del:Delegate>")
         if uri:
             _wrap_where_structure_forbids(add, form, moved)
@@ -474,7 +527,7 @@ def _wrap_all(c, name, evil_id, uri, whole_too):
              says("Expected element 'Issuer' not found."))
     text = evil.replace("@SIGNATURE@", original)
     c.refuse(f"wrapped-in-place-of-signature-{name}", "the signed assertion is moved aside, whole",
-             text, SIGNATURE_SYNTAX)
+             text, syntax("Expected element 'Signature', found 'saml:Assertion'"))
     response = '<samlp:Response xmlns:samlp="urn:oasis:names:tc:SAML:2.0:protocol">'
     c.refuse(f"wrapped-in-response-{name}", "both assertions stand in a response",
              response + evil.replace("@SIGNATURE@", "") + original + "</samlp:Response>",

@@ -2,10 +2,7 @@
 
 from . import names
 from .accepted import LEAN
-from .catalogue import MALFORMED, OUTSIDE_PROFILE, PARSE, SIGNATURE, replaced, signed
-
-# Where names break the rules of namespaces, who notices is open; that it never passes is not.
-NAMESPACES = MALFORMED + [{"class": PARSE}, {"class": SIGNATURE}]
+from .catalogue import MALFORMED, outside, replaced, says, signed, syntax
 
 
 def add_all(catalogue):
@@ -181,20 +178,31 @@ def _broken(c):
 def _namespaces(c):
     ref, end = "<saml:AuthnContextClassRef>", "</saml:AuthnContextClassRef>"
 
-    def add(name, *edits, refusals=NAMESPACES):
+    def add(name, *edits, refusals=MALFORMED):
         c.refuse("namespace-" + name, "names that break the rules of namespaces",
                  signed(LEAN, *edits), refusals)
+    def undeclared(element, prefix):
+        return outside(f"Element '{element}' uses the undeclared prefix '{prefix}'")
+
+    def other_namespace(element):
+        return says(f"Element '{element}' has unexpected namespace")
     add("undeclared-element", (ref, "<nowhere:AuthnContextClassRef>"),
-        (end, "</nowhere:AuthnContextClassRef>"))
+        (end, "</nowhere:AuthnContextClassRef>"), refusals=other_namespace("AuthnContextClassRef"))
     add("undeclared-value-element",
         ('<saml:AttributeValue xsi:type="xs:string">Ada</saml:AttributeValue>',
-         "<nowhere:AttributeValue>Ada</nowhere:AttributeValue>"))
-    add("undeclared-attribute", (ref, ref[:-1] + ' nowhere:a="b">'))
-    add("undeclared-attribute-in-signature", ("<ds:SignedInfo>", '<ds:SignedInfo nowhere:a="b">'))
-    add("undeclared-prefix-of-all", (f'xmlns:saml="{names.SAML}" ', ""))
-    add("undeclared-xsi", (f'xmlns:xsi="{names.XSI}" ', ""))
+         "<nowhere:AttributeValue>Ada</nowhere:AttributeValue>"),
+        refusals=other_namespace("AttributeValue"))
+    add("undeclared-attribute", (ref, ref[:-1] + ' nowhere:a="b">'),
+        refusals=undeclared("saml:AuthnContextClassRef", "nowhere"))
+    add("undeclared-attribute-in-signature", ("<ds:SignedInfo>", '<ds:SignedInfo nowhere:a="b">'),
+        refusals=undeclared("ds:SignedInfo", "nowhere"))
+    add("undeclared-prefix-of-all", (f'xmlns:saml="{names.SAML}" ', ""),
+        refusals=other_namespace("Assertion"))
+    add("undeclared-xsi", (f'xmlns:xsi="{names.XSI}" ', ""),
+        refusals=undeclared("saml:AttributeValue", "xsi"))
     c.refuse("namespace-undeclared-ds", "names that break the rules of namespaces",
-             replaced(signed(LEAN), f' xmlns:ds="{names.DS}"', ""), NAMESPACES)
+             replaced(signed(LEAN), f' xmlns:ds="{names.DS}"', ""),
+             syntax("Expected element 'Signature', found 'ds:Signature'"))
     add("prefix-unbound", (ref, '<saml:AuthnContextClassRef xmlns:a="">'))
     add("xml-bound-elsewhere", (ref, ref[:-1] + ' xmlns:xml="urn:a">'))
     add("xmlns-bound", (ref, ref[:-1] + ' xmlns:xmlns="urn:a">'))
@@ -202,8 +210,7 @@ def _namespaces(c):
         (ref, ref[:-1] + ' xmlns:a="http://www.w3.org/XML/1998/namespace">'))
     add("same-attribute-by-two-prefixes",
         (ref, ref[:-1] + ' xmlns:a="urn:a" xmlns:b="urn:a" a:x="1" b:x="1">'))
-    add("declared-twice", (ref, ref[:-1] + ' xmlns:a="urn:a" xmlns:a="urn:a">'),
-        refusals=MALFORMED)
+    add("declared-twice", (ref, ref[:-1] + ' xmlns:a="urn:a" xmlns:a="urn:a">'))
     add("two-colons", (ref, ref[:-1] + ' a:b:c="1">'))
     add("leading-colon", (ref, ref[:-1] + ' :a="1">'))
     add("trailing-colon", (ref, ref[:-1] + ' saml:="1">'))
@@ -215,4 +222,4 @@ def _namespaces(c):
                                     ("relative-default-inclusive", inclusive, default)):
         text = signed(token, (ref, ref[:-1] + attributes), stand_in=stand_in)
         c.refuse("namespace-" + name, "a relative namespace URI, which has no canonical form",
-                 text, OUTSIDE_PROFILE + MALFORMED)
+                 text, outside("The namespace URI 'relative/path' is relative"))

@@ -59,7 +59,7 @@ def canonical(element, method):
     exclusive = not algorithm.startswith(names.C14N)
     inclusive_namespaces = method.find("ec:InclusiveNamespaces", _NAMESPACES)
     if exclusive and inclusive_namespaces is not None:
-        prefixes = inclusive_namespaces.get("PrefixList").split()
+        prefixes = inclusive_namespaces.get("PrefixList", "").split()
     # Written out alone, an element carries every namespace declaration of its ancestors, which
     # is the context that inclusive canonicalization must see.
     alone = _parse_bytes(etree.tostring(element, with_tail=False))

@@ -1,25 +1,15 @@
 #include "XmlSupport.h"
 
 #include "quillon/xml/security/Signature.h"
+#include "support/TestData.h"
 
 #include <gtest/gtest.h>
-
-#include <fstream>
-#include <sstream>
 
 // Verification is tested on whole tokens in tests/hostile, signed messages with xmlsec1 in
 // tests/unit/ssoClient/message; here stands what neither can reach.
 namespace Quillon::Xml::Security {
 
 namespace {
-
-Ref<const Crypto::PrivateKey> LoadKey(const std::string& name)
-{
-    std::ifstream file(std::string(TEST_DATA_DIR) + "/keys/" + name + "-key.pem");
-    std::ostringstream text;
-    text << file.rdbuf();
-    return Crypto::CreatePrivateKey(text.str());
-}
 
 /** The message of the `XmlSecurityException` that `action` raises; "accepted" if it does not. */
 template <class Action>
@@ -46,7 +36,7 @@ protected:
 
     std::string SignWith(const std::string& key)
     {
-        const Ref<const Crypto::PrivateKey> privateKey = LoadKey(key);
+        const Ref<const Crypto::PrivateKey> privateKey = GetTestKey(key);
         return GetSecurityError([&] { _signature->Sign(privateKey.get()); });
     }
 
@@ -145,15 +135,88 @@ TEST_F(BlankSignature, WritesWhatItWasTold)
         "<ds:KeyInfo><k:Key xmlns:k=\"urn:k\"/></ds:KeyInfo>");
 }
 
+/** A document of the test data in which `sts` signed, as its own SignedInfo asks for. */
+Ref<Document> ReadSignedDocument(const std::string& name)
+{
+    return ParseText(ReadTestData("documents/" + name + ".xml"));
+}
+
+/** What comes of verifying the signature in `parent`: "genuine", "forged", or why it is refused. */
+std::string Verify(ElementNode* parent)
+{
+    Ref<Signature> signature;
+    CreateSignatureFromDom(parent, parent->FindChildElement("Signature", DsNamespace), signature);
+    bool isGenuine = false;
+    const std::string error = GetSecurityError([&] {
+        isGenuine = signature->Verify(CreateTrustSetKeyResolver(GetTestCertificates("sts")).get());
+    });
+    if (error != "accepted") {
+        return error;
+    }
+    return isGenuine ? "genuine" : "forged";
+}
+
+std::string VerifyInRoot(const std::string& name)
+{
+    return Verify(ReadSignedDocument(name)->GetRootElement());
+}
+
+TEST(VerifySignature, RequiresAReference)
+{
+    EXPECT_EQ(VerifyInRoot("whole"), "genuine");
+    EXPECT_EQ(VerifyInRoot("no-reference"), "The signature has 0 references; 1 to 8 are accepted");
+}
+
+TEST(VerifySignature, TakesAnEmptyReferenceForTheRootOnly)
+{
+    EXPECT_EQ(VerifyInRoot("whole"), "genuine");
+    // The whole document is genuine, but the caller asked about a part of it.
+    const Ref<Document> document = ReadSignedDocument("whole-signed-in-a-part");
+    EXPECT_EQ(
+        Verify(document->GetRootElement()->FindChildElement("p")),
+        "The reference covers a whole document of which the signed element is a part");
+}
+
+TEST(VerifySignature, TakesTheIdOfTheElementAroundTheSignatureOnly)
+{
+    const Ref<Document> part = ReadSignedDocument("part");
+    EXPECT_EQ(Verify(part->GetRootElement()->FindChildElement("p")), "genuine");
+    EXPECT_EQ(
+        VerifyInRoot("uri-of-another"),
+        "Reference '#_p' does not name the element that encloses the signature");
+}
+
+TEST(VerifySignature, TakesNoNamespaceDeclarationForAnId)
+{
+    EXPECT_EQ(VerifyInRoot("namespace-like-an-id"), "genuine");
+    EXPECT_EQ(VerifyInRoot("id-twice"), "Reference '#urn:r' names 2 elements of the document");
+}
+
+TEST(VerifySignature, RefusesAUriThatIsNoHashAndId)
+{
+    EXPECT_EQ(
+        VerifyInRoot("uri-without-hash"),
+        "Reference 'x_r' does not name the element that encloses the signature");
+    // The root's ID is empty, so the hash alone would name it.
+    EXPECT_EQ(
+        VerifyInRoot("uri-of-hash-only"),
+        "Reference '#' does not name the element that encloses the signature");
+}
+
 TEST(CreateSignatureFromDom, RefusesAnElementThatIsNoChildOfTheSignedOne)
 {
-    const Ref<Document> document =
-        ParseText("<r><m><s xmlns='http://www.w3.org/2000/09/xmldsig#'/></m></r>");
+    const Ref<Document> document = ReadSignedDocument("part");
     ElementNode* root = document->GetRootElement();
+    ElementNode* part = root->FindChildElement("p");
     Ref<Signature> signature;
-    EXPECT_THROW(
-        CreateSignatureFromDom(root, root->FindChildElement("m")->FindChildElement("s"), signature),
-        SignatureSyntaxException);
+    try {
+        CreateSignatureFromDom(root, part->FindChildElement("Signature"), signature);
+        ADD_FAILURE() << "accepted";
+    } catch (const SignatureSyntaxException& error) {
+        EXPECT_STREQ(error.what(), "The signature is not a child of the element that it signs");
+    }
+    CreateSignatureFromDom(part, part->FindChildElement("Signature"), signature);
+    EXPECT_EQ(signature->GetElement()->GetParent(), part);
 }
 
 TEST(CreateTrustSetKeyResolver, RefusesANullCertificate)
@@ -163,17 +226,14 @@ TEST(CreateTrustSetKeyResolver, RefusesANullCertificate)
 
 TEST(ReadSignature, IsNotSignedAgain)
 {
-    std::ifstream file(std::string(TEST_DATA_DIR) + "/tokens/accepted/bearer.xml");
-    std::ostringstream text;
-    text << file.rdbuf();
-    const Ref<Document> document = ParseText(text.str());
+    const Ref<Document> document = ParseText(ReadTestData("tokens/accepted/bearer.xml"));
     ElementNode* root = document->GetRootElement();
     Ref<Signature> signature;
     CreateSignatureFromDom(root, root->FindChildElement("Signature"), signature);
     EXPECT_EQ(signature->GetElement(), root->FindChildElement("Signature"));
     EXPECT_THROW(signature->AddReference("#x"), InvalidStateException);
     EXPECT_THROW(signature->AddKeyInfoContent(root), InvalidStateException);
-    EXPECT_THROW(signature->Sign(LoadKey("sts").get()), InvalidStateException);
+    EXPECT_THROW(signature->Sign(GetTestKey("sts").get()), InvalidStateException);
 }
 
 } // namespace

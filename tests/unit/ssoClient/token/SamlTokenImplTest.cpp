@@ -333,6 +333,21 @@ TEST_F(CheckTokenPropertiesTest, BearerConfirmationMustLastAsLongAsTheToken)
             "NotOnOrAfter=\"2012-01-31T12:05:01Z\"></saml:SubjectConfirmationData>")));
 }
 
+TEST_F(CheckTokenPropertiesTest, ChecksTheConfirmationsEndBeforeTheDelegation)
+{
+    const std::string text = Delegated("a@d", {"a@d", "b@d"});
+    EXPECT_EQ(
+        "ParseException: The SubjectConfirmation delegate id does not match the id of the last "
+        "delegate",
+        JudgeUnsigned(text));
+    EXPECT_EQ(
+        "ParseException: Invalid token subject validity",
+        JudgeUnsigned(Replace(
+            text,
+            ConfirmationEnd,
+            "NotOnOrAfter=\"2012-01-31T12:04:59Z\"></saml:SubjectConfirmationData>")));
+}
+
 TEST_F(CheckTokenPropertiesTest, DelegateIdMustBeTheLastDelegate)
 {
     EXPECT_EQ(ReachesSignature, JudgeUnsigned(Delegated("b@d", {"a@d", "b@d"})));
@@ -546,6 +561,16 @@ struct Envelope
     Quillon::Xml::ElementNode* assertion = nullptr;
 };
 
+std::string SignatureErrorOf(Quillon::Xml::ElementNode* assertion)
+{
+    try {
+        CreateSamlTokenFromDom(assertion, TrustSts());
+        return "accepted";
+    } catch (const InvalidSignatureException& error) {
+        return error.what();
+    }
+}
+
 using CreateSamlTokenFromDomTest = TokenTest;
 
 } // namespace
@@ -571,15 +596,24 @@ TEST_F(CreateSamlTokenFromDomTest, KeepsTheInclusiveCanonicalForm)
 
 TEST_F(CreateSamlTokenFromDomTest, RefusesAnEmptyReferenceInsideALargerDocument)
 {
-    const Envelope envelope(StsKey().Sign(Bearer(), ""));
-    EXPECT_THROW(CreateSamlTokenFromDom(envelope.assertion, TrustSts()), InvalidSignatureException);
+    // The reference's digest is that of the whole document, so nothing else can be wrong.
+    const std::string canonical =
+        "<e:Envelope xmlns:e=\"urn:envelope\"><e:Body>" + Bearer() + "</e:Body></e:Envelope>";
+    Ref<Quillon::Xml::Document> document;
+    ParseXML(StsKey().Sign(canonical, ""), document);
+    Quillon::Xml::ElementNode* body = document->GetRootElement()->FindChildElement("Body");
+    EXPECT_EQ(
+        "Signature verification error. The reference covers a whole document of which the signed "
+        "element is a part",
+        SignatureErrorOf(body->FindChildElement("Assertion")));
 }
 
 TEST_F(CreateSamlTokenFromDomTest, RefusesASecondElementWithTheId)
 {
     const std::string xml = StsKey().Sign(Bearer());
-    const Envelope envelope(xml + "<other ID=\"_token\"/>");
-    EXPECT_THROW(CreateSamlTokenFromDom(envelope.assertion, TrustSts()), InvalidSignatureException);
+    EXPECT_EQ(
+        "Signature verification error. Reference '#_token' names 2 elements of the document",
+        SignatureErrorOf(Envelope(xml + "<other ID=\"_token\"/>").assertion));
 }
 
 TEST_F(CreateSamlTokenFromDomTest, RefusesAForgedAssertionBesideTheSignedOne)

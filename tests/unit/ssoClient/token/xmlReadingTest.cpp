@@ -422,6 +422,8 @@ TEST(GetULongOptionalAttribute, RefusesAnythingElse)
           "+",
           "-",
           "+-1",
+          "+-5",
+          "+-0", // no sign of the number that is left tells this one
           "++1",
           "0x1",
           "1e3",
