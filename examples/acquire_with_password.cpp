@@ -21,17 +21,15 @@ try {
     tls.useSystemAuthorities = false;
     tls.authorities = ReadCertificates(argv[2]);
     const auto sslContext = Quillon::Ssl::CreateSSLContext(tls);
-
     SsoClient::SecurityTokenServiceConfig config;
     config.url = argv[1];
     config.trustedCertificates = ReadCertificates(argv[3]); // who may sign tokens
     config.sslContext = sslContext.get();
-    const auto service = SsoClient::CreateSecurityTokenService(config);
-
     std::string password;
     std::getline(std::cin, password);
-    const auto token = service->AcquireToken(argv[4], password, SsoClient::TokenSpec());
-    std::cout << SsoClient::CreateRedactedDescription(*token) << "\n";
+    const auto token = CreateSecurityTokenService(config)->AcquireToken(argv[4], password, {});
+    std::cout << (token ? CreateRedactedDescription(*token) : "no token") << "\n";
+    return token ? 0 : 1;
 } catch (const Quillon::Exception& error) {
     std::cerr << Quillon::GetClassName(error) << ": " << error.what() << "\n";
     return 1;

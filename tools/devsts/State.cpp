@@ -46,8 +46,11 @@ bool PairExists(const fs::path& first, const fs::path& second)
 {
     const bool hasFirst = fs::exists(first);
     if (hasFirst != fs::exists(second)) {
+        const fs::path& present = hasFirst ? first : second;
         const fs::path& missing = hasFirst ? second : first;
-        throw std::runtime_error(missing.string() + " is missing although its pair is there");
+        throw std::runtime_error(
+            missing.string() + " is missing although " + present.string()
+            + " is there: delete both to have them made anew");
     }
     return hasFirst;
 }

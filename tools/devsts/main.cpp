@@ -11,6 +11,12 @@
 
 namespace {
 
+class UsageError : public std::runtime_error
+{
+public:
+    using std::runtime_error::runtime_error;
+};
+
 // The signals are blocked before any thread exists, so that all of them inherit it and only
 // sigwait takes one.
 sigset_t BlockStopSignals()
@@ -28,7 +34,7 @@ void SetAddress(DevSts::Options& options, const std::string& listen)
     static const std::regex pattern(R"((?:\[([0-9A-Fa-f:.]+)\]|([^:\[\]]+)):(\d{1,5}))");
     std::smatch parts;
     if (!std::regex_match(listen, parts, pattern) || std::stoi(parts[3].str()) > 65535) {
-        throw std::runtime_error("--listen wants HOST:PORT or [IPv6]:PORT, not " + listen);
+        throw UsageError("--listen wants HOST:PORT or [IPv6]:PORT, not " + listen);
     }
     options.host = parts[1].matched ? parts[1].str() : parts[2].str();
     options.port = std::stoi(parts[3].str());
@@ -62,7 +68,13 @@ int Run(int argc, char** argv)
     app.add_option("--listen", listen, "address and port; port 0 takes any free one")
         ->capture_default_str();
     app.add_flag("--http", options.plainHttp, "serve plain HTTP instead of HTTPS");
-    CLI11_PARSE(app, argc, argv);
+    try {
+        app.parse(argc, argv);
+    } catch (const CLI::Success& request) {
+        return app.exit(request); // prints the help
+    } catch (const CLI::ParseError& error) {
+        throw UsageError(error.what());
+    }
     SetAddress(options, listen);
     Serve(options);
     return 0;
@@ -76,6 +88,6 @@ int main(int argc, char** argv)
         return Run(argc, argv);
     } catch (const std::exception& error) {
         std::fprintf(stderr, "ssoclient-devsts: %s\n", error.what());
-        return 1;
+        return dynamic_cast<const UsageError*>(&error) != nullptr ? 2 : 1;
     }
 }

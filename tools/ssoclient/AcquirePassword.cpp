@@ -1,3 +1,4 @@
+#include "Arguments.h"
 #include "Commands.h"
 #include "IdentityOptions.h"
 #include "Secret.h"
@@ -38,12 +39,16 @@ void AddAcquirePasswordCommand(CLI::App& parent, Action& action)
         parent.add_subcommand("password", "Acquire a token with a user name and a password");
     const auto options = std::make_shared<AcquirePasswordOptions>();
     options->service.AddTo(*command);
-    command->add_option("--user", options->user, "User name")->required()->type_name("NAME");
+    command->add_option("--user", options->user, "User name")
+        ->required()
+        ->check(CheckName)
+        ->type_name("NAME");
     command
         ->add_option(
             "--password-file",
             options->passwordFile,
             "File whose first line is the password, - for standard input (default: ask for it)")
+        ->check(CheckNotEmpty)
         ->type_name("FILE");
     options->identity.AddTo(*command);
     options->token.AddTo(*command);

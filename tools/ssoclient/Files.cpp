@@ -1,11 +1,13 @@
 #include "Files.h"
 
 #include "ExitCode.h"
+#include "FileDescriptor.h"
 
 #include "quillon/MessageFormatter.h"
 
 #include <sys/stat.h>
 
+#include <cerrno>
 #include <cstdio>
 #include <cstdlib>
 
@@ -47,12 +49,35 @@ std::string ReadAll(int descriptor, const std::string& name)
     }
 }
 
+[[noreturn]] void ThrowWriteError(const std::string& path)
+{
+    ThrowSystemError("cannot write `" + path + "'");
+}
+
 /** Renaming over a device or a pipe would replace it instead of writing to it. */
 void RequireRegularOrAbsent(const std::string& path)
 {
     struct stat status = {};
-    if (::stat(path.c_str(), &status) == 0 && !S_ISREG(status.st_mode)) {
-        throw UsageError(MessageFormatter::ASPrint("`%1' is not a regular file", path));
+    if (::stat(path.c_str(), &status) == 0) {
+        if (!S_ISREG(status.st_mode)) {
+            throw UsageError(MessageFormatter::ASPrint("`%1' is not a regular file", path));
+        }
+    } else if (errno != ENOENT) {
+        ThrowWriteError(path);
+    }
+}
+
+/** The folder of `path`, to put the name of a file behind. */
+std::string GetFolder(const std::string& path)
+{
+    const std::size_t slash = path.rfind('/');
+    return slash == std::string::npos ? "./" : path.substr(0, slash + 1);
+}
+
+void RequireWritableFolder(const std::string& path)
+{
+    if (::access(GetFolder(path).c_str(), W_OK | X_OK) != 0) {
+        ThrowWriteError(path);
     }
 }
 
@@ -62,11 +87,36 @@ void WriteAll(int descriptor, const std::string& text, const std::string& path)
         const ssize_t count = RetryInterrupted(
             [&] { return ::write(descriptor, text.data() + at, text.size() - at); });
         if (count < 0) {
-            ThrowSystemError("cannot write `" + path + "'");
+            ThrowWriteError(path);
         }
         at += static_cast<std::size_t>(count);
     }
 }
+
+/** A file beside the one that it is to become; it goes if it does not become that. */
+class TemporaryFile
+{
+public:
+    // mkostemp makes the file with mode 0600, whatever the umask.
+    explicit TemporaryFile(const std::string& path)
+        : _name(GetFolder(path) + "ssoclient.XXXXXX")
+        , _descriptor(::mkostemp(_name.data(), O_CLOEXEC))
+    {
+        if (!_descriptor.IsOpen()) {
+            ThrowWriteError(path);
+        }
+    }
+    TemporaryFile(const TemporaryFile&) = delete;
+    TemporaryFile& operator=(const TemporaryFile&) = delete;
+    ~TemporaryFile() { ::unlink(_name.c_str()); } // nothing has the name after a renaming
+
+    const std::string& GetName() const noexcept { return _name; }
+    int GetDescriptor() const noexcept { return _descriptor.Get(); }
+
+private:
+    std::string _name;
+    FileDescriptor _descriptor;
+};
 
 } // namespace
 
@@ -84,29 +134,17 @@ std::string ReadFile(const std::string& path)
 
 OutputFile::OutputFile(std::string path)
     : _path(std::move(path))
-    , _temporaryPath(_path + ".XXXXXX")
 {
     RequireRegularOrAbsent(_path);
-    // mkostemp makes the file with mode 0600, whatever the umask.
-    _descriptor = FileDescriptor(::mkostemp(_temporaryPath.data(), O_CLOEXEC));
-    if (!_descriptor.IsOpen()) {
-        ThrowSystemError("cannot write `" + _path + "'");
-    }
+    RequireWritableFolder(_path);
 }
 
-OutputFile::~OutputFile()
+void OutputFile::Write(const std::string& text) const
 {
-    if (!_committed) {
-        ::unlink(_temporaryPath.c_str());
+    const TemporaryFile file(_path);
+    WriteAll(file.GetDescriptor(), text, _path);
+    if (::fsync(file.GetDescriptor()) != 0
+        || std::rename(file.GetName().c_str(), _path.c_str()) != 0) {
+        ThrowWriteError(_path);
     }
-}
-
-void OutputFile::Commit(const std::string& text)
-{
-    WriteAll(_descriptor.Get(), text, _path);
-    if (::fsync(_descriptor.Get()) != 0
-        || std::rename(_temporaryPath.c_str(), _path.c_str()) != 0) {
-        ThrowSystemError("cannot write `" + _path + "'");
-    }
-    _committed = true;
 }

@@ -1,7 +1,5 @@
 #pragma once
 
-#include "FileDescriptor.h"
-
 #include <string>
 
 /**
@@ -12,25 +10,24 @@
 std::string ReadFile(const std::string& path);
 
 /**
- * A file that appears under its name whole or not at all, readable by its owner only. It is
- * prepared when the object is made, so that a path that cannot be written is known before a token
- * is asked for; what is not committed leaves no trace.
+ * A file that appears under its name whole or not at all, readable by its owner only. Whether its
+ * folder lets files be made is looked up when the object is made, so that this is known before a
+ * token is asked for. Nothing is made before there is something to write: whatever ends the
+ * program until then leaves no trace.
  */
 class OutputFile
 {
 public:
     /** @throws UsageError  no file can be made there. */
     explicit OutputFile(std::string path);
-    OutputFile(const OutputFile&) = delete;
-    OutputFile& operator=(const OutputFile&) = delete;
-    ~OutputFile();
 
-    /** Writes `text` and gives the file its name, in place of one that was there. */
-    void Commit(const std::string& text);
+    /**
+     * Writes a file with `text` in place of one that was there.
+     *
+     * @throws UsageError  that fails.
+     */
+    void Write(const std::string& text) const;
 
 private:
     std::string _path;
-    std::string _temporaryPath;
-    FileDescriptor _descriptor;
-    bool _committed = false;
 };

@@ -1,5 +1,6 @@
 #include "IdentityOptions.h"
 
+#include "Arguments.h"
 #include "ExitCode.h"
 #include "Files.h"
 #include "Secret.h"
@@ -118,12 +119,14 @@ AddedOptions AddOptions(CLI::App& command, IdentityOptions& options)
                 options.key,
                 "The caller's own private key: a PEM or DER file, or the URI of a key in an "
                 "OpenSSL store (file:..., pkcs11:...)")
+            ->check(CheckNotEmpty)
             ->type_name("KEY"),
         command
             .add_option(
                 "--cert",
                 options.certificateFile,
                 "PEM file whose first certificate is that of the key")
+            ->check(CheckNotEmpty)
             ->type_name("PEM")};
     command
         .add_option(
@@ -132,6 +135,7 @@ AddedOptions AddOptions(CLI::App& command, IdentityOptions& options)
             "File whose first line is the passphrase of an encrypted key, - for standard input "
             "(default: ask for it)")
         ->needs(added.key)
+        ->check(CheckNotEmpty)
         ->type_name("FILE");
     return added;
 }

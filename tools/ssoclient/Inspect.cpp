@@ -1,3 +1,4 @@
+#include "Arguments.h"
 #include "Commands.h"
 #include "Files.h"
 #include "TokenOutput.h"
@@ -10,8 +11,6 @@
 #include <memory>
 
 namespace {
-
-constexpr long long MaxClockToleranceSec = 100LL * 365 * 24 * 3600;
 
 struct InspectOptions
 {
@@ -38,6 +37,7 @@ void AddInspectCommand(CLI::App& parent, Action& action)
     const auto options = std::make_shared<InspectOptions>();
     command->add_option("FILE", options->file, "The token, - for standard input")
         ->required()
+        ->check(CheckNotEmpty)
         ->type_name("");
     AddTrustTo(*command, options->trustFiles);
     command
@@ -45,7 +45,7 @@ void AddInspectCommand(CLI::App& parent, Action& action)
             "--clock-tolerance",
             options->clockToleranceSec,
             "By how many seconds the token's validity is widened at both ends")
-        ->check(CLI::Range(0LL, MaxClockToleranceSec))
+        ->check(CLI::Range(0LL, MaxSeconds))
         ->capture_default_str()
         ->type_name("SEC");
     options->output.AddJsonTo(*command);

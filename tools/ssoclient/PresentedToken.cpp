@@ -1,5 +1,6 @@
 #include "PresentedToken.h"
 
+#include "Arguments.h"
 #include "Files.h"
 
 #include "ssoClient/CreateSamlToken.h"
@@ -8,6 +9,7 @@ void AddTokenTo(CLI::App& command, std::string& tokenFile)
 {
     command.add_option("--token", tokenFile, "The token to present, - for standard input")
         ->required()
+        ->check(CheckNotEmpty)
         ->type_name("FILE");
 }
 

@@ -1,3 +1,4 @@
+#include "Arguments.h"
 #include "Commands.h"
 #include "IdentityOptions.h"
 #include "PresentedToken.h"
@@ -39,6 +40,7 @@ void AddRenewCommand(CLI::App& parent, Action& action)
         ->add_option(
             "--lifetime", options->lifetimeSec, "Lifetime of the new token, from now, in seconds")
         ->required()
+        ->check(CheckLifetime)
         ->type_name("SEC");
     options->identity.AddRequiredTo(*command);
     options->output.AddOutTo(*command);

@@ -1,5 +1,9 @@
 #include "ServiceOptions.h"
 
+#include "Arguments.h"
+#include "ExitCode.h"
+
+#include "quillon/MessageFormatter.h"
 #include "quillon/http/HttpURL.h"
 #include "quillon/service/Logger.h"
 
@@ -22,7 +26,11 @@ Quillon::Ref<Quillon::Ssl::SSLContext> CreateContext(const ServiceOptions& servi
     Quillon::Ssl::SSLContextOptions options;
     options.useSystemAuthorities = service.authorityFiles.empty();
     options.authorities = ReadCertificates(service.authorityFiles);
-    return Quillon::Ssl::CreateSSLContext(options);
+    try {
+        return Quillon::Ssl::CreateSSLContext(options);
+    } catch (const Quillon::Crypto::CryptoException& error) {
+        throw UsageError(Quillon::MessageFormatter::ASPrint("cannot set up TLS: %1", error.what()));
+    }
 }
 
 /** The library's logger writes to standard error unless it is given another sink. */
@@ -47,6 +55,7 @@ void ServiceOptions::AddTo(CLI::App& command)
             "--ca",
             authorityFiles,
             "PEM files with the authorities to trust for TLS (default: the system's)")
+        ->check(CheckNotEmpty)
         ->type_name("PEM");
     command
         .add_option(
@@ -54,6 +63,7 @@ void ServiceOptions::AddTo(CLI::App& command)
             peer,
             "What the TLS server must prove: another host name, or sha256//BASE64 of its public "
             "key (default: the host name of the URL)")
+        ->check(CheckNotEmpty)
         ->type_name("TEXT");
     command.add_flag("--verbose", verbose, "Write the library's trace lines to standard error");
 }

@@ -1,5 +1,6 @@
 #include "TokenOutput.h"
 
+#include "Arguments.h"
 #include "ExitCode.h"
 #include "OneLine.h"
 
@@ -36,7 +37,10 @@ Json ToJson(const std::vector<Item>& items)
     return list;
 }
 
-/** What the redacted description says, under the same names; nothing more. */
+/**
+ * What the redacted description says, under the same names; nothing more. It is all ASCII, because
+ * a name may hold what would steer a terminal.
+ */
 std::string CreateJsonDescription(const SsoClient::SamlToken& token)
 {
     std::vector<SsoClient::PrincipalId> groups;
@@ -55,7 +59,7 @@ std::string CreateJsonDescription(const SsoClient::SamlToken& token)
     json["delegable"] = token.IsDelegable();
     json["isSolution"] = token.IsSolution();
     json["confirmationType"] = isBearer ? "bearer" : "holder-of-key";
-    return json.dump(2);
+    return json.dump(2, ' ', true);
 }
 
 } // namespace
@@ -68,6 +72,7 @@ void OutputOptions::AddJsonTo(CLI::App& command)
 void OutputOptions::AddOutTo(CLI::App& command)
 {
     command.add_option("--out", outFile, "Write the assertion to this file (mode 0600)")
+        ->check(CheckNotEmpty)
         ->type_name("FILE");
 }
 
@@ -85,7 +90,7 @@ void TokenOutput::Show(const boost::shared_ptr<const SsoClient::SamlToken>& toke
         throw SsoClient::SsoException("The token service answered without a token");
     }
     if (_file) {
-        _file->Commit(token->ToXml());
+        _file->Write(token->ToXml());
     }
     PrintLine(
         _json ? CreateJsonDescription(*token)

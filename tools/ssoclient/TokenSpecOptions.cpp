@@ -1,5 +1,7 @@
 #include "TokenSpecOptions.h"
 
+#include "Arguments.h"
+
 #include <CLI/Error.hpp>
 
 #include <algorithm>
@@ -42,6 +44,7 @@ void TokenSpecOptions::AddTo(CLI::App& command)
 {
     command.add_option("--lifetime", spec.tokenLifetimeSec, "Lifetime of the token in seconds")
         ->capture_default_str()
+        ->check(CheckLifetime)
         ->type_name("SEC");
     command.add_flag("--renewable", spec.renewable, "Ask for a token that can be renewed");
     command.add_flag("--delegable", spec.delegable, "Ask for a token that can be delegated");
@@ -50,9 +53,11 @@ void TokenSpecOptions::AddTo(CLI::App& command)
             "--delegate-to",
             [this](const std::string& name) { spec.delegateTo = name; },
             "Ask for a token delegated to this principal")
+        ->check(CheckName)
         ->type_name("NAME");
     command
         .add_option("--audience", spec.audienceRestriction, "Restrict the token to these parties")
+        ->check(CheckNotEmpty)
         ->type_name("URI");
     command
         .add_option_function<std::vector<AdviceWords>>(

@@ -1,5 +1,6 @@
 #include "Trust.h"
 
+#include "Arguments.h"
 #include "ExitCode.h"
 #include "Files.h"
 
@@ -26,6 +27,7 @@ void AddTrustTo(CLI::App& command, std::vector<std::string>& trustFiles)
         .add_option(
             "--trust", trustFiles, "PEM files with the certificates that may have signed the token")
         ->required()
+        ->check(CheckNotEmpty)
         ->type_name("PEM");
 }
 

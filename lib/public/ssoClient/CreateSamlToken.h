@@ -27,6 +27,8 @@ inline constexpr long long DefaultClockToleranceSec = 600;
  * @throws InvalidSignatureException           the signature does not verify.
  * @throws Quillon::Xml::XMLParseException     `xml` is not well-formed or exceeds a limit.
  * @throws Quillon::Crypto::CryptoException    the confirmation certificate cannot be decoded.
+ * @throws Quillon::Base64FormatException      the confirmation certificate is not Base64.
+ * @throws Quillon::InvalidArgumentException   a trusted certificate is null.
  *
  * Thread safety: any number of threads, also with the same certificates. Cost: one parse, one
  * hash and one public-key operation.
@@ -47,7 +49,12 @@ SSOCLIENT_API boost::shared_ptr<const SamlToken> CreateSamlToken(
 
 /**
  * The same for an assertion that is already parsed, possibly inside a larger document. The
- * token's XML is then the assertion's inclusive canonical form; the tree is not kept.
+ * token's XML is then the assertion's inclusive canonical form; the tree is not kept. That form
+ * takes on the `xml:` attributes of the elements around the assertion: if there are any, the
+ * token is good, but `CreateSamlToken` may refuse its XML.
+ *
+ * @throws Quillon::Xml::Security::XmlSecurityException  the assertion has no canonical form: a
+ *                                                       prefix is not declared.
  */
 SSOCLIENT_API boost::shared_ptr<const SamlToken> CreateSamlTokenFromDom(
     Quillon::Xml::ElementNode* assertion,

@@ -14,13 +14,21 @@ namespace SsoClient {
  * Obtains, renews and validates tokens at a WS-Trust 1.3 security token service.
  *
  * No operation retries. Each may throw:
- * - `Quillon::InvalidArgumentException`, before anything is sent, for a bad argument;
+ * - `Quillon::InvalidArgumentException`, before anything is sent, for a bad argument (only a
+ *   trusted certificate that is null is noticed later, when there is a token to verify);
  * - `Quillon::InvalidStateException`, before anything is sent, if it needs the holder-of-key
  *   identity and the configuration has none;
  * - `CommunicationException`, or the transport's own exception, if the exchange fails;
  * - `InvalidCredentialsException` if the service rejects the credentials;
  * - `InvalidSignatureException` if the token it sends does not verify;
- * - `SsoException` for any other fault or an answer that cannot be used.
+ * - `SsoException` for any other fault or an answer that cannot be used; as a `ParseException` if
+ *   the code of a fault has a prefix that nothing declares.
+ * An answer that is malformed in a particular place ends with the exception of that place:
+ * - `Quillon::Xml::XMLParseException` if the token in it cannot be parsed by itself;
+ * - `Quillon::Xml::Security::XmlSecurityException` if it has no canonical form;
+ * - `Quillon::Base64FormatException` or `Quillon::Crypto::CryptoException` if the certificate in
+ *   it cannot be decoded; the latter also if the caller's own key cannot sign;
+ * - `Quillon::TypeMismatchException` if the status of a validation is not text.
  *
  * There is no virtual destructor: a service is only owned by the pointer of its factory.
  *

@@ -38,6 +38,10 @@ class Acquire(ServiceTest):
                     self.acquire("--lifetime", lifetime), USAGE, "InvalidArgumentException",
                     "Invalid argument : .+")
 
+    def test_longest_lifetime_that_is_taken(self):
+        # The service shortens it.
+        self.assert_done(self.acquire("--lifetime", "3153600000"))
+
     def test_asks_for_audiences(self):
         out = self.folder / "token.xml"
         result = self.acquire("--audience", "urn:a", "urn:b", "--audience", "urn:c", "--out", out)
@@ -81,11 +85,6 @@ class WithAKey(ServiceTest):
         self.assert_fails(self.acquire("--cert", self.sts.certificate, service=self.nowhere),
                           USAGE, "UsageError", "--cert requires --key")
 
-    def test_empty_names_are_not_the_same_as_none(self):
-        result = self.acquire("--key", "", "--cert", "", service=self.nowhere)
-        self.assert_fails(result, USAGE, "UsageError",
-                          "cannot open `': No such file or directory")
-
     def test_passphrase_and_password_may_follow_each_other_on_standard_input(self):
         key = self.encrypted_key("key-secret")
         result = self.acquire("--json", "--key", key, "--cert", self.sts.certificate,
@@ -124,9 +123,19 @@ class OutputFiles(ServiceTest):
         self.assertEqual({out, self.password}, set(self.folder.iterdir()))
 
     def test_that_cannot_be_written_is_found_before_anything_is_sent(self):
-        for out, why in ((self.folder / "no" / "token.xml", "No such file or directory"),):
-            result = self.acquire("--out", out, service=self.nowhere)
-            self.assert_fails(result, USAGE, "UsageError", f"cannot write `{out}': {why}")
+        for out, why in ((self.folder / "no" / "token.xml", "No such file or directory"),
+                         (self.password / "token.xml", "Not a directory"),
+                         (self.folder / ("x" * 256), "File name too long")):
+            with self.subTest(why=why):
+                result = self.acquire("--out", out, service=self.nowhere)
+                self.assert_fails(result, USAGE, "UsageError", f"cannot write `{out}': {why}")
+
+    def test_in_the_working_folder_needs_no_folder_name(self):
+        before = os.getcwd()
+        self.addCleanup(os.chdir, before)
+        os.chdir(self.folder)
+        self.assert_done(self.acquire("--out", "x" * 255))
+        self.assertEqual({self.folder / ("x" * 255), self.password}, set(self.folder.iterdir()))
 
     def test_must_not_be_a_device_or_a_folder(self):
         for out in ("/dev/null", self.folder):

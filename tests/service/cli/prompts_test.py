@@ -33,9 +33,9 @@ sys.exit(os.waitstatus_to_exitcode(status))
 
 
 class PasswordPrompt(TerminalTest):
-    def acquire_at_terminal(self, **others):
+    def acquire_at_terminal(self, options=(), **others):
         return self.start("acquire", "password", *self.sts.service_options,
-                          "--user", DevelopmentSts.USER, **others)
+                          "--user", DevelopmentSts.USER, *options, **others)
 
     def test_reads_without_echo(self):
         process = self.acquire_at_terminal()
@@ -57,6 +57,16 @@ class PasswordPrompt(TerminalTest):
                 process.send_signal(number)
                 self.assertEqual(-number, process.wait(timeout=120))
                 self.assertTrue(self.echoes())
+
+    def test_signal_at_the_prompt_leaves_no_file(self):
+        before = set(self.folder.iterdir())
+        for number in (signal.SIGINT, signal.SIGTERM):
+            with self.subTest(signal=number):
+                process = self.acquire_at_terminal(options=["--out", self.folder / "token.xml"])
+                self.read_until(PROMPT)
+                process.send_signal(number)
+                self.assertEqual(-number, process.wait(timeout=120))
+                self.assertEqual(before, set(self.folder.iterdir()))
 
     def test_asks_again_after_a_stop(self):
         process = self.acquire_at_terminal(

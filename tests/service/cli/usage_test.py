@@ -1,5 +1,6 @@
 """What the command line says before anything is asked of a service."""
 
+import os
 import unittest
 
 from programs import DATA, REFUSED, USAGE, ProgramTest, ssoclient
@@ -82,6 +83,55 @@ class UsageErrors(ProgramTest):
             with self.subTest(value=value):
                 self.assert_usage_error(".*--clock-tolerance.*", "inspect", "x", "--trust",
                                         STS_CERTIFICATE, "--clock-tolerance", value)
+
+    # Of the command and its required options; the files are not read.
+    COMMANDS = {
+        "acquire password": {"--url": "https://127.0.0.1:1/sts", "--trust": "t", "--user": "u"},
+        "acquire certificate": {"--url": "https://127.0.0.1:1/sts", "--trust": "t", "--key": "k",
+                                "--cert": "c"},
+        "acquire token": {"--url": "https://127.0.0.1:1/sts", "--trust": "t", "--key": "k",
+                          "--cert": "c", "--token": "x"},
+        "renew": {"--url": "https://127.0.0.1:1/sts", "--trust": "t", "--key": "k",
+                  "--cert": "c", "--token": "x", "--lifetime": "1"}}
+
+    def assert_value_is_refused(self, message, command, option, value):
+        options = {**self.COMMANDS[command], option: value}
+        words = [word for pair in options.items() for word in pair]
+        self.assert_fails(ssoclient(*command.split(), *words), USAGE, "UsageError",
+                          f"{option}: {message}")
+
+    def test_empty_value_is_not_the_same_as_no_option(self):
+        common = ("--trust", "--ca", "--peer", "--key", "--cert", "--out")
+        for command, options in (
+                ("acquire password", (*common, "--user", "--password-file", "--delegate-to",
+                                      "--audience")),
+                ("acquire certificate", (*common, "--key-passphrase-file")),
+                ("acquire token", (*common, "--token")),
+                ("renew", (*common, "--token"))):
+            for option in options:
+                with self.subTest(command=command, option=option):
+                    self.assert_value_is_refused("must not be empty", command, option, "")
+        self.assert_usage_error("FILE: must not be empty", "inspect", "", "--trust", "t")
+
+    def test_name_with_control_characters(self):
+        for option in ("--user", "--delegate-to"):
+            for value in ("a\nb", "a\tb", "\x1b[31m", "a\x7f", "a\u009bb", "a\u2028b"):
+                with self.subTest(option=option, value=value):
+                    self.assert_value_is_refused("must not hold control characters",
+                                                 "acquire password", option, value)
+
+    def test_name_that_is_not_utf8(self):
+        for value in (b"\xff", b"a\xc3", b"\xc0\x80", b"\xed\xa0\x80"):
+            with self.subTest(value=value):
+                self.assert_value_is_refused("is not UTF-8", "acquire password", "--user",
+                                             os.fsdecode(value))
+
+    def test_lifetime_that_is_too_long(self):
+        for command in ("acquire password", "acquire certificate", "acquire token", "renew"):
+            for value in ("3153600001", "9223372036854775807"):
+                with self.subTest(command=command, value=value):
+                    self.assert_value_is_refused("must be at most 3153600000 seconds", command,
+                                                 "--lifetime", value)
 
     def test_lifetime_that_is_no_number(self):
         self.assert_usage_error(".*--lifetime.*", "acquire", "password", "--url", "x", "--user",

@@ -234,10 +234,25 @@ TEST(DevStsProgram, JudgesRequestsByRealTime)
 TEST(DevStsProgram, BadListenArgumentIsRefused)
 {
     Program program({"--state", StateArgument(), "--listen", "127.0.0.1"});
-    EXPECT_EQ(program.Wait(), 1);
+    EXPECT_EQ(program.Wait(), 2);
     EXPECT_EQ(
         program.Errors(),
         "ssoclient-devsts: --listen wants HOST:PORT or [IPv6]:PORT, not 127.0.0.1\n");
+}
+
+TEST(DevStsProgram, MissingStateArgumentIsRefusedInOneLine)
+{
+    Program program({});
+    EXPECT_EQ(program.Wait(), 2);
+    EXPECT_EQ(program.ReadRest(), "");
+    EXPECT_EQ(program.Errors(), "ssoclient-devsts: --state is required\n");
+}
+
+TEST(DevStsProgram, StateThatCannotBeUsedIsNoUsageError)
+{
+    Program program({"--state", "/dev/null/state"});
+    EXPECT_EQ(program.Wait(), 1);
+    EXPECT_NE(program.Errors().find("/dev/null/state"), std::string::npos);
 }
 
 } // namespace

@@ -65,7 +65,9 @@ TEST(State, KeyWithoutCertificateIsReported)
     fs::remove(state.Path() / "sts.pem");
     EXPECT_EQ(
         OpenFailure(state.Path()),
-        (state.Path() / "sts.pem").string() + " is missing although its pair is there");
+        (state.Path() / "sts.pem").string() + " is missing although "
+            + (state.Path() / "sts.key").string()
+            + " is there: delete both to have them made anew");
 }
 
 TEST(State, MistypedUserFieldIsReported)

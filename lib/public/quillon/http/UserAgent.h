@@ -35,8 +35,13 @@ QUILLON_API void CreateHttpConnectionPool(ConnectionSpec* spec, Ref<HttpConnecti
 /**
  * Sends requests to one server, over HTTP/1.1.
  *
- * Nothing outside the arguments has a say: no environment, proxy or .netrc. Redirects are not
- * followed. A reply may have 8 MiB of body and 64 KiB of headers.
+ * Nothing outside the arguments has a say in an exchange: no environment, proxy or .netrc.
+ * Redirects are not followed. A reply may have 8 MiB of body and 64 KiB of headers.
+ *
+ * The libraries below look at the environment when they initialise, with the first exchange at the
+ * latest: libcurl creates the file that SSLKEYLOGFILE names (no keys land in it), and OpenSSL reads
+ * its configuration file, which OPENSSL_CONF can name, unless the process initialised OpenSSL with
+ * OPENSSL_INIT_NO_LOAD_CONFIG before.
  *
  * All exchanges of the process run on one I/O thread, which starts with the first of them.
  * Completions run on a second thread, one after another, and should return soon: a slow one

@@ -45,7 +45,8 @@ public:
  * Reads UTF-8 documents without DOCTYPE. A prefix that nothing declares is not an error here
  * (readers report it in their own words), but canonicalizing it is.
  *
- * Thread safety: one parse at a time. Cost: linear in the size of the text.
+ * Thread safety: one parse at a time. Cost: linear in the size of the text; the memory is up to
+ * about 30 times that of the text, if it consists of small nodes.
  */
 class QUILLON_API Parser : public RefCounted
 {

@@ -1,0 +1,51 @@
+#include "Arguments.h"
+
+#include "OneLine.h"
+
+#include "quillon/MessageFormatter.h"
+
+#include <CLI/TypeTools.hpp>
+#include <nlohmann/json.hpp>
+
+using Quillon::MessageFormatter;
+
+namespace {
+
+/** Writing JSON is strict about UTF-8. */
+bool IsUtf8(const std::string& text)
+{
+    try {
+        nlohmann::json(text).dump();
+        return true;
+    } catch (const nlohmann::json::type_error&) {
+        return false;
+    }
+}
+
+} // namespace
+
+std::string CheckNotEmpty(const std::string& value)
+{
+    return value.empty() ? "must not be empty" : "";
+}
+
+std::string CheckName(const std::string& value)
+{
+    if (value.empty()) {
+        return CheckNotEmpty(value);
+    }
+    if (!IsUtf8(value)) {
+        return "is not UTF-8";
+    }
+    return ToOneLine(value) == value ? "" : "must not hold control characters";
+}
+
+std::string CheckLifetime(const std::string& value)
+{
+    long long seconds = 0;
+    // What is no number is refused by the conversion that follows.
+    if (CLI::detail::lexical_cast(value, seconds) && seconds > MaxSeconds) {
+        return MessageFormatter::ASPrint("must be at most %1 seconds", MaxSeconds);
+    }
+    return "";
+}
