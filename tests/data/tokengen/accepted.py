@@ -403,7 +403,8 @@ def _attributes(c):
          BASE, ('<saml:AttributeValue xsi:type="xs:string">Ada',
                 f'<saml:AttributeValue xmlns:x="urn:x" valid="{ID}" PAID="{ID}" x:valid="{ID}" '
                 f'Ids="{ID}" I="{ID}" d="{ID}" x:d="{ID}" Identifier="{ID}" IDREF="{ID}" '
-                f'_Id="{ID}" x:a-id="{ID}" href="#{ID}" xsi:type="xs:string">Ada'))
+                f'ad="{ID}" x:bd="{ID}" ie="{ID}" _Id="{ID}" x:a-id="{ID}" href="#{ID}" '
+                'xsi:type="xs:string">Ada'))
     _add(c, "blank-ends", "values with blanks at their ends, which belong to them",
          BASE.but(subject=(" user", "example.com "), groups=[("Users ", " example.com")],
                   advice=[("urn:source", [("urn:name", [" \tvalue "])])]))

@@ -6,14 +6,12 @@ import base64
 
 from . import names
 from .accepted import LEAN, good_reference, listed, listed_prefixes
-from .catalogue import PARSE, SIGNATURE, TAMPERED, outside, signed, value_of
+from .catalogue import TAMPERED, outside, signed, syntax, value_of
 from .forgery import no_parameter, only_text
 
 C14N_LIST = f'<ds:CanonicalizationMethod Algorithm="{names.EXC_C14N}"'
 TRANSFORM_LIST = f'<ds:Transform Algorithm="{names.EXC_C14N}"'
-SIXTY_FIVE = [{"class": SIGNATURE, "prefix": "Signature verification error. ", "contains": "64"}]
-BAD_LIST = [{"class": PARSE, "prefix": "Signature syntax error: ",
-             "contains": "InclusiveNamespaces"}]
+NOT_EMPTY = syntax("'InclusiveNamespaces' must be empty")
 
 
 def add_all(catalogue):
@@ -50,6 +48,10 @@ def _many_references(c):
     _refuse(c, "references-nine", "one more good reference than is looked at",
             outside("The signature has 9 references; 1 to 8 are accepted"), LEAN,
             (one, one * 9), xmlsec1="valid")
+    wrong = one.replace("@DIGEST@", base64.b64encode(bytes(32)).decode())
+    for name, pair in (("first", wrong + one), ("second", one + wrong)):
+        _refuse(c, f"references-two-{name}-wrong", "one of two references has another digest",
+                TAMPERED, LEAN, (one, pair), xmlsec1="invalid")
 
 
 def _misplaced_lists(c):
@@ -82,16 +84,20 @@ def _two_lists(c):
 
 def _bad_lists(c):
     good = listed("xs")
-    for name, bad in (
-            ("element", good[:-2] + "><ec:a></ec:a></ec:InclusiveNamespaces>"),
-            ("text", good[:-2] + ">xsi</ec:InclusiveNamespaces>"),
-            ("attribute", good[:-2] + ' a="b"/>'),
-            ("prefixed-attribute", good[:-2] + ' ec:PrefixList="xsi"/>'),
-            ("absent", good.replace(' PrefixList="xs"', ""))):
+
+    def attribute(name):
+        return syntax(f"Unexpected attribute '{name}' on 'InclusiveNamespaces'")
+    for name, refusals, bad in (
+            ("element", NOT_EMPTY, good[:-2] + "><ec:a></ec:a></ec:InclusiveNamespaces>"),
+            ("text", NOT_EMPTY, good[:-2] + ">xsi</ec:InclusiveNamespaces>"),
+            ("attribute", attribute("a"), good[:-2] + ' a="b"/>'),
+            ("prefixed-attribute", attribute("ec:PrefixList"), good[:-2] + ' ec:PrefixList="xsi"/>'),
+            ("absent", syntax("'InclusiveNamespaces' has no attribute 'PrefixList'"),
+             good.replace(' PrefixList="xs"', ""))):
         for place, element, start in (("c14n", "CanonicalizationMethod", C14N_LIST),
                                       ("transform", "Transform", TRANSFORM_LIST)):
             _refuse(c, f"prefix-list-{name}-{place}", "a prefix list that is more or less than one",
-                    BAD_LIST, LEAN, (start + "/>", f"{start}>{bad}</ds:{element}>"),
+                    refusals, LEAN, (start + "/>", f"{start}>{bad}</ds:{element}>"),
                     xmlsec1="none" if name == "absent" else "valid")
 
 
@@ -99,8 +105,8 @@ def _long_lists(c):
     prefixes = " ".join(listed_prefixes(65))
     for place, token in (("c14n", LEAN.signed_as(c14n_prefixes=prefixes)),
                          ("transform", LEAN.signed_as(transform_prefixes=prefixes))):
-        _refuse(c, f"prefix-list-65-{place}", "one more prefix than is looked up", SIXTY_FIVE, token,
-                xmlsec1="valid")
+        _refuse(c, f"prefix-list-65-{place}", "one more prefix than is looked up",
+                outside("More than 64 prefixes in a PrefixList"), token, xmlsec1="valid")
 
 
 def _digests(c):
