@@ -111,7 +111,8 @@ TEST_F(ProcessTest, ExitsWithExchangesInFlight)
         std::thread thread;
         ~Joiner() { thread.join(); }
     } joiner;
-    static HttpClient client(server);
+    // Never destroyed: the thread uses it until the joiner has joined.
+    static HttpClient& client = *new HttpClient(server);
     client.Post();
     joiner.thread = std::thread([] {
         if (client.PostAndFail() != "The process is about to end.") {
