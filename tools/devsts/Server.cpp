@@ -1,5 +1,6 @@
 #include "devsts/Server.h"
 
+#include "devsts/Connections.h"
 #include "devsts/State.h"
 #include "devsts/TokenService.h"
 
@@ -19,8 +20,7 @@ namespace {
 constexpr const char* Path = "/sts";
 constexpr std::size_t LargestRequest = 1U << 20U;
 // One thread serves one connection for as long as it stays open.
-constexpr std::size_t Threads = 32;
-// Stop waits this long for connections that are idle.
+constexpr std::size_t Threads = 128;
 constexpr time_t IdleSeconds = 5;
 constexpr std::size_t RequestsPerConnection = 1000000;
 
@@ -98,6 +98,7 @@ public:
             throw std::runtime_error(
                 "Cannot listen on " + _options.host + ":" + std::to_string(_options.port));
         }
+        _address = LocalAddress(_listener);
         // The HTTP library listens with room for five; a second call makes more.
         listen(_listener, SOMAXCONN);
         _thread = std::thread([this] { _http->listen_after_bind(); });
@@ -112,6 +113,7 @@ public:
     {
         if (_thread.joinable()) {
             _http->stop();
+            EndReading(_address);
             _thread.join();
         }
     }
@@ -233,6 +235,7 @@ private:
     std::thread _thread;
     int _port = 0;
     socket_t _listener = INVALID_SOCKET;
+    LocalAddress _address;
     std::atomic<std::chrono::milliseconds> _delay{std::chrono::milliseconds(0)};
     mutable std::mutex _mutex;
     std::deque<ReplyHook> _hooks;
