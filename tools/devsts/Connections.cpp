@@ -46,16 +46,14 @@ const sockaddr_in6& AsIpv6(const sockaddr_storage& address)
 
 bool Ipv4Covers(const sockaddr_in& listener, const sockaddr_in& other)
 {
-    return listener.sin_port == other.sin_port
-           && (listener.sin_addr.s_addr == htonl(INADDR_ANY)
-               || listener.sin_addr.s_addr == other.sin_addr.s_addr);
+    return listener.sin_addr.s_addr == htonl(INADDR_ANY)
+           || listener.sin_addr.s_addr == other.sin_addr.s_addr;
 }
 
 bool Ipv6Covers(const sockaddr_in6& listener, const sockaddr_in6& other)
 {
-    return listener.sin6_port == other.sin6_port
-           && (IN6_IS_ADDR_UNSPECIFIED(&listener.sin6_addr)
-               || IN6_ARE_ADDR_EQUAL(&listener.sin6_addr, &other.sin6_addr));
+    return IN6_IS_ADDR_UNSPECIFIED(&listener.sin6_addr)
+           || IN6_ARE_ADDR_EQUAL(&listener.sin6_addr, &other.sin6_addr);
 }
 
 bool IsSocket(const fs::path& entry)
@@ -66,17 +64,27 @@ bool IsSocket(const fs::path& entry)
 
 } // namespace
 
-LocalAddress::LocalAddress(int socket)
+IpAddress IpAddress::Local(int socket)
 {
-    socklen_t size = sizeof _address;
-    if (getsockname(socket, reinterpret_cast<sockaddr*>(&_address), &size) != 0) {
-        _address = {};
-    }
+    IpAddress address;
+    socklen_t size = sizeof address._address;
+    const bool found =
+        getsockname(socket, reinterpret_cast<sockaddr*>(&address._address), &size) == 0;
+    return found ? address : IpAddress();
 }
 
-bool LocalAddress::Covers(const LocalAddress& other) const
+IpAddress IpAddress::Peer(int socket)
 {
-    if (_address.ss_family != other._address.ss_family) {
+    IpAddress address;
+    socklen_t size = sizeof address._address;
+    const bool found =
+        getpeername(socket, reinterpret_cast<sockaddr*>(&address._address), &size) == 0;
+    return found ? address : IpAddress();
+}
+
+bool IpAddress::Covers(const IpAddress& other) const
+{
+    if (_address.ss_family != other._address.ss_family || Port() != other.Port()) {
         return false;
     }
     switch (_address.ss_family) {
@@ -89,7 +97,19 @@ bool LocalAddress::Covers(const LocalAddress& other) const
     }
 }
 
-void EndReading(const LocalAddress& listener)
+int IpAddress::Port() const
+{
+    switch (_address.ss_family) {
+    case AF_INET:
+        return ntohs(AsIpv4(_address).sin_port);
+    case AF_INET6:
+        return ntohs(AsIpv6(_address).sin6_port);
+    default:
+        return 0;
+    }
+}
+
+void EndReading(const IpAddress& listener, const std::set<int>& busy)
 {
     std::error_code ignored;
     for (const fs::directory_entry& entry : fs::directory_iterator("/proc/self/fd", ignored)) {
@@ -99,7 +119,8 @@ void EndReading(const LocalAddress& listener)
         // Another thread may close this number and open another file under it. The duplicate
         // stays what it is, so that the socket that is shut is the one that was judged.
         const File socket(fcntl(std::stoi(entry.path().filename().string()), F_DUPFD_CLOEXEC, 0));
-        if (listener.Covers(LocalAddress(socket.Number()))) {
+        if (listener.Covers(IpAddress::Local(socket.Number()))
+            && busy.count(IpAddress::Peer(socket.Number()).Port()) == 0) {
             shutdown(socket.Number(), SHUT_RD);
         }
     }

@@ -63,6 +63,17 @@ void Require(OM_uint32 major, OM_uint32 minor, gss_OID mechanism)
     throw GssError(minor == 0 ? text : text + ": " + StatusText(minor, GSS_C_MECH_CODE, mechanism));
 }
 
+// GSS finds no credential for a mechanism that it knows, and else knows no such mechanism.
+void RequireMechanism(OM_uint32 major)
+{
+    const OM_uint32 error = GSS_ROUTINE_ERROR(major);
+    if (error == GSS_S_NO_CRED || error == GSS_S_BAD_MECH) {
+        throw GssError(
+            "Only SPNEGO with Kerberos inside is negotiated: "
+            + StatusText(major, GSS_C_GSS_CODE, GSS_C_NO_OID));
+    }
+}
+
 GssCredential Acquire(const gss_key_value_set_desc& store, gss_OID mechanism)
 {
     gss_OID_set_desc mechanisms{1, mechanism};
@@ -149,6 +160,7 @@ std::string SecurityContext::Accept(const Acceptor& acceptor, const std::string&
         nullptr);
     _context.reset(context);
     const GssName clientOwner(client);
+    RequireMechanism(major);
     Require(major, minor, &Spnego);
     _isComplete = (major & GSS_S_CONTINUE_NEEDED) == 0;
     if (_isComplete) {
