@@ -67,8 +67,7 @@ boost::shared_ptr<GssNegotiationContext> CreateGssNegotiationContext(
     return boost::make_shared<GssNegotiationContextImpl>(
         spec,
         boost::make_shared<RequestBuilderImpl>(config.holderOfKeyConfig),
-        HttpsClient(
-            config.url, config.sslContext, config.sslPeerParameter, SendTimeoutMicroseconds)
+        HttpsClient(config.url, config.sslContext, config.sslPeerParameter, SendTimeoutMicroseconds)
             .CreateSession(),
         boost::make_shared<ResponseHandlerImpl>(),
         config.trustedCertificates);

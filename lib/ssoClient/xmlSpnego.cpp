@@ -72,8 +72,7 @@ void XMLBodyBuilderInitialSPNego::build(Ref<ElementNode>& out) const
 {
     XMLCompositeBuilder request(AcquireSecurityTokenBuilder(_confirmation, _spec));
     request.Add(WstSPNegoBinExchangeBuilder(_leg)).build(out);
-    ElementDefineAttribute(
-        out.get(), {Context, "urn:uuid:" + Quillon::StringUtil::GenerateUuid()});
+    ElementDefineAttribute(out.get(), {Context, "urn:uuid:" + Quillon::StringUtil::GenerateUuid()});
 }
 
 XMLBodyBuilderContinuedSPNego::XMLBodyBuilderContinuedSPNego(

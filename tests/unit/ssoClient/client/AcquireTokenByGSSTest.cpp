@@ -295,7 +295,7 @@ TEST_F(AcquireTokenByGSS, ReportsAMalformedAssertionAsFailureOfTheService)
 TEST_F(AcquireTokenByGSS, ReportsAnAssertionThatDoesNotVerify)
 {
     std::string assertion = GetSignedAssertion();
-    const std::size_t name = assertion.find("jdoe");
+    const std::size_t name = assertion.find("user@");
     ASSERT_NE(name, std::string::npos);
     assertion[name] = 'x';
     transport->replies = {NegotiationReply("c1", "", assertion)};

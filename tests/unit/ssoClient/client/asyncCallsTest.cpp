@@ -3,7 +3,7 @@
 #include "ssoClient/Exceptions.h"
 #include "support/FakeSamlToken.h"
 
-#include <boost/optional.hpp>
+#include <boost/optional/optional_io.hpp>
 #include <boost/smart_ptr/make_shared.hpp>
 #include <gmock/gmock.h>
 
@@ -110,8 +110,7 @@ TEST_F(SyncCallToResultFuncTest, CallsACompletionThatThrowsOnceOnly)
         ++calls;
         throw SsoException("completion");
     };
-    EXPECT_THROW(
-        SyncCallToResultFunc([] { return TokenPtr(); }, complain, NoToken), SsoException);
+    EXPECT_THROW(SyncCallToResultFunc([] { return TokenPtr(); }, complain, NoToken), SsoException);
     EXPECT_EQ(calls, 1);
 }
 

@@ -50,10 +50,9 @@ inline std::string NegotiationReply(
            " xmlns:t=\"http://docs.oasis-open.org/ws-sx/ws-trust/200512\" Context=\""
            + contextId + "\">"
            + (leg.empty() ? "" : "<t:BinaryExchange>" + leg + "</t:BinaryExchange>")
-           + (assertion.empty()
-                  ? ""
-                  : "<t:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</t:TokenType>"
-                    "<t:RequestedSecurityToken>"
-                        + assertion + "</t:RequestedSecurityToken>")
+           + (assertion.empty() ? ""
+                                : "<t:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</t:TokenType>"
+                                  "<t:RequestedSecurityToken>"
+                                      + assertion + "</t:RequestedSecurityToken>")
            + "</t:RequestSecurityTokenResponse></S:Body></S:Envelope>";
 }

@@ -272,7 +272,8 @@ TEST(HandleSPNegoResponse, AcceptsARequestedTokenThatHoldsNoAssertion)
 TEST(HandleSPNegoResponse, RefusesLegThatIsNotBase64)
 {
     for (const char* const text : {"aGVsbG8", "a", "aGVsbG8=x", "a?==", "aGVsbG9="}) {
-        EXPECT_EQ(GetReplyFailure(Response(Exchange(text))), "SsoException: Base64 format exception")
+        EXPECT_EQ(
+            GetReplyFailure(Response(Exchange(text))), "SsoException: Base64 format exception")
             << text;
     }
 }
@@ -298,15 +299,18 @@ TEST(HandleSPNegoResponse, ChecksContextThenLegThenTokenType)
 {
     EXPECT_EQ(GetReplyFailure(Response(Exchange("?") + Token("x"), "")), UnexpectedFormat);
     EXPECT_EQ(
-        GetReplyFailure(Response(Exchange("?") + Token("x"))), "SsoException: Base64 format exception");
+        GetReplyFailure(Response(Exchange("?") + Token("x"))),
+        "SsoException: Base64 format exception");
 }
 
 TEST(HandleSPNegoResponse, LooksForAFaultFirst)
 {
     EXPECT_EQ(
         GetReplyFailure(
-            Response("") + "<S:Fault><faultcode xmlns:t=\"" WST
-            "\">t:FailedAuthentication</faultcode><faultstring>no ticket</faultstring></S:Fault>"),
+            Response("")
+            + "<S:Fault><faultcode xmlns:t=\"" WST
+              "\">t:FailedAuthentication</faultcode><faultstring>no "
+              "ticket</faultstring></S:Fault>"),
         "InvalidCredentialsException: Authentication failed: no ticket");
 }
 
