@@ -92,7 +92,8 @@ public:
         EXPECT_EQ(0, bind(_socket, generic, size));
         EXPECT_EQ(0, getsockname(_socket, generic, &size));
         std::ofstream(_file) << "[libdefaults]\n default_realm = EXAMPLE.TEST\n"
-                             << " dns_lookup_kdc = false\n dns_canonicalize_hostname = false\n"
+                             << " udp_preference_limit = 1\n dns_lookup_kdc = false\n"
+                             << " dns_canonicalize_hostname = false\n"
                              << "[realms]\n EXAMPLE.TEST = {\n  kdc = 127.0.0.1:"
                              << ntohs(address.sin_port) << "\n }\n";
     }
@@ -255,7 +256,7 @@ TEST_F(NegotiateFailure, WithAnExpiredTicketSaysSo)
         ticket.times.endtime = 1000000001;
     });
     EXPECT_EQ(
-        "NegotiationException: Cannot negotiate with the service 'HTTP@localhost' by the "
+        "NegotiationException: Cannot negotiate with the service 'HTTP@localhost' using the "
         "credential cache '"
             + cache
             + "': Unspecified GSS failure.  Minor code may provide more information: Ticket "
@@ -314,7 +315,7 @@ TEST_F(NegotiateFailure, WithoutKdcSaysThatItCannotBeContacted)
             + kdc->GetFile("alice.keytab") + "': Cannot contact any KDC for realm 'EXAMPLE.TEST'",
         BeginWith(WithKeytab(kdc->GetFile("alice.keytab"), "alice")));
     EXPECT_EQ(
-        "NegotiationException: Cannot negotiate with the service 'HTTP@localhost' by the "
+        "NegotiationException: Cannot negotiate with the service 'HTTP@localhost' using the "
         "credential cache '"
             + kdc->GetFile("alice")
             + "': Unspecified GSS failure.  Minor code may provide more information: Cannot "
