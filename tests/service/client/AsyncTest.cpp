@@ -147,8 +147,7 @@ TEST_F(AsyncAtSts, CompletesAThousandAcquisitionsOnceEach)
     std::latch done(Count);
     const auto note = [&](const TokenPtr& token, const Quillon::Exception* error, int lifetime) {
         const std::lock_guard<std::mutex> lock(mutex);
-        mostThreads =
-            std::max(mostThreads, Quillon::System::GetThreadPool()->GetThreadCount());
+        mostThreads = std::max(mostThreads, Quillon::System::GetThreadPool()->GetThreadCount());
         if (token != nullptr && GetLifetimeSec(*token) == lifetime) {
             ids.insert(token->GetId());
         } else {
@@ -180,8 +179,7 @@ TEST_F(AsyncAtSts, CompletesAThousandAcquisitionsOnceEach)
     EXPECT_LE(mostThreads, Quillon::System::ThreadPool::DefaultLimit);
     RecordProperty(
         "milliseconds",
-        static_cast<int>(
-            std::chrono::duration_cast<std::chrono::milliseconds>(took).count()));
+        static_cast<int>(std::chrono::duration_cast<std::chrono::milliseconds>(took).count()));
     RecordProperty("threads", static_cast<int>(mostThreads));
 }
 
