@@ -130,7 +130,7 @@ bool KerberosNegotiationHandlerImpl::AdvanceContext(
     _context.reset(context);
     if (GSS_ERROR(major)) {
         throw NegotiationException(
-            (isFirst ? "Cannot negotiate with the service '" + _options.service + "' by "
+            (isFirst ? "Cannot negotiate with the service '" + _options.service + "' using "
                            + DescribeCredentials(_options)
                      : "The leg of the service '" + _options.service + "' is not acceptable")
             + ": " + GetGssError(major, minor, &spnegoMechanism));
