@@ -69,13 +69,13 @@ private:
 /** Queues `count` pieces of work that have begun on return and never finish. */
 void Block(std::ptrdiff_t count)
 {
-    static std::promise<void> never;
-    static const std::shared_future<void> future = never.get_future().share();
     static std::latch begun(count);
     for (std::ptrdiff_t index = 0; index < count; ++index) {
         GetThreadPool()->Queue([] {
             begun.count_down();
-            future.wait();
+            for (;;) {
+                pause(); // no signal comes
+            }
         });
     }
     begun.wait();
