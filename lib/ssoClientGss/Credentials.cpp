@@ -56,6 +56,7 @@ public:
     {
         const KerberosPrincipal principal = ParsePrincipal();
         const KerberosKeytab keytab = OpenKeytab();
+        FindKey(keytab.get(), principal.get());
         const LogOnOptions options = CreateOptions(cache);
         krb5_creds ticket{};
         Check(krb5_get_init_creds_keytab(
@@ -77,6 +78,14 @@ private:
         krb5_keytab keytab = nullptr;
         Check(krb5_kt_resolve(_context, ToTypedName(_keytab).c_str(), &keytab));
         return KerberosKeytab(keytab, {_context});
+    }
+
+    /** Kerberos would ask the KDC first, and tell its failure instead of the keytab's. */
+    void FindKey(krb5_keytab keytab, krb5_principal principal) const
+    {
+        krb5_keytab_entry entry{};
+        Check(krb5_kt_get_entry(_context, keytab, principal, 0, 0, &entry));
+        krb5_free_keytab_entry_contents(_context, &entry);
     }
 
     LogOnOptions CreateOptions(krb5_ccache cache) const
