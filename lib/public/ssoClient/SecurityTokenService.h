@@ -50,7 +50,8 @@ using ValidationCompletion =
  * that the caller may let go of everything, this object included. A null pointer stops the process
  * before anything is queued. The completion is called exactly once, on a thread of the pool; it is
  * not called for an exception that is no `Quillon::Exception`, such as `std::bad_alloc`, nor if the
- * process ends first. What the completion throws is logged.
+ * process ends first. What the completion throws is logged. On the calling thread there is only
+ * what the pool throws when it takes no work.
  *
  * There is no virtual destructor: a service is only owned by the pointer of its factory.
  *

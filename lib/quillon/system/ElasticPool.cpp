@@ -25,8 +25,7 @@ void LogStray(const std::string& what, const std::exception* error) noexcept
             what + " on the thread pool raised "
                 + (error != nullptr ? GetClassName(*error) + ": " + error->what()
                                     : "something that is not an exception."));
-    } catch (
-        const std::bad_alloc&) { // NOLINT(bugprone-empty-catch): a line that is lost harms nobody
+    } catch (const std::bad_alloc&) { // NOLINT(bugprone-empty-catch): a lost line harms nobody
     }
 }
 

@@ -177,8 +177,7 @@ TEST_F(AsyncOperation, AcquireTokenByGssAsyncKeepsTheHandler)
     transport->replies = {
         NegotiationReply("c1", "Zmlyc3Q=", ""), NegotiationReply("c1", "", GetSignedAssertion())};
     AwaitedToken awaited;
-    auto handler =
-        boost::make_shared<ScriptedHandler>(std::deque<std::string>{"one", "two"});
+    auto handler = boost::make_shared<ScriptedHandler>(std::deque<std::string>{"one", "two"});
     MakeService()->AcquireTokenByGssAsync(spec, std::move(handler), awaited.GetCompletion());
     EXPECT_EQ(awaited.Get().Describe(), "success");
     EXPECT_EQ(transport->sent.size(), 2U);
@@ -293,8 +292,8 @@ TEST_F(AsyncOperation, ReleasesEverythingAfterItRan)
     {
         const auto completion = awaited.GetCompletion();
         const ValidationCompletion keeping =
-            [completion, onRelease](
-                const boost::optional<bool>& verdict, const Quillon::Exception* error) {
+            [completion,
+             onRelease](const boost::optional<bool>& verdict, const Quillon::Exception* error) {
                 completion(verdict, error);
             };
         MakeService()->ValidateSubjectAsync(presented, keeping);
@@ -384,21 +383,19 @@ std::string StopPattern()
 const TokenCompletion TokenIsUnexpected = [](const TokenPtr&, const Quillon::Exception*) {
     std::_Exit(0);
 };
-const ValidationCompletion VerdictIsUnexpected =
-    [](const boost::optional<bool>&, const Quillon::Exception*) { std::_Exit(0); };
+const ValidationCompletion VerdictIsUnexpected = [](const boost::optional<bool>&,
+                                                    const Quillon::Exception*) { std::_Exit(0); };
 
 } // namespace
 
 TEST_F(AsyncOperation, StopsTheProcessOnANullTokenToRenew)
 {
-    EXPECT_DEATH(
-        MakeService()->RenewTokenAsync(nullptr, 300, TokenIsUnexpected), StopPattern());
+    EXPECT_DEATH(MakeService()->RenewTokenAsync(nullptr, 300, TokenIsUnexpected), StopPattern());
 }
 
 TEST_F(AsyncOperation, StopsTheProcessOnANullTokenToValidate)
 {
-    EXPECT_DEATH(
-        MakeService()->ValidateSubjectAsync(nullptr, VerdictIsUnexpected), StopPattern());
+    EXPECT_DEATH(MakeService()->ValidateSubjectAsync(nullptr, VerdictIsUnexpected), StopPattern());
 }
 
 TEST_F(AsyncOperation, StopsTheProcessOnANullTokenToPresent)
