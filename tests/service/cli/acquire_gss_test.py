@@ -111,10 +111,12 @@ class Refusals(KerberosTest):
             "--ccache", self.ccache, "--service", "HTTP@nowhere.example.test")
 
     def test_ticket_of_another_service(self):
-        self.assert_fails_matching(
+        self.assert_fails(
             self.acquire_by_gss("--ccache", self.ccache, "--service",
                                 "krbtgt/EXAMPLE.TEST@EXAMPLE.TEST"),
-            BAD_CREDENTIALS, "InvalidCredentialsException", "Authentication failed: .+")
+            BAD_CREDENTIALS, "InvalidCredentialsException",
+            f"Authentication failed: The negotiation has failed: {UNSPECIFIED}Request ticket "
+            "server krbtgt/EXAMPLE.TEST@EXAMPLE.TEST not found in keytab (ticket kvno 1)")
 
     def test_no_cache(self):
         self.assert_kerberos_fails(
@@ -136,8 +138,9 @@ class Refusals(KerberosTest):
     def test_client_that_the_service_does_not_know(self):
         result = self.acquire_by_gss("--keytab", self.realm.mallory_keytab,
                                      "--principal", "mallory")
-        self.assert_fails_matching(result, BAD_CREDENTIALS, "InvalidCredentialsException",
-                                   "Authentication failed: .+")
+        self.assert_fails(result, BAD_CREDENTIALS, "InvalidCredentialsException",
+                          "Authentication failed: The principal 'mallory@EXAMPLE.TEST' belongs to "
+                          "no known user")
 
     def test_no_keytab(self):
         self.assert_kerberos_fails(
@@ -183,18 +186,21 @@ class Refusals(KerberosTest):
     def test_service_without_kerberos(self):
         sts = DevelopmentSts()
         self.addCleanup(sts.stop)
-        self.assert_fails_matching(
+        self.assert_fails(
             self.acquire_by_gss("--ccache", self.ccache, service=sts.service_options),
-            REFUSED, "SsoException", "Unexpected SOAP fault: .+; request failed.")
+            REFUSED, "SsoException", "Unexpected SOAP fault: wst:InvalidRequest; request failed.")
 
     def test_no_server(self):
         result = self.acquire_by_gss("--ccache", self.ccache, service=self.nowhere)
-        self.assert_fails_matching(result, COMMUNICATION, "HttpException", ".+")
+        self.assert_fails(result, COMMUNICATION, "HttpException",
+                          "Cannot connect to 127.0.0.1 port 1: Connection refused.")
 
     def test_token_signed_by_another_than_the_trusted(self):
         result = self.acquire_by_gss("--ccache", self.ccache, service=[
             "--url", self.sts.url, "--ca", self.sts.ca, "--trust", self.sts.certificate])
-        self.assert_fails_matching(result, REFUSED, "InvalidSignatureException", ".+")
+        self.assert_fails(result, REFUSED, "InvalidSignatureException",
+                          "Signature verification error. The signing certificate is not one of the "
+                          "1 trusted certificates")
 
 
 class Verbose(KerberosTest):
@@ -225,7 +231,8 @@ class Verbose(KerberosTest):
         lines = result.err.splitlines()
         self.assertRegex(lines[0], "START operation")
         self.assertRegex(lines[-2], "END operation")
-        self.assertRegex(lines[-1], r"\Assoclient: InvalidCredentialsException: .+\Z")
+        self.assertEqual("ssoclient: InvalidCredentialsException: Authentication failed: The "
+                         "principal 'mallory@EXAMPLE.TEST' belongs to no known user", lines[-1])
         self.assertNotRegex(result.err, "[A-Za-z0-9+/]{40}")
 
 
