@@ -1,0 +1,7 @@
+#include "ssoClient/NegotiationHandler.h"
+
+namespace SsoClient {
+
+NegotiationHandler::~NegotiationHandler() = default;
+
+} // namespace SsoClient
