@@ -53,6 +53,38 @@ Sender Authentication::Identify(const Request& request) const
     throw Fault(FaultCodes::InvalidRequest, "The request carries no credentials");
 }
 
+std::optional<KeyProof> Authentication::ProveNegotiator(const Request& request) const
+{
+    if (request.usernameToken || request.presentedAssertion != nullptr) {
+        throw Fault(
+            FaultCodes::InvalidRequest,
+            "A negotiation carries no password and no token in its header");
+    }
+    if (request.signature != nullptr) {
+        return ProveCertificate(request);
+    }
+    if (request.binaryToken != nullptr) {
+        throw Fault(
+            FaultCodes::InvalidRequest, "The header carries a certificate but no signature");
+    }
+    return std::nullopt;
+}
+
+Sender Authentication::ByPrincipal(
+    const std::string& principal, const std::optional<KeyProof>& proof) const
+{
+    Sender sender;
+    sender.user = _users.FindByName(principal);
+    if (sender.user == nullptr) {
+        throw Fault(
+            FaultCodes::FailedAuthentication,
+            "The principal '" + principal + "' belongs to no known user");
+    }
+    sender.proof = proof;
+    sender.authnContext = Names::ContextKerberos;
+    return sender;
+}
+
 KeyProof Authentication::ProveCertificate(const Request& request) const
 {
     if (request.signature == nullptr) {

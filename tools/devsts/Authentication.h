@@ -6,6 +6,7 @@
 #include "devsts/Request.h"
 #include "devsts/Sender.h"
 
+#include <optional>
 #include <string>
 
 namespace DevSts {
@@ -34,6 +35,20 @@ public:
      * @throws Fault
      */
     Sender Identify(const Request& request) const;
+
+    /**
+     * The key behind the first request of a negotiation, if it is signed.
+     *
+     * @throws Fault  it carries credentials besides its leg.
+     */
+    std::optional<KeyProof> ProveNegotiator(const Request& request) const;
+
+    /**
+     * The user who has negotiated as `principal`, NAME@REALM.
+     *
+     * @throws Fault  there is none.
+     */
+    Sender ByPrincipal(const std::string& principal, const std::optional<KeyProof>& proof) const;
 
     /** The key of a signed request that names a certificate in its header. @throws Fault */
     KeyProof ProveCertificate(const Request& request) const;

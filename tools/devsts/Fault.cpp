@@ -12,6 +12,7 @@ namespace FaultCodes {
 const FaultCode Client{"soapenv", Names::Soap, "Client"};
 const FaultCode Server{"soapenv", Names::Soap, "Server"};
 const FaultCode InvalidRequest{"wst", Names::Wst, "InvalidRequest"};
+const FaultCode RequestFailed{"wst", Names::Wst, "RequestFailed"};
 const FaultCode FailedAuthentication{"wst", Names::Wst, "FailedAuthentication"};
 const FaultCode InvalidSecurityToken{"wst", Names::Wst, "InvalidSecurityToken"};
 const FaultCode ExpiredData{"wst", Names::Wst, "ExpiredData"};

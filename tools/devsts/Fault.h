@@ -18,6 +18,7 @@ namespace FaultCodes {
 extern const FaultCode Client;               ///< [SOAP11 4.4.1] not a message that can be read
 extern const FaultCode Server;               ///< [SOAP11 4.4.1] this STS itself is out of order
 extern const FaultCode InvalidRequest;       ///< [WST13 11] malformed or not allowed
+extern const FaultCode RequestFailed;        ///< [WST13 11] not now
 extern const FaultCode FailedAuthentication; ///< [WST13 11]
 extern const FaultCode InvalidSecurityToken; ///< [WST13 11] the presented token
 extern const FaultCode ExpiredData;          ///< [WST13 11] the message is not fresh

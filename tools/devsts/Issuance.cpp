@@ -1,10 +1,9 @@
 #include "devsts/Issuance.h"
 
 #include "devsts/Fault.h"
+#include "devsts/Random.h"
 
 #include <algorithm>
-#include <openssl/rand.h>
-#include <stdexcept>
 
 namespace DevSts {
 
@@ -14,19 +13,10 @@ constexpr std::chrono::hours LongestLifetime(30 * 24);
 constexpr unsigned RenewCount = 10;
 constexpr unsigned ProxyCount = 10;
 
+// An xs:ID begins with no digit.
 std::string NewAssertionId()
 {
-    unsigned char bytes[16];
-    if (RAND_bytes(bytes, sizeof bytes) != 1) {
-        throw std::runtime_error("RAND_bytes failed");
-    }
-    static constexpr const char* Digits = "0123456789abcdef";
-    std::string id = "_";
-    for (const unsigned char byte : bytes) {
-        id += Digits[byte >> 4U];
-        id += Digits[byte & 15U];
-    }
-    return id;
+    return "_" + RandomHex();
 }
 
 void SetLifetime(Assertion& assertion, const Interval& lifetime, TimePoint now)

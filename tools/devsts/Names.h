@@ -25,6 +25,8 @@ constexpr const char* RsaAdvice =
 
 // [WST13 3.1, 4, 5, 7]
 constexpr const char* ActionIssue = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue";
+constexpr const char* ActionContinue =
+    "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RSTR/Issue";
 constexpr const char* ActionRenew = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Renew";
 constexpr const char* ActionValidate =
     "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Validate";
@@ -42,6 +44,7 @@ constexpr const char* PasswordText = "http://docs.oasis-open.org/wss/2004/01/"
                                      "oasis-200401-wss-username-token-profile-1.0#PasswordText";
 constexpr const char* Base64Binary = "http://docs.oasis-open.org/wss/2004/01/"
                                      "oasis-200401-wss-soap-message-security-1.0#Base64Binary";
+constexpr const char* Spnego = "http://schemas.xmlsoap.org/ws/2005/02/trust/spnego";
 constexpr const char* X509v3 = "http://docs.oasis-open.org/wss/2004/01/"
                                "oasis-200401-wss-x509-token-profile-1.0#X509v3";
 // The two spellings of the profile's name are the profile's own. [WSS-SAML11 3.4]
@@ -58,6 +61,7 @@ constexpr const char* FormatUpn = SSOCLIENT_CLAIMS_AUTHORITY "/claims/UPN";
 constexpr const char* ContextPassword =
     "urn:oasis:names:tc:SAML:2.0:ac:classes:PasswordProtectedTransport";
 constexpr const char* ContextCertificate = "urn:oasis:names:tc:SAML:2.0:ac:classes:X509";
+constexpr const char* ContextKerberos = "urn:oasis:names:tc:SAML:2.0:ac:classes:Kerberos";
 
 constexpr const char* AttributeGroups =
     SSOCLIENT_RSA_AUTHORITY "/schemas/attr-names/2009/01/GroupIdentity";

@@ -1,5 +1,6 @@
 #include "devsts/ReplyWriter.h"
 
+#include "devsts/Certificates.h"
 #include "devsts/Names.h"
 
 #include <new>
@@ -22,7 +23,7 @@ struct Envelope
     }
 };
 
-void AddResponse(xmlNode* parent, xmlNs* wst, const xmlDoc* assertion, const Interval& lifetime)
+xmlNode* AddResponse(xmlNode* parent, xmlNs* wst, const xmlDoc* assertion, const Interval& lifetime)
 {
     xmlNode* response = AddElement(parent, wst, "RequestSecurityTokenResponse");
     AddElement(response, wst, "TokenType", Names::Saml);
@@ -37,6 +38,14 @@ void AddResponse(xmlNode* parent, xmlNs* wst, const xmlDoc* assertion, const Int
     xmlNs* wsu = DeclareNamespace(element, "wsu", Names::Wsu);
     AddElement(element, wsu, "Created", FormatTime(lifetime.created));
     AddElement(element, wsu, "Expires", FormatTime(lifetime.expires));
+    return response;
+}
+
+void AddBinaryExchange(xmlNode* response, xmlNs* wst, const std::string& bytes)
+{
+    xmlNode* exchange = AddElement(response, wst, "BinaryExchange", EncodeBase64(bytes));
+    SetAttribute(exchange, "ValueType", Names::Spnego);
+    SetAttribute(exchange, "EncodingType", Names::Base64Binary);
 }
 
 } // namespace
@@ -47,6 +56,29 @@ std::string WriteIssueReply(const xmlDoc* assertion, const Interval& lifetime)
     xmlNode* collection =
         AddElement(reply.body, reply.wst, "RequestSecurityTokenResponseCollection");
     AddResponse(collection, reply.wst, assertion, lifetime);
+    return Serialize(reply.doc.get());
+}
+
+std::string WriteLegReply(const NegotiationLeg& leg)
+{
+    const Envelope reply;
+    xmlNode* response = AddElement(reply.body, reply.wst, "RequestSecurityTokenResponse");
+    SetAttribute(response, "Context", leg.context);
+    AddBinaryExchange(response, reply.wst, leg.bytes);
+    return Serialize(reply.doc.get());
+}
+
+std::string WriteNegotiatedReply(
+    const xmlDoc* assertion, const Interval& lifetime, const NegotiationLeg& leg)
+{
+    const Envelope reply;
+    xmlNode* collection =
+        AddElement(reply.body, reply.wst, "RequestSecurityTokenResponseCollection");
+    xmlNode* response = AddResponse(collection, reply.wst, assertion, lifetime);
+    SetAttribute(response, "Context", leg.context);
+    if (!leg.bytes.empty()) {
+        AddBinaryExchange(response, reply.wst, leg.bytes);
+    }
     return Serialize(reply.doc.get());
 }
 

@@ -16,7 +16,8 @@ enum class Operation
 {
     ISSUE,
     RENEW,
-    VALIDATE
+    VALIDATE,
+    CONTINUE ///< a further leg of a negotiation that began with ISSUE
 };
 enum class KeyType
 {
@@ -62,6 +63,13 @@ struct TokenRequest
     xmlNode* target = nullptr; ///< the assertion to renew or to validate
 };
 
+/** One leg of a negotiation. [WST13 8.2] */
+struct NegotiationLeg
+{
+    std::string context; ///< the client's own at first, then that of this STS
+    std::string bytes;
+};
+
 struct Request
 {
     XmlDocument doc; ///< owns every node below
@@ -74,6 +82,7 @@ struct Request
     xmlNode* binaryToken = nullptr;
     xmlNode* signature = nullptr;
     TokenRequest token;
+    std::optional<NegotiationLeg> leg;
 };
 
 } // namespace DevSts

@@ -2,6 +2,7 @@
 
 #include "devsts/Fault.h"
 #include "devsts/Names.h"
+#include "devsts/NegotiationReader.h"
 
 #include <array>
 
@@ -17,10 +18,11 @@ struct OperationNames
     const char* tokenType;
 };
 
-constexpr std::array<OperationNames, 3> Operations{{
+constexpr std::array<OperationNames, 4> Operations{{
     {Operation::ISSUE, Names::ActionIssue, Names::RequestIssue, Names::Saml},
     {Operation::RENEW, Names::ActionRenew, Names::RequestRenew, Names::Saml},
     {Operation::VALIDATE, Names::ActionValidate, Names::RequestValidate, Names::TokenStatus},
+    {Operation::CONTINUE, Names::ActionContinue, "", ""},
 }};
 
 const OperationNames& ReadAction(const std::optional<std::string>& soapAction)
@@ -35,7 +37,8 @@ const OperationNames& ReadAction(const std::optional<std::string>& soapAction)
     }
     throw Fault(
         FaultCodes::Client,
-        "The SOAPAction header must be the quoted Issue, Renew or Validate action, not "
+        "The SOAPAction header must be the quoted Issue, Renew or Validate action or that of an "
+        "Issue response, not "
             + *soapAction);
 }
 
@@ -291,18 +294,31 @@ xmlNode* ReadTarget(const xmlNode* element)
     return assertion;
 }
 
+const xmlNode* OnlyChild(const xmlNode* parent, const XmlName& name)
+{
+    ChildCursor children(parent);
+    const xmlNode* child = children.Take(name);
+    children.RequireEnd();
+    return child;
+}
+
 void ReadBody(Request& request, const OperationNames& names)
 {
-    ChildCursor bodyChildren(request.body);
-    const xmlNode* element = bodyChildren.Take({Names::Wst, "RequestSecurityToken"});
-    bodyChildren.RequireEnd();
-    AllowAttributes(element, {});
+    if (names.operation == Operation::CONTINUE) {
+        request.leg = ReadContinuedRequest(
+            OnlyChild(request.body, {Names::Wst, "RequestSecurityTokenResponse"}));
+        return;
+    }
+    const xmlNode* element = OnlyChild(request.body, {Names::Wst, "RequestSecurityToken"});
     ChildCursor children(element);
     RequireText(children.Take({Names::Wst, "TokenType"}), names.tokenType);
     RequireText(children.Take({Names::Wst, "RequestType"}), names.requestType);
     switch (names.operation) {
     case Operation::ISSUE:
         ReadIssueRequest(children, request.token);
+        if (const xmlNode* exchange = children.TryTake({Names::Wst, "BinaryExchange"})) {
+            request.leg = ReadNegotiationLeg(element, exchange);
+        }
         break;
     case Operation::RENEW:
         request.token.lifetime = ReadLifetime(children.Take({Names::Wst, "Lifetime"}));
@@ -311,8 +327,13 @@ void ReadBody(Request& request, const OperationNames& names)
     case Operation::VALIDATE:
         request.token.target = ReadTarget(children.Take({Names::Wst, "ValidateTarget"}));
         break;
+    case Operation::CONTINUE:
+        break;
     }
     children.RequireEnd();
+    if (!request.leg) {
+        AllowAttributes(element, {});
+    }
 }
 
 } // namespace

@@ -53,6 +53,19 @@ void CopyReply(const Reply& reply, httplib::Response& response)
     response.set_content(reply.body, reply.contentType);
 }
 
+NegotiatorOptions ToNegotiatorOptions(const Options& options)
+{
+    NegotiatorOptions negotiation;
+    negotiation.keytab = options.keytab;
+    // With the other files: it holds for every server that shares them, and for no other.
+    negotiation.replays = options.stateDir / "kerberos.replays";
+    negotiation.mostPending = options.pendingNegotiations;
+    // [RFC6265 4.1.2]
+    negotiation.cookieAttributes =
+        std::string("; Path=") + Path + "; HttpOnly" + (options.plainHttp ? "" : "; Secure");
+    return negotiation;
+}
+
 Reply PlainReply(int status, const std::string& text)
 {
     Reply reply;
@@ -70,7 +83,7 @@ public:
     explicit Impl(Options options)
         : _options(std::move(options))
         , _state(_options.stateDir)
-        , _service(_state, _options.clock)
+        , _service(_state, _options.clock, ToNegotiatorOptions(_options))
     {}
 
     ~Impl() { Stop(); }

@@ -20,7 +20,9 @@ struct Options
     int port = 0;                   ///< 0: any free one
     bool plainHttp = false;
     Clock clock = SystemTime;
-    std::size_t keptRequests = 100; ///< how many requests ReceivedRequests remembers
+    std::filesystem::path keytab;           ///< negotiates with these keys; empty: not at all
+    std::size_t pendingNegotiations = 1000; ///< the most that wait for their next leg
+    std::size_t keptRequests = 100;         ///< how many requests ReceivedRequests remembers
 };
 
 /**
@@ -33,7 +35,7 @@ struct Options
 class Server
 {
 public:
-    /** @throws std::runtime_error  the state directory cannot be made or read. */
+    /** @throws std::runtime_error  the state directory or the keytab cannot be used. */
     explicit Server(Options options);
 
     /** Stops. */

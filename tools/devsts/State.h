@@ -16,6 +16,8 @@ namespace DevSts {
  *   client.pem, client.key  a client identity that users.json knows as a solution user
  *   users.json              the users
  *
+ * Kerberos adds kerberos.replays, the authenticators that have been received.
+ *
  * Keys have mode 0600.
  */
 class State

@@ -17,6 +17,31 @@ namespace {
 
 constexpr int StatusFault = 500; // [SOAP11 6.2]
 
+Reply OkReply(std::string body)
+{
+    Reply reply;
+    reply.body = std::move(body);
+    return reply;
+}
+
+Reply FaultReply(const Fault& fault)
+{
+    Reply reply;
+    reply.status = StatusFault;
+    reply.body = WriteFault(fault);
+    return reply;
+}
+
+void RequireTimestampOnly(const Request& request)
+{
+    if (request.usernameToken || request.presentedAssertion != nullptr
+        || request.binaryToken != nullptr || request.signature != nullptr) {
+        throw Fault(
+            FaultCodes::InvalidRequest,
+            "A continued negotiation carries nothing but a timestamp in its header");
+    }
+}
+
 void RequireNoCredentials(const Request& request, const char* operation)
 {
     if (request.usernameToken || request.presentedAssertion != nullptr) {
@@ -29,29 +54,26 @@ void RequireNoCredentials(const Request& request, const char* operation)
 
 } // namespace
 
-TokenService::TokenService(const State& state, Clock clock)
+TokenService::TokenService(const State& state, Clock clock, const NegotiatorOptions& negotiation)
     : _state(state)
     , _clock(std::move(clock))
     , _signer(state.SigningKeyPem(), state.SigningCertificatePem())
     , _signingCertificateDer(DerFromPem(state.SigningCertificatePem()))
+    , _negotiator(negotiation)
 {}
 
 Reply TokenService::Answer(const ReceivedRequest& received)
 {
-    Reply reply;
     try {
-        reply.body = Handle(received);
+        return Handle(received);
     } catch (const Fault& fault) {
-        reply.status = StatusFault;
-        reply.body = WriteFault(fault);
+        return FaultReply(fault);
     } catch (const std::runtime_error& error) {
-        reply.status = StatusFault;
-        reply.body = WriteFault(Fault(FaultCodes::Server, error.what()));
+        return FaultReply(Fault(FaultCodes::Server, error.what()));
     }
-    return reply;
 }
 
-std::string TokenService::Handle(const ReceivedRequest& received)
+Reply TokenService::Handle(const ReceivedRequest& received)
 {
     const auto action = received.headers.find("SOAPAction");
     const Request request = ReadRequest(
@@ -62,11 +84,14 @@ std::string TokenService::Handle(const ReceivedRequest& received)
     Authenticate(users, now).RequireFresh(request);
     switch (request.operation) {
     case Operation::ISSUE:
-        return Issue(request, users, now);
+        return request.leg ? BeginNegotiation(request, users, now)
+                           : OkReply(Issue(request, users, now));
+    case Operation::CONTINUE:
+        return ContinueNegotiation(request, received.headers, users, now);
     case Operation::RENEW:
-        return Renew(request, users, now);
+        return OkReply(Renew(request, users, now));
     case Operation::VALIDATE:
-        return Validate(request, users, now);
+        return OkReply(Validate(request, users, now));
     }
     throw std::runtime_error("unknown operation");
 }
@@ -76,6 +101,35 @@ std::string TokenService::Issue(const Request& request, const Users& users, Time
     const Sender sender = Authenticate(users, now).Identify(request);
     const Assertion assertion = IssueAssertion(sender, request.token, users, now);
     return WriteIssueReply(Sign(assertion).get(), {assertion.notBefore, assertion.notOnOrAfter});
+}
+
+Reply TokenService::BeginNegotiation(const Request& request, const Users& users, TimePoint now)
+{
+    const Negotiator::Step step = _negotiator.Begin(
+        request.leg->bytes, request.token, Authenticate(users, now).ProveNegotiator(request), now);
+    Reply reply = OkReply(AnswerLeg(step, users, now));
+    reply.headers.emplace("Set-Cookie", step.setCookie);
+    return reply;
+}
+
+Reply TokenService::ContinueNegotiation(
+    const Request& request, const Headers& headers, const Users& users, TimePoint now)
+{
+    RequireTimestampOnly(request);
+    return OkReply(AnswerLeg(_negotiator.Continue(*request.leg, headers, now), users, now));
+}
+
+std::string TokenService::AnswerLeg(const Negotiator::Step& step, const Users& users, TimePoint now)
+{
+    if (!step.complete) {
+        return WriteLegReply(step.leg);
+    }
+    const Sender sender =
+        Authenticate(users, now)
+            .ByPrincipal(step.complete->context.Principal(), step.complete->proof);
+    const Assertion assertion = IssueAssertion(sender, step.complete->wanted, users, now);
+    return WriteNegotiatedReply(
+        Sign(assertion).get(), {assertion.notBefore, assertion.notOnOrAfter}, step.leg);
 }
 
 std::string TokenService::Renew(const Request& request, const Users& users, TimePoint now)

@@ -5,6 +5,7 @@
 #include "devsts/Authentication.h"
 #include "devsts/Clock.h"
 #include "devsts/Messages.h"
+#include "devsts/Negotiator.h"
 #include "devsts/ReplayGuard.h"
 #include "devsts/Request.h"
 #include "devsts/Signing.h"
@@ -14,22 +15,26 @@
 namespace DevSts {
 
 /**
- * Answers requests: Issue, Renew and Validate.
+ * Answers requests: Issue, also by negotiation, Renew and Validate.
  *
  * Thread safety: any number of threads.
  */
 class TokenService
 {
 public:
-    /** `state` is borrowed. */
-    TokenService(const State& state, Clock clock);
+    /** `state` is borrowed. @throws std::runtime_error  the keytab cannot be used. */
+    TokenService(const State& state, Clock clock, const NegotiatorOptions& negotiation);
 
     /** Never throws but for lack of memory: whatever is wrong becomes a SOAP fault. */
     Reply Answer(const ReceivedRequest& received);
 
 private:
-    std::string Handle(const ReceivedRequest& received);
+    Reply Handle(const ReceivedRequest& received);
     std::string Issue(const Request& request, const Users& users, TimePoint now);
+    Reply BeginNegotiation(const Request& request, const Users& users, TimePoint now);
+    Reply ContinueNegotiation(
+        const Request& request, const Headers& headers, const Users& users, TimePoint now);
+    std::string AnswerLeg(const Negotiator::Step& step, const Users& users, TimePoint now);
     std::string Renew(const Request& request, const Users& users, TimePoint now);
     std::string Validate(const Request& request, const Users& users, TimePoint now) const;
     Authentication Authenticate(const Users& users, TimePoint now);
@@ -40,6 +45,7 @@ private:
     Signer _signer;
     std::string _signingCertificateDer;
     ReplayGuard _guard;
+    Negotiator _negotiator;
 };
 
 } // namespace DevSts

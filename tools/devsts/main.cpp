@@ -45,6 +45,9 @@ void Serve(const DevSts::Options& options)
     const sigset_t signals = BlockStopSignals();
     DevSts::Server server(options);
     server.Start();
+    if (!options.keytab.empty()) {
+        std::cerr << "Negotiates Kerberos with the keytab " << options.keytab.string() << std::endl;
+    }
     std::cerr << "For development only: keys and passwords lie in plain files in "
               << options.stateDir.string() << std::endl;
     std::cout << "listening on " << server.Url() << std::endl;
@@ -60,13 +63,19 @@ int Run(int argc, char** argv)
         "The state directory is made on first start. It holds ca.pem (trust it for TLS), sts.pem\n"
         "(trust it for tokens), client.pem and client.key (a client identity that the STS knows\n"
         "as a solution user), and users.json (the users and their passwords; it explains its\n"
-        "fields, and is read again for every request). SIGTERM or SIGINT ends the program.");
+        "fields, and is read again for every request). With a keytab, the Kerberos principal\n"
+        "NAME@REALM logs on as the user of that name, in any letter case, and kerberos.replays\n"
+        "remembers what has been received. SIGTERM or SIGINT ends the program.");
     DevSts::Options options;
     options.keptRequests = 0;
     std::string listen = "127.0.0.1:0";
     app.add_option("--state", options.stateDir, "the state directory")->required();
     app.add_option("--listen", listen, "address and port; port 0 takes any free one")
         ->capture_default_str();
+    app.add_option(
+        "--keytab",
+        options.keytab,
+        "a Kerberos keytab with keys of this service; clients may then negotiate");
     app.add_flag("--http", options.plainHttp, "serve plain HTTP instead of HTTPS");
     try {
         app.parse(argc, argv);

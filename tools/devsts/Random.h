@@ -1,0 +1,13 @@
+#ifndef DEVSTS_RANDOM_H
+#define DEVSTS_RANDOM_H
+
+#include <string>
+
+namespace DevSts {
+
+/** 128 random bits in 32 hexadecimal digits. @throws std::runtime_error */
+std::string RandomHex();
+
+} // namespace DevSts
+
+#endif
