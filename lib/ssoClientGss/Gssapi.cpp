@@ -32,7 +32,10 @@ gss_OID_desc spnegoMechanism = {sizeof spnegoBytes - 1, spnegoBytes};
 std::string GetGssError(OM_uint32 major, OM_uint32 minor, gss_OID mechanism)
 {
     const std::string text = GetMessages(major, GSS_C_GSS_CODE, mechanism);
-    return minor == 0 ? text : text + ": " + GetMessages(minor, GSS_C_MECH_CODE, mechanism);
+    const std::string detail = GetMessages(minor, GSS_C_MECH_CODE, mechanism);
+    // What a mechanism leaves unexplained comes out as either, depending on what the process did
+    // before. Neither helps.
+    return detail == "Unknown error" || detail == "Success" ? text : text + ": " + detail;
 }
 
 std::string GetKerberosError(krb5_context context, krb5_error_code code)

@@ -96,7 +96,8 @@ start_kdc() {
         write_configuration "$port"
         [[ -e $folder/principal ]] || make_database
         krb5kdc -r "$realm" -P "$folder/kdc.pid" >>"$folder/kdc.out" 2>&1 </dev/null || continue
-        # The KDC goes into the background only once it listens.
+        # It listens when it goes into the background, and says there which process it is.
+        until [[ -s $folder/kdc.pid ]]; do sleep 0.01; done
         is_listening "$port" && return
         stop_kdc
     done

@@ -17,8 +17,7 @@ struct ElasticPoolOptions
     std::size_t initial; ///< threads that start with the first work, as far as the limit allows
     std::size_t limit;   ///< threads at most
     std::chrono::milliseconds idleTime; ///< after which a thread beyond the initial ones goes
-    bool (*prepare)() =
-        nullptr; ///< called before the first thread starts; false: the end has begun
+    bool (*prepare)() = nullptr; ///< called before the first thread; false if the end has begun
 };
 
 /**

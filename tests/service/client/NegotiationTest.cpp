@@ -2,8 +2,10 @@
 
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/GssNegotiationContext.h"
+#include "ssoClientGss/Exceptions.h"
 #include "ssoClientGss/KerberosNegotiationHandler.h"
 #include "support/Failure.h"
+#include "support/TestData.h"
 #include "support/TestKdc.h"
 
 #include <gmock/gmock.h>
@@ -92,20 +94,20 @@ TEST_F(Negotiation, TakesTheTicketFromACache)
     options.url = config.url;
     options.ccache = kdc->GetFile("alice.ccache");
     kdc->LogOn("alice", options.ccache);
-    const TokenPtr token = MakeService()->AcquireTokenByGSS(
-        MakeSpec(), *CreateKerberosNegotiationHandler(options));
+    const TokenPtr token =
+        MakeService()->AcquireTokenByGSS(MakeSpec(), *CreateKerberosNegotiationHandler(options));
     ASSERT_NE(token, nullptr);
     EXPECT_EQ(token->GetSubject(), Alice());
 }
 
 TEST_F(Negotiation, GivesAHolderOfKeyTokenToAServiceWithAnIdentity)
 {
-    const TokenPtr token =
-        MakeService(true)->AcquireTokenByGSS(MakeSpec(), *MakeHandler("alice"));
+    const TokenPtr token = MakeService(true)->AcquireTokenByGSS(MakeSpec(), *MakeHandler("alice"));
     ASSERT_NE(token, nullptr);
     EXPECT_EQ(token->GetConfirmationMethod(), SamlToken::CONFIRM_HOLDER_OF_KEY);
     EXPECT_EQ(
-        token->GetConfirmationCertificate()->GetDer(), MakeIdentity().certificate->GetDer());
+        token->GetConfirmationCertificate()->GetEncoded(),
+        MakeIdentity().certificate->GetEncoded());
 }
 
 TEST_F(Negotiation, HandsTheServicesLastLegToTheHandlerAndWarnsOfNothing)
@@ -135,9 +137,9 @@ TEST_F(Negotiation, RunsAsynchronously)
 {
     std::promise<TokenPtr> promise;
     MakeService()->AcquireTokenByGssAsync(
-        MakeSpec(),
-        MakeHandler("alice"),
-        [&](const TokenPtr& token, const Quillon::Exception*) { promise.set_value(token); });
+        MakeSpec(), MakeHandler("alice"), [&](const TokenPtr& token, const Quillon::Exception*) {
+            promise.set_value(token);
+        });
     const TokenPtr token = promise.get_future().get();
     ASSERT_NE(token, nullptr);
     EXPECT_EQ(token->GetSubject(), Alice());
@@ -160,9 +162,7 @@ TEST_F(Negotiation, RunsOneLegAtATime)
 TEST_F(Negotiation, ReportsAClientThatTheServiceDoesNotKnow)
 {
     EXPECT_THAT(
-        GetFailure([&] {
-            MakeService()->AcquireTokenByGSS(MakeSpec(), *MakeHandler("mallory"));
-        }),
+        GetFailure([&] { MakeService()->AcquireTokenByGSS(MakeSpec(), *MakeHandler("mallory")); }),
         AllOf(
             StartsWith("InvalidCredentialsException: Authentication failed: "),
             HasSubstr("mallory@EXAMPLE.TEST")));
@@ -197,7 +197,8 @@ TEST_F(Negotiation, ReportsThatThereIsNoTicket)
             MakeService()->AcquireTokenByGSS(
                 MakeSpec(), *CreateKerberosNegotiationHandler(options));
         }),
-        AllOf(StartsWith("NegotiationException: "), HasSubstr("No Kerberos credentials available")));
+        AllOf(
+            StartsWith("NegotiationException: "), HasSubstr("No Kerberos credentials available")));
 }
 
 TEST_F(Negotiation, ReportsThatTheServiceDoesNotNegotiate)

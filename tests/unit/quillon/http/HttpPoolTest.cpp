@@ -24,7 +24,10 @@ protected:
     HttpPoolProcess() { GTEST_FLAG_SET(death_test_style, "threadsafe"); }
 };
 
-/** What the work came to; made before the pool starts, so it is destroyed after the pool's end. */
+/**
+ * What work came to. Made just before the pool starts, so it is destroyed when the pool has waited
+ * for the work, and nothing else has happened since.
+ */
 struct Outcome
 {
     const std::string expected;
@@ -33,7 +36,6 @@ struct Outcome
     ~Outcome()
     {
         auto future = actual.get_future();
-        // The end has waited for the work, so this does not have to.
         if (future.wait_for(std::chrono::seconds(0)) != std::future_status::ready
             || future.get() != expected) {
             std::abort();
@@ -41,17 +43,24 @@ struct Outcome
     }
 };
 
-/** A server that answers the first request of a connection and is silent from then on. */
-TestServer::Handler AnswerOnce(std::promise<void>& askedAgain)
+/** Answers requests, but for those that say "wait". */
+TestServer::Handler AnswerUnlessToldToWait(std::promise<void>& isWaiting)
 {
-    return [&askedAgain](ServerConnection& connection) {
-        connection.ReadRequest();
-        connection.Write(MakeReply("200 OK", "pong"));
-        if (connection.ReadRequest()) {
-            askedAgain.set_value();
+    return [&isWaiting](ServerConnection& connection) {
+        while (const auto request = connection.ReadRequest()) {
+            if (request->body == "wait") {
+                isWaiting.set_value();
+                connection.WaitForClose();
+                return;
+            }
+            connection.Write(MakeReply("200 OK", "pong"));
         }
-        connection.WaitForClose();
     };
+}
+
+std::string PostAndWait(HttpClient& client)
+{
+    return client.PostAndFail(HttpClient::MakeRequest("wait"));
 }
 
 enum class First
@@ -63,17 +72,18 @@ enum class First
 /** Ends the process while work waits for an exchange that gets no reply. */
 [[noreturn]] void ExitWhileWorkWaits(First first)
 {
-    static std::promise<void> asked;
-    static const TestServer server(AnswerOnce(asked));
-    static Outcome outcome{"The process is about to end.", {}};
+    static std::promise<void> isWaiting;
+    static const TestServer server(AnswerUnlessToldToWait(isWaiting));
     // Never destroyed: the work uses it until the end.
     static HttpClient& client = *new HttpClient(server);
-    if (first == First::POOL) {
-        GetThreadPool()->Queue([] {});
+    if (first == First::HTTP) {
+        client.Post();
     }
+    static Outcome outcome{"The process is about to end.", {}};
+    GetThreadPool()->Queue([] {});
     client.Post();
-    GetThreadPool()->Queue([] { outcome.actual.set_value(client.PostAndFail()); });
-    asked.get_future().wait();
+    GetThreadPool()->Queue([] { outcome.actual.set_value(PostAndWait(client)); });
+    isWaiting.get_future().wait();
     std::exit(0);
 }
 
@@ -116,14 +126,15 @@ TEST_F(HttpPoolProcess, SendsNothingMoreForWorkThatFinishes)
 /** Ends the process in work that has sent a request, while other work waits for a reply. */
 [[noreturn]] void ExitInWork()
 {
-    static std::promise<void> asked;
-    static const TestServer server(AnswerOnce(asked));
-    static Outcome outcome{"The process is about to end.", {}};
+    static std::promise<void> isWaiting;
+    static const TestServer server(AnswerUnlessToldToWait(isWaiting));
     static HttpClient& client = *new HttpClient(server);
+    client.Post();
+    static Outcome outcome{"The process is about to end.", {}};
     GetThreadPool()->Queue([] {
+        GetThreadPool()->Queue([] { outcome.actual.set_value(PostAndWait(client)); });
+        isWaiting.get_future().wait();
         client.Post();
-        GetThreadPool()->Queue([] { outcome.actual.set_value(client.PostAndFail()); });
-        asked.get_future().wait();
         std::exit(0);
     });
     std::promise<void>().get_future().wait();

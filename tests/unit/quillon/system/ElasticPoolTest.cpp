@@ -195,6 +195,18 @@ TEST(ThreadsOfThePool, GoWhenTheyAreIdleButForTheInitialOnes)
     EXPECT_LE(2U, pool.GetThreadCount());
 }
 
+TEST(ThreadsOfThePool, GoEvenIfTheOthersAreKeptBusy)
+{
+    ElasticPool pool(MakeOptions(1, 8, 1ms));
+    {
+        Gate gate;
+        Occupy(pool, gate, 8);
+    }
+    while (pool.GetThreadCount() > 4) {
+        GetThreadId(pool);
+    }
+}
+
 TEST(ThreadsOfThePool, StayUntilTheyHaveBeenIdleLongEnough)
 {
     static thread_local bool isKnown = false;
