@@ -135,6 +135,17 @@ class Refusals(KerberosTest):
             "Cannot negotiate with the service 'HTTP@127.0.0.1' using the credential cache "
             f"'{expired}': {UNSPECIFIED}Ticket expired", "--ccache", expired)
 
+    def test_kdc_that_cannot_be_reached(self):
+        configuration = self.write(
+            "krb5.conf", "[libdefaults]\n udp_preference_limit = 1\n dns_lookup_kdc = false\n"
+            "[realms]\n EXAMPLE.TEST = {\n  kdc = 127.0.0.1:1\n }\n")
+        keytab = self.realm.alice_keytab
+        self.assert_kerberos_fails(
+            f"Cannot log on as 'alice@EXAMPLE.TEST' with the keytab '{keytab}': "
+            "Cannot contact any KDC for realm 'EXAMPLE.TEST'",
+            "--keytab", keytab, "--principal", "alice@EXAMPLE.TEST",
+            environment={"KRB5_CONFIG": str(configuration)})
+
     def test_client_that_the_service_does_not_know(self):
         result = self.acquire_by_gss("--keytab", self.realm.mallory_keytab,
                                      "--principal", "mallory")
