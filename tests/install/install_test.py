@@ -60,10 +60,17 @@ class Install(unittest.TestCase):
         self.assertEqual(GSS_CONSUMER_SAYS,
                          self.build_with_pkg_config("ssoclient-gss", "gss_consumer.cpp"))
 
+    def read_dynamic_section(self, library):
+        return run("readelf", "--dynamic", "--wide", self.libraries / library)
+
     def get_needed(self, library):
         """The shared libraries that this one names. What those need is their own affair."""
-        dynamic = run("readelf", "--dynamic", "--wide", self.libraries / library)
-        return re.findall(r"\(NEEDED\).*\[(.+)\]", dynamic)
+        return re.findall(r"\(NEEDED\).*\[(.+)\]", self.read_dynamic_section(library))
+
+    def test_libraries_cannot_be_unloaded(self):
+        for library in ("libquillon.so", "libssoclient.so", "libssoclient_gss.so"):
+            with self.subTest(library=library):
+                self.assertRegex(self.read_dynamic_section(library), r"\(FLAGS_1\).*\bNODELETE\b")
 
     def test_only_the_kerberos_handler_needs_kerberos(self):
         kerberos = re.compile(r"lib(gssapi|krb5|k5crypto|com_err)")

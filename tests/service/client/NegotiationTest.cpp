@@ -3,14 +3,18 @@
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/GssNegotiationContext.h"
 #include "ssoClientGss/Exceptions.h"
+#include "ssoClientGss/Gssapi.h"
 #include "ssoClientGss/KerberosNegotiationHandler.h"
 #include "support/Failure.h"
 #include "support/TestData.h"
 #include "support/TestKdc.h"
 
+#include <boost/smart_ptr/make_shared.hpp>
 #include <gmock/gmock.h>
 
+#include <array>
 #include <future>
+#include <stdexcept>
 
 // A Kerberos ticket becomes a token: a real KDC, the Kerberos library on both sides, and HTTPS
 // between them.
@@ -77,6 +81,85 @@ protected:
 
 std::unique_ptr<Testing::TestKdc> Negotiation::kdc;
 
+/**
+ * A client that wants Kerberos in the style of DCE, in which it answers the service's leg once
+ * more before the service is satisfied.
+ */
+class ThreeLegHandler final : public NegotiationHandler
+{
+public:
+    ThreeLegHandler(const std::string& ccache, const std::string& service)
+    {
+        gss_key_value_element_desc element{"ccache", ccache.c_str()};
+        const gss_key_value_set_desc store{1, &element};
+        gss_cred_id_t credential = GSS_C_NO_CREDENTIAL;
+        OM_uint32 minor = 0;
+        Require(gss_acquire_cred_from(
+            &minor,
+            GSS_C_NO_NAME,
+            GSS_C_INDEFINITE,
+            GSS_C_NO_OID_SET,
+            GSS_C_INITIATE,
+            &store,
+            &credential,
+            nullptr,
+            nullptr));
+        _credential.reset(credential);
+        std::string text = service;
+        gss_buffer_desc buffer{text.size(), text.data()};
+        gss_name_t name = GSS_C_NO_NAME;
+        Require(gss_import_name(&minor, &buffer, GSS_C_NT_HOSTBASED_SERVICE, &name));
+        _service.reset(name);
+    }
+
+    boost::shared_ptr<Leg> Negotiate(const Leg& serverLeg) override
+    {
+        ++calls;
+        Leg copy = serverLeg;
+        gss_buffer_desc input{copy.size(), copy.data()};
+        Gss::GssBuffer output;
+        gss_ctx_id_t context = _context.release();
+        OM_uint32 minor = 0;
+        const OM_uint32 major = gss_init_sec_context(
+            &minor,
+            _credential.get(),
+            &context,
+            _service.get(),
+            &Gss::spnegoMechanism,
+            GSS_C_MUTUAL_FLAG | GSS_C_DCE_STYLE,
+            0,
+            GSS_C_NO_CHANNEL_BINDINGS,
+            &input,
+            nullptr,
+            output.Get(),
+            nullptr,
+            nullptr);
+        _context.reset(context);
+        Require(major);
+        return boost::make_shared<Leg>(output.begin(), output.end());
+    }
+
+    int calls = 0;
+
+private:
+    static void Require(OM_uint32 major)
+    {
+        if (GSS_ERROR(major)) {
+            throw std::runtime_error(Gss::GetGssError(major, 0, &Gss::spnegoMechanism));
+        }
+    }
+
+    Gss::GssCredential _credential;
+    Gss::GssName _service;
+    Gss::GssContext _context;
+};
+
+std::string GetHeader(const DevSts::ReceivedRequest& request, const std::string& name)
+{
+    const auto header = request.headers.find(name);
+    return header == request.headers.end() ? "" : header->second;
+}
+
 } // namespace
 
 TEST_F(Negotiation, TurnsATicketIntoAToken)
@@ -117,6 +200,26 @@ TEST_F(Negotiation, HandsTheServicesLastLegToTheHandlerAndWarnsOfNothing)
     for (const std::string& line : log.TakeLines()) {
         EXPECT_THAT(line, StartsWith("SsoClient[64]: "));
     }
+}
+
+TEST_F(Negotiation, GoesOnForAsManyLegsAsItTakes)
+{
+    const std::string ccache = kdc->GetFile("legs.ccache");
+    kdc->LogOn("alice", ccache);
+    ThreeLegHandler handler(ccache, "HTTP@127.0.0.1");
+    const TokenPtr token = MakeService(true)->AcquireTokenByGSS(MakeSpec(), handler);
+    ASSERT_NE(token, nullptr);
+    EXPECT_EQ(token->GetSubject(), Alice());
+    EXPECT_EQ(token->GetConfirmationMethod(), SamlToken::CONFIRM_HOLDER_OF_KEY);
+    EXPECT_GE(handler.calls, 2);
+
+    // The service took the second request for the first one's client by its cookie.
+    const std::vector<DevSts::ReceivedRequest> requests = server.ReceivedRequests();
+    ASSERT_EQ(requests.size(), 2U);
+    EXPECT_EQ(GetHeader(requests[0], "Cookie"), "");
+    EXPECT_NE(GetHeader(requests[1], "Cookie"), "");
+    EXPECT_THAT(GetHeader(requests[0], "SOAPAction"), HasSubstr("/RST/Issue"));
+    EXPECT_THAT(GetHeader(requests[1], "SOAPAction"), HasSubstr("/RSTR/Issue"));
 }
 
 TEST_F(Negotiation, NoticesAForgedLastLeg)
@@ -197,8 +300,7 @@ TEST_F(Negotiation, ReportsThatThereIsNoTicket)
             MakeService()->AcquireTokenByGSS(
                 MakeSpec(), *CreateKerberosNegotiationHandler(options));
         }),
-        AllOf(
-            StartsWith("NegotiationException: "), HasSubstr("No Kerberos credentials available")));
+        AllOf(StartsWith("NegotiationException: "), HasSubstr("No credentials cache found")));
 }
 
 TEST_F(Negotiation, ReportsThatTheServiceDoesNotNegotiate)
