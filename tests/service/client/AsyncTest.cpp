@@ -2,6 +2,7 @@
 
 #include "quillon/system/ThreadPool.h"
 #include "ssoClient/Exceptions.h"
+#include "support/TestServer.h"
 
 #include <gmock/gmock.h>
 
@@ -56,11 +57,6 @@ private:
 
 class AsyncAtSts : public HttpsStsTest
 {};
-class AsyncOverHttp : public HttpStsTest
-{
-protected:
-    AsyncOverHttp() { GTEST_FLAG_SET(death_test_style, "threadsafe"); }
-};
 
 } // namespace
 
@@ -187,54 +183,77 @@ TEST_F(AsyncAtSts, CompletesAThousandAcquisitionsOnceEach)
 
 namespace {
 
-/** Lets `count` acquisitions begin against a server that never answers in time. */
-void StartSlowAcquisitions(
-    const SecurityTokenService& service, DevSts::Server& server, std::size_t count)
+/** The service object of a process that is about to end, and a server that never answers. */
+struct EndingProcess
 {
-    server.SetDelay(std::chrono::seconds(20));
-    for (std::size_t index = 0; index < count; ++index) {
-        service.AcquireTokenAsync(
-            AlicesName,
-            AlicesPassword,
-            MakeSpec(),
-            [](const TokenPtr&, const Quillon::Exception* error) {
-                if (error == nullptr) {
-                    std::abort(); // no token can have arrived
-                }
-            });
+    std::promise<void> asked;
+    std::once_flag isAsked;
+    Testing::TestServer server{[this](Testing::ServerConnection& connection) {
+        connection.ReadRequest();
+        std::call_once(isAsked, [this] { asked.set_value(); });
+        connection.WaitForClose();
+    }};
+    ServicePtr service = MakeService();
+
+    ServicePtr MakeService() const
+    {
+        SecurityTokenServiceConfig config;
+        config.url = "http://127.0.0.1:" + std::to_string(server.GetPort()) + "/sts";
+        return CreateSecurityTokenService(config);
     }
-    while (server.ReceivedRequests().empty()) {
-        std::this_thread::yield();
-    }
-}
 
-} // namespace
-
-TEST_F(AsyncOverHttp, ExitsWithOperationsInFlight)
-{
-    EXPECT_EXIT(
-        {
-            StartSlowAcquisitions(*MakeService(), server, 200);
-            std::exit(0);
-        },
-        testing::ExitedWithCode(0),
-        "^$");
-}
-
-TEST_F(AsyncOverHttp, ExitsFromACompletionWithOperationsInFlight)
-{
-    EXPECT_EXIT(
-        {
-            const ServicePtr service = MakeService();
-            StartSlowAcquisitions(*service, server, 10);
-            // Its lifetime is refused before anything is sent.
+    /** Has operations of every kind of progress: under way, waiting for a thread. */
+    void StartAcquisitions(int count)
+    {
+        for (int index = 0; index < count; ++index) {
             service->AcquireTokenAsync(
                 AlicesName,
                 AlicesPassword,
-                MakeSpec(0),
-                [](const TokenPtr&, const Quillon::Exception*) { std::exit(0); });
-            std::promise<void>().get_future().wait();
-        },
-        testing::ExitedWithCode(0),
-        "^$");
+                MakeSpec(),
+                [](const TokenPtr&, const Quillon::Exception* error) {
+                    if (error == nullptr) {
+                        std::abort(); // no token can have arrived
+                    }
+                });
+        }
+        asked.get_future().wait();
+    }
+};
+
+[[noreturn]] void ExitWithOperationsInFlight()
+{
+    static EndingProcess process; // older than the threads, and so there until they have ended
+    process.StartAcquisitions(200);
+    std::exit(0);
+}
+
+[[noreturn]] void ExitFromACompletion()
+{
+    static EndingProcess process;
+    process.StartAcquisitions(10);
+    // Its lifetime is refused before anything is sent.
+    process.service->AcquireTokenAsync(
+        AlicesName, AlicesPassword, MakeSpec(0), [](const TokenPtr&, const Quillon::Exception*) {
+            std::exit(0);
+        });
+    std::promise<void>().get_future().wait();
+    std::abort();
+}
+
+class AsyncAtTheEnd : public testing::Test
+{
+protected:
+    AsyncAtTheEnd() { GTEST_FLAG_SET(death_test_style, "threadsafe"); }
+};
+
+} // namespace
+
+TEST_F(AsyncAtTheEnd, TheProcessExitsWithOperationsInFlight)
+{
+    EXPECT_EXIT(ExitWithOperationsInFlight(), testing::ExitedWithCode(0), "^$");
+}
+
+TEST_F(AsyncAtTheEnd, TheProcessExitsFromACompletion)
+{
+    EXPECT_EXIT(ExitFromACompletion(), testing::ExitedWithCode(0), "^$");
 }
