@@ -54,17 +54,44 @@ std::string StatusText(OM_uint32 status, int type, gss_OID mechanism)
     return text;
 }
 
-std::string ErrorText(OM_uint32 major, OM_uint32 minor)
+void Require(OM_uint32 major, OM_uint32 minor, gss_OID mechanism)
 {
+    if (GSS_ERROR(major) == 0) {
+        return;
+    }
     const std::string text = StatusText(major, GSS_C_GSS_CODE, GSS_C_NO_OID);
-    return minor == 0 ? text : text + ": " + StatusText(minor, GSS_C_MECH_CODE, &Spnego);
+    throw GssError(minor == 0 ? text : text + ": " + StatusText(minor, GSS_C_MECH_CODE, mechanism));
 }
 
-void Require(OM_uint32 major, OM_uint32 minor)
+// GSS finds no credential for a mechanism that it knows, and else knows no such mechanism.
+void RequireMechanism(OM_uint32 major)
 {
-    if (GSS_ERROR(major) != 0) {
-        throw GssError(ErrorText(major, minor));
+    const OM_uint32 error = GSS_ROUTINE_ERROR(major);
+    if (error == GSS_S_NO_CRED || error == GSS_S_BAD_MECH) {
+        throw GssError(
+            "Only SPNEGO with Kerberos inside is negotiated: "
+            + StatusText(major, GSS_C_GSS_CODE, GSS_C_NO_OID));
     }
+}
+
+GssCredential Acquire(const gss_key_value_set_desc& store, gss_OID mechanism)
+{
+    gss_OID_set_desc mechanisms{1, mechanism};
+    gss_cred_id_t credential = GSS_C_NO_CREDENTIAL;
+    OM_uint32 minor = 0;
+    const OM_uint32 major = gss_acquire_cred_from(
+        &minor,
+        GSS_C_NO_NAME,
+        GSS_C_INDEFINITE,
+        &mechanisms,
+        GSS_C_ACCEPT,
+        &store,
+        &credential,
+        nullptr,
+        nullptr);
+    GssCredential owner(credential);
+    Require(major, minor, mechanism);
+    return owner;
 }
 
 std::string DisplayName(gss_name_t name)
@@ -72,7 +99,7 @@ std::string DisplayName(gss_name_t name)
     OM_uint32 minor = 0;
     GssBuffer text;
     const OM_uint32 major = gss_display_name(&minor, name, text.Out(), nullptr);
-    Require(major, minor);
+    Require(major, minor, &Spnego);
     return text.Text();
 }
 
@@ -103,24 +130,13 @@ Acceptor::Acceptor(const std::filesystem::path& keytab, const std::filesystem::p
     std::array<gss_key_value_element_desc, 2> elements{
         {{"keytab", keytabName.c_str()}, {"rcache", replayName.c_str()}}};
     const gss_key_value_set_desc store{elements.size(), elements.data()};
-    gss_OID_set_desc spnegoOnly{1, &Spnego};
-    gss_cred_id_t credential = GSS_C_NO_CREDENTIAL;
-    OM_uint32 minor = 0;
-    OM_uint32 major = gss_acquire_cred_from(
-        &minor,
-        GSS_C_NO_NAME,
-        GSS_C_INDEFINITE,
-        &spnegoOnly,
-        GSS_C_ACCEPT,
-        &store,
-        &credential,
-        nullptr,
-        nullptr);
-    _credential.reset(credential);
-    Require(major, minor);
+    // SPNEGO would only say that it finds no mechanism; Kerberos tells what is wrong.
+    Acquire(store, &Kerberos);
+    _credential = Acquire(store, &Spnego);
     gss_OID_set_desc kerberosOnly{1, &Kerberos};
-    major = gss_set_neg_mechs(&minor, credential, &kerberosOnly);
-    Require(major, minor);
+    OM_uint32 minor = 0;
+    const OM_uint32 major = gss_set_neg_mechs(&minor, _credential.get(), &kerberosOnly);
+    Require(major, minor, &Spnego);
 }
 
 std::string SecurityContext::Accept(const Acceptor& acceptor, const std::string& leg)
@@ -144,7 +160,8 @@ std::string SecurityContext::Accept(const Acceptor& acceptor, const std::string&
         nullptr);
     _context.reset(context);
     const GssName clientOwner(client);
-    Require(major, minor);
+    RequireMechanism(major);
+    Require(major, minor, &Spnego);
     _isComplete = (major & GSS_S_CONTINUE_NEEDED) == 0;
     if (_isComplete) {
         _principal = DisplayName(client);

@@ -1,5 +1,6 @@
 #include "devsts/Server.h"
 
+#include "devsts/Connections.h"
 #include "devsts/State.h"
 #include "devsts/TokenService.h"
 
@@ -8,6 +9,7 @@
 #include <httplib.h>
 #include <mutex>
 #include <openssl/ssl.h>
+#include <set>
 #include <stdexcept>
 #include <sys/socket.h>
 #include <thread>
@@ -19,8 +21,7 @@ namespace {
 constexpr const char* Path = "/sts";
 constexpr std::size_t LargestRequest = 1U << 20U;
 // One thread serves one connection for as long as it stays open.
-constexpr std::size_t Threads = 32;
-// Stop waits this long for connections that are idle.
+constexpr std::size_t Threads = 128;
 constexpr time_t IdleSeconds = 5;
 constexpr std::size_t RequestsPerConnection = 1000000;
 
@@ -98,6 +99,7 @@ public:
             throw std::runtime_error(
                 "Cannot listen on " + _options.host + ":" + std::to_string(_options.port));
         }
+        _address = IpAddress::Local(_listener);
         // The HTTP library listens with room for five; a second call makes more.
         listen(_listener, SOMAXCONN);
         _thread = std::thread([this] { _http->listen_after_bind(); });
@@ -112,6 +114,7 @@ public:
     {
         if (_thread.joinable()) {
             _http->stop();
+            EndReading(_address, BusyPorts());
             _thread.join();
         }
     }
@@ -157,6 +160,11 @@ private:
         _http->Post(".*", answer);
         _http->Put(".*", answer);
         _http->Delete(".*", answer);
+        // The library logs once an answer is written.
+        _http->set_logger([this](const httplib::Request& request, const httplib::Response&) {
+            const std::lock_guard<std::mutex> lock(_mutex);
+            _busyPorts.erase(request.remote_port);
+        });
         _http->set_payload_max_length(LargestRequest);
         _http->set_keep_alive_max_count(RequestsPerConnection);
         _http->set_keep_alive_timeout(IdleSeconds);
@@ -186,7 +194,7 @@ private:
     void Answer(const httplib::Request& request, httplib::Response& response)
     {
         const ReceivedRequest received = ToReceived(request);
-        const ReplyHook hook = Remember(received);
+        const ReplyHook hook = Remember(received, request.remote_port);
         std::this_thread::sleep_for(_delay.load());
         Reply reply = MakeReply(received);
         if (hook) {
@@ -196,9 +204,10 @@ private:
     }
 
     // Gives the hook that was set for this request, if any.
-    ReplyHook Remember(const ReceivedRequest& received)
+    ReplyHook Remember(const ReceivedRequest& received, int port)
     {
         const std::lock_guard<std::mutex> lock(_mutex);
+        _busyPorts.insert(port);
         _received.push_back(received);
         while (_received.size() > _options.keptRequests) {
             _received.pop_front();
@@ -209,6 +218,12 @@ private:
         ReplyHook hook = std::move(_hooks.front());
         _hooks.pop_front();
         return hook;
+    }
+
+    std::set<int> BusyPorts() const
+    {
+        const std::lock_guard<std::mutex> lock(_mutex);
+        return _busyPorts;
     }
 
     Reply MakeReply(const ReceivedRequest& received)
@@ -233,8 +248,10 @@ private:
     std::thread _thread;
     int _port = 0;
     socket_t _listener = INVALID_SOCKET;
+    IpAddress _address;
     std::atomic<std::chrono::milliseconds> _delay{std::chrono::milliseconds(0)};
     mutable std::mutex _mutex;
+    std::set<int> _busyPorts; ///< whence the requests came that are not answered yet
     std::deque<ReplyHook> _hooks;
     std::deque<ReceivedRequest> _received;
 };

@@ -51,8 +51,7 @@ public:
      */
     int Start();
 
-    /** Answers the requests under way, waits at most five seconds for idle connections, and ends.
-     */
+    /** Answers the requests under way, closes idle connections, and ends. */
     void Stop();
 
     /** Where requests go; known once started. */

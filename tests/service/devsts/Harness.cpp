@@ -34,9 +34,9 @@ const xmlChar* Chars(const std::string& text)
     return reinterpret_cast<const xmlChar*>(text.c_str());
 }
 
-DevSts::Options TestOptions(const fs::path& state, const std::atomic<DevSts::TimePoint>& now)
+DevSts::Options TestOptions(
+    DevSts::Options options, const fs::path& state, const std::atomic<DevSts::TimePoint>& now)
 {
-    DevSts::Options options;
     options.stateDir = state;
     options.plainHttp = true;
     options.clock = [&now] { return now.load(); };
@@ -181,8 +181,8 @@ bool VerifiesWithXmlSec(const std::string& assertion)
            == 0;
 }
 
-ServerTest::ServerTest(const fs::path& state)
-    : _server(TestOptions(state, _now))
+ServerTest::ServerTest(const fs::path& state, DevSts::Options options)
+    : _server(TestOptions(std::move(options), state, _now))
     , _port(_server.Start())
 {}
 
@@ -192,10 +192,13 @@ DevSts::TimePoint ServerTest::StartTime()
     return DevSts::TimePoint(sys_days(year(2026) / November / 20)) + hours(12);
 }
 
-HttpResult ServerTest::Post(const std::string& action, const std::string& body)
+HttpResult ServerTest::Post(
+    const std::string& action, const std::string& body, const DevSts::Headers& headers)
 {
     httplib::Client client("127.0.0.1", _port);
-    const auto result = client.Post("/sts", {{"SOAPAction", '"' + action + '"'}}, body, "text/xml");
+    httplib::Headers all(headers.begin(), headers.end());
+    all.emplace("SOAPAction", '"' + action + '"');
+    const auto result = client.Post("/sts", all, body, "text/xml");
     if (!result) {
         ADD_FAILURE() << "no answer: " << to_string(result.error());
         return {};

@@ -67,12 +67,15 @@ struct HttpResult
 class ServerTest : public testing::Test
 {
 protected:
-    explicit ServerTest(const std::filesystem::path& state = SharedState());
+    /** `options` count but for the state, the protocol and the clock. */
+    explicit ServerTest(
+        const std::filesystem::path& state = SharedState(), DevSts::Options options = {});
 
     static DevSts::TimePoint StartTime();
 
-    /** POSTs to the STS as its clients do. */
-    HttpResult Post(const std::string& action, const std::string& body);
+    /** POSTs to the STS as its clients do; `headers` come on top. */
+    HttpResult Post(
+        const std::string& action, const std::string& body, const DevSts::Headers& headers = {});
     HttpResult PostIssue(const std::string& body);
 
     /** A reply of 500 whose fault code is `prefix:local`; gives its faultstring. */

@@ -227,7 +227,8 @@ TEST_F(BrokenRequest, UnquotedActionIsRefused)
     ASSERT_TRUE(result);
     EXPECT_EQ(
         FaultText({result->status, result->body, {}}, "soapenv:Client"),
-        "The SOAPAction header must be the quoted Issue, Renew or Validate action, not "
+        "The SOAPAction header must be the quoted Issue, Renew or Validate action or that of an "
+        "Issue response, not "
             + std::string(Ns::Wst) + "/RST/Issue");
 }
 

@@ -1,4 +1,4 @@
-#include "Harness.h"
+#include "NegotiationHarness.h"
 #include "Requests.h"
 
 #include <array>
@@ -189,24 +189,24 @@ TEST(DevStsProgram, OldTlsIsRefused)
 }
 
 // The program keeps real time, so its requests cannot come from the standing clock.
-std::string RealTimeRequest()
+std::string RealTime(std::string request)
 {
     const DevSts::TimePoint now = DevSts::SystemTime();
     const std::string created = DevSts::FormatTime(now);
     const std::string expires = DevSts::FormatTime(now + std::chrono::minutes(10));
-    std::string request = PasswordRequest();
     request = Replaced(request, "2026-11-20T12:00:00.000Z", created);
     request = Replaced(request, "2026-11-20T12:10:00.000Z", expires);
     request = Replaced(request, "2026-11-20T12:00:00.001Z", created);
     return Replaced(request, "2026-11-20T13:00:00.001Z", expires);
 }
 
-std::string PostWithCurl(const std::string& url, const std::string& request)
+std::string PostWithCurl(
+    const std::string& url, const std::string& request, const std::string& options = "")
 {
     const TempDir dir;
     WriteText(dir.Path() / "request.xml", request);
     return RunCommand(Curl(
-                          "--cacert " + (SharedState() / "ca.pem").string()
+                          options + " --cacert " + (SharedState() / "ca.pem").string()
                           + " --header 'Content-Type: text/xml' --header 'SOAPAction: \""
                           + std::string(Ns::Wst) + "/RST/Issue\"' --data-binary @"
                           + (dir.Path() / "request.xml").string() + " " + url))
@@ -216,7 +216,7 @@ std::string PostWithCurl(const std::string& url, const std::string& request)
 TEST(DevStsProgram, IssuesToCurl)
 {
     const Program program({"--state", StateArgument()});
-    const std::string reply = PostWithCurl(UrlIn(program.ReadLine()), RealTimeRequest());
+    const std::string reply = PostWithCurl(UrlIn(program.ReadLine()), RealTime(PasswordRequest()));
     EXPECT_TRUE(VerifiesWithXmlSec(AssertionIn(reply)));
 }
 
@@ -246,6 +246,46 @@ TEST(DevStsProgram, MissingStateArgumentIsRefusedInOneLine)
     EXPECT_EQ(program.Wait(), 2);
     EXPECT_EQ(program.ReadRest(), "");
     EXPECT_EQ(program.Errors(), "ssoclient-devsts: --state is required\n");
+}
+
+TEST(DevStsProgram, SaysThatItNegotiates)
+{
+    const std::string keytab = Realm::Shared().File("service.keytab");
+    Program program({"--state", StateArgument(), "--keytab", keytab});
+    EXPECT_NE(UrlIn(program.ReadLine()), "");
+    program.Signal(SIGTERM);
+    EXPECT_EQ(program.Wait(), 0);
+    EXPECT_EQ(
+        program.Errors(),
+        "Negotiates Kerberos with the keytab " + keytab
+            + "\nFor development only: keys and passwords lie in plain files in " + StateArgument()
+            + "\n");
+}
+
+TEST(DevStsProgram, NegotiationCookieIsSecureOnHttps)
+{
+    const Program program(
+        {"--state", StateArgument(), "--keytab", Realm::Shared().File("service.keytab")});
+    const std::string reply = PostWithCurl(
+        UrlIn(program.ReadLine()), RealTime(FirstRequest(OfferOfKerberos())), "--include");
+    EXPECT_TRUE(std::regex_search(
+        reply,
+        std::regex("Set-Cookie: devsts-negotiation=[0-9a-f]{32}; Path=/sts; HttpOnly; Secure\r")))
+        << reply;
+}
+
+TEST(DevStsProgram, KeytabThatCannotBeUsedEndsIt)
+{
+    const std::string keytab = (SharedState() / "sts.pem").string();
+    Program program({"--state", StateArgument(), "--keytab", keytab});
+    EXPECT_EQ(program.Wait(), 1);
+    EXPECT_EQ(program.ReadRest(), "");
+    EXPECT_EQ(
+        program.Errors(),
+        "ssoclient-devsts: The keytab " + keytab
+            + " cannot be used: No credentials were supplied, or the credentials were unavailable "
+              "or inaccessible: Keytab FILE:"
+            + keytab + " is nonexistent or empty\n");
 }
 
 TEST(DevStsProgram, StateThatCannotBeUsedIsNoUsageError)

@@ -1,8 +1,10 @@
 #include "Harness.h"
 #include "Requests.h"
 
+#include <condition_variable>
 #include <future>
 #include <httplib.h>
+#include <mutex>
 
 namespace DevStsTests {
 
@@ -66,6 +68,37 @@ TEST_F(InProcessServer, StoppedServerIsGone)
     EXPECT_FALSE(client.Post("/sts", PasswordRequest(), "text/xml"));
 }
 
+TEST_F(InProcessServer, StopDoesNotWaitForIdleConnections)
+{
+    httplib::Client client("127.0.0.1", _port);
+    client.set_keep_alive(true);
+    ASSERT_TRUE(client.Get("/sts"));
+    const auto begun = std::chrono::steady_clock::now();
+    _server.Stop();
+    // Idle connections live for five seconds.
+    EXPECT_LT(std::chrono::steady_clock::now() - begun, std::chrono::seconds(4));
+}
+
+TEST_F(InProcessServer, StopAnswersTheRequestUnderWay)
+{
+    std::promise<void> begun;
+    std::promise<void> stopping;
+    _server.OnNextReply([&](const DevSts::ReceivedRequest&, DevSts::Reply&) {
+        begun.set_value();
+        stopping.get_future().wait();
+    });
+    std::future<HttpResult> reply =
+        std::async(std::launch::async, [this] { return PostIssue(PasswordRequest()); });
+    begun.get_future().wait();
+    std::future<void> stopped = std::async(std::launch::async, [this] { _server.Stop(); });
+    // Once nobody can connect, the stop has begun.
+    while (httplib::Client("127.0.0.1", _port).Get("/sts")) {
+    }
+    stopping.set_value();
+    EXPECT_EQ(reply.get().status, 200);
+    stopped.get();
+}
+
 TEST_F(InProcessServer, UnusableAddressIsReported)
 {
     DevSts::Options options;
@@ -87,6 +120,31 @@ TEST_F(InProcessServer, TakenPortIsReported)
 TEST_F(InProcessServer, AnswersManyClientsAtOnce)
 {
     std::vector<std::future<HttpResult>> replies(40);
+    for (std::future<HttpResult>& reply : replies) {
+        reply = std::async(std::launch::async, [this] { return PostIssue(PasswordRequest()); });
+    }
+    for (std::future<HttpResult>& reply : replies) {
+        EXPECT_EQ(reply.get().status, 200);
+    }
+}
+
+TEST_F(InProcessServer, HundredRequestsAreUnderWayAtOnce)
+{
+    constexpr int Clients = 100;
+    std::mutex mutex;
+    std::condition_variable arrived;
+    int underWay = 0;
+    for (int i = 0; i < Clients; ++i) {
+        _server.OnNextReply([&](const DevSts::ReceivedRequest&, DevSts::Reply& reply) {
+            std::unique_lock<std::mutex> lock(mutex);
+            ++underWay;
+            arrived.notify_all();
+            const bool all = arrived.wait_for(
+                lock, std::chrono::seconds(30), [&] { return underWay == Clients; });
+            reply.status = all ? 200 : 503;
+        });
+    }
+    std::vector<std::future<HttpResult>> replies(Clients);
     for (std::future<HttpResult>& reply : replies) {
         reply = std::async(std::launch::async, [this] { return PostIssue(PasswordRequest()); });
     }
