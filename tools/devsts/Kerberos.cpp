@@ -60,7 +60,9 @@ void Require(OM_uint32 major, OM_uint32 minor, gss_OID mechanism)
         return;
     }
     const std::string text = StatusText(major, GSS_C_GSS_CODE, GSS_C_NO_OID);
-    throw GssError(minor == 0 ? text : text + ": " + StatusText(minor, GSS_C_MECH_CODE, mechanism));
+    // SPNEGO has codes of its own that have no text.
+    const std::string detail = StatusText(minor, GSS_C_MECH_CODE, mechanism);
+    throw GssError(minor == 0 || detail == "Unknown error" ? text : text + ": " + detail);
 }
 
 // GSS finds no credential for a mechanism that it knows, and else knows no such mechanism.

@@ -49,7 +49,9 @@ TEST_F(PendingNegotiation, LegOfAnotherNegotiationIsRefused)
 {
     const HttpResult other = BeginToWait();
     const HttpResult reply = PostNext(ContextOf(other), _leg, CookieOf(other));
-    FaultText(reply, "wst:FailedAuthentication");
+    EXPECT_EQ(
+        FaultText(reply, "wst:FailedAuthentication"),
+        "The negotiation has failed: Invalid token was supplied");
     EXPECT_EQ(PostNext(_context, _leg, _cookie).status, 200);
 }
 
@@ -76,7 +78,9 @@ TEST_F(PendingNegotiation, FinishedOneIsGone)
 
 TEST_F(PendingNegotiation, FailedOneIsGone)
 {
-    FaultText(PostNext(_context, "garbage", _cookie), "wst:FailedAuthentication");
+    EXPECT_EQ(
+        FaultText(PostNext(_context, "garbage", _cookie), "wst:FailedAuthentication"),
+        "The negotiation has failed: Invalid token was supplied");
     EXPECT_EQ(
         FaultText(PostNext(_context, _leg, _cookie), "wst:InvalidRequest"),
         NoSuchContext(_context));
@@ -156,9 +160,10 @@ TEST_F(FewNegotiations, OneTooManyIsRefused)
 
 TEST_F(FewNegotiations, EndedOneMakesRoom)
 {
-    PostNext(ContextOf(_waiting), "garbage", CookieOf(_waiting));
+    EXPECT_EQ(PostNext(ContextOf(_waiting), "garbage", CookieOf(_waiting)).status, 500);
     EXPECT_EQ(BeginToWait().status, 200);
-    FaultText(BeginToWait(), "wst:RequestFailed");
+    EXPECT_EQ(
+        FaultText(BeginToWait(), "wst:RequestFailed"), "Too many negotiations are under way: 3");
 }
 
 TEST_F(FewNegotiations, AgedOnesMakeRoom)
