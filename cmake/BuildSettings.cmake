@@ -29,6 +29,12 @@ if(CMAKE_BUILD_TYPE STREQUAL "Release" OR CMAKE_BUILD_TYPE STREQUAL "RelWithDebI
 endif()
 add_link_options(-Wl,-z,relro,-z,now)
 
+# Keeps a library in the process once it is there: its threads may still run its code after a host
+# has unloaded the module that brought it.
+function(ssoclient_stay_loaded library)
+    target_link_options(${library} PRIVATE -Wl,-z,nodelete)
+endfunction()
+
 set(SSOCLIENT_SANITIZE "" CACHE STRING "Sanitizers to build with, for example address,undefined")
 if(SSOCLIENT_SANITIZE)
     add_compile_options(-fsanitize=${SSOCLIENT_SANITIZE} -fno-sanitize-recover=all

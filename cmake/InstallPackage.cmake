@@ -4,8 +4,8 @@ include(CMakePackageConfigHelpers)
 
 set(package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/SsoClient)
 
-set_target_properties(quillon ssoclient PROPERTIES INSTALL_RPATH "$ORIGIN")
-install(TARGETS quillon ssoclient EXPORT SsoClientTargets
+set_target_properties(quillon ssoclient ssoclient_gss PROPERTIES INSTALL_RPATH "$ORIGIN")
+install(TARGETS quillon ssoclient ssoclient_gss EXPORT SsoClientTargets
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR})
 install(DIRECTORY lib/public/ DESTINATION ${CMAKE_INSTALL_INCLUDEDIR} FILES_MATCHING PATTERN *.h)
 
@@ -30,7 +30,7 @@ install(FILES
 # pkg-config finds the prefix from where its file lies.
 file(RELATIVE_PATH pc_to_prefix
     ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_PREFIX})
-foreach(package quillon ssoclient)
+foreach(package quillon ssoclient ssoclient-gss)
     configure_file(cmake/${package}.pc.in ${package}.pc @ONLY)
     install(FILES ${CMAKE_CURRENT_BINARY_DIR}/${package}.pc
         DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)

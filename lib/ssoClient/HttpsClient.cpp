@@ -3,6 +3,7 @@
 #include "quillon/PanicVerify.h"
 #include "quillon/http/HttpURL.h"
 #include "ssoClient/Exceptions.h"
+#include "ssoClient/asyncCalls.h"
 
 #include <boost/bind/bind.hpp>
 #include <boost/smart_ptr/make_shared.hpp>
@@ -15,8 +16,6 @@ namespace Http = Quillon::Http;
 
 /** SOAP 1.1 faults come with this status [SOAP11 6.2]. */
 constexpr int SoapFaultStatus = 500;
-
-void IgnoreResponse(Quillon::Exception const* /*error*/, Quillon::Reader* /*body*/) {}
 
 Quillon::Ref<Http::ClientRequest> ComposeRequest(
     Request const& request, std::string const& path, long long timeout)
@@ -75,7 +74,7 @@ HttpsSession::HttpsSession(Http::ConnectionSpec* spec, std::string const& path, 
 void HttpsSession::SendRequest(Request const& request, Quillon::Ref<Quillon::Reader>& response)
 {
     Quillon::Ref<Quillon::System::ScheduledItem> pending;
-    SendRequestAsync(request, &IgnoreResponse, pending);
+    SendRequestAsync(request, boost::bind(&noop), pending);
     Quillon::Ref<Http::ClientResponse> httpResponse;
     _userAgent->WaitForResponse(
         static_cast<Http::PendingRequestItem*>(pending.get()), _timeout, httpResponse);

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "ssoClient/Leg.h"
 #include "ssoClient/Request.h"
 #include "ssoClient/SamlToken.h"
 #include "ssoClient/TokenSpec.h"
@@ -30,6 +31,18 @@ public:
         const std::string& password,
         const TokenSpec& spec,
         Request& request) const = 0;
+
+    /**
+     * Begins a negotiation. Signed as a password request is.
+     *
+     * @throws Quillon::InvalidArgumentException  the lifetime is not positive.
+     */
+    virtual void BuildInitialSPNegoRequest(
+        const TokenSpec& spec, const Leg& leg, Request& request) const = 0;
+
+    /** Goes on with a negotiation, as a response to the service's response. Never signed. */
+    virtual void BuildContinuedSPNegoRequest(
+        const std::string& contextId, const Leg& leg, Request& request) const = 0;
 
     /**
      * Signed with the caller's own key.

@@ -7,6 +7,7 @@
 #include "ssoClient/xmlRequestBuilders.h"
 #include "ssoClient/xmlSecurityBuilders.h"
 #include "ssoClient/xmlSoapBuilders.h"
+#include "ssoClient/xmlSpnego.h"
 
 #include <boost/smart_ptr/make_shared.hpp>
 
@@ -90,6 +91,27 @@ void RequestBuilderImpl::BuildUserPassTokenRequest(
     request.soapAction = Wire::IssueAction;
     request.body =
         BuildTokenRequest(ConfOverrideWithDelegate(spec), std::move(header), std::move(body));
+}
+
+void RequestBuilderImpl::BuildInitialSPNegoRequest(
+    const TokenSpec& spec, const Leg& leg, Request& request) const
+{
+    ValidateLifetime(spec.tokenLifetimeSec);
+    XMLBuilderPtr header = CreateHeader();
+    XMLBuilderPtr body = boost::make_shared<XMLBodyBuilderInitialSPNego>(
+        GetEffectiveConfirmationType(spec.confirmation), spec, leg);
+    request.soapAction = Wire::IssueAction;
+    request.body =
+        BuildTokenRequest(ConfOverrideWithDelegate(spec), std::move(header), std::move(body));
+}
+
+void RequestBuilderImpl::BuildContinuedSPNegoRequest(
+    const std::string& contextId, const Leg& leg, Request& request) const
+{
+    XMLBuilderPtr header = CreateHeader();
+    XMLBuilderPtr body = boost::make_shared<XMLBodyBuilderContinuedSPNego>(contextId, leg);
+    request.soapAction = Wire::IssueResponseAction;
+    request.body = BuildUnSignedRequest(std::move(header), std::move(body));
 }
 
 void RequestBuilderImpl::BuildCertificateTokenRequest(const TokenSpec& spec, Request& request) const

@@ -19,6 +19,10 @@ public:
         const std::string& password,
         const TokenSpec& spec,
         Request& request) const override;
+    void BuildInitialSPNegoRequest(
+        const TokenSpec& spec, const Leg& leg, Request& request) const override;
+    void BuildContinuedSPNegoRequest(
+        const std::string& contextId, const Leg& leg, Request& request) const override;
     void BuildCertificateTokenRequest(const TokenSpec& spec, Request& request) const override;
     void BuildExchangeTokenRequest(
         const SamlToken& token, const TokenSpec& spec, Request& request) const override;

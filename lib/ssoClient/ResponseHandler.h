@@ -1,6 +1,7 @@
 #pragma once
 
 #include "quillon/Reader.h"
+#include "ssoClient/SPNegoResponse.h"
 
 #include <string>
 
@@ -29,6 +30,9 @@ public:
 
     /** Stores the renewed assertion in `tokenXml`, so that its signature still verifies. */
     virtual void HandleRenewTokenResponse(Quillon::Reader* body, std::string& tokenXml) const = 0;
+
+    /** Replaces `response`, if the reply is good, by what the service answers to a leg. */
+    virtual void HandleSPNegoResponse(Quillon::Reader* body, SPNegoResponse& response) const = 0;
 
 protected:
     ~ResponseHandler() = default;

@@ -2,14 +2,13 @@
 
 #include "quillon/PanicVerify.h"
 #include "quillon/xml/Parser.h"
-#include "quillon/xml/security/Canonicalizer.h"
-#include "quillon/xml/security/Identifiers.h"
 #include "ssoClient/Exceptions.h"
+#include "ssoClient/responseReading.h"
 #include "ssoClient/wireNames.h"
 #include "ssoClient/xmlReading.h"
+#include "ssoClient/xmlSpnego.h"
 
 #include <algorithm>
-#include <initializer_list>
 #include <iterator>
 
 using Quillon::Ref;
@@ -21,7 +20,6 @@ namespace SsoClient {
 namespace {
 
 constexpr char Unit[] = "lib/ssoClient/ResponseHandlerImpl";
-constexpr char UnexpectedFormat[] = "Unexpected XML format";
 
 // A name in the reply's own terms: prefixes differ between services.
 struct FaultName
@@ -44,12 +42,6 @@ bool IsBadCredentials(const QName& code)
             return code.GetNamespaceUri() == name.namespaceUri
                    && code.GetLocalName() == name.localName;
         });
-}
-
-// The text that an element starts with; empty for no element and for one without such a text.
-std::string GetElementText(const ElementNode* element)
-{
-    return GetText(GetTextNode(element));
 }
 
 [[noreturn]] void ThrowFault(const ElementNode& fault)
@@ -108,33 +100,9 @@ auto ProcessResponseWith(Quillon::Reader* body, const Extractor& extractor)
     return extractor(*soapBody);
 }
 
-// Follows the path of local names, taking the first match at each step.
-const ElementNode& RequireDescendant(
-    const ElementNode& element, std::initializer_list<std::string_view> path)
-{
-    const ElementNode* current = &element;
-    for (const std::string_view localName : path) {
-        current = current->FindChildElement(localName);
-        if (current == nullptr) {
-            throw SsoException(UnexpectedFormat);
-        }
-    }
-    return *current;
-}
-
-// Inclusive, because it keeps every namespace declaration in scope: prefixes that only stand in
-// attribute values and text stay bound, and a signature in either canonical form still verifies.
-std::string ToCanonicalXml(const ElementNode& element)
-{
-    const Ref<Quillon::StringWriter> writer = Quillon::CreateStringWriter();
-    Quillon::Xml::Security::CreateCanonicalizer(Quillon::Xml::Security::InclusiveC14n)
-        ->Canonicalize(&element, writer.get());
-    return writer->TakeString();
-}
-
 std::string ExtractIssuedToken(const ElementNode& soapBody)
 {
-    return ToCanonicalXml(RequireDescendant(
+    return ToAssertionText(RequireDescendant(
         soapBody,
         {"RequestSecurityTokenResponseCollection",
          "RequestSecurityTokenResponse",
@@ -145,7 +113,7 @@ std::string ExtractIssuedToken(const ElementNode& soapBody)
 // Only an issue request is answered by a collection [WST13 4.3, 5].
 std::string ExtractRenewedToken(const ElementNode& soapBody)
 {
-    return ToCanonicalXml(RequireDescendant(
+    return ToAssertionText(RequireDescendant(
         soapBody, {"RequestSecurityTokenResponse", "RequestedSecurityToken", "Assertion"}));
 }
 
@@ -166,7 +134,7 @@ bool ExtractValidity(const ElementNode& soapBody)
     if (text->GetText() == Wire::InvalidStatus) {
         return false;
     }
-    throw SsoException(UnexpectedFormat);
+    ThrowUnexpectedFormat();
 }
 
 } // namespace
@@ -186,6 +154,12 @@ void ResponseHandlerImpl::HandleRenewTokenResponse(
     Quillon::Reader* body, std::string& tokenXml) const
 {
     tokenXml = ProcessResponseWith(body, ExtractRenewedToken);
+}
+
+void ResponseHandlerImpl::HandleSPNegoResponse(
+    Quillon::Reader* body, SPNegoResponse& response) const
+{
+    response = ProcessResponseWith(body, ExtractSPNegoResponse);
 }
 
 } // namespace SsoClient

@@ -3,10 +3,10 @@
 #include "quillon/PanicVerify.h"
 #include "quillon/StringUtil.h"
 #include "quillon/system/Clock.h"
-#include "quillon/xml/security/Canonicalizer.h"
 #include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/wireNames.h"
+#include "ssoClient/xmlReading.h"
 
 #include <boost/smart_ptr/make_shared.hpp>
 
@@ -29,14 +29,6 @@ constexpr char TokenTextCanonicalization[] = "http://www.w3.org/TR/2001/REC-xml-
 
 /** More seconds than the calendar has: beyond it, a tolerance changes nothing any more. */
 constexpr long long MaxToleranceSec = 400'000'000'000;
-
-std::string Canonicalize(const ElementNode* assertion)
-{
-    const auto canonicalizer = Security::CreateCanonicalizer(TokenTextCanonicalization);
-    const auto writer = Quillon::CreateStringWriter();
-    canonicalizer->Canonicalize(assertion, writer.get());
-    return writer->TakeString();
-}
 
 void CheckIdentification(const SamlAssertionType& assertion)
 {
@@ -147,7 +139,7 @@ SamlTokenImpl::SamlTokenImpl(
     long long clockToleranceSec)
 {
     RequireElementQName(assertion, "Assertion", Wire::SamlNamespace);
-    _xml = Canonicalize(assertion);
+    _xml = ToCanonicalXml(assertion, TokenTextCanonicalization);
     InitializeFromDom(assertion, keyResolver, clockToleranceSec);
 }
 

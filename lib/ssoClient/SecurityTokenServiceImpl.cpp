@@ -1,17 +1,21 @@
 #include "ssoClient/SecurityTokenServiceImpl.h"
 
 #include "quillon/MessageFormatter.h"
+#include "quillon/PanicVerify.h"
 #include "quillon/StringUtil.h"
 #include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/HttpsClient.h"
 #include "ssoClient/RequestBuilderImpl.h"
 #include "ssoClient/ResponseHandlerImpl.h"
+#include "ssoClient/asyncCalls.h"
 #include "ssoClient/descriptions.h"
 #include "ssoClient/logging.h"
 
+#include <boost/none.hpp>
 #include <boost/smart_ptr/make_shared.hpp>
 
+#include <string.h>
 #include <utility>
 
 using Quillon::MessageFormatter;
@@ -20,6 +24,7 @@ namespace SsoClient {
 
 namespace {
 
+constexpr char Unit[] = "lib/ssoClient/SecurityTokenServiceImpl";
 constexpr long long SendTimeoutMicroseconds = 240'000'000;
 
 // Marks the begin and, however it is left, the end of an operation in the log.
@@ -56,6 +61,65 @@ private:
     std::string _operationName;
 };
 
+// The handler has to see the service's last leg, for with it the service proves itself. What it
+// answers is not sent. The test is the way round that log readers know, not the way of its text.
+void ConsumeFinalLeg(const Leg& serverLeg, NegotiationHandler& handler)
+{
+    if (serverLeg.empty()) {
+        return;
+    }
+    const boost::shared_ptr<Leg> userLeg = handler.Negotiate(serverLeg);
+    if (userLeg == nullptr || userLeg->empty()) {
+        getLogger()->Log(
+            Quillon::Service::LOG_LEVEL_WARNING,
+            "GSS contract error: non-empty user leg after negotiation is complete");
+    }
+}
+
+// Keeps what `_p` points to alive inside a bound call, and hands it over by reference.
+template <class T>
+class PassByRefHelper
+{
+public:
+    explicit PassByRefHelper(const boost::shared_ptr<T>& p)
+        : _p(p)
+    {
+        if (_p == nullptr) {
+            Quillon::PanicVerify("_p", Unit, 488);
+        }
+    }
+
+    operator T&() const noexcept { return *_p; } // NOLINT(google-explicit-constructor)
+
+private:
+    boost::shared_ptr<T> _p;
+};
+
+template <class T>
+PassByRefHelper<T> PassByRef(const boost::shared_ptr<T>& p)
+{
+    return PassByRefHelper<T>(p);
+}
+
+struct WipedText
+{
+    std::string text;
+
+    explicit WipedText(const std::string& original)
+        : text(original)
+    {}
+    WipedText(const WipedText&) = delete;
+    WipedText& operator=(const WipedText&) = delete;
+    ~WipedText() { explicit_bzero(text.data(), text.size()); }
+};
+
+// Bound calls are copied on their way to the pool; the copies share the one password.
+PassByRefHelper<const std::string> PassSecret(const std::string& secret)
+{
+    const boost::shared_ptr<WipedText> copy = boost::make_shared<WipedText>(secret);
+    return PassByRef(boost::shared_ptr<const std::string>(copy, &copy->text));
+}
+
 } // namespace
 
 SecurityTokenServiceImpl::SecurityTokenServiceImpl(
@@ -85,6 +149,22 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireToken(
     std::string tokenXml;
     _responseHandler->HandleAcquireTokenResponse(reply.get(), tokenXml);
     return ToSamlToken(tokenXml);
+}
+
+boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByGSS(
+    const TokenSpec& spec, NegotiationHandler& handler) const
+{
+    const OperationFrame frame("AcquireTokenByGSS");
+    LogTrace([&spec] {
+        return MessageFormatter::ASPrint("Requested token with spec `%1'", WriteTokenSpec(spec));
+    });
+    const boost::shared_ptr<TransportSession> session = _transport->CreateSession();
+    SPNegoResponse response;
+    do {
+        ExchangeLegs(*session, spec, handler, response);
+    } while (response.token.empty());
+    ConsumeFinalLeg(response.leg, handler);
+    return ToSamlToken(response.token);
 }
 
 boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByCertificate(
@@ -145,6 +225,128 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::RenewToken(
     std::string tokenXml;
     _responseHandler->HandleRenewTokenResponse(Send(request).get(), tokenXml);
     return ToSamlToken(tokenXml);
+}
+
+void SecurityTokenServiceImpl::AcquireTokenAsync(
+    const std::string& userName,
+    const std::string& password,
+    const TokenSpec& spec,
+    const TokenCompletion& completion) const
+{
+    SyncToAsyncCall(
+        TokenCall(boost::bind(
+            &SecurityTokenService::AcquireToken, Copy(), userName, PassSecret(password), spec)),
+        completion);
+}
+
+void SecurityTokenServiceImpl::AcquireTokenByGssAsync(
+    const TokenSpec& spec,
+    const boost::shared_ptr<NegotiationHandler>& handler,
+    const TokenCompletion& completion) const
+{
+    SyncToAsyncCall(
+        TokenCall(boost::bind(
+            &SecurityTokenService::AcquireTokenByGSS, Copy(), spec, PassByRef(handler))),
+        completion);
+}
+
+void SecurityTokenServiceImpl::AcquireTokenByCertificateAsync(
+    const TokenSpec& spec, const TokenCompletion& completion) const
+{
+    SyncToAsyncCall(
+        TokenCall(boost::bind(&SecurityTokenService::AcquireTokenByCertificate, Copy(), spec)),
+        completion);
+}
+
+void SecurityTokenServiceImpl::AcquireTokenByTokenAsync(
+    const boost::shared_ptr<const SamlToken>& token,
+    const TokenSpec& spec,
+    const TokenCompletion& completion) const
+{
+    SyncToAsyncCall(
+        TokenCall(boost::bind(
+            &SecurityTokenService::AcquireTokenByToken, Copy(), PassByRef(token), spec)),
+        completion);
+}
+
+void SecurityTokenServiceImpl::ValidateSubjectAsync(
+    const boost::shared_ptr<const SamlToken>& token, const ValidationCompletion& completion) const
+{
+    SyncToAsyncCall(
+        ValidationCall(
+            boost::bind(&SecurityTokenService::ValidateSubject, Copy(), PassByRef(token))),
+        completion,
+        boost::optional<bool>(boost::none));
+}
+
+void SecurityTokenServiceImpl::RenewTokenAsync(
+    const boost::shared_ptr<const SamlToken>& token,
+    long long lifetimeSec,
+    const TokenCompletion& completion) const
+{
+    SyncToAsyncCall(
+        TokenCall(
+            boost::bind(&SecurityTokenService::RenewToken, Copy(), PassByRef(token), lifetimeSec)),
+        completion);
+}
+
+boost::shared_ptr<const SecurityTokenService> SecurityTokenServiceImpl::Copy() const
+{
+    return boost::make_shared<SecurityTokenServiceImpl>(*this);
+}
+
+void SecurityTokenServiceImpl::ExchangeLegs(
+    TransportSession& session,
+    const TokenSpec& spec,
+    NegotiationHandler& handler,
+    SPNegoResponse& response) const
+{
+    const boost::shared_ptr<Leg> userLeg = handler.Negotiate(response.leg);
+    if (userLeg == nullptr) {
+        throw Quillon::InvalidArgumentException(
+            "Invalid NegotiationHandler: the returned leg may not be NULL");
+    }
+    if (response.contextId.empty()) {
+        StartSPNegotiation(session, *userLeg, spec, response);
+    } else {
+        ContinueSPNegotiation(session, *userLeg, response.contextId, response);
+    }
+    if (response.contextId.empty()) {
+        throw CommunicationException("Error processing the response to SPNego token request: no "
+                                     "Context ID was returned.");
+    }
+}
+
+void SecurityTokenServiceImpl::StartSPNegotiation(
+    TransportSession& session,
+    const Leg& leg,
+    const TokenSpec& spec,
+    SPNegoResponse& response) const
+{
+    if (leg.empty()) {
+        Quillon::PanicVerify("!leg.empty()", Unit, 762);
+    }
+    Request request;
+    _requestBuilder->BuildInitialSPNegoRequest(spec, leg, request);
+    Quillon::Ref<Quillon::Reader> reply;
+    session.SendRequest(request, reply);
+    _responseHandler->HandleSPNegoResponse(reply.get(), response);
+}
+
+void SecurityTokenServiceImpl::ContinueSPNegotiation(
+    TransportSession& session,
+    const Leg& leg,
+    const std::string& contextId,
+    SPNegoResponse& response) const
+{
+    if (leg.empty()) {
+        Quillon::PanicVerify("!leg.empty()", Unit, 794);
+    }
+    Request request;
+    _requestBuilder->BuildContinuedSPNegoRequest(contextId, leg, request);
+    Quillon::Ref<Quillon::Reader> reply;
+    session.SendRequest(request, reply);
+    _responseHandler->HandleSPNegoResponse(reply.get(), response);
 }
 
 Quillon::Ref<Quillon::Reader> SecurityTokenServiceImpl::Send(const Request& request) const

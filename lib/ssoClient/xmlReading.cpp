@@ -3,6 +3,7 @@
 #include "quillon/PanicVerify.h"
 #include "quillon/StringUtil.h"
 #include "quillon/xml/Parser.h"
+#include "quillon/xml/security/Canonicalizer.h"
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/wireNames.h"
 
@@ -340,6 +341,18 @@ const TextNode* GetTextNode(const Node* node) noexcept
 std::string GetText(const TextNode* node)
 {
     return node == nullptr ? std::string() : std::string(node->GetText());
+}
+
+std::string GetElementText(const ElementNode* element)
+{
+    return GetText(GetTextNode(element));
+}
+
+std::string ToCanonicalXml(const ElementNode* element, const std::string& algorithm)
+{
+    const auto writer = Quillon::CreateStringWriter();
+    Quillon::Xml::Security::CreateCanonicalizer(algorithm)->Canonicalize(element, writer.get());
+    return writer->TakeString();
 }
 
 } // namespace SsoClient

@@ -144,4 +144,10 @@ const Quillon::Xml::TextNode* GetTextNode(const Quillon::Xml::Node* node) noexce
 /** Empty for null. */
 std::string GetText(const Quillon::Xml::TextNode* node);
 
+/** The text that an element starts with; empty for no element and for one without such a text. */
+std::string GetElementText(const Quillon::Xml::ElementNode* element);
+
+/** The element as text in the canonical form that `algorithm` names. */
+std::string ToCanonicalXml(const Quillon::Xml::ElementNode* element, const std::string& algorithm);
+
 } // namespace SsoClient

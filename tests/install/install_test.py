@@ -2,6 +2,7 @@
 
 import os
 import pathlib
+import re
 import subprocess
 import tempfile
 import unittest
@@ -11,6 +12,10 @@ CXX = os.environ["CXX"]
 FLAGS = [f"-fsanitize={os.environ['SANITIZE']}"] if os.environ["SANITIZE"] else []
 CONSUMER_SAYS = ("XMLParseException\n"
                  "Invalid argument : HTTPS connection requested but no SSLContext provided.\n")
+GSS_CONSUMER_SAYS = (
+    "Invalid argument : A keytab needs the principal whose key is in it\n"
+    "Cannot log on as 'nobody@EXAMPLE.TEST' with the keytab '/no/keytab':"
+    " Key table file '/no/keytab' not found\n")
 
 
 def run(*command, **environment):
@@ -39,6 +44,7 @@ class Install(unittest.TestCase):
         run(os.environ["CMAKE"], "--build", build)
         self.assertEqual(CONSUMER_SAYS, run(build / "consumer"))
         self.assertEqual("aW5zdGFsbGVk\n", run(build / "quillon-consumer"))
+        self.assertEqual(GSS_CONSUMER_SAYS, run(build / "gss-consumer"))
 
     def build_with_pkg_config(self, package, source):
         program = self.folder / package
@@ -51,6 +57,29 @@ class Install(unittest.TestCase):
         self.assertEqual(CONSUMER_SAYS, self.build_with_pkg_config("ssoclient", "consumer.cpp"))
         self.assertEqual("aW5zdGFsbGVk\n",
                          self.build_with_pkg_config("quillon", "quillon_consumer.cpp"))
+        self.assertEqual(GSS_CONSUMER_SAYS,
+                         self.build_with_pkg_config("ssoclient-gss", "gss_consumer.cpp"))
+
+    def read_dynamic_section(self, library):
+        return run("readelf", "--dynamic", "--wide", self.libraries / library)
+
+    def get_needed(self, library):
+        """The shared libraries that this one names. What those need is their own affair."""
+        return re.findall(r"\(NEEDED\).*\[(.+)\]", self.read_dynamic_section(library))
+
+    def test_libraries_cannot_be_unloaded(self):
+        for library in ("libquillon.so", "libssoclient.so", "libssoclient_gss.so"):
+            with self.subTest(library=library):
+                self.assertRegex(self.read_dynamic_section(library), r"\(FLAGS_1\).*\bNODELETE\b")
+
+    def test_only_the_kerberos_handler_needs_kerberos(self):
+        kerberos = re.compile(r"lib(gssapi|krb5|k5crypto|com_err)")
+        for library, is_needed in (("libquillon.so", False), ("libssoclient.so", False),
+                                   ("libssoclient_gss.so", True)):
+            with self.subTest(library=library):
+                needed = self.get_needed(library)
+                self.assertTrue(any(name.startswith("libc.so") for name in needed), needed)
+                self.assertEqual(is_needed, any(map(kerberos.match, needed)), needed)
 
     @unittest.skipUnless(os.environ["TOOLS"] == "1", "the tools are not built")
     def test_tools_find_their_libraries(self):

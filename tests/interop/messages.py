@@ -11,10 +11,12 @@ DATA = pathlib.Path(os.environ["TEST_DATA_DIR"])
 KEYS = DATA / "keys"
 
 # By the certificate in the message, and by the SAML token in the message.
-SIGNED_BY_CERTIFICATE = ["password-signed", "certificate", "certificate-full", "renew"]
+SIGNED_BY_CERTIFICATE = ["password-signed", "certificate", "certificate-full", "renew",
+                         "negotiation-first-signed"]
 SIGNED_BY_TOKEN = ["exchange", "exchange-full", "exchange-bearer"]
 SIGNED = SIGNED_BY_CERTIFICATE + SIGNED_BY_TOKEN
-UNSIGNED = ["password", "password-full", "password-delegating", "validate"]
+UNSIGNED = ["password", "password-full", "password-delegating", "validate", "negotiation-first",
+            "negotiation-next"]
 
 SOME_TIME = "2026-06-15T12:00:00.000Z"
 

@@ -17,10 +17,16 @@ def signature_of(text):
     return re.search(SIGNATURE, text, re.DOTALL)[0]
 
 
+def contexts(text):
+    """The name of the negotiation that a request begins."""
+    return re.findall(f'(?<= Context="urn:uuid:){UUID}(?=")', text)
+
+
 def values(text):
-    """Every value that may differ: two ids, two digests, and the signature over them."""
+    """Every value that may differ: two ids, two digests, the signature over them, and a context."""
     signature = signature_of(text)
-    return (re.findall(f'(?<= wsu:Id="){UUID}(?=")', text)
+    return (contexts(text)
+            + re.findall(f'(?<= wsu:Id="){UUID}(?=")', text)
             + re.findall(VALUE.format("DigestValue"), signature)
             + re.findall(VALUE.format("SignatureValue"), signature))
 
@@ -36,14 +42,18 @@ class Repeat(unittest.TestCase):
         first, second = messages.write(), messages.write()
         for name in UNSIGNED:
             with self.subTest(request=name):
-                self.assertEqual(first[name], second[name])
+                one, other = contexts(first[name]), contexts(second[name])
+                self.assertEqual(name == "negotiation-first", one != other)
+                self.assertEqual(without(one, first[name]), without(other, second[name]))
 
     def test_at_the_same_time_ids_digests_and_signature_value_differ(self):
         first, second = messages.write(), messages.write()
         for name in SIGNED:
             with self.subTest(request=name):
                 one, other = values(first[name]), values(second[name])
-                self.assertEqual([5, 5, 10], [len(one), len(other), len({*one, *other})])
+                count = 6 if name.startswith("negotiation") else 5
+                self.assertEqual([count, count, 2 * count],
+                                 [len(one), len(other), len({*one, *other})])
                 self.assertEqual(without(one, first[name]), without(other, second[name]))
 
     def test_at_another_time_created_and_expires_differ_too(self):
@@ -51,10 +61,11 @@ class Repeat(unittest.TestCase):
         for name in SIGNED + UNSIGNED:
             with self.subTest(request=name):
                 one, other = first[name], second[name]
-                if name in SIGNED:
-                    one, other = without(values(one), one), without(values(other), other)
+                find = values if name in SIGNED else contexts
+                one, other = without(find(one), one), without(find(other), other)
                 times, later = re.findall(TIME, one), re.findall(TIME, other)
-                self.assertEqual([2 if name == "validate" else 4] * 2, [len(times), len(later)])
+                count = 2 if name in ("validate", "negotiation-next") else 4
+                self.assertEqual([count] * 2, [len(times), len(later)])
                 self.assertTrue(set(times).isdisjoint(later))
                 self.assertEqual(re.sub(TIME, "", one), re.sub(TIME, "", other))
 

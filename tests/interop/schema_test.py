@@ -84,6 +84,14 @@ class Schemas(unittest.TestCase):
         self.assert_invalid("password-full", "<wsa:Address>https://one.*?</wsa:Address>", "",
                             "EndpointReference.*Missing child.*Address")
 
+    def test_context_of_a_negotiation_has_no_namespace(self):
+        self.assert_invalid("negotiation-next", ' Context="', ' wst:Context="',
+                            "Context' is not allowed")
+
+    def test_leg_says_what_it_is(self):
+        self.assert_invalid("negotiation-next", ' ValueType="[^"]*"(?=>bGVn)', "",
+                            "BinaryExchange.*ValueType.*required")
+
     def test_assertion_needs_its_issuer(self):
         self.assert_invalid("exchange", "<saml:Issuer .*</saml:Issuer>", "", "Expected is.*Issuer")
 

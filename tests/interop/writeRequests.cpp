@@ -59,6 +59,7 @@ public:
         WriteCertificateRequests();
         WriteExchangeRequests();
         WriteTokenRequests();
+        WriteNegotiationRequests();
     }
 
 private:
@@ -104,6 +105,20 @@ private:
         Write("renew", [&](Request& out) { _withKey.BuildRenewRequest(*_holderOfKey, 600, out); });
         Write("validate", [&](Request& out) {
             _withoutKey.BuildValidateSubjectRequest(*_holderOfKey, out);
+        });
+    }
+
+    void WriteNegotiationRequests() const
+    {
+        const Leg leg{'l', 'e', 'g'};
+        Write("negotiation-first", [&](Request& out) {
+            _withoutKey.BuildInitialSPNegoRequest(MakeFullSpec(), leg, out);
+        });
+        Write("negotiation-first-signed", [&](Request& out) {
+            _withKey.BuildInitialSPNegoRequest(TokenSpec(), leg, out);
+        });
+        Write("negotiation-next", [&](Request& out) {
+            _withKey.BuildContinuedSPNegoRequest("urn:example:context", leg, out);
         });
     }
 

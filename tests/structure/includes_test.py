@@ -16,10 +16,16 @@ utility valarray variant vector version
 string.h""".split())  # <cstring> does not declare explicit_bzero
 
 # Each third-party library of Quillon, and the one unit that may include it.
-ONE_UNIT = {
+QUILLON_UNITS = {
     "openssl/": "lib/quillon/crypto/OpenSsl.h",
     "curl/": "lib/quillon/http/Curl.h",
     "libxml/": "lib/quillon/xml/",
+}
+
+# The same for the Kerberos handler. `krb5` begins the header's name and its folder's.
+GSS_UNITS = {
+    "gssapi": "lib/ssoClientGss/Gssapi.h",
+    "krb5": "lib/ssoClientGss/Gssapi.h",
 }
 
 # What Quillon takes from the platform beside the standard library.
@@ -44,6 +50,23 @@ class Includes(unittest.TestCase):
             and not (include.is_quoted and include.target.startswith("ssoClient/")
                      and include.resolves_under("lib")))
 
+    def test_kerberos_handler_sees_only_itself_public_headers_boost_and_its_one_unit(self):
+        paths = sources.files("lib/ssoClientGss", "lib/public/ssoClientGss")
+        self.assert_none(
+            include for include in sources.includes(paths)
+            if not is_boost_or_standard(include)
+            and not (include.is_quoted and include.resolves_under("lib/public"))
+            and not (include.is_quoted and include.target.startswith("ssoClientGss/")
+                     and include.resolves_under("lib"))
+            and not include.target.startswith(tuple(GSS_UNITS)))
+
+    def test_core_sees_nothing_of_the_kerberos_handler(self):
+        paths = sources.files("lib/ssoClient", "lib/public/ssoClient", "lib/quillon",
+                              "lib/public/quillon")
+        self.assert_none(
+            include for include in sources.includes(paths)
+            if include.target.startswith("ssoClientGss/"))
+
     def test_quillon_sees_nothing_of_ssoclient(self):
         paths = sources.files("lib/quillon", "lib/public/quillon")
         self.assert_none(
@@ -57,13 +80,14 @@ class Includes(unittest.TestCase):
             if not is_boost_or_standard(include)
             and not (include.is_quoted and include.resolves_under("lib/public")))
 
-    def test_each_third_party_library_has_one_unit_in_quillon(self):
-        users = {prefix: set() for prefix in ONE_UNIT}
+    def test_each_third_party_library_has_one_unit(self):
+        units = {**QUILLON_UNITS, **GSS_UNITS}
+        users = {prefix: set() for prefix in units}
         for include in sources.includes(sources.files("lib")):
-            for prefix in ONE_UNIT:
+            for prefix in units:
                 if include.target.startswith(prefix):
                     users[prefix].add(sources.name(include.path))
-        for prefix, unit in ONE_UNIT.items():
+        for prefix, unit in units.items():
             with self.subTest(library=prefix):
                 self.assertEqual(1, len(users[prefix]), sorted(users[prefix]))
                 self.assertTrue(next(iter(users[prefix])).startswith(unit), users[prefix])
@@ -75,7 +99,7 @@ class Includes(unittest.TestCase):
             if not include.is_quoted
             and not is_boost_or_standard(include)
             and include.target not in PLATFORM_HEADERS
-            and not include.target.startswith(tuple(ONE_UNIT)))
+            and not include.target.startswith(tuple(QUILLON_UNITS)))
 
     def test_development_sts_sees_neither_library(self):
         paths = sources.files("tools/devsts")

@@ -21,6 +21,7 @@ fail() {
     exit 1
 }
 
+# TCP only: a port that is free for TCP may be taken for UDP.
 write_configuration() {
     local port=$1
     cat >"$folder/krb5.conf" <<END
@@ -30,6 +31,7 @@ write_configuration() {
     dns_lookup_realm = false
     dns_canonicalize_hostname = false
     rdns = false
+    udp_preference_limit = 1
     kdc_timeout = 5000
     default_ccache_name = FILE:$folder/no-default-ccache
     default_keytab_name = FILE:$folder/no-default-keytab
@@ -44,7 +46,6 @@ write_configuration() {
     localhost = $realm
     127.0.0.1 = $realm
 END
-    # TCP only: a port that is free for TCP may be taken for UDP.
     cat >"$folder/kdc.conf" <<END
 [kdcdefaults]
     kdc_listen = ""
@@ -95,7 +96,8 @@ start_kdc() {
         write_configuration "$port"
         [[ -e $folder/principal ]] || make_database
         krb5kdc -r "$realm" -P "$folder/kdc.pid" >>"$folder/kdc.out" 2>&1 </dev/null || continue
-        # The KDC goes into the background only once it listens.
+        # It listens when it goes into the background, and says there which process it is.
+        until [[ -s $folder/kdc.pid ]]; do sleep 0.01; done
         is_listening "$port" && return
         stop_kdc
     done

@@ -16,6 +16,7 @@ using Action = std::function<ExitCode()>;
 void AddAcquirePasswordCommand(CLI::App& parent, Action& action);
 void AddAcquireCertificateCommand(CLI::App& parent, Action& action);
 void AddAcquireTokenCommand(CLI::App& parent, Action& action);
+void AddAcquireGssCommand(CLI::App& parent, Action& action);
 void AddRenewCommand(CLI::App& parent, Action& action);
 void AddValidateCommand(CLI::App& parent, Action& action);
 void AddInspectCommand(CLI::App& parent, Action& action);

@@ -4,6 +4,7 @@
 
 #include "quillon/http/HttpException.h"
 #include "ssoClient/Exceptions.h"
+#include "ssoClientGss/Exceptions.h"
 
 #include <cerrno>
 #include <iostream>
@@ -30,7 +31,8 @@ ExitCode GetExitCode(const std::exception& error)
             error)) {
         return ExitCode::USAGE;
     }
-    if (IsOneOf<SsoClient::InvalidCredentialsException>(error)) {
+    if (IsOneOf<SsoClient::InvalidCredentialsException, SsoClient::Gss::NegotiationException>(
+            error)) {
         return ExitCode::BAD_CREDENTIALS;
     }
     if (IsOneOf<SsoClient::CommunicationException, Quillon::Http::HttpException>(error)) {

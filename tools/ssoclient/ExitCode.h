@@ -11,7 +11,7 @@ enum class ExitCode : int
     DONE = 0,
     REFUSED = 1, ///< the token or the service's answer is not acceptable, or the service refuses
     USAGE = 2,   ///< the command line, an argument, or a file that cannot be used
-    BAD_CREDENTIALS = 3,
+    BAD_CREDENTIALS = 3, ///< the service or Kerberos does not take them
     COMMUNICATION = 4
 };
 

@@ -17,6 +17,7 @@ void AddCommands(CLI::App& app, Action& action)
     AddAcquirePasswordCommand(*acquire, action);
     AddAcquireCertificateCommand(*acquire, action);
     AddAcquireTokenCommand(*acquire, action);
+    AddAcquireGssCommand(*acquire, action);
     AddRenewCommand(app, action);
     AddValidateCommand(app, action);
     AddInspectCommand(app, action);

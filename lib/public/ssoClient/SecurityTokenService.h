@@ -1,9 +1,13 @@
 #pragma once
 
+#include "quillon/Exceptions.h"
+#include "ssoClient/NegotiationHandler.h"
 #include "ssoClient/SamlToken.h"
 #include "ssoClient/SecurityTokenServiceConfig.h"
 #include "ssoClient/TokenSpec.h"
 
+#include <boost/function.hpp>
+#include <boost/optional.hpp>
 #include <boost/smart_ptr/shared_ptr.hpp>
 
 #include <string>
@@ -11,7 +15,18 @@
 namespace SsoClient {
 
 /**
- * Obtains, renews and validates tokens at a WS-Trust 1.3 security token service.
+ * Told how an asynchronous operation ended: what the blocking one returns and no exception, or
+ * nothing and the exception. The pointer is valid during the call only; `Clone` keeps the
+ * exception, and `Throw` raises it again as what it is.
+ */
+using TokenCompletion =
+    boost::function<void(const boost::shared_ptr<const SamlToken>&, const Quillon::Exception*)>;
+using ValidationCompletion =
+    boost::function<void(const boost::optional<bool>&, const Quillon::Exception*)>;
+
+/**
+ * Obtains, renews and validates tokens at a WS-Trust 1.3 security token service. Every operation
+ * has a blocking and an asynchronous form.
  *
  * No operation retries. Each may throw:
  * - `Quillon::InvalidArgumentException`, before anything is sent, for a bad argument (only a
@@ -30,6 +45,14 @@ namespace SsoClient {
  *   it cannot be decoded; the latter also if the caller's own key cannot sign;
  * - `Quillon::TypeMismatchException` if the status of a validation is not text.
  *
+ * An asynchronous form returns at once, and runs the blocking operation on
+ * `Quillon::System::GetThreadPool()`. Its arguments are copied or, if they are pointers, kept, so
+ * that the caller may let go of everything, this object included. A null pointer stops the process
+ * before anything is queued. The completion is called exactly once, on a thread of the pool; it is
+ * not called for an exception that is no `Quillon::Exception`, such as `std::bad_alloc`, nor if the
+ * process ends first. What the completion throws is logged. On the calling thread there is only
+ * what the pool throws when it takes no work.
+ *
  * There is no virtual destructor: a service is only owned by the pointer of its factory.
  *
  * Thread safety: immutable; any number of threads.
@@ -44,6 +67,20 @@ public:
      */
     virtual boost::shared_ptr<const SamlToken> AcquireToken(
         const std::string& userName, const std::string& password, const TokenSpec& spec) const = 0;
+
+    /**
+     * Acquires a token by a SPNEGO negotiation. All legs go over one connection, with the cookies
+     * that the service sets.
+     *
+     * @param handler  makes the caller's legs, on the calling thread; used by this call alone.
+     *                 What it throws leaves the operation unchanged.
+     * @return as `AcquireToken`.
+     *
+     * @throws Quillon::InvalidArgumentException  also if the handler returns null. An empty leg
+     *                                            before the token has arrived stops the process.
+     */
+    virtual boost::shared_ptr<const SamlToken> AcquireTokenByGSS(
+        const TokenSpec& spec, NegotiationHandler& handler) const = 0;
 
     /**
      * Acquires a holder-of-key token with the caller's own key and certificate. The confirmation
@@ -74,6 +111,35 @@ public:
      */
     virtual boost::shared_ptr<const SamlToken> RenewToken(
         const SamlToken& token, long long lifetimeSec) const = 0;
+
+    virtual void AcquireTokenAsync(
+        const std::string& userName,
+        const std::string& password,
+        const TokenSpec& spec,
+        const TokenCompletion& completion) const = 0;
+
+    /** The handler is called on a thread of the pool. */
+    virtual void AcquireTokenByGssAsync(
+        const TokenSpec& spec,
+        const boost::shared_ptr<NegotiationHandler>& handler,
+        const TokenCompletion& completion) const = 0;
+
+    virtual void AcquireTokenByCertificateAsync(
+        const TokenSpec& spec, const TokenCompletion& completion) const = 0;
+
+    virtual void AcquireTokenByTokenAsync(
+        const boost::shared_ptr<const SamlToken>& token,
+        const TokenSpec& spec,
+        const TokenCompletion& completion) const = 0;
+
+    virtual void ValidateSubjectAsync(
+        const boost::shared_ptr<const SamlToken>& token,
+        const ValidationCompletion& completion) const = 0;
+
+    virtual void RenewTokenAsync(
+        const boost::shared_ptr<const SamlToken>& token,
+        long long lifetimeSec,
+        const TokenCompletion& completion) const = 0;
 };
 
 /**

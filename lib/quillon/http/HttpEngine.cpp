@@ -1,6 +1,8 @@
 #include "http/HttpEngine.h"
 
-#include <csignal>
+#include "system/ProcessEnd.h"
+#include "system/SignalBlock.h"
+
 #include <unistd.h>
 #include <utility>
 
@@ -19,35 +21,6 @@ union ImmortalEngine {
     ImmortalEngine& operator=(const ImmortalEngine&) = delete;
 
     HttpEngine engine;
-};
-
-struct Stopper
-{
-    Stopper() = default;
-    ~Stopper() { HttpEngine::Get().Stop(); }
-    Stopper(const Stopper&) = delete;
-    Stopper& operator=(const Stopper&) = delete;
-};
-
-/**
- * Threads that start inside the scope take no signals: the host's handlers stay on the host's
- * threads, and a broken connection raises no SIGPIPE, which libcurl leaves to us.
- */
-class SignalBlock
-{
-public:
-    SignalBlock() noexcept
-    {
-        sigset_t all;
-        sigfillset(&all);
-        pthread_sigmask(SIG_SETMASK, &all, &_old);
-    }
-    ~SignalBlock() { pthread_sigmask(SIG_SETMASK, &_old, nullptr); }
-    SignalBlock(const SignalBlock&) = delete;
-    SignalBlock& operator=(const SignalBlock&) = delete;
-
-private:
-    sigset_t _old{};
 };
 
 Outcome MakeFailure(const std::string& text)
@@ -97,8 +70,13 @@ void HttpEngine::Start()
         throw std::bad_alloc();
     }
     // libcurl has initialised OpenSSL by now, so OpenSSL takes itself down after the threads.
-    static const Stopper atExit;
-    const SignalBlock noSignals;
+    static const bool stops =
+        System::RunAtProcessEnd(System::EndStage::EXCHANGES, [] { Get().Stop(); });
+    if (!stops) {
+        ThrowEnded();
+    }
+    // A broken connection raises SIGPIPE, which libcurl leaves to us.
+    const System::SignalBlock noSignals;
     try {
         _callbackThread.Start();
         _ioThread = std::thread([this] { Run(); });
@@ -286,10 +264,9 @@ void HttpEngine::Stop()
     }
     {
         const std::lock_guard<std::mutex> lock(_mutex);
-        if (_state != State::RUNNING) {
+        if (std::exchange(_state, State::ENDED) != State::RUNNING) {
             return;
         }
-        _state = State::ENDED;
     }
     Wake();
     _ioThread.join();

@@ -51,7 +51,7 @@ public:
     std::list<Connections>::iterator AddConnections(Ref<const ConnectionSpecImpl> spec);
     void RetireConnections(std::list<Connections>::iterator connections) noexcept;
 
-    /** Stops the threads; what is in flight fails. Called once, when the process ends. */
+    /** Stops the threads; what is in flight fails, and so does what comes later. */
     void Stop();
 
 private:

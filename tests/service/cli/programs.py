@@ -22,15 +22,16 @@ DESCRIPTION = (
 Result = collections.namedtuple("Result", "code out err")
 
 
-def run(*command, stdin=""):
-    """Runs a program without a terminal."""
+def run(*command, stdin="", environment=None):
+    """Runs a program without a terminal, in this process's environment unless it is given one."""
     result = subprocess.run([str(part) for part in command], input=stdin, text=True,
-                            capture_output=True, start_new_session=True, timeout=120)
+                            capture_output=True, start_new_session=True, timeout=120,
+                            env=environment)
     return Result(result.returncode, result.stdout, result.stderr)
 
 
-def ssoclient(*arguments, stdin=""):
-    return run(SSOCLIENT, *arguments, stdin=stdin)
+def ssoclient(*arguments, stdin="", environment=None):
+    return run(SSOCLIENT, *arguments, stdin=stdin, environment=environment)
 
 
 class ProgramTest(unittest.TestCase):
@@ -65,12 +66,13 @@ class DevelopmentSts:
     USER = "alice@example.test"
     PASSWORD = "alice-secret"
 
-    def __init__(self, *switches):
+    def __init__(self, *switches, environment=None):
         self._folder = tempfile.TemporaryDirectory()
         self.state = pathlib.Path(self._folder.name)
         self._process = subprocess.Popen(
             [os.environ["DEVSTS"], "--state", str(self.state), *switches],
-            stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, stderr=subprocess.DEVNULL, text=True)
+            stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, stderr=subprocess.DEVNULL, text=True,
+            env=environment)
         self.url = self._read_url()
         self.ca = self.state / "ca.pem"
         self.trust = self.state / "sts.pem"
@@ -106,7 +108,11 @@ class ServiceTest(ProgramTest):
 
     @classmethod
     def setUpClass(cls):
-        cls.sts = DevelopmentSts(*cls.SWITCHES)
+        cls.start_sts(*cls.SWITCHES)
+
+    @classmethod
+    def start_sts(cls, *switches, environment=None):
+        cls.sts = DevelopmentSts(*switches, environment=environment)
         cls.addClassCleanup(cls.sts.stop)
 
     def setUp(self):

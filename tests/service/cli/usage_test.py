@@ -21,7 +21,8 @@ class Help(unittest.TestCase):
 
     def test_of_the_program_names_the_commands(self):
         self.assert_prints(ssoclient("--help"), "acquire", "renew", "validate", "inspect")
-        self.assert_prints(ssoclient("acquire", "--help"), "password", "certificate", "token")
+        self.assert_prints(ssoclient("acquire", "--help"), "password", "certificate", "token",
+                           "gss")
 
     def test_of_a_command_names_its_options(self):
         for command, options in (
@@ -30,6 +31,8 @@ class Help(unittest.TestCase):
                 ("acquire certificate", (*self.IDENTITY, *self.SERVICE, *self.SPEC, *self.OUTPUT)),
                 ("acquire token", ("--token", "--bearer", *self.IDENTITY, *self.SERVICE,
                                    *self.SPEC, *self.OUTPUT)),
+                ("acquire gss", ("--service", "--ccache", "--keytab", "--principal", "--bearer",
+                                 *self.IDENTITY, *self.SERVICE, *self.SPEC, *self.OUTPUT)),
                 ("renew", ("--token", "--lifetime", *self.IDENTITY, *self.SERVICE, *self.OUTPUT)),
                 ("validate", ("--token", *self.SERVICE)),
                 ("inspect", ("FILE", "--trust", "--clock-tolerance", "--json"))):
@@ -68,6 +71,7 @@ class UsageErrors(ProgramTest):
                 ("acquire password", {**service, "--user": "u"}),
                 ("acquire certificate", {**service, **identity}),
                 ("acquire token", {**service, **identity, "--token": "t"}),
+                ("acquire gss", service),
                 ("renew", {**service, **identity, "--token": "t", "--lifetime": "1"}),
                 ("validate", {**service, "--token": "t"})):
             for missing in options:
@@ -91,6 +95,7 @@ class UsageErrors(ProgramTest):
                                 "--cert": "c"},
         "acquire token": {"--url": "https://127.0.0.1:1/sts", "--trust": "t", "--key": "k",
                           "--cert": "c", "--token": "x"},
+        "acquire gss": {"--url": "https://127.0.0.1:1/sts", "--trust": "t"},
         "renew": {"--url": "https://127.0.0.1:1/sts", "--trust": "t", "--key": "k",
                   "--cert": "c", "--token": "x", "--lifetime": "1"}}
 
@@ -107,6 +112,7 @@ class UsageErrors(ProgramTest):
                                       "--audience")),
                 ("acquire certificate", (*common, "--key-passphrase-file")),
                 ("acquire token", (*common, "--token")),
+                ("acquire gss", (*common, "--service", "--ccache", "--keytab", "--principal")),
                 ("renew", (*common, "--token"))):
             for option in options:
                 with self.subTest(command=command, option=option):
@@ -114,11 +120,13 @@ class UsageErrors(ProgramTest):
         self.assert_usage_error("FILE: must not be empty", "inspect", "", "--trust", "t")
 
     def test_name_with_control_characters(self):
-        for option in ("--user", "--delegate-to"):
+        for command, option in (("acquire password", "--user"),
+                                ("acquire password", "--delegate-to"),
+                                ("acquire gss", "--service"), ("acquire gss", "--principal")):
             for value in ("a\nb", "a\tb", "\x1b[31m", "a\x7f", "a\u009bb", "a\u2028b"):
                 with self.subTest(option=option, value=value):
-                    self.assert_value_is_refused("must not hold control characters",
-                                                 "acquire password", option, value)
+                    self.assert_value_is_refused("must not hold control characters", command,
+                                                 option, value)
 
     def test_name_that_is_not_utf8(self):
         for value in (b"\xff", b"a\xc3", b"\xc0\x80", b"\xed\xa0\x80"):
@@ -127,7 +135,8 @@ class UsageErrors(ProgramTest):
                                              os.fsdecode(value))
 
     def test_lifetime_that_is_too_long(self):
-        for command in ("acquire password", "acquire certificate", "acquire token", "renew"):
+        for command in ("acquire password", "acquire certificate", "acquire token", "acquire gss",
+                        "renew"):
             for value in ("3153600001", "9223372036854775807"):
                 with self.subTest(command=command, value=value):
                     self.assert_value_is_refused("must be at most 3153600000 seconds", command,

@@ -10,14 +10,20 @@ namespace Quillon::System {
 /**
  * Runs work on threads of its own. It starts with as many threads as the machine has cores, adds
  * one whenever work would have to wait, up to its limit, and lets those beyond the first go again
- * when they have been idle for a while. Its threads take no signals.
+ * when they have been idle for a while. Its threads take no signals. Work begins in the order in
+ * which it was queued.
  *
- * An exception that leaves a piece of work is logged at level 8 with its text; the thread goes on.
+ * An exception that leaves a piece of work is logged at level 8 with its class and text; the
+ * thread goes on.
  *
  * When the process ends (`exit`, or a return from `main`), work that has not begun is dropped and
  * never runs. Work that has begun gets a moment to finish: HTTP exchanges that it waits for fail
  * at once, and after two seconds the process ends without it. `exit` may be called by a piece of
  * work itself.
+ *
+ * All this happens at the place in the order of `atexit` where the first work was queued. Static
+ * objects that work uses should be made before that: those made later are destroyed earlier, while
+ * work may still run.
  *
  * Thread safety: any thread, including those of the pool.
  */
@@ -30,12 +36,13 @@ public:
      * Runs `work` later, on a thread of the pool, and then releases it there.
      *
      * @throws InvalidArgumentException  `work` is empty.
-     * @throws InvalidStateException     the process is about to end, or has forked since the
-     *                                   threads started. Nothing is queued.
+     * @throws InvalidStateException     the process is about to end, has forked since the first
+     *                                   work, or has no thread and cannot start one. Nothing is
+     *                                   queued.
      */
     virtual void Queue(const Functor& work) = 0;
 
-    /** How many threads there are now: none before the first work. */
+    /** How many threads there are now: none before the first work, and in a forked child. */
     virtual std::size_t GetThreadCount() const = 0;
 
 protected:

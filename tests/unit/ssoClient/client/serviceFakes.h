@@ -8,14 +8,20 @@
 #include <boost/smart_ptr/make_shared.hpp>
 #include <gtest/gtest.h>
 
+#include <deque>
 #include <string>
+#include <utility>
 #include <vector>
 
-/** A transport that answers every request with `reply`, or throws `failure` if there is one. */
+/**
+ * A transport that throws `failure` if there is one, or else answers every request with the next
+ * of `replies`, and then with `reply`.
+ */
 class FakeTransport final : public SsoClient::Transport
 {
 public:
     std::string reply;
+    mutable std::deque<std::string> replies;
     boost::shared_ptr<Quillon::Exception> failure;
 
     mutable std::vector<SsoClient::Request> sent;
@@ -46,7 +52,7 @@ private:
             if (_transport.failure) {
                 _transport.failure->Throw();
             }
-            response = Quillon::CreateStringReader(_transport.reply);
+            response = Quillon::CreateStringReader(_transport.TakeReply());
         }
 
         void SendRequestAsync(
@@ -60,6 +66,16 @@ private:
     private:
         const FakeTransport& _transport;
     };
+
+    std::string TakeReply() const
+    {
+        if (replies.empty()) {
+            return reply;
+        }
+        std::string next = std::move(replies.front());
+        replies.pop_front();
+        return next;
+    }
 };
 
 /** A response handler that takes the whole reply for the assertion. */
@@ -86,6 +102,11 @@ public:
     void HandleRenewTokenResponse(Quillon::Reader* body, std::string& tokenXml) const override
     {
         HandleAcquireTokenResponse(body, tokenXml);
+    }
+
+    void HandleSPNegoResponse(Quillon::Reader*, SsoClient::SPNegoResponse&) const override
+    {
+        FAIL() << "An operation without negotiation negotiated.";
     }
 
 private:

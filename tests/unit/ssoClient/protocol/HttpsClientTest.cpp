@@ -305,6 +305,42 @@ TEST(SendRequestAsync, GivesAnItemThatCallsItOff)
     EXPECT_FALSE(called);
 }
 
+TEST(SendRequestAsync, EndsTheExchangeWhenItsItemIsLetGo)
+{
+    std::promise<void> asked;
+    std::promise<void> closed;
+    const TestServer server([&](ServerConnection& connection) {
+        connection.ReadRequest();
+        asked.set_value();
+        connection.WaitForClose();
+        closed.set_value();
+    });
+    std::atomic<bool> called{false};
+    const auto kept = std::make_shared<int>();
+    const boost::shared_ptr<TransportSession> session = MakeClient(server).CreateSession();
+    Ref<ScheduledItem> pending;
+    session->SendRequestAsync(
+        MakeRequest(), [&called, kept](const Exception*, Reader*) { called = true; }, pending);
+    asked.get_future().wait();
+    pending.reset();
+    EXPECT_EQ(kept.use_count(), 1); // the callback has gone with it
+    closed.get_future().wait();
+    EXPECT_FALSE(called);
+}
+
+TEST(SendRequestAsync, CallsBackOnAnotherThread)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
+    std::promise<std::thread::id> caller;
+    Ref<ScheduledItem> pending;
+    const boost::shared_ptr<TransportSession> session = MakeClient(server).CreateSession();
+    session->SendRequestAsync(
+        MakeRequest(),
+        [&](const Exception*, Reader*) { caller.set_value(std::this_thread::get_id()); },
+        pending);
+    EXPECT_NE(caller.get_future().get(), std::this_thread::get_id());
+}
+
 TEST(SendRequestAsync, CompletesAfterItsSessionIsGone)
 {
     std::promise<void> mayAnswer;

@@ -183,6 +183,88 @@ TEST(BuildUserPassTokenRequest, WithIdentityAndDelegationIsUnsignedHolderOfKey)
     EXPECT_THAT(request.body, Not(HasSubstr("UseKey")));
 }
 
+namespace {
+
+const Leg FirstLeg{'l', 'e', 'g'};
+
+Request BuildInitialSPNego(
+    const TokenSpec& spec, const boost::optional<HolderOfKeyConfig>& config = boost::none)
+{
+    Request request;
+    RequestBuilderImpl(config).BuildInitialSPNegoRequest(spec, FirstLeg, request);
+    return request;
+}
+
+} // namespace
+
+TEST(BuildInitialSPNegoRequest, WithoutIdentityIsUnsignedBearer)
+{
+    const Request request = BuildInitialSPNego(SpecWithLifetime(300));
+    EXPECT_EQ(request.soapAction, WST "/RST/Issue");
+    EXPECT_THAT(request.body, HasSubstr(BearerKeyType));
+    EXPECT_THAT(request.body, HasSubstr(">bGVn</wst:BinaryExchange></wst:RequestSecurityToken>"));
+    EXPECT_THAT(GetHeaderParts(request.body), ElementsAre("wsu:Timestamp"));
+}
+
+TEST(BuildInitialSPNegoRequest, WithIdentityIsSignedHolderOfKey)
+{
+    const Request request = BuildInitialSPNego(SpecWithLifetime(300), GetIdentity());
+    EXPECT_THAT(request.body, HasSubstr(PublicKeyType));
+    EXPECT_THAT(
+        GetHeaderParts(request.body),
+        ElementsAre("wsu:Timestamp", "wsse:BinarySecurityToken", "ds:Signature"));
+    EXPECT_TRUE(Xmlsec1Verifies(request.body, "client", RequestSignature));
+}
+
+TEST(BuildInitialSPNegoRequest, WithIdentityAndBearerConfirmationIsUnsignedBearer)
+{
+    TokenSpec spec = SpecWithLifetime(300);
+    spec.confirmation = TokenSpec::CONFIRMATION_BEARER;
+    const Request request = BuildInitialSPNego(spec, GetIdentity());
+    EXPECT_THAT(request.body, HasSubstr(BearerKeyType));
+    EXPECT_THAT(GetHeaderParts(request.body), ElementsAre("wsu:Timestamp"));
+}
+
+TEST(BuildInitialSPNegoRequest, WithIdentityAndDelegationIsUnsignedHolderOfKey)
+{
+    TokenSpec spec = SpecWithLifetime(300);
+    spec.delegateTo = "proxy";
+    const Request request = BuildInitialSPNego(spec, GetIdentity());
+    EXPECT_THAT(request.body, HasSubstr(PublicKeyType));
+    EXPECT_THAT(GetHeaderParts(request.body), ElementsAre("wsu:Timestamp"));
+}
+
+TEST(BuildInitialSPNegoRequest, RefusesLifetimeThatIsNotPositive)
+{
+    for (const long long lifetime : {0LL, -1LL}) {
+        EXPECT_EQ(GetFailure([&] { BuildInitialSPNego(SpecWithLifetime(lifetime)); }), BadLifetime);
+    }
+}
+
+TEST(BuildInitialSPNegoRequest, HasATimestampOfTenMinutes)
+{
+    const FixedClock clock("2026-11-20T12:00:00Z");
+    EXPECT_THAT(
+        BuildInitialSPNego(SpecWithLifetime(300)).body,
+        HasSubstr("<wsu:Created>2026-11-20T12:00:00.000Z</wsu:Created>"
+                  "<wsu:Expires>2026-11-20T12:10:00.000Z</wsu:Expires></wsu:Timestamp>"));
+}
+
+TEST(BuildContinuedSPNegoRequest, IsAnUnsignedResponse)
+{
+    Request request;
+    RequestBuilderImpl(GetIdentity()).BuildContinuedSPNegoRequest("ctx", FirstLeg, request);
+    EXPECT_EQ(request.soapAction, WST "/RSTR/Issue");
+    EXPECT_THAT(
+        request.body,
+        HasSubstr("xmlns:wst=\"" WST "\"><wst:RequestSecurityTokenResponse Context=\"ctx\">"
+                  "<wst:BinaryExchange "));
+    EXPECT_THAT(
+        request.body,
+        HasSubstr(">bGVn</wst:BinaryExchange></wst:RequestSecurityTokenResponse></soapenv:Body>"));
+    EXPECT_THAT(GetHeaderParts(request.body), ElementsAre("wsu:Timestamp"));
+}
+
 TEST(BuildCertificateTokenRequest, NeedsBothHalvesOfTheIdentity)
 {
     const std::string expected =

@@ -1,0 +1,411 @@
+#include "negotiationFakes.h"
+#include "quillon/service/Logger.h"
+#include "serviceFakes.h"
+#include "ssoClient/CreateSamlToken.h"
+#include "ssoClient/Exceptions.h"
+#include "ssoClient/RequestBuilderImpl.h"
+#include "ssoClient/ResponseHandlerImpl.h"
+#include "ssoClient/SecurityTokenServiceImpl.h"
+#include "support/FakeSamlToken.h"
+#include "support/FixedClock.h"
+
+#include <boost/optional/optional_io.hpp>
+#include <boost/smart_ptr/weak_ptr.hpp>
+#include <gmock/gmock.h>
+
+#include <future>
+#include <memory>
+#include <mutex>
+#include <thread>
+
+using namespace SsoClient;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::StartsWith;
+using TokenPtr = boost::shared_ptr<const SamlToken>;
+
+namespace {
+
+#define WST "http://docs.oasis-open.org/ws-sx/ws-trust/200512"
+
+constexpr char Unit[] = "lib/ssoClient/SecurityTokenServiceImpl";
+
+std::string Reply(const std::string& response)
+{
+    return "<S:Envelope xmlns:S=\"http://schemas.xmlsoap.org/soap/envelope/\"><S:Body>" + response
+           + "</S:Body></S:Envelope>";
+}
+
+std::string TokenResponse()
+{
+    return "<RequestSecurityTokenResponse><RequestedSecurityToken>" + GetSignedAssertion()
+           + "</RequestedSecurityToken></RequestSecurityTokenResponse>";
+}
+
+std::string IssueReply()
+{
+    return Reply(
+        "<RequestSecurityTokenResponseCollection>" + TokenResponse()
+        + "</RequestSecurityTokenResponseCollection>");
+}
+
+std::string StatusReply(const std::string& code)
+{
+    return Reply(
+        "<RequestSecurityTokenResponse><Status><Code>" WST "/status/" + code
+        + "</Code></Status></RequestSecurityTokenResponse>");
+}
+
+std::string FaultReply(const std::string& code)
+{
+    return Reply(
+        "<S:Fault><faultcode xmlns:w=\"" WST "\">" + code
+        + "</faultcode><faultstring>no</faultstring></S:Fault>");
+}
+
+/** What a completion was told, kept beyond its call. */
+template <class Result>
+struct Told
+{
+    Result result;
+    std::shared_ptr<Quillon::Exception> error;
+    std::thread::id thread;
+
+    std::string Describe() const
+    {
+        return error ? Quillon::GetClassName(*error) + ": " + error->what() : "success";
+    }
+};
+
+/** A completion that can be waited for; a second call of it would throw. */
+template <class Result>
+class Awaited
+{
+public:
+    boost::function<void(const Result&, const Quillon::Exception*)> GetCompletion()
+    {
+        return [promise = _promise](const Result& result, const Quillon::Exception* error) {
+            promise->set_value(
+                {result,
+                 std::shared_ptr<Quillon::Exception>(error != nullptr ? error->Clone() : nullptr),
+                 std::this_thread::get_id()});
+        };
+    }
+
+    Told<Result> Get() { return _promise->get_future().get(); }
+
+private:
+    std::shared_ptr<std::promise<Told<Result>>> _promise =
+        std::make_shared<std::promise<Told<Result>>>();
+};
+
+using AwaitedToken = Awaited<TokenPtr>;
+using AwaitedVerdict = Awaited<boost::optional<bool>>;
+
+class AsyncOperation : public testing::Test
+{
+protected:
+    AsyncOperation()
+    {
+        GTEST_FLAG_SET(death_test_style, "threadsafe");
+        spec.tokenLifetimeSec = 300;
+    }
+
+    boost::shared_ptr<const SecurityTokenService> MakeService() const
+    {
+        return boost::make_shared<SecurityTokenServiceImpl>(
+            boost::make_shared<RequestBuilderImpl>(
+                HolderOfKeyConfig{GetTestKey("client"), GetTestCertificates("client").front()}),
+            transport,
+            boost::make_shared<ResponseHandlerImpl>(),
+            GetTestCertificates("sts"));
+    }
+
+    static boost::shared_ptr<const SamlToken> MakePresented()
+    {
+        auto token = boost::make_shared<FakeSamlToken>();
+        token->xml = ReadTestData("tokens/accepted/holder-of-key.xml");
+        token->confirmationMethod = SamlToken::CONFIRM_HOLDER_OF_KEY;
+        return token;
+    }
+
+    TokenSpec spec;
+    boost::shared_ptr<FakeTransport> transport = boost::make_shared<FakeTransport>();
+    FixedClock clock{WhenTokensAreValid};
+};
+
+} // namespace
+
+TEST_F(AsyncOperation, AcquireTokenAsyncDeliversTheTokenOnAnotherThread)
+{
+    transport->reply = IssueReply();
+    AwaitedToken awaited;
+    MakeService()->AcquireTokenAsync("jdoe", "s3cret", spec, awaited.GetCompletion());
+    const auto told = awaited.Get();
+    EXPECT_EQ(told.Describe(), "success");
+    ASSERT_NE(told.result, nullptr);
+    EXPECT_NE(told.thread, std::this_thread::get_id());
+    ASSERT_EQ(transport->sent.size(), 1U);
+    EXPECT_THAT(transport->sent[0].body, HasSubstr("<wsse:Username>jdoe</wsse:Username>"));
+    EXPECT_THAT(transport->sent[0].body, HasSubstr(">s3cret</wsse:Password>"));
+}
+
+TEST_F(AsyncOperation, WorksOnCopiesOfItsArguments)
+{
+    transport->reply = IssueReply();
+    AwaitedToken awaited;
+    {
+        auto service = MakeService();
+        std::string user = "jdoe";
+        std::string password = "s3cret";
+        TokenSpec ownSpec = spec;
+        ownSpec.audienceRestriction.insert("somewhere");
+        service->AcquireTokenAsync(user, password, ownSpec, awaited.GetCompletion());
+        service.reset();
+        user = "other";
+        password = "other";
+        ownSpec.audienceRestriction.clear();
+    }
+    EXPECT_EQ(awaited.Get().Describe(), "success");
+    EXPECT_THAT(transport->sent[0].body, HasSubstr("<wsse:Username>jdoe</wsse:Username>"));
+    EXPECT_THAT(transport->sent[0].body, HasSubstr(">s3cret</wsse:Password>"));
+    EXPECT_THAT(transport->sent[0].body, HasSubstr("somewhere"));
+}
+
+TEST_F(AsyncOperation, AcquireTokenByGssAsyncKeepsTheHandler)
+{
+    transport->replies = {
+        NegotiationReply("c1", "Zmlyc3Q=", ""), NegotiationReply("c1", "", GetSignedAssertion())};
+    AwaitedToken awaited;
+    auto handler = boost::make_shared<ScriptedHandler>(std::deque<std::string>{"one", "two"});
+    MakeService()->AcquireTokenByGssAsync(spec, std::move(handler), awaited.GetCompletion());
+    EXPECT_EQ(awaited.Get().Describe(), "success");
+    EXPECT_EQ(transport->sent.size(), 2U);
+}
+
+TEST_F(AsyncOperation, AcquireTokenByGssAsyncDeliversWhatTheHandlerThrows)
+{
+    class Refusing final : public NegotiationHandler
+    {
+        boost::shared_ptr<Leg> Negotiate(const Leg&) override { throw SsoException("no ticket"); }
+    };
+    AwaitedToken awaited;
+    MakeService()->AcquireTokenByGssAsync(
+        spec, boost::make_shared<Refusing>(), awaited.GetCompletion());
+    EXPECT_EQ(awaited.Get().Describe(), "SsoException: no ticket");
+}
+
+TEST_F(AsyncOperation, AcquireTokenByCertificateAsyncDeliversTheToken)
+{
+    transport->reply = IssueReply();
+    AwaitedToken awaited;
+    MakeService()->AcquireTokenByCertificateAsync(spec, awaited.GetCompletion());
+    EXPECT_NE(awaited.Get().result, nullptr);
+    EXPECT_EQ(transport->sent[0].soapAction, WST "/RST/Issue");
+}
+
+TEST_F(AsyncOperation, AcquireTokenByTokenAsyncKeepsThePresentedToken)
+{
+    transport->reply = IssueReply();
+    AwaitedToken awaited;
+    MakeService()->AcquireTokenByTokenAsync(MakePresented(), spec, awaited.GetCompletion());
+    EXPECT_NE(awaited.Get().result, nullptr);
+    EXPECT_THAT(transport->sent[0].body, HasSubstr("Assertion"));
+}
+
+TEST_F(AsyncOperation, RenewTokenAsyncDeliversTheToken)
+{
+    transport->reply = Reply(TokenResponse());
+    AwaitedToken awaited;
+    MakeService()->RenewTokenAsync(MakePresented(), 300, awaited.GetCompletion());
+    EXPECT_NE(awaited.Get().result, nullptr);
+    EXPECT_EQ(transport->sent[0].soapAction, WST "/RST/Renew");
+}
+
+TEST_F(AsyncOperation, ValidateSubjectAsyncDeliversEachVerdict)
+{
+    for (const bool verdict : {true, false}) {
+        transport->reply = StatusReply(verdict ? "valid" : "invalid");
+        AwaitedVerdict awaited;
+        MakeService()->ValidateSubjectAsync(MakePresented(), awaited.GetCompletion());
+        const auto told = awaited.Get();
+        EXPECT_EQ(told.result, boost::optional<bool>(verdict));
+        EXPECT_EQ(told.Describe(), "success");
+    }
+}
+
+TEST_F(AsyncOperation, ValidateSubjectAsyncDeliversAnEmptyVerdictWithTheException)
+{
+    transport->reply = FaultReply("w:InvalidRequest");
+    AwaitedVerdict awaited;
+    MakeService()->ValidateSubjectAsync(MakePresented(), awaited.GetCompletion());
+    const auto told = awaited.Get();
+    EXPECT_EQ(told.result, boost::none);
+    EXPECT_EQ(
+        told.Describe(), "SsoException: Unexpected SOAP fault: w:InvalidRequest; request failed.");
+}
+
+TEST_F(AsyncOperation, DeliversBadCredentialsWithTheirDynamicType)
+{
+    transport->reply = FaultReply("w:FailedAuthentication");
+    AwaitedToken awaited;
+    MakeService()->AcquireTokenAsync("jdoe", "s3cret", spec, awaited.GetCompletion());
+    const auto told = awaited.Get();
+    EXPECT_EQ(told.result, nullptr);
+    EXPECT_EQ(told.Describe(), "InvalidCredentialsException: Authentication failed: no");
+    // The clone came from a thread of the pool and is raised on this one.
+    EXPECT_THROW(told.error->Throw(), InvalidCredentialsException);
+}
+
+TEST_F(AsyncOperation, DeliversBadArgumentsInsteadOfRaisingThem)
+{
+    spec.tokenLifetimeSec = 0;
+    AwaitedToken awaited;
+    MakeService()->AcquireTokenAsync("jdoe", "s3cret", spec, awaited.GetCompletion());
+    EXPECT_EQ(
+        awaited.Get().Describe(),
+        "InvalidArgumentException: Invalid argument : Token lifetime must be positive");
+}
+
+TEST_F(AsyncOperation, DeliversAnEmptyAssertionAsNoTokenAndNoError)
+{
+    AwaitedToken awaited;
+    SecurityTokenServiceImpl(
+        boost::make_shared<RequestBuilderImpl>(boost::none),
+        transport,
+        boost::make_shared<ReplyIsToken>(*transport),
+        {})
+        .AcquireTokenAsync("jdoe", "s3cret", spec, awaited.GetCompletion());
+    const auto told = awaited.Get();
+    EXPECT_EQ(told.result, nullptr);
+    EXPECT_EQ(told.Describe(), "success");
+}
+
+TEST_F(AsyncOperation, ReleasesEverythingAfterItRan)
+{
+    transport->reply = StatusReply("valid");
+    auto presented = MakePresented();
+    const boost::weak_ptr<const SamlToken> observer = presented;
+    const auto released = std::make_shared<std::promise<void>>();
+    auto onRelease = std::shared_ptr<void>(nullptr, [released](void*) { released->set_value(); });
+    AwaitedVerdict awaited;
+    {
+        const auto completion = awaited.GetCompletion();
+        const ValidationCompletion keeping =
+            [completion,
+             onRelease](const boost::optional<bool>& verdict, const Quillon::Exception* error) {
+                completion(verdict, error);
+            };
+        MakeService()->ValidateSubjectAsync(presented, keeping);
+    }
+    presented.reset();
+    onRelease.reset();
+    awaited.Get();
+    released->get_future().wait();
+    // The arguments go with the completion; the pool has at most a last step of that to do.
+    while (!observer.expired()) {
+        std::this_thread::yield();
+    }
+}
+
+// ------------------------------------------------------------------- what leaves a work item
+
+namespace {
+
+/** Takes the lines of all loggers, from whatever thread. */
+class SharedLog
+{
+public:
+    SharedLog()
+    {
+        Quillon::Service::GetApp()->GetLogFacility().SetSink(
+            [this](const std::string&, int level, const std::string& text) {
+                _line.set_value(std::to_string(level) + ": " + text);
+            });
+    }
+    ~SharedLog() { Quillon::Service::GetApp()->GetLogFacility().SetSink({}); }
+    SharedLog(const SharedLog&) = delete;
+    SharedLog& operator=(const SharedLog&) = delete;
+
+    std::string WaitForLine() { return _line.get_future().get(); }
+
+private:
+    std::promise<std::string> _line;
+};
+
+} // namespace
+
+TEST_F(AsyncOperation, LogsWhatACompletionThrows)
+{
+    transport->reply = StatusReply("valid");
+    SharedLog log;
+    MakeService()->ValidateSubjectAsync(
+        MakePresented(), [](const boost::optional<bool>&, const Quillon::Exception*) {
+            throw SsoException("thrown by the completion");
+        });
+    const std::string line = log.WaitForLine();
+    EXPECT_THAT(line, StartsWith("8: "));
+    EXPECT_THAT(line, HasSubstr("SsoException: thrown by the completion"));
+}
+
+TEST_F(AsyncOperation, LogsThatACompletionIsEmpty)
+{
+    transport->reply = StatusReply("valid");
+    SharedLog log;
+    MakeService()->ValidateSubjectAsync(MakePresented(), ValidationCompletion());
+    const std::string line = log.WaitForLine();
+    EXPECT_THAT(line, StartsWith("8: "));
+    EXPECT_THAT(line, HasSubstr("call to empty boost::function"));
+}
+
+TEST_F(AsyncOperation, GoesOnAfterACompletionThatThrew)
+{
+    transport->reply = StatusReply("valid");
+    {
+        SharedLog log;
+        MakeService()->ValidateSubjectAsync(MakePresented(), ValidationCompletion());
+        log.WaitForLine();
+    }
+    AwaitedVerdict awaited;
+    MakeService()->ValidateSubjectAsync(MakePresented(), awaited.GetCompletion());
+    EXPECT_EQ(awaited.Get().result, boost::optional<bool>(true));
+}
+
+// ------------------------------------------------------------------------ null pointers
+
+namespace {
+
+std::string StopPattern()
+{
+    return std::string("_p.*") + Unit + ".*488";
+}
+
+const TokenCompletion TokenIsUnexpected = [](const TokenPtr&, const Quillon::Exception*) {
+    std::_Exit(0);
+};
+const ValidationCompletion VerdictIsUnexpected = [](const boost::optional<bool>&,
+                                                    const Quillon::Exception*) { std::_Exit(0); };
+
+} // namespace
+
+TEST_F(AsyncOperation, StopsTheProcessOnANullTokenToRenew)
+{
+    EXPECT_DEATH(MakeService()->RenewTokenAsync(nullptr, 300, TokenIsUnexpected), StopPattern());
+}
+
+TEST_F(AsyncOperation, StopsTheProcessOnANullTokenToValidate)
+{
+    EXPECT_DEATH(MakeService()->ValidateSubjectAsync(nullptr, VerdictIsUnexpected), StopPattern());
+}
+
+TEST_F(AsyncOperation, StopsTheProcessOnANullTokenToPresent)
+{
+    EXPECT_DEATH(
+        MakeService()->AcquireTokenByTokenAsync(nullptr, spec, TokenIsUnexpected), StopPattern());
+}
+
+TEST_F(AsyncOperation, StopsTheProcessOnANullHandler)
+{
+    EXPECT_DEATH(
+        MakeService()->AcquireTokenByGssAsync(spec, nullptr, TokenIsUnexpected), StopPattern());
+}
