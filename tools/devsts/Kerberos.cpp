@@ -135,6 +135,7 @@ Acceptor::Acceptor(const std::filesystem::path& keytab, const std::filesystem::p
     // SPNEGO would only say that it finds no mechanism; Kerberos tells what is wrong.
     Acquire(store, &Kerberos);
     _credential = Acquire(store, &Spnego);
+    // Mechanisms that a machine adds as plug-ins stay outside.
     gss_OID_set_desc kerberosOnly{1, &Kerberos};
     OM_uint32 minor = 0;
     const OM_uint32 major = gss_set_neg_mechs(&minor, _credential.get(), &kerberosOnly);

@@ -110,6 +110,16 @@ TEST_F(RefusedNegotiation, OfferOfNtlmAloneIsRefused)
         OtherMechanism + "An unsupported mechanism was requested");
 }
 
+TEST_F(RefusedNegotiation, OfferOfIakerbAloneIsRefused)
+{
+    const std::string spnego = "\x06\x06\x2b\x06\x01\x05\x05\x02";
+    const std::string iakerb = "\x06\x06\x2b\x06\x01\x05\x02\x05";
+    const std::string offer = "\x60\x18" + spnego + "\xa0\x0e\x30\x0c\xa0\x0a\x30\x08" + iakerb;
+    EXPECT_EQ(
+        FaultText(PostIssue(FirstRequest(offer)), "wst:FailedAuthentication"),
+        OtherMechanism + "An unsupported mechanism was requested");
+}
+
 TEST_F(RefusedNegotiation, PasswordInTheHeaderIsRefused)
 {
     Initiator alice = Alice();
