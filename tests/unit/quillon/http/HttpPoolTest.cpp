@@ -1,6 +1,7 @@
 #include "HttpClient.h"
 
 #include "quillon/system/ThreadPool.h"
+#include "support/PoolSupport.h"
 
 #include <gtest/gtest.h>
 
@@ -8,7 +9,6 @@
 #include <cstdlib>
 #include <future>
 #include <string>
-#include <thread>
 
 using namespace Testing;
 using Quillon::System::GetThreadPool;
@@ -105,13 +105,7 @@ TEST_F(HttpPoolProcess, ReleasesWorkThatWaitsIfHttpWasUsedFirst)
     static std::promise<void> begun;
     GetThreadPool()->Queue([] {
         begun.set_value();
-        for (bool hasEnded = false; !hasEnded; std::this_thread::yield()) {
-            try {
-                GetThreadPool()->Queue([] {});
-            } catch (const Quillon::InvalidStateException&) {
-                hasEnded = true;
-            }
-        }
+        AwaitEnd(*GetThreadPool());
         outcome.actual.set_value(HttpClient(server).PostAndFail());
     });
     begun.get_future().wait();

@@ -1,6 +1,6 @@
 #include "system/ElasticPool.h"
 
-#include "PoolSupport.h"
+#include "support/PoolSupport.h"
 
 #include "quillon/service/Logger.h"
 

@@ -1,6 +1,6 @@
 #include "quillon/system/ThreadPool.h"
 
-#include "PoolSupport.h"
+#include "support/PoolSupport.h"
 #include "support/TestData.h"
 
 #include <gtest/gtest.h>
