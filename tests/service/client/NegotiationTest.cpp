@@ -3,18 +3,16 @@
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/GssNegotiationContext.h"
 #include "ssoClientGss/Exceptions.h"
-#include "ssoClientGss/Gssapi.h"
 #include "ssoClientGss/KerberosNegotiationHandler.h"
 #include "support/Failure.h"
+#include "support/Initiator.h"
 #include "support/TestData.h"
 #include "support/TestKdc.h"
 
 #include <boost/smart_ptr/make_shared.hpp>
 #include <gmock/gmock.h>
 
-#include <array>
 #include <future>
-#include <stdexcept>
 
 // A Kerberos ticket becomes a token: a real KDC, the Kerberos library on both sides, and HTTPS
 // between them.
@@ -88,70 +86,21 @@ std::unique_ptr<Testing::TestKdc> Negotiation::kdc;
 class ThreeLegHandler final : public NegotiationHandler
 {
 public:
-    ThreeLegHandler(const std::string& ccache, const std::string& service)
-    {
-        gss_key_value_element_desc element{"ccache", ccache.c_str()};
-        const gss_key_value_set_desc store{1, &element};
-        gss_cred_id_t credential = GSS_C_NO_CREDENTIAL;
-        OM_uint32 minor = 0;
-        Require(gss_acquire_cred_from(
-            &minor,
-            GSS_C_NO_NAME,
-            GSS_C_INDEFINITE,
-            GSS_C_NO_OID_SET,
-            GSS_C_INITIATE,
-            &store,
-            &credential,
-            nullptr,
-            nullptr));
-        _credential.reset(credential);
-        std::string text = service;
-        gss_buffer_desc buffer{text.size(), text.data()};
-        gss_name_t name = GSS_C_NO_NAME;
-        Require(gss_import_name(&minor, &buffer, GSS_C_NT_HOSTBASED_SERVICE, &name));
-        _service.reset(name);
-    }
+    explicit ThreeLegHandler(const std::string& ccache)
+        : _client(ccache, "HTTP/127.0.0.1@EXAMPLE.TEST", GSS_C_MUTUAL_FLAG | GSS_C_DCE_STYLE)
+    {}
 
     boost::shared_ptr<Leg> Negotiate(const Leg& serverLeg) override
     {
         ++calls;
-        Leg copy = serverLeg;
-        gss_buffer_desc input{copy.size(), copy.data()};
-        Gss::GssBuffer output;
-        gss_ctx_id_t context = _context.release();
-        OM_uint32 minor = 0;
-        const OM_uint32 major = gss_init_sec_context(
-            &minor,
-            _credential.get(),
-            &context,
-            _service.get(),
-            &Gss::spnegoMechanism,
-            GSS_C_MUTUAL_FLAG | GSS_C_DCE_STYLE,
-            0,
-            GSS_C_NO_CHANNEL_BINDINGS,
-            &input,
-            nullptr,
-            output.Get(),
-            nullptr,
-            nullptr);
-        _context.reset(context);
-        Require(major);
-        return boost::make_shared<Leg>(output.begin(), output.end());
+        const std::string leg = _client.Step({serverLeg.begin(), serverLeg.end()});
+        return boost::make_shared<Leg>(leg.begin(), leg.end());
     }
 
     int calls = 0;
 
 private:
-    static void Require(OM_uint32 major)
-    {
-        if (GSS_ERROR(major)) {
-            throw std::runtime_error(Gss::GetGssError(major, 0, &Gss::spnegoMechanism));
-        }
-    }
-
-    Gss::GssCredential _credential;
-    Gss::GssName _service;
-    Gss::GssContext _context;
+    Testing::Initiator _client;
 };
 
 std::string GetHeader(const DevSts::ReceivedRequest& request, const std::string& name)
@@ -206,7 +155,7 @@ TEST_F(Negotiation, GoesOnForAsManyLegsAsItTakes)
 {
     const std::string ccache = kdc->GetFile("legs.ccache");
     kdc->LogOn("alice", ccache);
-    ThreeLegHandler handler(ccache, "HTTP@127.0.0.1");
+    ThreeLegHandler handler(ccache);
     const TokenPtr token = MakeService(true)->AcquireTokenByGSS(MakeSpec(), handler);
     ASSERT_NE(token, nullptr);
     EXPECT_EQ(token->GetSubject(), Alice());

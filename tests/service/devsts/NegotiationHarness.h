@@ -2,9 +2,12 @@
 #define DEVSTS_TESTS_NEGOTIATION_HARNESS_H
 
 #include "Harness.h"
-#include "Initiator.h"
+#include "support/Initiator.h"
 
 namespace DevStsTests {
+
+using Testing::Initiator;
+using Testing::Mechanism;
 
 /** The Kerberos realm that all tests share. */
 class Realm

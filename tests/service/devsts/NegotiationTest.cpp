@@ -73,7 +73,8 @@ TEST_F(Negotiate, ChangedLastLegProvesNothing)
     EXPECT_FALSE(alice.IsMutual());
 }
 
-// DCE's style has the client speak last: its third leg ends the negotiation. [MS-KILE 3.4.5.1]
+// In DCE's style the client answers the service's leg once more: only that third leg proves the
+// client to the service.
 TEST_F(Negotiate, SecondLegIsAnsweredUnderTheSameContext)
 {
     Initiator alice = Alice(GSS_C_MUTUAL_FLAG | GSS_C_DCE_STYLE);

@@ -1,11 +1,10 @@
-#ifndef DEVSTS_TESTS_INITIATOR_H
-#define DEVSTS_TESTS_INITIATOR_H
+#pragma once
 
 #include <gssapi/gssapi.h>
 #include <gssapi/gssapi_ext.h>
 #include <string>
 
-namespace DevStsTests {
+namespace Testing {
 
 enum class Mechanism
 {
@@ -49,6 +48,4 @@ private:
     bool _isComplete = false;
 };
 
-} // namespace DevStsTests
-
-#endif
+} // namespace Testing

@@ -3,7 +3,7 @@
 #include <gssapi/gssapi_krb5.h>
 #include <stdexcept>
 
-namespace DevStsTests {
+namespace Testing {
 
 namespace {
 
@@ -102,4 +102,4 @@ std::string Initiator::Step(const std::string& leg)
     return next;
 }
 
-} // namespace DevStsTests
+} // namespace Testing
