@@ -2,10 +2,11 @@
 # A Kerberos realm of its own for a test: a key distribution centre on a free loopback port, its
 # database, principals and keytabs in one folder.
 #
-#   kdc.sh start FOLDER   makes all that, and returns when the KDC answers
-#   kdc.sh stop FOLDER    ends the KDC
+# It prints the path of the folder when the KDC answers, and waits for the end of its standard
+# input. Then it ends the KDC and removes the folder, so that none outlives whoever holds the other
+# end of a pipe to it. Start it by `setsid --fork`, which spares it what kills a test's processes.
 #
-# FOLDER then has, besides the KDC's own files:
+# The folder has, besides the KDC's own files:
 #   krb5.conf        for KRB5_CONFIG
 #   service.keytab   HTTP/127.0.0.1 and HTTP/localhost, the token service
 #   alice.keytab     alice, whom the sample users of the token service know
@@ -87,6 +88,17 @@ make_database() {
 
 is_listening() { (exec 3<>"/dev/tcp/127.0.0.1/$1") 2>/dev/null; }
 
+# It listens when it says which process it is.
+await_kdc() {
+    local count
+    for ((count = 0; count < 3000; ++count)); do
+        [[ ! -s $folder/kdc.pid ]] || return 0
+        kill -0 "$kdc" 2>/dev/null || return 1
+        sleep 0.01
+    done
+    return 1
+}
+
 # Somebody else may take a port between its choice and its use, hence the tries.
 start_kdc() {
     local port try
@@ -95,10 +107,9 @@ start_kdc() {
         ! is_listening "$port" || continue
         write_configuration "$port"
         [[ -e $folder/principal ]] || make_database
-        krb5kdc -r "$realm" -P "$folder/kdc.pid" >>"$folder/kdc.out" 2>&1 </dev/null || continue
-        # It listens when it goes into the background, and says there which process it is.
-        until [[ -s $folder/kdc.pid ]]; do sleep 0.01; done
-        is_listening "$port" && return
+        krb5kdc -n -r "$realm" -P "$folder/kdc.pid" >>"$folder/kdc.out" 2>&1 </dev/null &
+        kdc=$!
+        ! await_kdc || return 0
         stop_kdc
     done
     cat "$folder"/kdc.out "$folder"/kdc.log >&2
@@ -106,18 +117,23 @@ start_kdc() {
 }
 
 stop_kdc() {
-    [[ -s $folder/kdc.pid ]] || return 0
-    local pid
-    pid=$(<"$folder/kdc.pid")
-    kill "$pid" 2>/dev/null || true
+    [[ -n $kdc ]] || return 0
+    kill "$kdc" 2>/dev/null || true
+    wait "$kdc" || true
+    kdc=
     rm -f "$folder/kdc.pid"
 }
 
-[[ $# -eq 2 ]] || fail 'usage: kdc.sh start|stop FOLDER'
-folder=$(cd "$2" && pwd)
+clean_up() {
+    stop_kdc
+    rm -rf "$folder"
+}
+
+[[ $# -eq 0 ]] || fail 'usage: kdc.sh'
+kdc=
+folder=$(mktemp -d "${TMPDIR:-/tmp}/test-kdc-XXXXXX")
+trap clean_up EXIT
 export KRB5_CONFIG=$folder/krb5.conf KRB5_KDC_PROFILE=$folder/kdc.conf
-case $1 in
-    start) start_kdc ;;
-    stop) stop_kdc ;;
-    *) fail "unknown command $1" ;;
-esac
+start_kdc
+printf '%s\n' "$folder"
+cat >/dev/null

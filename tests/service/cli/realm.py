@@ -4,7 +4,6 @@ import os
 import pathlib
 import struct
 import subprocess
-import tempfile
 
 from programs import ServiceTest, ssoclient
 
@@ -15,8 +14,11 @@ class Realm:
     """EXAMPLE.TEST, whose key distribution centre runs until `stop`."""
 
     def __init__(self):
-        self._folder = tempfile.TemporaryDirectory()
-        self.folder = pathlib.Path(self._folder.name)
+        self._kdc = subprocess.Popen(["setsid", "--fork", KDC], stdin=subprocess.PIPE,
+                                     stdout=subprocess.PIPE, text=True)
+        folder = self._kdc.stdout.readline().rstrip("\n")
+        assert folder, "the KDC did not start"
+        self.folder = pathlib.Path(folder)
         self.service_keytab = self.folder / "service.keytab"
         self.alice_keytab = self.folder / "alice.keytab"
         self.mallory_keytab = self.folder / "mallory.keytab"
@@ -24,7 +26,6 @@ class Realm:
         self.environment = {name: value for name, value in os.environ.items()
                             if not name.startswith("KRB5")}
         self.environment["KRB5_CONFIG"] = str(self.folder / "krb5.conf")
-        self._control("start")
 
     def log_on(self, principal, ccache):
         """Puts a ticket-granting ticket of the principal into `ccache`."""
@@ -34,11 +35,8 @@ class Realm:
         return ccache
 
     def stop(self):
-        self._control("stop")
-        self._folder.cleanup()
-
-    def _control(self, action):
-        subprocess.run([KDC, action, self.folder], check=True, stdin=subprocess.DEVNULL)
+        """Returns when the KDC and its folder are gone."""
+        self._kdc.communicate()
 
 
 class CredentialCache:
