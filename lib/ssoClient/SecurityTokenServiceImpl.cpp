@@ -8,6 +8,7 @@
 #include "ssoClient/HttpsClient.h"
 #include "ssoClient/RequestBuilderImpl.h"
 #include "ssoClient/ResponseHandlerImpl.h"
+#include "ssoClient/WipedText.h"
 #include "ssoClient/asyncCalls.h"
 #include "ssoClient/descriptions.h"
 #include "ssoClient/logging.h"
@@ -15,7 +16,6 @@
 #include <boost/none.hpp>
 #include <boost/smart_ptr/make_shared.hpp>
 
-#include <string.h>
 #include <utility>
 
 using Quillon::MessageFormatter;
@@ -100,18 +100,6 @@ PassByRefHelper<T> PassByRef(const boost::shared_ptr<T>& p)
 {
     return PassByRefHelper<T>(p);
 }
-
-struct WipedText
-{
-    std::string text;
-
-    explicit WipedText(const std::string& original)
-        : text(original)
-    {}
-    WipedText(const WipedText&) = delete;
-    WipedText& operator=(const WipedText&) = delete;
-    ~WipedText() { explicit_bzero(text.data(), text.size()); }
-};
 
 // Bound calls are copied on their way to the pool; the copies share the one password.
 PassByRefHelper<const std::string> PassSecret(const std::string& secret)

@@ -4,6 +4,7 @@
 
 #include <boost/smart_ptr/make_shared.hpp>
 
+#include <algorithm>
 #include <array>
 #include <utility>
 
@@ -20,6 +21,16 @@ constexpr std::size_t MaxServerLegSize = 65536;
  */
 constexpr std::array<unsigned char, 9> AcceptCompleted{
     0xa1, 0x07, 0x30, 0x05, 0xa0, 0x03, 0x0a, 0x01, 0x00};
+
+bool IsAcceptCompleted(const Leg& leg)
+{
+    return std::equal(leg.begin(), leg.end(), AcceptCompleted.begin(), AcceptCompleted.end());
+}
+
+boost::shared_ptr<Leg> MakeAcceptCompleted()
+{
+    return boost::make_shared<Leg>(AcceptCompleted.begin(), AcceptCompleted.end());
+}
 
 GssName ImportServiceName(const std::string& service)
 {
@@ -50,6 +61,9 @@ boost::shared_ptr<Leg> KerberosNegotiationHandlerImpl::Negotiate(const Leg& serv
 {
     // A failure ends the negotiation too: nothing that the service sends after it is looked at.
     const State state = std::exchange(_state, State::OVER);
+    if (state == State::COMPLETE && IsAcceptCompleted(serverLeg)) {
+        return MakeAcceptCompleted(); // the service says once that it agrees [RFC 4178 4.2.2]
+    }
     CheckServerLeg(state, serverLeg);
     if (state == State::NEW) {
         _credentials.emplace(_options);
@@ -66,7 +80,7 @@ boost::shared_ptr<Leg> KerberosNegotiationHandlerImpl::Negotiate(const Leg& serv
 void KerberosNegotiationHandlerImpl::CheckServerLeg(State state, const Leg& leg) const
 {
     const std::string service = "the service '" + _options.service + "'";
-    if (state == State::OVER) {
+    if (state == State::COMPLETE || state == State::OVER) {
         throw NegotiationException(
             "The negotiation with " + service + " is over; a handler serves only one");
     }
@@ -99,9 +113,11 @@ boost::shared_ptr<Leg> KerberosNegotiationHandlerImpl::TakeStep(const Leg& serve
         throw NegotiationException(
             "The negotiation with the service '" + _options.service
             + "' is complete, but the service has not authenticated itself");
+    } else {
+        _state = State::COMPLETE;
     }
     if (output.empty()) {
-        return boost::make_shared<Leg>(AcceptCompleted.begin(), AcceptCompleted.end());
+        return MakeAcceptCompleted();
     }
     return boost::make_shared<Leg>(output.begin(), output.end());
 }

@@ -29,6 +29,7 @@ private:
     {
         NEW,
         RUNNING,
+        COMPLETE, // on this side
         OVER
     };
 

@@ -16,7 +16,10 @@ namespace SsoClient::Gss {
  */
 struct KerberosOptions
 {
-    /** The token service. Its host gives the service name `HTTP@host`; else it is not read. */
+    /**
+     * The token service. Its host gives the service name `HTTP@host`, as if that were given as
+     * `service`; else it is not read.
+     */
     std::string url;
 
     /**
@@ -43,9 +46,9 @@ struct KerberosOptions
  *
  * `Negotiate` throws a `NegotiationException`. It refuses what would keep a negotiation from
  * ending: an empty leg or a leg above 64 KiB of the service, a leg after the negotiation is
- * complete, and more than 16 legs. When the negotiation completes without a leg of its own to
- * send, it returns an "accept-completed" [RFC 4178 4.2.2]. A service that sends no last leg has
- * not authenticated itself through Kerberos.
+ * complete (but one bare "accept-completed" may come), and more than 16 legs. When the negotiation
+ * completes without a leg of its own to send, it returns an "accept-completed" [RFC 4178 4.2.2]. A
+ * service that sends no last leg has not authenticated itself through Kerberos.
  *
  * @throws Quillon::InvalidArgumentException  the options contradict each other, are incomplete,
  *                                            or are no names.

@@ -267,7 +267,7 @@ bool ElasticPool::AwaitWork(Position self, std::unique_lock<std::mutex>& lock)
         } else if (std::chrono::steady_clock::now() < self->surplusAt) {
             self->wake.wait_until(lock, self->surplusAt);
         } else {
-            Leave(_idle, self, lock);
+            Leave(self, lock);
             return false;
         }
     }
@@ -298,22 +298,25 @@ void ElasticPool::Abandon(Position self)
     if (_state == State::LEAVING) {
         return; // the destructor has the threads
     }
+    std::list<Worker> departed;
+    departed.swap(_retired);
+    _retired.splice(_retired.end(), _busy, self);
     if (_state == State::ENDED) {
         _quietened.notify_all();
     } else if (!_queue.empty()) {
-        AddThread();
-        HandOver();
+        Contain("Starting a thread in the place of one that has ended", [this] { AddThread(); });
+        HandOver(); // without a thread, the work waits for the next that is queued
     }
-    Leave(_busy, self, lock);
+    lock.unlock();
+    Join(departed);
 }
 
 /** Joins those that left before and is joined by the next, so that ended threads do not pile up. */
-void ElasticPool::Leave(
-    std::list<Worker>& workers, Position self, std::unique_lock<std::mutex>& lock)
+void ElasticPool::Leave(Position self, std::unique_lock<std::mutex>& lock)
 {
     std::list<Worker> departed;
     departed.swap(_retired);
-    _retired.splice(_retired.end(), workers, self);
+    _retired.splice(_retired.end(), _idle, self);
     lock.unlock();
     Join(departed);
 }

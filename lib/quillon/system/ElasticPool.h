@@ -21,7 +21,7 @@ struct ElasticPoolOptions
 };
 
 /**
- * Runs work in the order in which it was queued, on as many threads as it takes for no work to
+ * Hands work to threads in the order in which it was queued, to as many as it takes for no work to
  * wait, up to a limit. Of the idle threads, the one that ran last works first, so that those
  * which are not needed stay idle and go.
  *
@@ -100,7 +100,7 @@ private:
     bool AwaitWork(Position self, std::unique_lock<std::mutex>& lock);
     void FinishWork(Position self);
     void Abandon(Position self);
-    void Leave(std::list<Worker>& workers, Position self, std::unique_lock<std::mutex>& lock);
+    void Leave(Position self, std::unique_lock<std::mutex>& lock);
 
     std::atomic<int> _pid{0}; // of the process that queues
 

@@ -13,10 +13,7 @@ namespace Quillon::System {
 
 namespace {
 
-constexpr std::chrono::seconds IdleTime{10};
-
-/** What running work may take to finish when the process ends. */
-constexpr std::chrono::seconds Patience{2};
+using std::chrono::seconds;
 
 class ProcessPool final : public ThreadPool
 {
@@ -31,7 +28,10 @@ private:
     static bool Prepare();
 
     ElasticPool _pool{
-        {std::max(std::thread::hardware_concurrency(), 1U), DefaultLimit, IdleTime, &Prepare}};
+        {std::max(std::thread::hardware_concurrency(), 1U),
+         DefaultLimit,
+         seconds(IdleTimeSec),
+         &Prepare}};
 };
 
 /** Never destroyed: work may still run, or be queued, while static objects are destroyed. */
@@ -54,7 +54,7 @@ bool ProcessPool::Prepare()
 {
     // OpenSSL comes first, so that it takes itself down after the work has finished.
     Crypto::InitialiseOpenSsl();
-    return RunAtProcessEnd(EndStage::WORK, [] { Get()._pool.End(Patience); });
+    return RunAtProcessEnd(EndStage::WORK, [] { Get()._pool.End(seconds(PatienceSec)); });
 }
 
 } // namespace

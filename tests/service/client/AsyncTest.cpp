@@ -2,6 +2,7 @@
 
 #include "quillon/system/ThreadPool.h"
 #include "ssoClient/Exceptions.h"
+#include "support/Awaited.h"
 #include "support/TestServer.h"
 
 #include <gmock/gmock.h>
@@ -20,40 +21,17 @@ namespace {
 
 constexpr char AlicesName[] = "alice@example.test";
 
-/** What a completion was told: the token or a description of the exception. */
-struct Told
-{
-    TokenPtr token;
-    std::string error;
-};
-
 std::string Describe(const Quillon::Exception* error)
 {
     return error == nullptr ? "" : Quillon::GetClassName(*error) + ": " + error->what();
 }
 
-class AwaitedToken
+TokenPtr GetToken(AwaitedToken& awaited)
 {
-public:
-    TokenCompletion GetCompletion()
-    {
-        return [promise = _promise](const TokenPtr& token, const Quillon::Exception* error) {
-            promise->set_value({token, Describe(error)});
-        };
-    }
-
-    Told Get() { return _promise->get_future().get(); }
-
-    TokenPtr GetToken()
-    {
-        const Told told = Get();
-        EXPECT_EQ(told.error, "");
-        return told.token;
-    }
-
-private:
-    std::shared_ptr<std::promise<Told>> _promise = std::make_shared<std::promise<Told>>();
-};
+    const Told<TokenPtr> told = awaited.Get();
+    EXPECT_EQ(told.Describe(), "success");
+    return told.result;
+}
 
 class AsyncAtSts : public HttpsStsTest
 {};
@@ -68,21 +46,21 @@ TEST_F(AsyncAtSts, RunsEveryOperation)
 
     AwaitedToken byPassword;
     service->AcquireTokenAsync(AlicesName, AlicesPassword, spec, byPassword.GetCompletion());
-    EXPECT_EQ(byPassword.GetToken()->GetSubject(), Alice());
+    EXPECT_EQ(GetToken(byPassword)->GetSubject(), Alice());
 
     AwaitedToken byCertificate;
     service->AcquireTokenByCertificateAsync(spec, byCertificate.GetCompletion());
-    const TokenPtr own = byCertificate.GetToken();
+    const TokenPtr own = GetToken(byCertificate);
     ASSERT_NE(own, nullptr);
     EXPECT_EQ(own->GetSubject(), ServiceUser());
 
     AwaitedToken byToken;
     service->AcquireTokenByTokenAsync(own, MakeSpec(100), byToken.GetCompletion());
-    EXPECT_EQ(byToken.GetToken()->GetSubject(), ServiceUser());
+    EXPECT_EQ(GetToken(byToken)->GetSubject(), ServiceUser());
 
     AwaitedToken renewed;
     service->RenewTokenAsync(own, 200, renewed.GetCompletion());
-    EXPECT_EQ(GetLifetimeSec(*renewed.GetToken()), 200);
+    EXPECT_EQ(GetLifetimeSec(*GetToken(renewed)), 200);
 
     std::promise<boost::optional<bool>> verdict;
     service->ValidateSubjectAsync(
@@ -96,9 +74,9 @@ TEST_F(AsyncAtSts, DeliversRefusedCredentials)
 {
     AwaitedToken awaited;
     MakeService()->AcquireTokenAsync(AlicesName, "wrong", MakeSpec(), awaited.GetCompletion());
-    const Told told = awaited.Get();
-    EXPECT_EQ(told.token, nullptr);
-    EXPECT_THAT(told.error, testing::StartsWith("InvalidCredentialsException: "));
+    const Told<TokenPtr> told = awaited.Get();
+    EXPECT_EQ(told.result, nullptr);
+    EXPECT_THAT(told.Describe(), testing::StartsWith("InvalidCredentialsException: "));
 }
 
 TEST_F(AsyncAtSts, DeliversATransportFailureAsItIs)
@@ -107,7 +85,8 @@ TEST_F(AsyncAtSts, DeliversATransportFailureAsItIs)
     AwaitedToken awaited;
     MakeService()->AcquireTokenAsync(
         AlicesName, AlicesPassword, MakeSpec(), awaited.GetCompletion());
-    EXPECT_EQ(awaited.Get().error, "CommunicationException: Server returned error: 404 Not Found");
+    EXPECT_EQ(
+        awaited.Get().Describe(), "CommunicationException: Server returned error: 404 Not Found");
 }
 
 TEST_F(AsyncAtSts, CompletesAfterTheServiceObjectIsGone)
@@ -116,7 +95,7 @@ TEST_F(AsyncAtSts, CompletesAfterTheServiceObjectIsGone)
     AwaitedToken awaited;
     MakeService()->AcquireTokenAsync(
         AlicesName, AlicesPassword, MakeSpec(), awaited.GetCompletion());
-    EXPECT_NE(awaited.GetToken(), nullptr);
+    EXPECT_NE(GetToken(awaited), nullptr);
 }
 
 TEST_F(AsyncAtSts, MayBeStartedFromACompletion)
@@ -127,7 +106,7 @@ TEST_F(AsyncAtSts, MayBeStartedFromACompletion)
         MakeSpec(), [&](const TokenPtr& token, const Quillon::Exception*) {
             service->AcquireTokenByTokenAsync(token, MakeSpec(100), awaited.GetCompletion());
         });
-    EXPECT_NE(awaited.GetToken(), nullptr);
+    EXPECT_NE(GetToken(awaited), nullptr);
 }
 
 // A service that takes its time must cost waiting, not tokens.
@@ -172,7 +151,7 @@ TEST_F(AsyncAtSts, CompletesAThousandAcquisitionsOnceEach)
     for (const std::atomic<int>& count : calls) {
         EXPECT_EQ(count, 1);
     }
-    EXPECT_LE(mostThreads, Quillon::System::ThreadPool::DefaultLimit);
+    EXPECT_EQ(mostThreads, Quillon::System::ThreadPool::DefaultLimit);
     RecordProperty(
         "milliseconds",
         static_cast<int>(std::chrono::duration_cast<std::chrono::milliseconds>(took).count()));

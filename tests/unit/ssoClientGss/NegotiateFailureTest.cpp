@@ -450,14 +450,35 @@ TEST_F(NegotiateFailure, AtTheStartEndsTheNegotiation)
     EXPECT_EQ(Over, GetFailure([&] { handler->Negotiate(Leg()); }));
 }
 
-TEST_F(NegotiateFailure, OnAnyLegAfterCompletionIsRefused)
+TEST_F(NegotiateFailure, OnAnyOtherLegAfterCompletionIsRefused)
 {
-    const Leg completed = MakeResponse(ACCEPT_COMPLETED);
-    for (const Leg& further : {Leg(), completed}) {
+    Leg completed = MakeResponse(ACCEPT_COMPLETED);
+    Leg longer = completed;
+    longer.push_back(0);
+    Leg shorter = completed;
+    shorter.pop_back();
+    for (const Leg& further : {Leg(), longer, shorter, MakeResponse(ACCEPT_INCOMPLETE)}) {
         const auto handler = CreateKerberosNegotiationHandler(WithService("HTTP@localhost"));
         handler->Negotiate(Acceptor(*kdc).Accept(*handler->Negotiate(Leg())));
         EXPECT_EQ(Over, GetFailure([&] { handler->Negotiate(further); }));
+        EXPECT_EQ(Over, GetFailure([&] { handler->Negotiate(completed); }));
     }
+}
+
+TEST_F(NegotiateFailure, OnASecondAgreementOfTheServiceIsRefused)
+{
+    const Leg completed = MakeResponse(ACCEPT_COMPLETED);
+    const auto handler = CreateKerberosNegotiationHandler(WithService("HTTP@localhost"));
+    handler->Negotiate(Acceptor(*kdc).Accept(*handler->Negotiate(Leg())));
+    EXPECT_EQ(completed, *handler->Negotiate(completed));
+    EXPECT_EQ(Over, GetFailure([&] { handler->Negotiate(completed); }));
+}
+
+TEST_F(NegotiateFailure, OnAnAgreementInPlaceOfTheProofIsRefused)
+{
+    const auto handler = CreateKerberosNegotiationHandler(WithService("HTTP@localhost"));
+    handler->Negotiate(Leg());
+    EXPECT_NE("none", GetFailure([&] { handler->Negotiate(MakeResponse(ACCEPT_COMPLETED)); }));
 }
 
 namespace {
@@ -518,6 +539,7 @@ TEST_F(NegotiateWithMic, MakesALegForIt)
     ProtectingService service(*kdc);
     const Leg last = *handler->Negotiate(service.Answer(*handler->Negotiate(Leg())));
     EXPECT_TRUE(service.IsProtectedBy(last));
+    EXPECT_NO_THROW(handler->Negotiate(MakeResponse(ACCEPT_COMPLETED)));
     EXPECT_EQ(Over, GetFailure([&] { handler->Negotiate(MakeResponse(ACCEPT_COMPLETED)); }));
 }
 

@@ -14,6 +14,7 @@
 #include <memory>
 #include <numeric>
 #include <pthread.h>
+#include <set>
 #include <stdexcept>
 #include <string>
 #include <vector>
@@ -59,7 +60,7 @@ TEST(QueueWork, RunsOnAnotherThread)
     EXPECT_NE(std::this_thread::get_id(), GetThreadId(pool));
 }
 
-TEST(QueueWork, BeginsInOrder)
+TEST(QueueWork, BeginsInOrderOnOneThread)
 {
     constexpr int Count = 200;
     std::vector<int> order;
@@ -228,7 +229,7 @@ TEST(ThreadsOfThePool, StayUntilTheyHaveBeenIdleLongEnough)
     }
 }
 
-TEST(ThreadsOfThePool, TakeNoSignals)
+TEST(ThreadsOfThePool, TakeNoSignalsButThoseOfTheirOwnFaults)
 {
     sigset_t before;
     pthread_sigmask(SIG_SETMASK, nullptr, &before);
@@ -240,9 +241,10 @@ TEST(ThreadsOfThePool, TakeNoSignals)
     });
     sigset_t after;
     pthread_sigmask(SIG_SETMASK, nullptr, &after);
-    for (int signal = 1; signal < SIGSYS; ++signal) {
-        const bool canBeBlocked = signal != SIGKILL && signal != SIGSTOP;
-        EXPECT_EQ(canBeBlocked, sigismember(&mask, signal) == 1) << signal;
+    const std::set<int> open{
+        SIGKILL, SIGSTOP, SIGSEGV, SIGBUS, SIGFPE, SIGILL, SIGTRAP, SIGSYS, SIGABRT};
+    for (int signal = 1; signal <= SIGSYS; ++signal) {
+        EXPECT_EQ(!open.contains(signal), sigismember(&mask, signal) == 1) << signal;
         EXPECT_EQ(sigismember(&before, signal), sigismember(&after, signal)) << signal;
     }
 }

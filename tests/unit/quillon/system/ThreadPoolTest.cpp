@@ -7,6 +7,7 @@
 
 #include <algorithm>
 #include <atomic>
+#include <csignal>
 #include <cstdlib>
 #include <latch>
 #include <memory>
@@ -79,6 +80,25 @@ void Block(std::ptrdiff_t count)
         });
     }
     begun.wait();
+}
+
+TEST(ThreadPoolTimes, AreTheDocumentedOnes)
+{
+    EXPECT_EQ(64U, ThreadPool::DefaultLimit);
+    EXPECT_EQ(10, ThreadPool::IdleTimeSec);
+    EXPECT_EQ(2, ThreadPool::PatienceSec);
+}
+
+TEST_F(ThreadPoolProcess, LetsTheHostHandleAFaultOfItsWork)
+{
+    EXPECT_EXIT(
+        {
+            std::signal(SIGSEGV, [](int) { std::_Exit(7); });
+            RunOn(*GetThreadPool(), [] { return std::raise(SIGSEGV); });
+            std::_Exit(1);
+        },
+        testing::ExitedWithCode(7),
+        "^$");
 }
 
 TEST_F(ThreadPoolProcess, StartsWithAThreadForEachCore)

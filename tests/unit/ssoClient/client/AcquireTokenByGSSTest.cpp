@@ -208,7 +208,9 @@ TEST_F(AcquireTokenByGSS, StopsTheProcessOnAnEmptyFirstLeg)
 {
     ScriptedHandler handler({""});
     EXPECT_DEATH(
-        Acquire(handler), "!leg\\.empty\\(\\).*lib/ssoClient/SecurityTokenServiceImpl.*762");
+        Acquire(handler),
+        "PanicVerify failed: !leg\\.empty\\(\\) "
+        "\\(lib/ssoClient/SecurityTokenServiceImpl:762\\)\n");
 }
 
 TEST_F(AcquireTokenByGSS, StopsTheProcessOnAnEmptyFurtherLeg)
@@ -216,7 +218,9 @@ TEST_F(AcquireTokenByGSS, StopsTheProcessOnAnEmptyFurtherLeg)
     transport->replies = {NegotiationReply("c1", "Zmlyc3Q=", "")};
     ScriptedHandler handler({"one", ""});
     EXPECT_DEATH(
-        Acquire(handler), "!leg\\.empty\\(\\).*lib/ssoClient/SecurityTokenServiceImpl.*794");
+        Acquire(handler),
+        "PanicVerify failed: !leg\\.empty\\(\\) "
+        "\\(lib/ssoClient/SecurityTokenServiceImpl:794\\)\n");
 }
 
 TEST_F(AcquireTokenByGSS, RefusesAReplyWithoutContextId)

@@ -1,11 +1,14 @@
 #include "negotiationFakes.h"
+#include "quillon/http/HttpException.h"
 #include "quillon/service/Logger.h"
+#include "quillon/system/ThreadPool.h"
 #include "serviceFakes.h"
 #include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/RequestBuilderImpl.h"
 #include "ssoClient/ResponseHandlerImpl.h"
 #include "ssoClient/SecurityTokenServiceImpl.h"
+#include "support/Awaited.h"
 #include "support/FakeSamlToken.h"
 #include "support/FixedClock.h"
 
@@ -13,10 +16,13 @@
 #include <boost/smart_ptr/weak_ptr.hpp>
 #include <gmock/gmock.h>
 
+#include <csignal>
+#include <cstdio>
 #include <future>
 #include <memory>
 #include <mutex>
 #include <thread>
+#include <typeinfo>
 
 using namespace SsoClient;
 using testing::ElementsAre;
@@ -27,8 +33,6 @@ using TokenPtr = boost::shared_ptr<const SamlToken>;
 namespace {
 
 #define WST "http://docs.oasis-open.org/ws-sx/ws-trust/200512"
-
-constexpr char Unit[] = "lib/ssoClient/SecurityTokenServiceImpl";
 
 std::string Reply(const std::string& response)
 {
@@ -62,45 +66,6 @@ std::string FaultReply(const std::string& code)
         "<S:Fault><faultcode xmlns:w=\"" WST "\">" + code
         + "</faultcode><faultstring>no</faultstring></S:Fault>");
 }
-
-/** What a completion was told, kept beyond its call. */
-template <class Result>
-struct Told
-{
-    Result result;
-    std::shared_ptr<Quillon::Exception> error;
-    std::thread::id thread;
-
-    std::string Describe() const
-    {
-        return error ? Quillon::GetClassName(*error) + ": " + error->what() : "success";
-    }
-};
-
-/** A completion that can be waited for; a second call of it would throw. */
-template <class Result>
-class Awaited
-{
-public:
-    boost::function<void(const Result&, const Quillon::Exception*)> GetCompletion()
-    {
-        return [promise = _promise](const Result& result, const Quillon::Exception* error) {
-            promise->set_value(
-                {result,
-                 std::shared_ptr<Quillon::Exception>(error != nullptr ? error->Clone() : nullptr),
-                 std::this_thread::get_id()});
-        };
-    }
-
-    Told<Result> Get() { return _promise->get_future().get(); }
-
-private:
-    std::shared_ptr<std::promise<Told<Result>>> _promise =
-        std::make_shared<std::promise<Told<Result>>>();
-};
-
-using AwaitedToken = Awaited<TokenPtr>;
-using AwaitedVerdict = Awaited<boost::optional<bool>>;
 
 class AsyncOperation : public testing::Test
 {
@@ -257,6 +222,48 @@ TEST_F(AsyncOperation, DeliversBadCredentialsWithTheirDynamicType)
     EXPECT_THROW(told.error->Throw(), InvalidCredentialsException);
 }
 
+namespace {
+
+/** Has an operation fail on a thread of the pool, and raises the clone of its exception here. */
+template <class Failure>
+void ExpectToKeepItsType(
+    const boost::shared_ptr<FakeTransport>& transport,
+    const SecurityTokenService& service,
+    const TokenPtr& token)
+{
+    transport->failure = boost::make_shared<Failure>("text");
+    const std::string text = transport->failure->what();
+    AwaitedVerdict awaited;
+    service.ValidateSubjectAsync(token, awaited.GetCompletion());
+    const auto told = awaited.Get();
+    ASSERT_NE(told.error, nullptr);
+    try {
+        told.error->Throw();
+    } catch (const std::exception& raised) {
+        EXPECT_EQ(typeid(raised), typeid(Failure));
+        EXPECT_EQ(raised.what(), text);
+    }
+}
+
+} // namespace
+
+TEST_F(AsyncOperation, DeliversEveryExceptionWithItsDynamicType)
+{
+    const auto service = MakeService();
+    const TokenPtr token = MakePresented();
+    ExpectToKeepItsType<SsoException>(transport, *service, token);
+    ExpectToKeepItsType<InvalidTokenException>(transport, *service, token);
+    ExpectToKeepItsType<ParseException>(transport, *service, token);
+    ExpectToKeepItsType<InvalidSignatureException>(transport, *service, token);
+    ExpectToKeepItsType<CommunicationException>(transport, *service, token);
+    ExpectToKeepItsType<InvalidCredentialsException>(transport, *service, token);
+    ExpectToKeepItsType<Quillon::InvalidArgumentException>(transport, *service, token);
+    ExpectToKeepItsType<Quillon::InvalidStateException>(transport, *service, token);
+    ExpectToKeepItsType<Quillon::Base64FormatException>(transport, *service, token);
+    ExpectToKeepItsType<Quillon::TypeMismatchException>(transport, *service, token);
+    ExpectToKeepItsType<Quillon::Http::HttpException>(transport, *service, token);
+}
+
 TEST_F(AsyncOperation, DeliversBadArgumentsInsteadOfRaisingThem)
 {
     spec.tokenLifetimeSec = 0;
@@ -375,9 +382,15 @@ TEST_F(AsyncOperation, GoesOnAfterACompletionThatThrew)
 
 namespace {
 
-std::string StopPattern()
+constexpr char StoppedBeforeAnythingWasQueued[] =
+    "PanicVerify failed: _p \\(lib/ssoClient/SecurityTokenServiceImpl:488\\)\n0 threads\n";
+
+/** The pool starts its threads with the first work. */
+void CountThreadsAtTheEnd()
 {
-    return std::string("_p.*") + Unit + ".*488";
+    std::signal(SIGABRT, [](int) {
+        std::fprintf(stderr, "%zu threads\n", Quillon::System::GetThreadPool()->GetThreadCount());
+    });
 }
 
 const TokenCompletion TokenIsUnexpected = [](const TokenPtr&, const Quillon::Exception*) {
@@ -390,22 +403,40 @@ const ValidationCompletion VerdictIsUnexpected = [](const boost::optional<bool>&
 
 TEST_F(AsyncOperation, StopsTheProcessOnANullTokenToRenew)
 {
-    EXPECT_DEATH(MakeService()->RenewTokenAsync(nullptr, 300, TokenIsUnexpected), StopPattern());
+    EXPECT_DEATH(
+        {
+            CountThreadsAtTheEnd();
+            MakeService()->RenewTokenAsync(nullptr, 300, TokenIsUnexpected);
+        },
+        StoppedBeforeAnythingWasQueued);
 }
 
 TEST_F(AsyncOperation, StopsTheProcessOnANullTokenToValidate)
 {
-    EXPECT_DEATH(MakeService()->ValidateSubjectAsync(nullptr, VerdictIsUnexpected), StopPattern());
+    EXPECT_DEATH(
+        {
+            CountThreadsAtTheEnd();
+            MakeService()->ValidateSubjectAsync(nullptr, VerdictIsUnexpected);
+        },
+        StoppedBeforeAnythingWasQueued);
 }
 
 TEST_F(AsyncOperation, StopsTheProcessOnANullTokenToPresent)
 {
     EXPECT_DEATH(
-        MakeService()->AcquireTokenByTokenAsync(nullptr, spec, TokenIsUnexpected), StopPattern());
+        {
+            CountThreadsAtTheEnd();
+            MakeService()->AcquireTokenByTokenAsync(nullptr, spec, TokenIsUnexpected);
+        },
+        StoppedBeforeAnythingWasQueued);
 }
 
 TEST_F(AsyncOperation, StopsTheProcessOnANullHandler)
 {
     EXPECT_DEATH(
-        MakeService()->AcquireTokenByGssAsync(spec, nullptr, TokenIsUnexpected), StopPattern());
+        {
+            CountThreadsAtTheEnd();
+            MakeService()->AcquireTokenByGssAsync(spec, nullptr, TokenIsUnexpected);
+        },
+        StoppedBeforeAnythingWasQueued);
 }

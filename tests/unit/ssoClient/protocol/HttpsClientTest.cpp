@@ -10,6 +10,8 @@
 #include <gtest/gtest.h>
 
 #include <future>
+#include <memory>
+#include <thread>
 #include <type_traits>
 
 using namespace SsoClient;
@@ -328,17 +330,30 @@ TEST(SendRequestAsync, EndsTheExchangeWhenItsItemIsLetGo)
     EXPECT_FALSE(called);
 }
 
-TEST(SendRequestAsync, CallsBackOnAnotherThread)
+/** The thread on which a request that this thread sends calls back. */
+std::thread::id GetCallbackThread(const TestServer& server)
 {
-    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
-    std::promise<std::thread::id> caller;
+    std::promise<std::thread::id> thread;
     Ref<ScheduledItem> pending;
     const boost::shared_ptr<TransportSession> session = MakeClient(server).CreateSession();
     session->SendRequestAsync(
         MakeRequest(),
-        [&](const Exception*, Reader*) { caller.set_value(std::this_thread::get_id()); },
+        [&](const Exception*, Reader*) { thread.set_value(std::this_thread::get_id()); },
         pending);
-    EXPECT_NE(caller.get_future().get(), std::this_thread::get_id());
+    return thread.get_future().get();
+}
+
+TEST(SendRequestAsync, CallsBackOnTheThreadOfTheHttpClient)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
+    const std::thread::id first = GetCallbackThread(server);
+    std::thread::id second;
+    std::thread other([&] { second = GetCallbackThread(server); });
+    const std::thread::id otherId = other.get_id();
+    other.join();
+    EXPECT_EQ(first, second);
+    EXPECT_NE(first, std::this_thread::get_id());
+    EXPECT_NE(second, otherId);
 }
 
 TEST(SendRequestAsync, CompletesAfterItsSessionIsGone)

@@ -278,6 +278,27 @@ TEST(HandleSPNegoResponse, RefusesLegThatIsNotBase64)
     }
 }
 
+TEST(HandleSPNegoResponse, RefusesALegThatIsNotOneText)
+{
+    for (const char* const content :
+         {"aGVs<!-- x -->bG8=",
+          "<!-- x -->aGVsbG8=",
+          "aGVsbG8=<!-- x -->",
+          "<x/>aGVsbG8=",
+          "<x/>"}) {
+        EXPECT_EQ(GetReplyFailure(Response(Exchange(content))), UnexpectedFormat) << content;
+    }
+    EXPECT_EQ(Handle(Reply(Response(Exchange("aGVs<![CDATA[bG8=]]>")))).leg, Hello);
+}
+
+TEST(HandleSPNegoResponse, RefusesATokenTypeThatIsNotOneText)
+{
+    for (const char* const end : {"<!-- x -->", "<!-- x -->#other", "<x/>"}) {
+        EXPECT_EQ(GetReplyFailure(Response(Token(std::string(SamlType) + end))), UnexpectedFormat)
+            << end;
+    }
+}
+
 TEST(HandleSPNegoResponse, RefusesAnyOtherTokenType)
 {
     const std::string profile =
