@@ -316,9 +316,7 @@ void SecurityTokenServiceImpl::StartSPNegotiation(
     }
     Request request;
     _requestBuilder->BuildInitialSPNegoRequest(spec, leg, request);
-    Quillon::Ref<Quillon::Reader> reply;
-    session.SendRequest(request, reply);
-    _responseHandler->HandleSPNegoResponse(reply.get(), response);
+    SendLeg(session, request, response);
 }
 
 void SecurityTokenServiceImpl::ContinueSPNegotiation(
@@ -332,6 +330,12 @@ void SecurityTokenServiceImpl::ContinueSPNegotiation(
     }
     Request request;
     _requestBuilder->BuildContinuedSPNegoRequest(contextId, leg, request);
+    SendLeg(session, request, response);
+}
+
+void SecurityTokenServiceImpl::SendLeg(
+    TransportSession& session, const Request& request, SPNegoResponse& response) const
+{
     Quillon::Ref<Quillon::Reader> reply;
     session.SendRequest(request, reply);
     _responseHandler->HandleSPNegoResponse(reply.get(), response);

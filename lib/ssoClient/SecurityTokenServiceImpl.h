@@ -74,6 +74,9 @@ private:
         const std::string& contextId,
         SPNegoResponse& response) const;
 
+    /** Sends a request of a negotiation in its session. */
+    void SendLeg(TransportSession& session, const Request& request, SPNegoResponse& response) const;
+
     /** Lets the handler answer the last reply, and sends the answer. */
     void ExchangeLegs(
         TransportSession& session,
