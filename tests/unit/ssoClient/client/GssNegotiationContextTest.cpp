@@ -91,6 +91,20 @@ TEST_F(NegotiateToken, BeginsAnewAfterAReplyWithoutContextId)
     EXPECT_EQ(transport->sent[1].soapAction, WST "/RST/Issue");
 }
 
+TEST_F(NegotiateToken, BeginsAnewAfterALaterReplyWithoutContextId)
+{
+    transport->replies = {
+        NegotiationReply("c1", "Zmlyc3Q=", ""),
+        NegotiationReply("", "c2Vjb25k", ""),
+        NegotiationReply("c3", "Zmlyc3Q=", "")};
+    const auto context = MakeContext();
+    context->NegotiateToken(ToLeg("one"));
+    context->NegotiateToken(ToLeg("two"));
+    context->NegotiateToken(ToLeg("three"));
+    EXPECT_EQ(transport->sent[1].soapAction, WST "/RSTR/Issue");
+    EXPECT_EQ(transport->sent[2].soapAction, WST "/RST/Issue");
+}
+
 TEST_F(NegotiateToken, GoesOnAfterTheToken)
 {
     transport->replies = {
