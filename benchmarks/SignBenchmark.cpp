@@ -3,7 +3,7 @@
 #include "Floor.h"
 #include "TestData.h"
 
-#include "ssoClient/RequestBuilderImpl.h"
+#include "ssoClient/protocol/RequestBuilderImpl.h"
 
 #include <benchmark/benchmark.h>
 

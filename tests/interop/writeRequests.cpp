@@ -2,7 +2,7 @@
 // to judge: interop_requests FOLDER KEY TIME, where KEY names a key of the test data.
 
 #include "ssoClient/CreateSamlToken.h"
-#include "ssoClient/RequestBuilderImpl.h"
+#include "ssoClient/protocol/RequestBuilderImpl.h"
 #include "support/FixedClock.h"
 #include "support/TestData.h"
 

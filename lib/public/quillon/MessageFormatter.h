@@ -1,7 +1,6 @@
 #pragma once
 
 #include "quillon/Export.h"
-#include "quillon/system/DateTime.h"
 
 #include <initializer_list>
 #include <string>
@@ -15,15 +14,6 @@ namespace Quillon {
  */
 template <class T>
 struct ToStringFormatter;
-
-template <>
-struct ToStringFormatter<System::DateTime>
-{
-    static std::string Format(const System::DateTime* value)
-    {
-        return value == nullptr ? "(null)" : value->ToString();
-    }
-};
 
 /** Messages with numbered placeholders `%1` to `%9`. */
 class QUILLON_API MessageFormatter

@@ -2,7 +2,7 @@
 
 #include "crypto/Digest.h"
 #include "crypto/Handles.h"
-#include "crypto/Keys.h"
+#include "crypto/PublicKeyImpl.h"
 
 #include <array>
 #include <cstdio>

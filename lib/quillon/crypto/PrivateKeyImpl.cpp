@@ -1,7 +1,7 @@
 #include "quillon/crypto/PrivateKey.h"
 
 #include "crypto/Handles.h"
-#include "crypto/Keys.h"
+#include "crypto/keyFacts.h"
 
 #include <algorithm>
 #include <cstring>

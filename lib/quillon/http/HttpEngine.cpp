@@ -1,7 +1,7 @@
 #include "http/HttpEngine.h"
 
-#include "system/ProcessEnd.h"
-#include "system/SignalBlock.h"
+#include "threads/ProcessEnd.h"
+#include "threads/SignalBlock.h"
 
 #include <unistd.h>
 #include <utility>

@@ -26,8 +26,9 @@ std::string_view Trim(std::string_view text) noexcept
 bool ReplyCollector::AddHeaderLine(std::string_view line)
 {
     _headerBytes += line.size();
-    if (_headerBytes > MaxHeaderBytes) {
-        _problem = "has more than " + std::to_string(MaxHeaderBytes) + " bytes of headers";
+    if (_headerBytes > ReplyLimits::MaxHeaderBytes) {
+        _problem =
+            "has more than " + std::to_string(ReplyLimits::MaxHeaderBytes) + " bytes of headers";
         return false;
     }
     if (_expectsStatus) {
@@ -76,8 +77,8 @@ bool ReplyCollector::AddField(std::string_view name, std::string_view value)
 
 bool ReplyCollector::AddBody(std::string_view piece)
 {
-    if (piece.size() > MaxBodyBytes - _body.size()) {
-        _problem = "is larger than " + std::to_string(MaxBodyBytes) + " bytes";
+    if (piece.size() > ReplyLimits::MaxBodyBytes - _body.size()) {
+        _problem = "is larger than " + std::to_string(ReplyLimits::MaxBodyBytes) + " bytes";
         return false;
     }
     _body.append(piece);

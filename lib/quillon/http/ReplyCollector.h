@@ -1,9 +1,7 @@
 #pragma once
 
 #include "quillon/http/ClientResponse.h"
-#include "quillon/xml/Parser.h"
 
-#include <cstddef>
 #include <string>
 #include <string_view>
 
@@ -16,10 +14,6 @@ namespace Quillon::Http {
 class ReplyCollector
 {
 public:
-    /** What an XML document may have: a larger reply would be refused after it was read. */
-    static constexpr std::size_t MaxBodyBytes = Xml::ParserLimits::MaxDocumentBytes;
-    static constexpr std::size_t MaxHeaderBytes = std::size_t{64} * 1024;
-
     /** Takes one line of a header, interim replies and trailers included. @return acceptance. */
     bool AddHeaderLine(std::string_view line);
 

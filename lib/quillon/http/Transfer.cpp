@@ -79,7 +79,7 @@ void Transfer::SetLimits()
     const long timeout = ToMilliseconds(_request->GetTimeout());
     Set(CURLOPT_TIMEOUT_MS, timeout);
     Set(CURLOPT_CONNECTTIMEOUT_MS, timeout);
-    Set(CURLOPT_MAXFILESIZE_LARGE, static_cast<curl_off_t>(ReplyCollector::MaxBodyBytes));
+    Set(CURLOPT_MAXFILESIZE_LARGE, static_cast<curl_off_t>(ReplyLimits::MaxBodyBytes));
     Set(CURLOPT_NOSIGNAL, 1L);
     // A transfer that ends early does not wait for its name look-up, and with it all the others.
     Set(CURLOPT_QUICK_EXIT, 1L);
@@ -268,7 +268,7 @@ std::string Transfer::Describe(CURLcode result) const
         return "The TLS handshake with " + server + " failed: " + detail + ".";
     case CURLE_FILESIZE_EXCEEDED:
         return "The reply of " + server + " is larger than "
-               + std::to_string(ReplyCollector::MaxBodyBytes) + " bytes.";
+               + std::to_string(ReplyLimits::MaxBodyBytes) + " bytes.";
     case CURLE_GOT_NOTHING:
         return "The server " + server + " closed the connection without a reply.";
     case CURLE_PARTIAL_FILE:

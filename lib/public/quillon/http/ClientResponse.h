@@ -3,6 +3,7 @@
 #include "quillon/Reader.h"
 #include "quillon/Ref.h"
 
+#include <cstddef>
 #include <string>
 
 namespace Quillon::Http {
@@ -12,6 +13,13 @@ struct HttpStatus
 {
     int code = 0;
     std::string reasonPhrase; ///< may be empty
+};
+
+/** A reply that exceeds one of these is an error of the exchange. */
+struct ReplyLimits
+{
+    static constexpr std::size_t MaxBodyBytes = std::size_t{8} * 1024 * 1024;
+    static constexpr std::size_t MaxHeaderBytes = std::size_t{64} * 1024; ///< trailers included
 };
 
 /**

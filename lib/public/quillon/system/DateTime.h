@@ -1,6 +1,7 @@
 #pragma once
 
 #include "quillon/Exceptions.h"
+#include "quillon/MessageFormatter.h"
 
 #include <cstdint>
 #include <string>
@@ -86,3 +87,16 @@ private:
 QUILLON_API DateTime DateTimeFromUtc(long long utcTime, bool local);
 
 } // namespace Quillon::System
+
+namespace Quillon {
+
+template <>
+struct ToStringFormatter<System::DateTime>
+{
+    static std::string Format(const System::DateTime* value)
+    {
+        return value == nullptr ? "(null)" : value->ToString();
+    }
+};
+
+} // namespace Quillon

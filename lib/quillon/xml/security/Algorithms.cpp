@@ -1,5 +1,7 @@
 #include "xml/security/Algorithms.h"
+
 #include "core/Quote.h"
+#include "crypto/acceptedKeys.h"
 
 #include "quillon/xml/security/Exceptions.h"
 #include "quillon/xml/security/Identifiers.h"
@@ -24,8 +26,6 @@ constexpr std::array<SignatureAlgorithm, 6> SignatureAlgorithms{{
     {EcdsaSha384, KeyType::EC, HashAlgorithm::SHA384},
     {EcdsaSha512, KeyType::EC, HashAlgorithm::SHA512},
 }};
-
-constexpr int MinRsaBits = 2048;
 
 } // namespace
 
@@ -59,7 +59,7 @@ Crypto::HashAlgorithm GetDigestAlgorithm(std::string_view identifier)
 
 bool IsAcceptedKey(const SignatureAlgorithm& algorithm, Crypto::KeyType type, int bits) noexcept
 {
-    return type == algorithm.keyType && (type != KeyType::RSA || bits >= MinRsaBits);
+    return type == algorithm.keyType && Crypto::IsStrongEnough(type, bits);
 }
 
 } // namespace Quillon::Xml::Security

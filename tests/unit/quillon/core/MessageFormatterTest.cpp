@@ -76,10 +76,3 @@ TEST(ASPrint, UsesTheFormatterOfAType)
     const Point* none = nullptr;
     EXPECT_EQ("3|4 3|4 nowhere", MessageFormatter::ASPrint("%1 %2 %3", point, &point, none));
 }
-
-TEST(ASPrint, FormatsATime)
-{
-    const Quillon::System::DateTime time;
-    const Quillon::System::DateTime* none = nullptr;
-    EXPECT_EQ("1970-01-01T00:00:00.000Z (null)", MessageFormatter::ASPrint("%1 %2", time, none));
-}

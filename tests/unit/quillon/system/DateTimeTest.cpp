@@ -249,3 +249,10 @@ TEST(DateTime, ComparesInstants)
     EXPECT_TRUE(early != late);
     EXPECT_TRUE(late == DateTime("2012-01-31T12:00:00+01:00"));
 }
+
+TEST(DateTime, FillsAPlaceholder)
+{
+    const DateTime time;
+    const DateTime* none = nullptr;
+    EXPECT_EQ("1970-01-01T00:00:00.000Z (null)", MessageFormatter::ASPrint("%1 %2", time, none));
+}

@@ -2,9 +2,9 @@
 #include "negotiationFakes.h"
 #include "serviceFakes.h"
 #include "ssoClient/Exceptions.h"
-#include "ssoClient/RequestBuilderImpl.h"
-#include "ssoClient/ResponseHandlerImpl.h"
-#include "ssoClient/SecurityTokenServiceImpl.h"
+#include "ssoClient/client/SecurityTokenServiceImpl.h"
+#include "ssoClient/protocol/RequestBuilderImpl.h"
+#include "ssoClient/protocol/ResponseHandlerImpl.h"
 #include "support/Failure.h"
 #include "support/FixedClock.h"
 

@@ -1,11 +1,11 @@
-#include "ssoClient/GssNegotiationContextImpl.h"
+#include "ssoClient/client/GssNegotiationContextImpl.h"
 
 #include "logCapture.h"
 #include "negotiationFakes.h"
 #include "serviceFakes.h"
 #include "ssoClient/Exceptions.h"
-#include "ssoClient/RequestBuilderImpl.h"
-#include "ssoClient/ResponseHandlerImpl.h"
+#include "ssoClient/protocol/RequestBuilderImpl.h"
+#include "ssoClient/protocol/ResponseHandlerImpl.h"
 #include "support/Failure.h"
 #include "support/FixedClock.h"
 

@@ -1,4 +1,4 @@
-#include "ssoClient/SecurityTokenServiceImpl.h"
+#include "ssoClient/client/SecurityTokenServiceImpl.h"
 
 #include "logCapture.h"
 #include "quillon/Exceptions.h"
@@ -7,8 +7,8 @@
 #include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/Descriptions.h"
 #include "ssoClient/Exceptions.h"
-#include "ssoClient/RequestBuilderImpl.h"
-#include "ssoClient/ResponseHandlerImpl.h"
+#include "ssoClient/protocol/RequestBuilderImpl.h"
+#include "ssoClient/protocol/ResponseHandlerImpl.h"
 #include "support/Failure.h"
 #include "support/FixedClock.h"
 #include "support/TestData.h"

@@ -1,12 +1,12 @@
-#include "ssoClient/SecurityTokenServiceImpl.h"
+#include "ssoClient/client/SecurityTokenServiceImpl.h"
 
 #include "logCapture.h"
 #include "serviceFakes.h"
 #include "ssoClient/Descriptions.h"
 #include "ssoClient/Exceptions.h"
-#include "ssoClient/RequestBuilderImpl.h"
-#include "ssoClient/ResponseHandlerImpl.h"
-#include "ssoClient/descriptions.h"
+#include "ssoClient/client/descriptions.h"
+#include "ssoClient/protocol/RequestBuilderImpl.h"
+#include "ssoClient/protocol/ResponseHandlerImpl.h"
 #include "support/FakeSamlToken.h"
 #include "support/FixedClock.h"
 

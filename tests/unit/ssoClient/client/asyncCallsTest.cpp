@@ -1,4 +1,4 @@
-#include "ssoClient/asyncCalls.h"
+#include "ssoClient/client/asyncCalls.h"
 
 #include "ssoClient/Exceptions.h"
 #include "support/FakeSamlToken.h"
@@ -132,9 +132,3 @@ TEST_F(SyncCallToResultFuncTest, RaisesTheEmptyFunctionErrorForAnEmptyCompletion
         EXPECT_STREQ(error.what(), "call to empty boost::function");
     }
 }
-
-// Bound without arguments, it takes whatever it is given.
-static_assert(std::is_constructible_v<
-              boost::function<void(const TokenPtr&, const Quillon::Exception*)>,
-              decltype(boost::bind(&noop))>);
-static_assert(noexcept(noop()));

@@ -1,4 +1,4 @@
-#include "ssoClient/descriptions.h"
+#include "ssoClient/client/descriptions.h"
 
 #include "support/FakeSamlToken.h"
 

@@ -1,8 +1,8 @@
 #include "ssoClient/GssNegotiationContext.h"
-#include "ssoClient/RequestBuilder.h"
-#include "ssoClient/ResponseHandler.h"
 #include "ssoClient/SecurityTokenService.h"
-#include "ssoClient/Transport.h"
+#include "ssoClient/protocol/RequestBuilder.h"
+#include "ssoClient/protocol/ResponseHandler.h"
+#include "ssoClient/protocol/Transport.h"
 
 #include <gmock/gmock.h>
 

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "ssoClient/logging.h"
+#include "ssoClient/client/logging.h"
 
 #include <string>
 #include <vector>

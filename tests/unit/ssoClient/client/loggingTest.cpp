@@ -1,4 +1,4 @@
-#include "ssoClient/logging.h"
+#include "ssoClient/client/logging.h"
 
 #include "logCapture.h"
 

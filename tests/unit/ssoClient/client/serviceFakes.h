@@ -1,8 +1,8 @@
 #pragma once
 
 #include "quillon/Exceptions.h"
-#include "ssoClient/ResponseHandler.h"
-#include "ssoClient/Transport.h"
+#include "ssoClient/protocol/ResponseHandler.h"
+#include "ssoClient/protocol/Transport.h"
 #include "support/TestData.h"
 
 #include <boost/smart_ptr/make_shared.hpp>

@@ -1,7 +1,7 @@
 #pragma once
 
 #include "quillon/xml/Parser.h"
-#include "ssoClient/xmlCommonBuilders.h"
+#include "ssoClient/message/xmlCommonBuilders.h"
 
 #include <string>
 

@@ -1,4 +1,4 @@
-#include "ssoClient/xmlCommonBuilders.h"
+#include "ssoClient/message/xmlCommonBuilders.h"
 
 #include "builderText.h"
 #include "support/FakeSamlToken.h"

@@ -1,4 +1,4 @@
-#include "ssoClient/xmlRequestBuilders.h"
+#include "ssoClient/message/xmlRequestBuilders.h"
 
 #include "builderText.h"
 #include "support/FakeSamlToken.h"

@@ -1,4 +1,4 @@
-#include "ssoClient/xmlSecurityBuilders.h"
+#include "ssoClient/message/xmlSecurityBuilders.h"
 
 #include "builderText.h"
 #include "support/FixedClock.h"

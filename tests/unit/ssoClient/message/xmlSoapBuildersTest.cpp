@@ -1,7 +1,7 @@
-#include "ssoClient/xmlSoapBuilders.h"
+#include "ssoClient/message/xmlSoapBuilders.h"
 
 #include "builderText.h"
-#include "ssoClient/xmlSecurityBuilders.h"
+#include "ssoClient/message/xmlSecurityBuilders.h"
 #include "support/FixedClock.h"
 #include "support/TestData.h"
 #include "support/Xmlsec1.h"

@@ -1,10 +1,11 @@
-#include "ssoClient/HttpsClient.h"
+#include "ssoClient/protocol/HttpsClient.h"
 
 #include "quillon/http/HttpException.h"
 #include "ssoClient/Exceptions.h"
 #include "support/TestServer.h"
 #include "support/TestTls.h"
 
+#include <boost/bind/bind.hpp>
 #include <boost/smart_ptr/make_shared.hpp>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -527,5 +528,9 @@ TEST(Request, OverwritesItsBodyWhenItGoes)
     request->~Request();
     EXPECT_EQ(std::string_view::npos, bytes.find("secret"));
 }
+
+// Bound without arguments, it takes whatever it is given.
+static_assert(std::is_constructible_v<ResponseCallback, decltype(boost::bind(&noop))>);
+static_assert(noexcept(noop()));
 
 } // namespace

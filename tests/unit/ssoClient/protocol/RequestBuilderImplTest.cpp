@@ -1,4 +1,4 @@
-#include "ssoClient/RequestBuilderImpl.h"
+#include "ssoClient/protocol/RequestBuilderImpl.h"
 
 #include "quillon/xml/Parser.h"
 #include "support/Failure.h"

@@ -1,8 +1,8 @@
-#include "ssoClient/ResponseHandlerImpl.h"
+#include "ssoClient/protocol/ResponseHandlerImpl.h"
 
 #include "quillon/xml/Parser.h"
 #include "ssoClient/Exceptions.h"
-#include "ssoClient/xmlReading.h"
+#include "ssoClient/wire/xmlReading.h"
 #include "support/Failure.h"
 
 #include <gmock/gmock.h>

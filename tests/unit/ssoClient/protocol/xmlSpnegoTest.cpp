@@ -1,6 +1,6 @@
-#include "ssoClient/xmlSpnego.h"
+#include "ssoClient/protocol/xmlSpnego.h"
 
-#include "ssoClient/ResponseHandlerImpl.h"
+#include "ssoClient/protocol/ResponseHandlerImpl.h"
 #include "support/Failure.h"
 #include "support/FixedClock.h"
 #include "support/TestData.h"

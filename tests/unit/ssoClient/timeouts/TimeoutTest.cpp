@@ -1,6 +1,6 @@
 #include "ssoClient/GssNegotiationContext.h"
-#include "ssoClient/HttpsClient.h"
 #include "ssoClient/SecurityTokenService.h"
+#include "ssoClient/protocol/HttpsClient.h"
 #include "support/TestData.h"
 
 #include <gmock/gmock.h>

@@ -1,9 +1,9 @@
-#include "ssoClient/SamlTokenImpl.h"
+#include "ssoClient/token/SamlTokenImpl.h"
 
 #include "quillon/xml/Parser.h"
 #include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/Exceptions.h"
-#include "ssoClient/wireNames.h"
+#include "ssoClient/wire/wireNames.h"
 #include "unit/ssoClient/token/TokenText.h"
 
 #include <gtest/gtest.h>

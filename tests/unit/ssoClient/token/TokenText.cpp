@@ -3,7 +3,7 @@
 #include "quillon/Exceptions.h"
 #include "quillon/StringUtil.h"
 #include "ssoClient/CreateSamlToken.h"
-#include "ssoClient/wireNames.h"
+#include "ssoClient/wire/wireNames.h"
 
 #include <openssl/evp.h>
 #include <openssl/rsa.h>

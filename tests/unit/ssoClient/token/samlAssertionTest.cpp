@@ -1,6 +1,6 @@
-#include "ssoClient/samlAssertion.h"
+#include "ssoClient/token/samlAssertion.h"
 
-#include "ssoClient/wireNames.h"
+#include "ssoClient/wire/wireNames.h"
 #include "unit/ssoClient/token/TokenText.h"
 
 #include <gtest/gtest.h>

@@ -1,4 +1,4 @@
-#include "ssoClient/samlStatements.h"
+#include "ssoClient/token/samlStatements.h"
 
 #include "unit/ssoClient/token/TokenText.h"
 

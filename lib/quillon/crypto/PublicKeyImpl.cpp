@@ -1,0 +1,75 @@
+#include "crypto/PublicKeyImpl.h"
+
+#include "crypto/Handles.h"
+#include "crypto/keyFacts.h"
+
+#include <vector>
+
+namespace Quillon::Crypto {
+
+namespace {
+
+/** The DER form that OpenSSL wants of a signature given as r || s; empty if it is not one. */
+std::vector<unsigned char> ToDerEcdsa(
+    const EVP_PKEY* key, const unsigned char* signature, std::size_t length)
+{
+    const std::size_t half = GetEcdsaIntegerLength(key);
+    if (length != 2 * half) {
+        return {};
+    }
+    EcdsaSigOwner value(ECDSA_SIG_new());
+    BIGNUM* r = BN_bin2bn(signature, static_cast<int>(half), nullptr);
+    BIGNUM* s = BN_bin2bn(signature + half, static_cast<int>(half), nullptr);
+    if (!value || r == nullptr || s == nullptr || ECDSA_SIG_set0(value.get(), r, s) != 1) {
+        BN_free(r);
+        BN_free(s);
+        return {};
+    }
+    const int size = i2d_ECDSA_SIG(value.get(), nullptr);
+    std::vector<unsigned char> der(size > 0 ? static_cast<std::size_t>(size) : 0);
+    unsigned char* out = der.data();
+    if (size > 0) {
+        i2d_ECDSA_SIG(value.get(), &out);
+    }
+    return der;
+}
+
+} // namespace
+
+CryptoException::~CryptoException() = default;
+
+PublicKeyImpl::PublicKeyImpl(KeyOwner key)
+    : _key(std::move(key))
+    , _type(Crypto::GetKeyType(_key.get()))
+    , _bits(EVP_PKEY_get_bits(_key.get()))
+{}
+
+bool PublicKeyImpl::VerifyDigest(
+    HashAlgorithm algorithm,
+    const unsigned char* digest,
+    const unsigned char* signature,
+    std::size_t signatureLength) const
+{
+    const ErrorQueueScope errors;
+    std::vector<unsigned char> der;
+    if (_type == KeyType::EC) {
+        der = ToDerEcdsa(_key.get(), signature, signatureLength);
+        signature = der.data();
+        signatureLength = der.size();
+        if (der.empty()) {
+            return false;
+        }
+    }
+    const KeyContextOwner context(EVP_PKEY_CTX_new_from_pkey(nullptr, _key.get(), nullptr));
+    if (!context || EVP_PKEY_verify_init(context.get()) != 1
+        || (_type == KeyType::RSA
+            && EVP_PKEY_CTX_set_rsa_padding(context.get(), RSA_PKCS1_PADDING) != 1)
+        || EVP_PKEY_CTX_set_signature_md(context.get(), GetDigest(algorithm)) != 1) {
+        throw CryptoException("Cannot verify with a key of type " + GetDescription());
+    }
+    return EVP_PKEY_verify(
+               context.get(), signature, signatureLength, digest, GetDigestLength(algorithm))
+           == 1;
+}
+
+} // namespace Quillon::Crypto

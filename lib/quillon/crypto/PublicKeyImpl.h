@@ -1,0 +1,31 @@
+#pragma once
+
+#include "crypto/OpenSsl.h"
+#include "crypto/keyFacts.h"
+
+#include "quillon/crypto/PublicKey.h"
+
+namespace Quillon::Crypto {
+
+/** A public key over a handle that it owns. */
+class PublicKeyImpl final : public PublicKey
+{
+public:
+    explicit PublicKeyImpl(KeyOwner key);
+
+    KeyType GetKeyType() const noexcept override { return _type; }
+    int GetBits() const noexcept override { return _bits; }
+    std::string GetDescription() const override { return DescribeKey(_key.get()); }
+    bool VerifyDigest(
+        HashAlgorithm algorithm,
+        const unsigned char* digest,
+        const unsigned char* signature,
+        std::size_t signatureLength) const override;
+
+private:
+    KeyOwner _key;
+    KeyType _type;
+    int _bits;
+};
+
+} // namespace Quillon::Crypto

@@ -1,0 +1,38 @@
+#pragma once
+
+#include "ssoClient/GssNegotiationContext.h"
+#include "ssoClient/protocol/RequestBuilder.h"
+#include "ssoClient/protocol/ResponseHandler.h"
+#include "ssoClient/protocol/Transport.h"
+
+#include <list>
+#include <string>
+
+namespace SsoClient::InternalApi {
+
+class GssNegotiationContextImpl final : public virtual GssNegotiationContext
+{
+public:
+    /** @throws Quillon::InvalidArgumentException  there is no trusted certificate. */
+    GssNegotiationContextImpl(
+        const TokenSpec& spec,
+        const boost::shared_ptr<const RequestBuilder>& requestBuilder,
+        const boost::shared_ptr<TransportSession>& session,
+        const boost::shared_ptr<const ResponseHandler>& responseHandler,
+        const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates);
+
+    NegotiationResult NegotiateToken(const Leg& leg) override;
+
+private:
+    /** Sends the leg. @return the reply. */
+    Quillon::Ref<Quillon::Reader> Send(const Leg& leg);
+
+    TokenSpec _spec;
+    std::string _contextId; // of the last reply; empty before the first
+    boost::shared_ptr<const RequestBuilder> _requestBuilder;
+    boost::shared_ptr<TransportSession> _session;
+    boost::shared_ptr<const ResponseHandler> _responseHandler;
+    std::list<Quillon::Ref<const Quillon::Crypto::Certificate>> _trustedCertificates;
+};
+
+} // namespace SsoClient::InternalApi

@@ -1,0 +1,99 @@
+#pragma once
+
+#include "ssoClient/SecurityTokenService.h"
+#include "ssoClient/protocol/RequestBuilder.h"
+#include "ssoClient/protocol/ResponseHandler.h"
+#include "ssoClient/protocol/Transport.h"
+
+#include <list>
+
+namespace SsoClient {
+
+/** Each operation is one road: build a request, send it, read the reply, verify the token. */
+class SecurityTokenServiceImpl final : public SecurityTokenService
+{
+public:
+    SecurityTokenServiceImpl(
+        const boost::shared_ptr<const RequestBuilder>& requestBuilder,
+        const boost::shared_ptr<const Transport>& transport,
+        const boost::shared_ptr<const ResponseHandler>& responseHandler,
+        const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates);
+
+    boost::shared_ptr<const SamlToken> AcquireToken(
+        const std::string& userName,
+        const std::string& password,
+        const TokenSpec& spec) const override;
+    boost::shared_ptr<const SamlToken> AcquireTokenByGSS(
+        const TokenSpec& spec, NegotiationHandler& handler) const override;
+    boost::shared_ptr<const SamlToken> AcquireTokenByCertificate(
+        const TokenSpec& spec) const override;
+    boost::shared_ptr<const SamlToken> AcquireTokenByToken(
+        const SamlToken& token, const TokenSpec& spec) const override;
+    bool ValidateSubject(const SamlToken& token) const override;
+    boost::shared_ptr<const SamlToken> RenewToken(
+        const SamlToken& token, long long lifetimeSec) const override;
+
+    void AcquireTokenAsync(
+        const std::string& userName,
+        const std::string& password,
+        const TokenSpec& spec,
+        const TokenCompletion& completion) const override;
+    void AcquireTokenByGssAsync(
+        const TokenSpec& spec,
+        const boost::shared_ptr<NegotiationHandler>& handler,
+        const TokenCompletion& completion) const override;
+    void AcquireTokenByCertificateAsync(
+        const TokenSpec& spec, const TokenCompletion& completion) const override;
+    void AcquireTokenByTokenAsync(
+        const boost::shared_ptr<const SamlToken>& token,
+        const TokenSpec& spec,
+        const TokenCompletion& completion) const override;
+    void ValidateSubjectAsync(
+        const boost::shared_ptr<const SamlToken>& token,
+        const ValidationCompletion& completion) const override;
+    void RenewTokenAsync(
+        const boost::shared_ptr<const SamlToken>& token,
+        long long lifetimeSec,
+        const TokenCompletion& completion) const override;
+
+private:
+    /** Sends the request in a session of its own. @return the reply. */
+    Quillon::Ref<Quillon::Reader> Send(const Request& request) const;
+
+    /** Sends the first leg of a negotiation, which must not be empty. */
+    void StartSPNegotiation(
+        TransportSession& session,
+        const Leg& leg,
+        const TokenSpec& spec,
+        SPNegoResponse& response) const;
+
+    /** Sends a further leg, which must not be empty. */
+    void ContinueSPNegotiation(
+        TransportSession& session,
+        const Leg& leg,
+        const std::string& contextId,
+        SPNegoResponse& response) const;
+
+    /** Sends a request of a negotiation in its session. */
+    void SendLeg(TransportSession& session, const Request& request, SPNegoResponse& response) const;
+
+    /** Lets the handler answer the last reply, and sends the answer. */
+    void ExchangeLegs(
+        TransportSession& session,
+        const TokenSpec& spec,
+        NegotiationHandler& handler,
+        SPNegoResponse& response) const;
+
+    /** What an asynchronous operation works with: the caller's object may go meanwhile. */
+    boost::shared_ptr<const SecurityTokenService> Copy() const;
+
+    /** @return the verified token; null for an empty text. */
+    boost::shared_ptr<const SamlToken> ToSamlToken(const std::string& tokenXml) const;
+
+    boost::shared_ptr<const RequestBuilder> _requestBuilder;
+    boost::shared_ptr<const Transport> _transport;
+    boost::shared_ptr<const ResponseHandler> _responseHandler;
+    std::list<Quillon::Ref<const Quillon::Crypto::Certificate>> _trustedCertificates;
+};
+
+} // namespace SsoClient

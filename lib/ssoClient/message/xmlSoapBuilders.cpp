@@ -1,0 +1,169 @@
+#include "ssoClient/message/xmlSoapBuilders.h"
+
+#include "quillon/PanicVerify.h"
+#include "quillon/StringUtil.h"
+#include "quillon/xml/security/Identifiers.h"
+#include "ssoClient/message/xmlSecurityBuilders.h"
+#include "ssoClient/wire/wireNames.h"
+
+#include <boost/smart_ptr/make_shared.hpp>
+
+#include <utility>
+
+using Quillon::Ref;
+using Quillon::Xml::ElementNode;
+namespace Security = Quillon::Xml::Security;
+
+namespace SsoClient {
+
+namespace {
+
+constexpr char Unit[] = "lib/ssoClient/xmlSoapBuilders";
+constexpr char CertificateId[] = "holderOfKeyCertificate";
+
+void RequireHeaderBuilder(const XMLBuilderPtr& headerBuilder, int line)
+{
+    if (headerBuilder == nullptr) {
+        Quillon::PanicVerify("headerBuilder != __null", Unit, line);
+    }
+}
+
+ElementNode* RequireChild(
+    const ElementNode* parent,
+    const char* localName,
+    const char* namespaceUri,
+    const char* expression,
+    int line)
+{
+    ElementNode* const child = parent->FindChildElement(localName, namespaceUri);
+    if (child == nullptr) {
+        Quillon::PanicVerify(expression, Unit, line);
+    }
+    return child;
+}
+
+/** An xs:ID is a name and begins with no digit [XML Schema Part 2, 3.3.8], as most UUIDs do. */
+std::string GenerateUuidThatIsAName()
+{
+    std::string uuid = Quillon::StringUtil::GenerateUuid();
+    while (uuid.front() <= '9') {
+        uuid = Quillon::StringUtil::GenerateUuid();
+    }
+    return uuid;
+}
+
+} // namespace
+
+XMLBuilderPtr SoapBuilder(XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder)
+{
+    auto header = boost::make_shared<XMLCompositeBuilder>(ElementBuilder("soapenv", "Header"));
+    header->Add(std::move(headerBuilder));
+
+    // Some bodies use `wst` without declaring it.
+    auto body = boost::make_shared<XMLCompositeBuilder>(
+        ElementBuilder("soapenv", "Body", {{"xmlns:wst", Wire::WsTrustNamespace}}));
+    body->Add(std::move(bodyBuilder));
+
+    auto envelope = boost::make_shared<XMLCompositeBuilder>(
+        ElementBuilder("soapenv", "Envelope", {{"xmlns:soapenv", Wire::SoapNamespace}}));
+    envelope->Add(std::move(header)).Add(std::move(body));
+    return envelope;
+}
+
+XMLSignedSoapBuilder::XMLSignedSoapBuilder(
+    XMLBuilderPtr headerBuilder,
+    XMLBuilderPtr bodyBuilder,
+    const Quillon::Crypto::PrivateKey* key,
+    XMLBuilderPtr keyInfoBuilder)
+    : _headerBuilder(std::move(headerBuilder))
+    , _bodyBuilder(std::move(bodyBuilder))
+    , _key(key)
+    , _keyInfoBuilder(std::move(keyInfoBuilder))
+{
+    RequireHeaderBuilder(_headerBuilder, 339);
+}
+
+void XMLSignedSoapBuilder::build(Ref<ElementNode>& out) const
+{
+    SoapBuilder(_headerBuilder, _bodyBuilder)->build(out);
+    SignSoapMessage(_key, _keyInfoBuilder, out.get());
+}
+
+boost::shared_ptr<const XMLSignedSoapBuilder> SamlRefSignedSoapBuilder(
+    XMLBuilderPtr headerBuilder,
+    XMLBuilderPtr bodyBuilder,
+    const Quillon::Crypto::PrivateKey* key,
+    const std::string& assertionId)
+{
+    return boost::make_shared<XMLSignedSoapBuilder>(
+        std::move(headerBuilder),
+        std::move(bodyBuilder),
+        key,
+        WsseSamlKeyIdReferenceBuilder(assertionId));
+}
+
+boost::shared_ptr<const XMLSignedSoapBuilder> CertRefSignedSoapBuilder(
+    XMLBuilderPtr headerBuilder,
+    XMLBuilderPtr bodyBuilder,
+    const Quillon::Crypto::PrivateKey* key,
+    const Quillon::Crypto::Certificate* certificate)
+{
+    RequireHeaderBuilder(headerBuilder, 376);
+    auto header = boost::make_shared<XMLCompositeBuilder>(std::move(headerBuilder));
+    header->Add(WsseX509v3BinarySecTokenBuilder(CertificateId, certificate));
+    return boost::make_shared<XMLSignedSoapBuilder>(
+        std::move(header),
+        std::move(bodyBuilder),
+        key,
+        WsseX509v3BSTReferenceBuilder(CertificateId));
+}
+
+void SignSoapMessage(
+    const Quillon::Crypto::PrivateKey* key,
+    const XMLBuilderPtr& keyInfoBuilder,
+    ElementNode* envelope)
+{
+    ElementNode* const soapBody =
+        RequireChild(envelope, "Body", Wire::SoapNamespace, "soapBody != __null", 169);
+    ElementNode* const soapHeader =
+        RequireChild(envelope, "Header", Wire::SoapNamespace, "soapHeader != __null", 173);
+    ElementNode* const wsseSecurity =
+        RequireChild(soapHeader, "Security", Wire::WsseNamespace, "wsseSecurity != __null", 177);
+    // Every security header that is signed was made with a timestamp.
+    ElementNode* const timestamp = wsseSecurity->FindChildElement("Timestamp", Wire::WsuNamespace);
+
+    Ref<Security::Signature> signature;
+    Security::CreateBlankSignature(
+        envelope, Security::ExclusiveC14n, Security::RsaSha256, "ds", signature);
+    AddElementToSignature(signature.get(), soapBody);
+    AddElementToSignature(signature.get(), timestamp);
+    if (keyInfoBuilder != nullptr) {
+        Ref<ElementNode> keyInfo;
+        keyInfoBuilder->build(keyInfo);
+        signature->AddKeyInfoContent(keyInfo.get());
+    }
+    signature->Sign(key);
+    signature->GetElement()->DefineAttribute("Id", Wire::ProofSignatureId);
+    wsseSecurity->AppendChild(signature->GetElement());
+}
+
+std::string CreateWssuId(ElementNode* element)
+{
+    if (const auto* const attribute = element->FindAttribute("Id", Wire::WsuNamespace)) {
+        return std::string(attribute->value);
+    }
+    std::string id = GenerateUuidThatIsAName();
+    element->DefineAttribute("xmlns:wsu", Wire::WsuNamespace);
+    element->DefineAttribute("wsu:Id", id);
+    return id;
+}
+
+void AddElementToSignature(Security::Signature* signature, ElementNode* element)
+{
+    Security::Reference* const reference = signature->AddReference("#" + CreateWssuId(element));
+    reference->SetDigestMethod(Security::DigestSha256);
+    // The elements do not contain the signature, so there is no enveloped-signature transform.
+    reference->AddTransform(Security::ExclusiveC14n);
+}
+
+} // namespace SsoClient

@@ -1,0 +1,138 @@
+#include "ssoClient/protocol/HttpsClient.h"
+
+#include "quillon/PanicVerify.h"
+#include "quillon/http/HttpURL.h"
+#include "ssoClient/Exceptions.h"
+
+#include <boost/bind/bind.hpp>
+#include <boost/smart_ptr/make_shared.hpp>
+
+namespace SsoClient {
+
+namespace {
+
+namespace Http = Quillon::Http;
+
+/** SOAP 1.1 faults come with this status [SOAP11 6.2]. */
+constexpr int SoapFaultStatus = 500;
+
+Quillon::Ref<Http::ClientRequest> ComposeRequest(
+    Request const& request, std::string const& path, long long timeout)
+{
+    Quillon::Ref<Http::ClientRequest> httpRequest;
+    Http::CreateHttpRequest(Http::HttpMethod::POST, path, httpRequest);
+    httpRequest->SetHeader("Content-Type", "text/xml");
+    // The action is a quoted string [SOAP11 6.1.1].
+    httpRequest->SetHeader("SOAPAction", "\"" + request.soapAction + "\"");
+    httpRequest->GetBodyWriter()->Write(request.body.data(), request.body.size());
+    httpRequest->SetTimeout(timeout);
+    return httpRequest;
+}
+
+} // namespace
+
+HttpsClient::HttpsClient(
+    std::string const& url,
+    Quillon::Ssl::SSLContext* sslContext,
+    std::string const& peer,
+    long long timeout)
+    : _sslContext(sslContext)
+    , _timeout(timeout)
+{
+    bool isHttps = false;
+    std::string host;
+    int port = 0;
+    Http::ParseHttpURL(url, isHttps, host, port, _path);
+    if (isHttps && !_sslContext) {
+        throw Quillon::InvalidArgumentException(
+            "HTTPS connection requested but no SSLContext provided.");
+    }
+    Quillon::Ref<Http::ConnectionSpec> tcp;
+    Http::CreateTCPConnectionSpec(host, port, false, tcp);
+    if (isHttps) {
+        Http::CreateSSLConnectionSpec(tcp.get(), sslContext, host, peer, _connectionSpec);
+    } else {
+        _connectionSpec = tcp;
+    }
+}
+
+boost::shared_ptr<TransportSession> HttpsClient::CreateSession() const
+{
+    return boost::make_shared<HttpsSession>(_connectionSpec.get(), _path, _timeout);
+}
+
+HttpsSession::HttpsSession(Http::ConnectionSpec* spec, std::string const& path, long long timeout)
+    : _path(path)
+    , _timeout(timeout)
+{
+    Quillon::Ref<Http::CookieStore> cookies;
+    Http::CreateCookieStore("", cookies);
+    Http::CreateHttpUserAgent(spec, cookies.get(), nullptr, _userAgent);
+}
+
+void HttpsSession::SendRequest(Request const& request, Quillon::Ref<Quillon::Reader>& response)
+{
+    Quillon::Ref<Quillon::System::ScheduledItem> pending;
+    SendRequestAsync(request, boost::bind(&noop), pending);
+    Quillon::Ref<Http::ClientResponse> httpResponse;
+    _userAgent->WaitForResponse(
+        static_cast<Http::PendingRequestItem*>(pending.get()), _timeout, httpResponse);
+    boost::shared_ptr<Quillon::Exception> error;
+    TranslateResponse(nullptr, httpResponse.get(), error, response);
+    if (error) {
+        error->Throw();
+    }
+}
+
+void HttpsSession::SendRequestAsync(
+    Request const& request,
+    ResponseCallback const& callback,
+    Quillon::Ref<Quillon::System::ScheduledItem>& pending)
+{
+    const Http::Completion completion = boost::bind(
+        &AsyncTranslateResponse,
+        callback,
+        boost::placeholders::_1,
+        boost::placeholders::_2,
+        boost::placeholders::_3);
+    const Quillon::Ref<Http::ClientRequest> httpRequest = ComposeRequest(request, _path, _timeout);
+    Quillon::Ref<Http::PendingRequestItem> item;
+    _userAgent->SendRequestAsync(httpRequest.get(), completion, item);
+    pending = item;
+}
+
+void TranslateResponse(
+    Quillon::Exception const* error,
+    Http::ClientResponse* response,
+    boost::shared_ptr<Quillon::Exception>& outError,
+    Quillon::Ref<Quillon::Reader>& outBody)
+{
+    if (error != nullptr) {
+        outError = boost::make_shared<CommunicationException>(error->what());
+        return;
+    }
+    if (response == nullptr) {
+        Quillon::PanicVerify("response != __null", "lib/ssoClient/HttpsClient", __LINE__);
+    }
+    const Http::HttpStatus& status = response->GetStatus();
+    if (status.code / 100 == 2 || status.code == SoapFaultStatus) {
+        outBody = response->GetBody();
+        return;
+    }
+    outError = boost::make_shared<CommunicationException>(
+        "Server returned error: " + std::to_string(status.code) + " " + status.reasonPhrase);
+}
+
+void AsyncTranslateResponse(
+    ResponseCallback const& callback,
+    Quillon::Exception const* error,
+    Http::ClientResponse* response,
+    Http::PendingRequestItem* /*item*/)
+{
+    boost::shared_ptr<Quillon::Exception> outError;
+    Quillon::Ref<Quillon::Reader> outBody;
+    TranslateResponse(error, response, outError, outBody);
+    callback(outError.get(), outBody.get());
+}
+
+} // namespace SsoClient

@@ -1,0 +1,81 @@
+#pragma once
+
+#include "ssoClient/protocol/Transport.h"
+
+#include "quillon/http/ConnectionSpec.h"
+#include "quillon/http/UserAgent.h"
+#include "quillon/ssl/SSLContext.h"
+
+#include <string>
+
+namespace SsoClient {
+
+/** Posts SOAP 1.1 messages to the URL of a token service. */
+class HttpsClient final : public Transport
+{
+public:
+    /**
+     * @param url         of the service, `https` or `http`.
+     * @param sslContext  may be null only for `http`; kept by reference.
+     * @param peer        what the TLS peer must prove, see
+     *                    `Quillon::Http::CreateSSLConnectionSpec`.
+     * @param timeout     of each exchange, in microseconds.
+     *
+     * @throws Quillon::InvalidArgumentException  a malformed URL or peer, or no SSL context.
+     */
+    HttpsClient(
+        std::string const& url,
+        Quillon::Ssl::SSLContext* sslContext,
+        std::string const& peer,
+        long long timeout);
+
+    boost::shared_ptr<TransportSession> CreateSession() const override;
+
+private:
+    Quillon::Ref<Quillon::Http::ConnectionSpec> _connectionSpec;
+    Quillon::Ref<Quillon::Ssl::SSLContext> _sslContext;
+    std::string _path;
+    long long _timeout;
+};
+
+/** A conversation with cookies and connections of its own. */
+class HttpsSession final : public TransportSession
+{
+public:
+    HttpsSession(Quillon::Http::ConnectionSpec* spec, std::string const& path, long long timeout);
+
+    void SendRequest(Request const& request, Quillon::Ref<Quillon::Reader>& response) override;
+    void SendRequestAsync(
+        Request const& request,
+        ResponseCallback const& callback,
+        Quillon::Ref<Quillon::System::ScheduledItem>& pending) override;
+
+private:
+    Quillon::Ref<Quillon::Http::UserAgent> _userAgent;
+    std::string _path;
+    long long _timeout;
+};
+
+/**
+ * Decides what an answered or failed exchange means: a reply with status 2xx or 500 is the
+ * service's word (SOAP 1.1 sends faults with 500), everything else an error.
+ *
+ * @param error     why the exchange failed, or null.
+ * @param response  the reply; never null if `error` is.
+ * @param outError  receives a `CommunicationException`, or stays as it is.
+ * @param outBody   receives the body of an acceptable reply, or stays as it is.
+ */
+void TranslateResponse(
+    Quillon::Exception const* error,
+    Quillon::Http::ClientResponse* response,
+    boost::shared_ptr<Quillon::Exception>& outError,
+    Quillon::Ref<Quillon::Reader>& outBody);
+
+/** Hands what `TranslateResponse` makes of a completed exchange to `callback`. */
+void AsyncTranslateResponse(
+    ResponseCallback const& callback,
+    Quillon::Exception const* error,
+    Quillon::Http::ClientResponse* response,
+    Quillon::Http::PendingRequestItem* item);
+
+} // namespace SsoClient

@@ -1,0 +1,66 @@
+#pragma once
+
+#include "ssoClient/protocol/Request.h"
+
+#include "quillon/Exceptions.h"
+#include "quillon/Reader.h"
+#include "quillon/system/ScheduledItem.h"
+
+#include <boost/function.hpp>
+#include <boost/smart_ptr/shared_ptr.hpp>
+
+namespace SsoClient {
+
+/**
+ * Told how a request ended: an exception and no reply, or no exception and the reply's body. Both
+ * are valid during the call; a reply can be kept by reference.
+ */
+using ResponseCallback = boost::function<void(Quillon::Exception const*, Quillon::Reader*)>;
+
+/** A completion that wants to know nothing, bound without arguments. */
+inline void noop() noexcept {} // NOLINT(readability-identifier-naming)
+
+/**
+ * One conversation with the token service: its requests share the service's cookies and
+ * connection.
+ *
+ * Thread safety: one operation at a time.
+ */
+class TransportSession
+{
+public:
+    /**
+     * Sends a request and waits for the reply.
+     *
+     * @param response  receives the reply's body, which may be a SOAP fault.
+     * @throws CommunicationException         the service answered with another status.
+     * @throws Quillon::Http::HttpException   the exchange failed.
+     */
+    virtual void SendRequest(Request const& request, Quillon::Ref<Quillon::Reader>& response) = 0;
+
+    /**
+     * Sends a request and returns at once; `callback` is called once, on a thread of the HTTP
+     * client. Every failure is a `CommunicationException` there.
+     *
+     * @param pending  receives what can be called off; letting go of it calls it off, too.
+     */
+    virtual void SendRequestAsync(
+        Request const& request,
+        ResponseCallback const& callback,
+        Quillon::Ref<Quillon::System::ScheduledItem>& pending) = 0;
+
+protected:
+    ~TransportSession() = default;
+};
+
+/** The way to one token service. Thread safety: immutable. */
+class Transport
+{
+public:
+    virtual boost::shared_ptr<TransportSession> CreateSession() const = 0;
+
+protected:
+    ~Transport() = default;
+};
+
+} // namespace SsoClient
