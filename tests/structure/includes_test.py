@@ -109,6 +109,12 @@ class Includes(unittest.TestCase):
             or (include.is_quoted and not include.resolves_under(
                 "tools", include.path.parent.relative_to(sources.ROOT))))
 
+    # Its headers are 9,000 lines, which no other source shall pay for.
+    def test_parser_of_the_command_line_has_one_unit(self):
+        users = {sources.name(include.path) for include in sources.includes(sources.files("tools"))
+                 if include.target.startswith("CLI/")}
+        self.assertEqual({"tools/ssoclient/CommandLine.cpp", "tools/devsts/main.cpp"}, users)
+
     def test_command_line_and_examples_see_only_public_headers(self):
         paths = sources.files("tools/ssoclient", "examples")
         self.assert_none(

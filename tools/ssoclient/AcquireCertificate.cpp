@@ -27,16 +27,16 @@ ExitCode AcquireCertificate(const AcquireCertificateOptions& options)
 
 } // namespace
 
-void AddAcquireCertificateCommand(CLI::App& parent, Action& action)
+void AddAcquireCertificateCommand(const Command& parent, Action& action)
 {
-    CLI::App* command = parent.add_subcommand(
+    const Command command = parent.AddCommand(
         "certificate", "Acquire a holder-of-key token with one's own key and certificate");
     const auto options = std::make_shared<AcquireCertificateOptions>();
-    options->service.AddTo(*command);
-    options->identity.AddRequiredTo(*command);
-    options->token.AddTo(*command);
-    options->output.AddOutTo(*command);
-    options->output.AddJsonTo(*command);
-    command->callback(
+    options->service.AddTo(command);
+    options->identity.AddRequiredTo(command);
+    options->token.AddTo(command);
+    options->output.AddOutTo(command);
+    options->output.AddJsonTo(command);
+    command.WhenNamed(
         [options, &action] { action = [options] { return AcquireCertificate(*options); }; });
 }

@@ -32,52 +32,52 @@ ExitCode AcquireGss(const AcquireGssOptions& options)
     return ExitCode::DONE;
 }
 
-void AddKerberosTo(CLI::App& command, SsoClient::Gss::KerberosOptions& options)
+void AddKerberosTo(const Command& command, SsoClient::Gss::KerberosOptions& options)
 {
     command
-        .add_option(
+        .AddOption(
             "--service",
             options.service,
             "The Kerberos service, SERVICE@HOST or SERVICE/HOST[@REALM] (default: HTTP@ and the "
             "host of the URL)")
-        ->check(CheckName)
-        ->type_name("NAME");
-    CLI::Option* const ccache =
+        .Check(CheckName)
+        .ValueName("NAME");
+    const Option ccache =
         command
-            .add_option(
+            .AddOption(
                 "--ccache",
                 options.ccache,
                 "Credential cache with the ticket (default: the cache that kinit fills)")
-            ->check(CheckNotEmpty)
-            ->type_name("NAME");
-    CLI::Option* const keytab =
+            .Check(CheckNotEmpty)
+            .ValueName("NAME");
+    const Option keytab =
         command
-            .add_option(
+            .AddOption(
                 "--keytab", options.keytab, "Keytab with the principal's key, in place of a cache")
-            ->check(CheckNotEmpty)
-            ->type_name("FILE");
-    CLI::Option* const principal =
+            .Check(CheckNotEmpty)
+            .ValueName("FILE");
+    const Option principal =
         command
-            .add_option("--principal", options.principal, "Principal to log on as with the keytab")
-            ->check(CheckName)
-            ->type_name("NAME");
-    keytab->needs(principal)->excludes(ccache);
-    principal->needs(keytab)->excludes(ccache);
+            .AddOption("--principal", options.principal, "Principal to log on as with the keytab")
+            .Check(CheckName)
+            .ValueName("NAME");
+    keytab.Needs(principal).Excludes(ccache);
+    principal.Needs(keytab).Excludes(ccache);
 }
 
 } // namespace
 
-void AddAcquireGssCommand(CLI::App& parent, Action& action)
+void AddAcquireGssCommand(const Command& parent, Action& action)
 {
-    CLI::App* command =
-        parent.add_subcommand("gss", "Acquire a token with a Kerberos ticket, by SPNEGO");
+    const Command command =
+        parent.AddCommand("gss", "Acquire a token with a Kerberos ticket, by SPNEGO");
     const auto options = std::make_shared<AcquireGssOptions>();
-    options->service.AddTo(*command);
-    AddKerberosTo(*command, options->kerberos);
-    options->identity.AddTo(*command);
-    options->token.AddTo(*command);
-    options->token.AddBearerTo(*command);
-    options->output.AddOutTo(*command);
-    options->output.AddJsonTo(*command);
-    command->callback([options, &action] { action = [options] { return AcquireGss(*options); }; });
+    options->service.AddTo(command);
+    AddKerberosTo(command, options->kerberos);
+    options->identity.AddTo(command);
+    options->token.AddTo(command);
+    options->token.AddBearerTo(command);
+    options->output.AddOutTo(command);
+    options->output.AddJsonTo(command);
+    command.WhenNamed([options, &action] { action = [options] { return AcquireGss(*options); }; });
 }

@@ -33,28 +33,28 @@ ExitCode AcquirePassword(const AcquirePasswordOptions& options)
 
 } // namespace
 
-void AddAcquirePasswordCommand(CLI::App& parent, Action& action)
+void AddAcquirePasswordCommand(const Command& parent, Action& action)
 {
-    CLI::App* command =
-        parent.add_subcommand("password", "Acquire a token with a user name and a password");
+    const Command command =
+        parent.AddCommand("password", "Acquire a token with a user name and a password");
     const auto options = std::make_shared<AcquirePasswordOptions>();
-    options->service.AddTo(*command);
-    command->add_option("--user", options->user, "User name")
-        ->required()
-        ->check(CheckName)
-        ->type_name("NAME");
+    options->service.AddTo(command);
+    command.AddOption("--user", options->user, "User name")
+        .Required()
+        .Check(CheckName)
+        .ValueName("NAME");
     command
-        ->add_option(
+        .AddOption(
             "--password-file",
             options->passwordFile,
             "File whose first line is the password, - for standard input (default: ask for it)")
-        ->check(CheckNotEmpty)
-        ->type_name("FILE");
-    options->identity.AddTo(*command);
-    options->token.AddTo(*command);
-    options->token.AddBearerTo(*command);
-    options->output.AddOutTo(*command);
-    options->output.AddJsonTo(*command);
-    command->callback(
+        .Check(CheckNotEmpty)
+        .ValueName("FILE");
+    options->identity.AddTo(command);
+    options->token.AddTo(command);
+    options->token.AddBearerTo(command);
+    options->output.AddOutTo(command);
+    options->output.AddJsonTo(command);
+    command.WhenNamed(
         [options, &action] { action = [options] { return AcquirePassword(*options); }; });
 }

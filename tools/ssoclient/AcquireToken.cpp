@@ -30,18 +30,18 @@ ExitCode AcquireToken(const AcquireTokenOptions& options)
 
 } // namespace
 
-void AddAcquireTokenCommand(CLI::App& parent, Action& action)
+void AddAcquireTokenCommand(const Command& parent, Action& action)
 {
-    CLI::App* command = parent.add_subcommand(
+    const Command command = parent.AddCommand(
         "token", "Acquire a token by presenting another, for delegation or other properties");
     const auto options = std::make_shared<AcquireTokenOptions>();
-    options->service.AddTo(*command);
-    AddTokenTo(*command, options->tokenFile);
-    options->identity.AddRequiredTo(*command);
-    options->token.AddTo(*command);
-    options->token.AddBearerTo(*command);
-    options->output.AddOutTo(*command);
-    options->output.AddJsonTo(*command);
-    command->callback(
+    options->service.AddTo(command);
+    AddTokenTo(command, options->tokenFile);
+    options->identity.AddRequiredTo(command);
+    options->token.AddTo(command);
+    options->token.AddBearerTo(command);
+    options->output.AddOutTo(command);
+    options->output.AddJsonTo(command);
+    command.WhenNamed(
         [options, &action] { action = [options] { return AcquireToken(*options); }; });
 }

@@ -1,10 +1,10 @@
 #include "Arguments.h"
 
+#include "CommandLine.h"
 #include "OneLine.h"
 
 #include "quillon/MessageFormatter.h"
 
-#include <CLI/TypeTools.hpp>
 #include <nlohmann/json.hpp>
 
 using Quillon::MessageFormatter;
@@ -44,7 +44,7 @@ std::string CheckLifetime(const std::string& value)
 {
     long long seconds = 0;
     // What is no number is refused by the conversion that follows.
-    if (CLI::detail::lexical_cast(value, seconds) && seconds > MaxSeconds) {
+    if (ToNumber(value, seconds) && seconds > MaxSeconds) {
         return MessageFormatter::ASPrint("must be at most %1 seconds", MaxSeconds);
     }
     return "";

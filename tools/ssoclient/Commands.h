@@ -1,8 +1,7 @@
 #pragma once
 
+#include "CommandLine.h"
 #include "ExitCode.h"
-
-#include <CLI/App.hpp>
 
 #include <functional>
 
@@ -13,10 +12,10 @@ using Action = std::function<ExitCode()>;
  * Each adds one command to `parent`; when the command line names it, parsing puts what it does
  * into `action`.
  */
-void AddAcquirePasswordCommand(CLI::App& parent, Action& action);
-void AddAcquireCertificateCommand(CLI::App& parent, Action& action);
-void AddAcquireTokenCommand(CLI::App& parent, Action& action);
-void AddAcquireGssCommand(CLI::App& parent, Action& action);
-void AddRenewCommand(CLI::App& parent, Action& action);
-void AddValidateCommand(CLI::App& parent, Action& action);
-void AddInspectCommand(CLI::App& parent, Action& action);
+void AddAcquirePasswordCommand(const Command& parent, Action& action);
+void AddAcquireCertificateCommand(const Command& parent, Action& action);
+void AddAcquireTokenCommand(const Command& parent, Action& action);
+void AddAcquireGssCommand(const Command& parent, Action& action);
+void AddRenewCommand(const Command& parent, Action& action);
+void AddValidateCommand(const Command& parent, Action& action);
+void AddInspectCommand(const Command& parent, Action& action);

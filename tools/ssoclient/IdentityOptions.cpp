@@ -106,54 +106,54 @@ Quillon::Ref<const PrivateKey> ReadSigningKey(
 
 struct AddedOptions
 {
-    CLI::Option* key;
-    CLI::Option* certificate;
+    Option key;
+    Option certificate;
 };
 
-AddedOptions AddOptions(CLI::App& command, IdentityOptions& options)
+AddedOptions AddOptions(const Command& command, IdentityOptions& options)
 {
     const AddedOptions added = {
         command
-            .add_option(
+            .AddOption(
                 "--key",
                 options.key,
                 "The caller's own private key: a PEM or DER file, or the URI of a key in an "
                 "OpenSSL store (file:..., pkcs11:...)")
-            ->check(CheckNotEmpty)
-            ->type_name("KEY"),
+            .Check(CheckNotEmpty)
+            .ValueName("KEY"),
         command
-            .add_option(
+            .AddOption(
                 "--cert",
                 options.certificateFile,
                 "PEM file whose first certificate is that of the key")
-            ->check(CheckNotEmpty)
-            ->type_name("PEM")};
+            .Check(CheckNotEmpty)
+            .ValueName("PEM")};
     command
-        .add_option(
+        .AddOption(
             "--key-passphrase-file",
             options.keyPassphraseFile,
             "File whose first line is the passphrase of an encrypted key, - for standard input "
             "(default: ask for it)")
-        ->needs(added.key)
-        ->check(CheckNotEmpty)
-        ->type_name("FILE");
+        .Needs(added.key)
+        .Check(CheckNotEmpty)
+        .ValueName("FILE");
     return added;
 }
 
 } // namespace
 
-void IdentityOptions::AddTo(CLI::App& command)
+void IdentityOptions::AddTo(const Command& command)
 {
     const AddedOptions added = AddOptions(command, *this);
-    added.key->needs(added.certificate);
-    added.certificate->needs(added.key);
+    added.key.Needs(added.certificate);
+    added.certificate.Needs(added.key);
 }
 
-void IdentityOptions::AddRequiredTo(CLI::App& command)
+void IdentityOptions::AddRequiredTo(const Command& command)
 {
     const AddedOptions added = AddOptions(command, *this);
-    added.key->required();
-    added.certificate->required();
+    added.key.Required();
+    added.certificate.Required();
 }
 
 boost::optional<SsoClient::HolderOfKeyConfig> IdentityOptions::Read() const

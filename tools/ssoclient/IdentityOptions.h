@@ -1,8 +1,8 @@
 #pragma once
 
-#include "ssoClient/HolderOfKeyConfig.h"
+#include "CommandLine.h"
 
-#include <CLI/App.hpp>
+#include "ssoClient/HolderOfKeyConfig.h"
 
 #include <boost/optional.hpp>
 
@@ -17,8 +17,8 @@ struct IdentityOptions
     std::string certificateFile;
 
     /** Adds them as options that may both be left out. */
-    void AddTo(CLI::App& command);
-    void AddRequiredTo(CLI::App& command);
+    void AddTo(const Command& command);
+    void AddRequiredTo(const Command& command);
 
     /**
      * Reads the key and the certificate, and asks for the key's passphrase if it has one.

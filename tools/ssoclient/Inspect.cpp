@@ -6,8 +6,6 @@
 
 #include "ssoClient/CreateSamlToken.h"
 
-#include <CLI/Validators.hpp>
-
 #include <memory>
 
 namespace {
@@ -31,23 +29,23 @@ ExitCode Inspect(const InspectOptions& options)
 
 } // namespace
 
-void AddInspectCommand(CLI::App& parent, Action& action)
+void AddInspectCommand(const Command& parent, Action& action)
 {
-    CLI::App* command = parent.add_subcommand("inspect", "Verify a token file and describe it");
+    const Command command = parent.AddCommand("inspect", "Verify a token file and describe it");
     const auto options = std::make_shared<InspectOptions>();
-    command->add_option("FILE", options->file, "The token, - for standard input")
-        ->required()
-        ->check(CheckNotEmpty)
-        ->type_name("");
-    AddTrustTo(*command, options->trustFiles);
+    command.AddOption("FILE", options->file, "The token, - for standard input")
+        .Required()
+        .Check(CheckNotEmpty)
+        .ValueName("");
+    AddTrustTo(command, options->trustFiles);
     command
-        ->add_option(
+        .AddOption(
             "--clock-tolerance",
             options->clockToleranceSec,
             "By how many seconds the token's validity is widened at both ends")
-        ->check(CLI::Range(0LL, MaxSeconds))
-        ->capture_default_str()
-        ->type_name("SEC");
-    options->output.AddJsonTo(*command);
-    command->callback([options, &action] { action = [options] { return Inspect(*options); }; });
+        .Between(0, MaxSeconds)
+        .ShowDefault()
+        .ValueName("SEC");
+    options->output.AddJsonTo(command);
+    command.WhenNamed([options, &action] { action = [options] { return Inspect(*options); }; });
 }

@@ -5,12 +5,12 @@
 
 #include "ssoClient/CreateSamlToken.h"
 
-void AddTokenTo(CLI::App& command, std::string& tokenFile)
+void AddTokenTo(const Command& command, std::string& tokenFile)
 {
-    command.add_option("--token", tokenFile, "The token to present, - for standard input")
-        ->required()
-        ->check(CheckNotEmpty)
-        ->type_name("FILE");
+    command.AddOption("--token", tokenFile, "The token to present, - for standard input")
+        .Required()
+        .Check(CheckNotEmpty)
+        .ValueName("FILE");
 }
 
 boost::shared_ptr<const SsoClient::SamlToken> ReadToken(

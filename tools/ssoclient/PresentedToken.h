@@ -1,17 +1,16 @@
 #pragma once
 
+#include "CommandLine.h"
 #include "Trust.h"
 
 #include "ssoClient/SamlToken.h"
-
-#include <CLI/App.hpp>
 
 #include <boost/smart_ptr/shared_ptr.hpp>
 
 #include <string>
 
 /** Adds the required `--token FILE`. */
-void AddTokenTo(CLI::App& command, std::string& tokenFile);
+void AddTokenTo(const Command& command, std::string& tokenFile);
 
 /** Reads a token that is to be presented to the service, and verifies it; `-` is standard input. */
 boost::shared_ptr<const SsoClient::SamlToken> ReadToken(

@@ -30,20 +30,20 @@ ExitCode Renew(const RenewOptions& options)
 
 } // namespace
 
-void AddRenewCommand(CLI::App& parent, Action& action)
+void AddRenewCommand(const Command& parent, Action& action)
 {
-    CLI::App* command = parent.add_subcommand("renew", "Renew a holder-of-key token");
+    const Command command = parent.AddCommand("renew", "Renew a holder-of-key token");
     const auto options = std::make_shared<RenewOptions>();
-    options->service.AddTo(*command);
-    AddTokenTo(*command, options->tokenFile);
+    options->service.AddTo(command);
+    AddTokenTo(command, options->tokenFile);
     command
-        ->add_option(
+        .AddOption(
             "--lifetime", options->lifetimeSec, "Lifetime of the new token, from now, in seconds")
-        ->required()
-        ->check(CheckLifetime)
-        ->type_name("SEC");
-    options->identity.AddRequiredTo(*command);
-    options->output.AddOutTo(*command);
-    options->output.AddJsonTo(*command);
-    command->callback([options, &action] { action = [options] { return Renew(*options); }; });
+        .Required()
+        .Check(CheckLifetime)
+        .ValueName("SEC");
+    options->identity.AddRequiredTo(command);
+    options->output.AddOutTo(command);
+    options->output.AddJsonTo(command);
+    command.WhenNamed([options, &action] { action = [options] { return Renew(*options); }; });
 }

@@ -44,28 +44,28 @@ void EnableTraceLines()
 
 } // namespace
 
-void ServiceOptions::AddTo(CLI::App& command)
+void ServiceOptions::AddTo(const Command& command)
 {
-    command.add_option("--url", url, "The token service, https://HOST[:PORT]/PATH")
-        ->required()
-        ->type_name("URL");
+    command.AddOption("--url", url, "The token service, https://HOST[:PORT]/PATH")
+        .Required()
+        .ValueName("URL");
     AddTrustTo(command, trustFiles);
     command
-        .add_option(
+        .AddOption(
             "--ca",
             authorityFiles,
             "PEM files with the authorities to trust for TLS (default: the system's)")
-        ->check(CheckNotEmpty)
-        ->type_name("PEM");
+        .Check(CheckNotEmpty)
+        .ValueName("PEM");
     command
-        .add_option(
+        .AddOption(
             "--peer",
             peer,
             "What the TLS server must prove: another host name, or sha256//BASE64 of its public "
             "key (default: the host name of the URL)")
-        ->check(CheckNotEmpty)
-        ->type_name("TEXT");
-    command.add_flag("--verbose", verbose, "Write the library's trace lines to standard error");
+        .Check(CheckNotEmpty)
+        .ValueName("TEXT");
+    command.AddFlag("--verbose", verbose, "Write the library's trace lines to standard error");
 }
 
 boost::shared_ptr<SsoClient::SecurityTokenService> ServiceOptions::CreateService(

@@ -1,11 +1,10 @@
 #pragma once
 
+#include "CommandLine.h"
 #include "Trust.h"
 
 #include "quillon/ssl/SSLContext.h"
 #include "ssoClient/SecurityTokenService.h"
-
-#include <CLI/App.hpp>
 
 #include <string>
 #include <vector>
@@ -19,7 +18,7 @@ struct ServiceOptions
     std::string peer;
     bool verbose = false;
 
-    void AddTo(CLI::App& command);
+    void AddTo(const Command& command);
 
     /**
      * Creates the service, and turns its trace lines on if that is asked for.

@@ -64,16 +64,16 @@ std::string CreateJsonDescription(const SsoClient::SamlToken& token)
 
 } // namespace
 
-void OutputOptions::AddJsonTo(CLI::App& command)
+void OutputOptions::AddJsonTo(const Command& command)
 {
-    command.add_flag("--json", json, "Print the token's facts as JSON");
+    command.AddFlag("--json", json, "Print the token's facts as JSON");
 }
 
-void OutputOptions::AddOutTo(CLI::App& command)
+void OutputOptions::AddOutTo(const Command& command)
 {
-    command.add_option("--out", outFile, "Write the assertion to this file (mode 0600)")
-        ->check(CheckNotEmpty)
-        ->type_name("FILE");
+    command.AddOption("--out", outFile, "Write the assertion to this file (mode 0600)")
+        .Check(CheckNotEmpty)
+        .ValueName("FILE");
 }
 
 TokenOutput::TokenOutput(const OutputOptions& options)

@@ -1,10 +1,9 @@
 #pragma once
 
+#include "CommandLine.h"
 #include "Files.h"
 
 #include "ssoClient/SamlToken.h"
-
-#include <CLI/App.hpp>
 
 #include <boost/smart_ptr/shared_ptr.hpp>
 
@@ -17,8 +16,8 @@ struct OutputOptions
     bool json = false;
     std::string outFile;
 
-    void AddJsonTo(CLI::App& command);
-    void AddOutTo(CLI::App& command);
+    void AddJsonTo(const Command& command);
+    void AddOutTo(const Command& command);
 };
 
 /** Shows tokens as the options say. Made before a token is asked for: see `OutputFile`. */

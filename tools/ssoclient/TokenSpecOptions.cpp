@@ -1,16 +1,14 @@
 #include "TokenSpecOptions.h"
 
 #include "Arguments.h"
-
-#include <CLI/Error.hpp>
+#include "ExitCode.h"
 
 #include <algorithm>
-#include <utility>
 
 namespace {
 
 /** The words of one `--advice`. */
-using AdviceWords = std::pair<std::string, std::string>;
+using AdviceWords = Command::Pair;
 
 /** The entry whose `key` is `value`; a new one at the end if there is none. */
 template <class Entry>
@@ -31,7 +29,7 @@ void AddAdvice(std::vector<SsoClient::Advice>& advice, const AdviceWords& words)
     const auto& [source, attribute] = words;
     const std::size_t end = attribute.find('=');
     if (end == 0 || end == std::string::npos) {
-        throw CLI::ValidationError("--advice", "`" + attribute + "' is not NAME=VALUE");
+        throw UsageError("--advice: `" + attribute + "' is not NAME=VALUE");
     }
     SsoClient::Advice& ofSource = FindOrAdd(advice, &SsoClient::Advice::source, source);
     FindOrAdd(ofSource.attributes, &SsoClient::AdviceAttribute::name, attribute.substr(0, end))
@@ -40,27 +38,26 @@ void AddAdvice(std::vector<SsoClient::Advice>& advice, const AdviceWords& words)
 
 } // namespace
 
-void TokenSpecOptions::AddTo(CLI::App& command)
+void TokenSpecOptions::AddTo(const Command& command)
 {
-    command.add_option("--lifetime", spec.tokenLifetimeSec, "Lifetime of the token in seconds")
-        ->capture_default_str()
-        ->check(CheckLifetime)
-        ->type_name("SEC");
-    command.add_flag("--renewable", spec.renewable, "Ask for a token that can be renewed");
-    command.add_flag("--delegable", spec.delegable, "Ask for a token that can be delegated");
+    command.AddOption("--lifetime", spec.tokenLifetimeSec, "Lifetime of the token in seconds")
+        .ShowDefault()
+        .Check(CheckLifetime)
+        .ValueName("SEC");
+    command.AddFlag("--renewable", spec.renewable, "Ask for a token that can be renewed");
+    command.AddFlag("--delegable", spec.delegable, "Ask for a token that can be delegated");
     command
-        .add_option_function<std::string>(
+        .AddOption(
             "--delegate-to",
             [this](const std::string& name) { spec.delegateTo = name; },
             "Ask for a token delegated to this principal")
-        ->check(CheckName)
-        ->type_name("NAME");
+        .Check(CheckName)
+        .ValueName("NAME");
+    command.AddOption("--audience", spec.audienceRestriction, "Restrict the token to these parties")
+        .Check(CheckNotEmpty)
+        .ValueName("URI");
     command
-        .add_option("--audience", spec.audienceRestriction, "Restrict the token to these parties")
-        ->check(CheckNotEmpty)
-        ->type_name("URI");
-    command
-        .add_option_function<std::vector<AdviceWords>>(
+        .AddPairOption(
             "--advice",
             [this](const std::vector<AdviceWords>& entries) {
                 for (const AdviceWords& entry : entries) {
@@ -68,13 +65,12 @@ void TokenSpecOptions::AddTo(CLI::App& command)
                 }
             },
             "Ask for this attribute in the token's advice; may repeat")
-        ->allow_extra_args(false)
-        ->type_name("SOURCE NAME=VALUE");
+        .ValueName("SOURCE NAME=VALUE");
 }
 
-void TokenSpecOptions::AddBearerTo(CLI::App& command)
+void TokenSpecOptions::AddBearerTo(const Command& command)
 {
-    command.add_flag_callback(
+    command.AddFlag(
         "--bearer",
         [this] { spec.confirmation = SsoClient::TokenSpec::CONFIRMATION_BEARER; },
         "Ask for a bearer token, although there is a key");

@@ -1,16 +1,16 @@
 #pragma once
 
-#include "ssoClient/TokenSpec.h"
+#include "CommandLine.h"
 
-#include <CLI/App.hpp>
+#include "ssoClient/TokenSpec.h"
 
 /** The options that say what kind of token is wanted; `spec` holds the outcome. */
 struct TokenSpecOptions
 {
     SsoClient::TokenSpec spec;
 
-    void AddTo(CLI::App& command);
+    void AddTo(const Command& command);
 
     /** Adds `--bearer`, for the commands that may ask for either kind of confirmation. */
-    void AddBearerTo(CLI::App& command);
+    void AddBearerTo(const Command& command);
 };

@@ -21,14 +21,14 @@ CertificateList ReadCertificateFile(const std::string& file)
 
 } // namespace
 
-void AddTrustTo(CLI::App& command, std::vector<std::string>& trustFiles)
+void AddTrustTo(const Command& command, std::vector<std::string>& trustFiles)
 {
     command
-        .add_option(
+        .AddOption(
             "--trust", trustFiles, "PEM files with the certificates that may have signed the token")
-        ->required()
-        ->check(CheckNotEmpty)
-        ->type_name("PEM");
+        .Required()
+        .Check(CheckNotEmpty)
+        .ValueName("PEM");
 }
 
 CertificateList ReadCertificates(const std::vector<std::string>& files)

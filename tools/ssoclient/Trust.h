@@ -1,8 +1,8 @@
 #pragma once
 
-#include "quillon/crypto/Certificate.h"
+#include "CommandLine.h"
 
-#include <CLI/App.hpp>
+#include "quillon/crypto/Certificate.h"
 
 #include <list>
 #include <string>
@@ -11,7 +11,7 @@
 using CertificateList = std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>;
 
 /** Adds the required `--trust PEM...`. */
-void AddTrustTo(CLI::App& command, std::vector<std::string>& trustFiles);
+void AddTrustTo(const Command& command, std::vector<std::string>& trustFiles);
 
 /**
  * Reads all certificates of the PEM files.

@@ -24,12 +24,12 @@ ExitCode Validate(const ValidateOptions& options)
 
 } // namespace
 
-void AddValidateCommand(CLI::App& parent, Action& action)
+void AddValidateCommand(const Command& parent, Action& action)
 {
-    CLI::App* command =
-        parent.add_subcommand("validate", "Ask the service whether a token's subject is valid");
+    const Command command =
+        parent.AddCommand("validate", "Ask the service whether a token's subject is valid");
     const auto options = std::make_shared<ValidateOptions>();
-    options->service.AddTo(*command);
-    AddTokenTo(*command, options->tokenFile);
-    command->callback([options, &action] { action = [options] { return Validate(*options); }; });
+    options->service.AddTo(command);
+    AddTokenTo(command, options->tokenFile);
+    command.WhenNamed([options, &action] { action = [options] { return Validate(*options); }; });
 }
