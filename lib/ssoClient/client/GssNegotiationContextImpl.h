@@ -24,9 +24,6 @@ public:
     NegotiationResult NegotiateToken(const Leg& leg) override;
 
 private:
-    /** Sends the leg. @return the reply. */
-    Quillon::Ref<Quillon::Reader> Send(const Leg& leg);
-
     TokenSpec _spec;
     std::string _contextId; // of the last reply; empty before the first
     boost::shared_ptr<const RequestBuilder> _requestBuilder;

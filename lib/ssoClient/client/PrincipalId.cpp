@@ -2,17 +2,13 @@
 
 #include "quillon/PanicVerify.h"
 #include "quillon/StringUtil.h"
+#include "ssoClient/wire/assertionPlaces.h"
 
 #include <utility>
 
 namespace SsoClient {
 
 namespace {
-
-// Unit and lines are part of the text that operators search for; they do not follow this file.
-constexpr char Unit[] = "lib/public/ssoClient/PrincipalId";
-constexpr int NameLine = 43;
-constexpr int DomainLine = 44;
 
 bool EqualIgnoringCase(const std::string& a, const std::string& b)
 {
@@ -26,10 +22,14 @@ PrincipalId::PrincipalId(std::string name, std::string domain)
     , _domain(std::move(domain))
 {
     if (_name.empty()) {
-        Quillon::PanicVerify("!name.empty()", Unit, NameLine);
+        Quillon::PanicVerify(
+            "!name.empty()", AssertionPlaces::PrincipalId, AssertionPlaces::PrincipalWithoutName);
     }
     if (_domain.empty()) {
-        Quillon::PanicVerify("!domain.empty()", Unit, DomainLine);
+        Quillon::PanicVerify(
+            "!domain.empty()",
+            AssertionPlaces::PrincipalId,
+            AssertionPlaces::PrincipalWithoutDomain);
     }
 }
 

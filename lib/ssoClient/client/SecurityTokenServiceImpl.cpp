@@ -1,22 +1,15 @@
 #include "ssoClient/client/SecurityTokenServiceImpl.h"
 
 #include "quillon/MessageFormatter.h"
-#include "quillon/PanicVerify.h"
-#include "quillon/StringUtil.h"
 #include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/client/asyncCalls.h"
 #include "ssoClient/client/descriptions.h"
-#include "ssoClient/client/logging.h"
-#include "ssoClient/protocol/HttpsClient.h"
-#include "ssoClient/protocol/RequestBuilderImpl.h"
-#include "ssoClient/protocol/ResponseHandlerImpl.h"
-#include "ssoClient/wire/WipedText.h"
+#include "ssoClient/client/negotiation.h"
+#include "ssoClient/client/operation.h"
 
 #include <boost/none.hpp>
 #include <boost/smart_ptr/make_shared.hpp>
-
-#include <utility>
 
 using Quillon::MessageFormatter;
 
@@ -24,88 +17,9 @@ namespace SsoClient {
 
 namespace {
 
-constexpr char Unit[] = "lib/ssoClient/SecurityTokenServiceImpl";
-constexpr long long SendTimeoutMicroseconds = 240'000'000;
-
-// Marks the begin and, however it is left, the end of an operation in the log.
-class OperationFrame
+std::string DescribeRequest(const TokenSpec& spec)
 {
-public:
-    explicit OperationFrame(std::string operationName)
-        : _opId(Quillon::StringUtil::GenerateUuid())
-        , _operationName(std::move(operationName))
-    {
-        LogTrace([this] { return Describe("START"); });
-    }
-
-    OperationFrame(const OperationFrame&) = delete;
-    OperationFrame& operator=(const OperationFrame&) = delete;
-
-    ~OperationFrame()
-    {
-        try {
-            LogTrace([this] { return Describe("END"); });
-        } catch (const std::exception&) { // NOLINT(bugprone-empty-catch)
-            // Out of memory for one log line; the operation has its own outcome to report.
-        }
-    }
-
-private:
-    std::string Describe(const char* step) const
-    {
-        return MessageFormatter::ASPrint(
-            "opId=%1 %2 operation SecurityTokenServiceImpl::%3", _opId, step, _operationName);
-    }
-
-    std::string _opId;
-    std::string _operationName;
-};
-
-// The handler has to see the service's last leg, for with it the service proves itself. What it
-// answers is not sent. The test is the way round that log readers know, not the way of its text.
-void ConsumeFinalLeg(const Leg& serverLeg, NegotiationHandler& handler)
-{
-    if (serverLeg.empty()) {
-        return;
-    }
-    const boost::shared_ptr<Leg> userLeg = handler.Negotiate(serverLeg);
-    if (userLeg == nullptr || userLeg->empty()) {
-        getLogger()->Log(
-            Quillon::Service::LOG_LEVEL_WARNING,
-            "GSS contract error: non-empty user leg after negotiation is complete");
-    }
-}
-
-// Keeps what `_p` points to alive inside a bound call, and hands it over by reference.
-template <class T>
-class PassByRefHelper
-{
-public:
-    explicit PassByRefHelper(const boost::shared_ptr<T>& p)
-        : _p(p)
-    {
-        if (_p == nullptr) {
-            Quillon::PanicVerify("_p", Unit, 488);
-        }
-    }
-
-    operator T&() const noexcept { return *_p; } // NOLINT(google-explicit-constructor)
-
-private:
-    boost::shared_ptr<T> _p;
-};
-
-template <class T>
-PassByRefHelper<T> PassByRef(const boost::shared_ptr<T>& p)
-{
-    return PassByRefHelper<T>(p);
-}
-
-// Bound calls are copied on their way to the pool; the copies share the one password.
-PassByRefHelper<const std::string> PassSecret(const std::string& secret)
-{
-    const boost::shared_ptr<WipedText> copy = boost::make_shared<WipedText>(secret);
-    return PassByRef(boost::shared_ptr<const std::string>(copy, &copy->text));
+    return MessageFormatter::ASPrint("Requested token with spec `%1'", WriteTokenSpec(spec));
 }
 
 } // namespace
@@ -124,95 +38,95 @@ SecurityTokenServiceImpl::SecurityTokenServiceImpl(
 boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireToken(
     const std::string& userName, const std::string& password, const TokenSpec& spec) const
 {
-    const OperationFrame frame("AcquireToken");
-    LogTrace([&] {
-        return MessageFormatter::ASPrint(
-            "Requested token for subject `%1', spec `%2'", userName, WriteTokenSpec(spec));
-    });
-    Request request;
-    _requestBuilder->BuildUserPassTokenRequest(userName, password, spec, request);
-    LogTrace([] { return "SecurityTokenServiceImpl::AcquireToken sending request"; });
-    const Quillon::Ref<Quillon::Reader> reply = Send(request);
-    LogTrace([] { return "SecurityTokenServiceImpl::AcquireToken processing response"; });
-    std::string tokenXml;
-    _responseHandler->HandleAcquireTokenResponse(reply.get(), tokenXml);
-    return ToSamlToken(tokenXml);
+    return Run(
+        *_transport,
+        "AcquireToken",
+        [&] {
+            return MessageFormatter::ASPrint(
+                "Requested token for subject `%1', spec `%2'", userName, WriteTokenSpec(spec));
+        },
+        [&](Request& request) {
+            _requestBuilder->BuildUserPassTokenRequest(userName, password, spec, request);
+            LogTrace([] { return "SecurityTokenServiceImpl::AcquireToken sending request"; });
+        },
+        [&](Quillon::Reader* reply) {
+            LogTrace([] { return "SecurityTokenServiceImpl::AcquireToken processing response"; });
+            return ReadIssuedToken(reply);
+        });
 }
 
 boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByGSS(
     const TokenSpec& spec, NegotiationHandler& handler) const
 {
-    const OperationFrame frame("AcquireTokenByGSS");
-    LogTrace([&spec] {
-        return MessageFormatter::ASPrint("Requested token with spec `%1'", WriteTokenSpec(spec));
-    });
-    const boost::shared_ptr<TransportSession> session = _transport->CreateSession();
-    SPNegoResponse response;
-    do {
-        ExchangeLegs(*session, spec, handler, response);
-    } while (response.token.empty());
-    ConsumeFinalLeg(response.leg, handler);
-    return ToSamlToken(response.token);
+    return Run(
+        "AcquireTokenByGSS",
+        [&] { return DescribeRequest(spec); },
+        [&] {
+            const LegDriver legs(
+                *_requestBuilder, *_responseHandler, LegDriver::EmptyLeg::StopsTheProcess);
+            const boost::shared_ptr<TransportSession> session = _transport->CreateSession();
+            return ToSamlToken(Negotiate(legs, *session, spec, handler));
+        });
 }
 
 boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByCertificate(
     const TokenSpec& spec) const
 {
-    const OperationFrame frame("AcquireTokenByCertificate");
-    LogTrace([&spec] {
-        return MessageFormatter::ASPrint("Requested token with spec `%1'", WriteTokenSpec(spec));
-    });
-    Request request;
-    _requestBuilder->BuildCertificateTokenRequest(spec, request);
-    std::string tokenXml;
-    _responseHandler->HandleAcquireTokenResponse(Send(request).get(), tokenXml);
-    return ToSamlToken(tokenXml);
+    return Run(
+        *_transport,
+        "AcquireTokenByCertificate",
+        [&] { return DescribeRequest(spec); },
+        [&](Request& request) { _requestBuilder->BuildCertificateTokenRequest(spec, request); },
+        [&](Quillon::Reader* reply) { return ReadIssuedToken(reply); });
 }
 
 boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByToken(
     const SamlToken& token, const TokenSpec& spec) const
 {
-    const OperationFrame frame("AcquireTokenByToken");
-    LogTrace([&] {
-        return MessageFormatter::ASPrint(
-            "Requested token for %1 with spec `%2'",
-            CreateRedactedDescription(token),
-            WriteTokenSpec(spec));
-    });
-    Request request;
-    _requestBuilder->BuildExchangeTokenRequest(token, spec, request);
-    std::string tokenXml;
-    _responseHandler->HandleAcquireTokenResponse(Send(request).get(), tokenXml);
-    return ToSamlToken(tokenXml);
+    return Run(
+        *_transport,
+        "AcquireTokenByToken",
+        [&] {
+            return MessageFormatter::ASPrint(
+                "Requested token for %1 with spec `%2'",
+                CreateRedactedDescription(token),
+                WriteTokenSpec(spec));
+        },
+        [&](Request& request) { _requestBuilder->BuildExchangeTokenRequest(token, spec, request); },
+        [&](Quillon::Reader* reply) { return ReadIssuedToken(reply); });
 }
 
 bool SecurityTokenServiceImpl::ValidateSubject(const SamlToken& token) const
 {
-    const OperationFrame frame("ValidateSubject");
-    LogTrace([&token] {
-        return MessageFormatter::ASPrint(
-            "Validating subject of token %1", CreateRedactedDescription(token));
-    });
-    Request request;
-    _requestBuilder->BuildValidateSubjectRequest(token, request);
-    const bool result = _responseHandler->HandleValidateSubjectResponse(Send(request).get());
-    LogTrace([result] { return MessageFormatter::ASPrint("Result: %1", result); });
-    return result;
+    return Run(
+        *_transport,
+        "ValidateSubject",
+        [&] {
+            return MessageFormatter::ASPrint(
+                "Validating subject of token %1", CreateRedactedDescription(token));
+        },
+        [&](Request& request) { _requestBuilder->BuildValidateSubjectRequest(token, request); },
+        [&](Quillon::Reader* reply) {
+            const bool result = _responseHandler->HandleValidateSubjectResponse(reply);
+            LogTrace([result] { return MessageFormatter::ASPrint("Result: %1", result); });
+            return result;
+        });
 }
 
 boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::RenewToken(
     const SamlToken& token, long long lifetimeSec) const
 {
-    const OperationFrame frame("RenewToken");
-    LogTrace([&] {
-        return MessageFormatter::ASPrint(
-            "Renewing token %1 for %2 more seconds", CreateRedactedDescription(token), lifetimeSec);
-    });
-    Request request;
-    _requestBuilder->BuildRenewRequest(token, lifetimeSec, request);
-    std::string tokenXml;
-    _responseHandler->HandleRenewTokenResponse(Send(request).get(), tokenXml);
-    return ToSamlToken(tokenXml);
+    return Run(
+        *_transport,
+        "RenewToken",
+        [&] {
+            return MessageFormatter::ASPrint(
+                "Renewing token %1 for %2 more seconds",
+                CreateRedactedDescription(token),
+                lifetimeSec);
+        },
+        [&](Request& request) { _requestBuilder->BuildRenewRequest(token, lifetimeSec, request); },
+        [&](Quillon::Reader* reply) { return ReadRenewedToken(reply); });
 }
 
 void SecurityTokenServiceImpl::AcquireTokenAsync(
@@ -283,69 +197,20 @@ boost::shared_ptr<const SecurityTokenService> SecurityTokenServiceImpl::Copy() c
     return boost::make_shared<SecurityTokenServiceImpl>(*this);
 }
 
-void SecurityTokenServiceImpl::ExchangeLegs(
-    TransportSession& session,
-    const TokenSpec& spec,
-    NegotiationHandler& handler,
-    SPNegoResponse& response) const
+boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::ReadIssuedToken(
+    Quillon::Reader* reply) const
 {
-    const boost::shared_ptr<Leg> userLeg = handler.Negotiate(response.leg);
-    if (userLeg == nullptr) {
-        throw Quillon::InvalidArgumentException(
-            "Invalid NegotiationHandler: the returned leg may not be NULL");
-    }
-    if (response.contextId.empty()) {
-        StartSPNegotiation(session, *userLeg, spec, response);
-    } else {
-        ContinueSPNegotiation(session, *userLeg, response.contextId, response);
-    }
-    if (response.contextId.empty()) {
-        throw CommunicationException("Error processing the response to SPNego token request: no "
-                                     "Context ID was returned.");
-    }
+    std::string tokenXml;
+    _responseHandler->HandleAcquireTokenResponse(reply, tokenXml);
+    return ToSamlToken(tokenXml);
 }
 
-void SecurityTokenServiceImpl::StartSPNegotiation(
-    TransportSession& session,
-    const Leg& leg,
-    const TokenSpec& spec,
-    SPNegoResponse& response) const
+boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::ReadRenewedToken(
+    Quillon::Reader* reply) const
 {
-    if (leg.empty()) {
-        Quillon::PanicVerify("!leg.empty()", Unit, 762);
-    }
-    Request request;
-    _requestBuilder->BuildInitialSPNegoRequest(spec, leg, request);
-    SendLeg(session, request, response);
-}
-
-void SecurityTokenServiceImpl::ContinueSPNegotiation(
-    TransportSession& session,
-    const Leg& leg,
-    const std::string& contextId,
-    SPNegoResponse& response) const
-{
-    if (leg.empty()) {
-        Quillon::PanicVerify("!leg.empty()", Unit, 794);
-    }
-    Request request;
-    _requestBuilder->BuildContinuedSPNegoRequest(contextId, leg, request);
-    SendLeg(session, request, response);
-}
-
-void SecurityTokenServiceImpl::SendLeg(
-    TransportSession& session, const Request& request, SPNegoResponse& response) const
-{
-    Quillon::Ref<Quillon::Reader> reply;
-    session.SendRequest(request, reply);
-    _responseHandler->HandleSPNegoResponse(reply.get(), response);
-}
-
-Quillon::Ref<Quillon::Reader> SecurityTokenServiceImpl::Send(const Request& request) const
-{
-    Quillon::Ref<Quillon::Reader> reply;
-    _transport->CreateSession()->SendRequest(request, reply);
-    return reply;
+    std::string tokenXml;
+    _responseHandler->HandleRenewTokenResponse(reply, tokenXml);
+    return ToSamlToken(tokenXml);
 }
 
 boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::ToSamlToken(
@@ -366,17 +231,6 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::ToSamlToken(
             "Successfully acquired token: %1", CreateRedactedDescription(*token));
     });
     return token;
-}
-
-boost::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
-    const SecurityTokenServiceConfig& config)
-{
-    return boost::make_shared<SecurityTokenServiceImpl>(
-        boost::make_shared<RequestBuilderImpl>(config.holderOfKeyConfig),
-        boost::make_shared<HttpsClient>(
-            config.url, config.sslContext, config.sslPeerParameter, SendTimeoutMicroseconds),
-        boost::make_shared<ResponseHandlerImpl>(),
-        config.trustedCertificates);
 }
 
 } // namespace SsoClient

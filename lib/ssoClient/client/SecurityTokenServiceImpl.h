@@ -9,7 +9,10 @@
 
 namespace SsoClient {
 
-/** Each operation is one road: build a request, send it, read the reply, verify the token. */
+/**
+ * Says of each operation what is its own: its line in the log, what it asks for, what it reads. The
+ * road that all of them go is in operation.h, the one of a negotiation in negotiation.h.
+ */
 class SecurityTokenServiceImpl final : public SecurityTokenService
 {
 public:
@@ -57,35 +60,12 @@ public:
         const TokenCompletion& completion) const override;
 
 private:
-    /** Sends the request in a session of its own. @return the reply. */
-    Quillon::Ref<Quillon::Reader> Send(const Request& request) const;
-
-    /** Sends the first leg of a negotiation, which must not be empty. */
-    void StartSPNegotiation(
-        TransportSession& session,
-        const Leg& leg,
-        const TokenSpec& spec,
-        SPNegoResponse& response) const;
-
-    /** Sends a further leg, which must not be empty. */
-    void ContinueSPNegotiation(
-        TransportSession& session,
-        const Leg& leg,
-        const std::string& contextId,
-        SPNegoResponse& response) const;
-
-    /** Sends a request of a negotiation in its session. */
-    void SendLeg(TransportSession& session, const Request& request, SPNegoResponse& response) const;
-
-    /** Lets the handler answer the last reply, and sends the answer. */
-    void ExchangeLegs(
-        TransportSession& session,
-        const TokenSpec& spec,
-        NegotiationHandler& handler,
-        SPNegoResponse& response) const;
-
     /** What an asynchronous operation works with: the caller's object may go meanwhile. */
     boost::shared_ptr<const SecurityTokenService> Copy() const;
+
+    // What the reply to a request, or its text, gives as a token.
+    boost::shared_ptr<const SamlToken> ReadIssuedToken(Quillon::Reader* reply) const;
+    boost::shared_ptr<const SamlToken> ReadRenewedToken(Quillon::Reader* reply) const;
 
     /** @return the verified token; null for an empty text. */
     boost::shared_ptr<const SamlToken> ToSamlToken(const std::string& tokenXml) const;

@@ -7,6 +7,7 @@
 #include "ssoClient/message/xmlSecurityBuilders.h"
 #include "ssoClient/message/xmlSoapBuilders.h"
 #include "ssoClient/protocol/xmlSpnego.h"
+#include "ssoClient/wire/assertionPlaces.h"
 #include "ssoClient/wire/wireNames.h"
 
 #include <boost/smart_ptr/make_shared.hpp>
@@ -16,8 +17,6 @@
 namespace SsoClient {
 
 namespace {
-
-constexpr char Unit[] = "lib/ssoClient/RequestBuilderImpl";
 
 constexpr char AcquireByCertificate[] = "acquire token by certificate";
 constexpr char AcquireByToken[] = "acquire token by token";
@@ -211,7 +210,10 @@ std::string RequestBuilderImpl::BuildSamlRefSignedRequest(
 const HolderOfKeyConfig& RequestBuilderImpl::GetHolderOfKeyConfig() const
 {
     if (!_holderOfKeyConfig.is_initialized()) {
-        Quillon::PanicVerify("_holderOfKeyConfig.is_initialized()", Unit, __LINE__);
+        Quillon::PanicVerify(
+            "_holderOfKeyConfig.is_initialized()",
+            AssertionPlaces::RequestBuilderImpl,
+            AssertionPlaces::SigningWithoutIdentity);
     }
     if (!_holderOfKeyConfig->privateKey || !_holderOfKeyConfig->certificate) {
         throw Quillon::InvalidArgumentException(
