@@ -3,6 +3,7 @@
 #include <nlohmann/json.hpp>
 
 #include <algorithm>
+#include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <ostream>
@@ -14,6 +15,8 @@ namespace HostileTests {
 namespace {
 
 using Json = nlohmann::json;
+
+const std::string Tokens = TEST_DATA_DIR "/tokens/";
 
 std::string ReadFile(const std::string& path)
 {
@@ -90,11 +93,12 @@ std::string DescribeFacts(const Json& facts)
     return out.str();
 }
 
-TokenCase ToTokenCase(const Json& line)
+TokenCase ToTokenCase(const std::string& folder, const std::string& rule, const Json& line)
 {
     TokenCase tokenCase;
-    line.at("file").get_to(tokenCase.file);
-    line.at("about").get_to(tokenCase.about);
+    tokenCase.file = folder + "/" + line.at("file").get<std::string>();
+    tokenCase.rule = rule;
+    tokenCase.about = line.value("about", "");
     line.at("trust").get_to(tokenCase.trusted);
     line.at("nowMicros").get_to(tokenCase.nowMicros);
     line.at("toleranceSec").get_to(tokenCase.toleranceSec);
@@ -112,14 +116,24 @@ TokenCase ToTokenCase(const Json& line)
     return tokenCase;
 }
 
+/** Adds the lines of the table in `folder`, which is relative to the folder of tokens. */
+void LoadTable(const std::string& folder, const Json& defaults, std::vector<TokenCase>& cases)
+{
+    const Json table = Json::parse(ReadFile(Tokens + folder + "/expected.json"));
+    for (const Json& token : table.at("tokens")) {
+        Json line = defaults;
+        line.update(token);
+        cases.push_back(ToTokenCase(folder, table.value("rule", ""), line));
+    }
+}
+
 std::vector<TokenCase> LoadTokenTable()
 {
-    const Json table = Json::parse(ReadFile(TEST_DATA_DIR "/tokens/expected.json"));
+    const Json defaults = Json::parse(ReadFile(Tokens + "defaults.json"));
     std::vector<TokenCase> cases;
-    for (const Json& token : table.at("tokens")) {
-        Json line = table.at("defaults");
-        line.update(token);
-        cases.push_back(ToTokenCase(line));
+    LoadTable("accepted", defaults, cases);
+    for (const auto& rule : std::filesystem::directory_iterator(Tokens + "refused")) {
+        LoadTable("refused/" + rule.path().filename().string(), defaults, cases);
     }
     return cases;
 }
@@ -150,7 +164,7 @@ const TokenCase& GetTokenCase(const std::string& file)
 
 std::string ReadToken(const TokenCase& tokenCase)
 {
-    return ReadFile(TEST_DATA_DIR "/tokens/" + tokenCase.file);
+    return ReadFile(Tokens + tokenCase.file);
 }
 
 Conditions GetConditions(const TokenCase& tokenCase)

@@ -8,10 +8,11 @@
 
 namespace HostileTests {
 
-/** One token file and what must come of it, as the table beside the files says. */
+/** One token file and what must come of it, as the table beside it says. */
 struct TokenCase
 {
     std::string file;  ///< relative to the folder of tokens
+    std::string rule;  ///< the rule that a refused one breaks
     std::string about; ///< what is special about it
     std::vector<std::string> trusted;
     long long nowMicros = 0;
@@ -22,7 +23,7 @@ struct TokenCase
 
 std::ostream& operator<<(std::ostream& out, const TokenCase& tokenCase);
 
-/** All lines of the table. Throws `std::exception` if it cannot be read. */
+/** The lines of the tables of all folders. Throws `std::exception` if it cannot be read. */
 const std::vector<TokenCase>& GetTokenTable();
 
 /** The line of one file, for example "accepted/bearer.xml". */

@@ -55,8 +55,8 @@ TEST_P(RefusedToken, SaysWhy)
     const TokenCase& line = GetParam();
     const Verdict verdict = Judge(ReadToken(line), GetConditions(line));
     EXPECT_TRUE(IsAmong(verdict, line.refusals))
-        << line.about << "\nfound:    " << Describe(verdict)
-        << "\nexpected: " << Describe(line.refusals);
+        << line.file << "\nrule:     " << line.rule << "\nspecial:  " << line.about
+        << "\nfound:    " << Describe(verdict) << "\nexpected: " << Describe(line.refusals);
 }
 
 INSTANTIATE_TEST_SUITE_P(Table, AcceptedToken, testing::ValuesIn(Select(true)), NameOf);
@@ -64,13 +64,18 @@ INSTANTIATE_TEST_SUITE_P(Table, RefusedToken, testing::ValuesIn(Select(false)), 
 
 TEST(TokenTable, NamesEveryFile)
 {
-    std::size_t files = 0;
-    for (const char* folder : {"accepted", "refused"}) {
-        const std::filesystem::directory_iterator entries(
-            std::filesystem::path(TEST_DATA_DIR "/tokens") / folder);
-        files += static_cast<std::size_t>(std::distance(begin(entries), end(entries)));
+    const std::filesystem::recursive_directory_iterator entries(TEST_DATA_DIR "/tokens");
+    const auto files = std::count_if(begin(entries), end(entries), [](const auto& entry) {
+        return entry.is_regular_file() && entry.path().extension() != ".json";
+    });
+    EXPECT_EQ(static_cast<std::size_t>(files), GetTokenTable().size());
+}
+
+TEST(TokenTable, TellsTheRuleThatEachRefusedTokenBreaks)
+{
+    for (const TokenCase& line : GetTokenTable()) {
+        EXPECT_EQ(line.refusals.empty(), line.rule.empty()) << line.file;
     }
-    EXPECT_EQ(files, GetTokenTable().size());
 }
 
 } // namespace HostileTests

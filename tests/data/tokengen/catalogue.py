@@ -1,10 +1,11 @@
-"""Collects the tokens and their expected results, and writes both."""
+"""Collects the tokens and their expected results, and writes both, folder by folder."""
 
 import json
 import re
 
 from . import keys, signing
 from .assertion import Token, micros
+from .rules import RULES
 
 DEFAULTS = {
     "trust": ["sts"],
@@ -13,6 +14,9 @@ DEFAULTS = {
     "toleranceSec": 600,
     "xmlsec1": "none",
 }
+
+# For `about`, where a token is not more special than the rule that it breaks and its name say.
+RULE_SAYS_IT = None
 
 PARSE = "SsoClient::ParseException"
 SIGNATURE = "SsoClient::InvalidSignatureException"
@@ -64,41 +68,49 @@ def value_of(text, element):
 
 
 class Catalogue:
+    """Tokens by folder. A refused one lies in the folder of the rule that it breaks."""
+
     def __init__(self, directory):
         self._directory = directory
-        self._entries = []
+        self._folders = {"accepted": []} | {f"refused/{rule}": [] for rule in RULES}
+        self._made = set()
 
     def accept(self, name, about, text, facts, **conditions):
         entry = self._entry("accepted", name, about, text, conditions)
         entry["xmlsec1"] = "valid"
         entry["facts"] = facts
 
-    def refuse(self, name, about, text, refusals, xmlsec1="none", **conditions):
-        """xmlsec1: what that program must say of the bare signature, or "none" for not asked."""
-        entry = self._entry("refused", name, about, text, conditions)
+    def refuse(self, place, about, text, refusals, xmlsec1="none", **conditions):
+        """place: the rule and the name, with a slash between them.
+        xmlsec1: what that program must say of the bare signature, or "none" for not asked."""
+        rule, name = place.split("/")
+        entry = self._entry(f"refused/{rule}", name, about, text, conditions)
         if xmlsec1 != "none":
             entry["xmlsec1"] = xmlsec1
         entry["refusals"] = refusals
 
     def save(self):
-        expected = {self._directory / e["file"] for e in self._entries}
-        for folder in ("accepted", "refused"):
-            for stale in set((self._directory / folder).glob("*.xml")) - expected:
-                stale.unlink()
-        blocks = []
-        for entry in self._entries:
-            lines = [f"  {json.dumps(k)}: {json.dumps(v)}" for k, v in entry.items()]
-            blocks.append("{\n" + ",\n".join(lines) + "\n}")
-        (self._directory / "expected.json").write_text(
-            '{"defaults":\n' + json.dumps(DEFAULTS) + ',\n"tokens": [\n' + ",\n".join(blocks)
-            + "\n]}\n")
-        return len(self._entries)
+        _write_json(self._directory / "defaults.json", DEFAULTS.items())
+        written = {self._directory / "defaults.json"}
+        for folder, entries in self._folders.items():
+            if not entries:
+                raise ValueError(f"no token in {folder}")
+            table = self._directory / folder / "expected.json"
+            _write_json(table, _head(folder), entries)
+            written |= {table} | {table.with_name(entry["file"]) for entry in entries}
+        _delete_all_but(written, self._directory)
+        return sum(map(len, self._folders.values()))
 
     def _entry(self, folder, name, about, text, conditions):
-        file = f"{folder}/{name}.xml"
-        if any(e["file"] == file for e in self._entries):
+        file = f"{name}.xml"
+        # Tests are named after verdict and file alone, so no two rules may share a file's name.
+        verdict_and_file = (folder.split("/")[0], file)
+        if verdict_and_file in self._made:
             raise ValueError(f"{file} is made twice")
-        entry = {"file": file, "about": about}
+        self._made.add(verdict_and_file)
+        entry = {"file": file}
+        if about is not RULE_SAYS_IT:
+            entry["about"] = about
         if "trust" in conditions:
             entry["trust"] = conditions["trust"]
         if "now" in conditions:
@@ -106,10 +118,36 @@ class Catalogue:
             entry["nowMicros"] = micros(conditions["now"])
         if "tolerance" in conditions:
             entry["toleranceSec"] = conditions["tolerance"]
-        self._entries.append(entry)
+        self._folders[folder].append(entry)
         data = text if isinstance(text, bytes) else text.encode()
-        _write_unless_same_but_signature(self._directory / file, data)
+        _write_unless_same_but_signature(self._directory / folder / file, data)
         return entry
+
+
+def _head(folder):
+    """What a table says of all its tokens: the rule that they break, and where it comes from."""
+    if folder == "accepted":
+        return []
+    rule, standard = RULES[folder.removeprefix("refused/")]
+    return [("rule", rule)] + ([("standard", standard)] if standard else [])
+
+
+def _write_json(path, head, entries=()):
+    """One member a line, so that a change of one is a change of one line."""
+    members = [f"{json.dumps(k)}: {json.dumps(v)}" for k, v in head]
+    if entries:
+        blocks = [",\n".join(f"  {json.dumps(k)}: {json.dumps(v)}" for k, v in entry.items())
+                  for entry in entries]
+        members.append('"tokens": [\n{\n' + "\n},\n{\n".join(blocks) + "\n}\n]")
+    path.write_text("{\n" + ",\n".join(members) + "\n}\n")
+
+
+def _delete_all_but(kept, directory):
+    for path in sorted(directory.rglob("*"), reverse=True):
+        if path.is_file() and path not in kept:
+            path.unlink()
+        elif path.is_dir() and not any(path.iterdir()):
+            path.rmdir()
 
 
 def _write_unless_same_but_signature(path, data):

@@ -8,8 +8,8 @@ from . import keys, names
 from .accepted import DELEGATES, LEAN, LEAN_HOLDER, rsa_key_value
 from .assertion import ID, key_info
 from .catalogue import (
-    MALFORMED, NOT_COVERED, OUTSIDE_PROFILE, SIGNATURE_SYNTAX, TAMPERED, outside, replaced, says,
-    signed, syntax, value_of)
+    MALFORMED, NOT_COVERED, OUTSIDE_PROFILE, RULE_SAYS_IT, SIGNATURE_SYNTAX, TAMPERED, outside,
+    replaced, says, signed, syntax, value_of)
 
 SYNTAX_OR_OUTSIDE = SIGNATURE_SYNTAX + OUTSIDE_PROFILE
 BASE64_DIGITS = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/"
@@ -21,6 +21,7 @@ BASE64_TRANSFORM = names.DS + "base64"
 DECRYPT = "http://www.w3.org/2002/07/decrypt#XML"
 STR_TRANSFORM = ("http://docs.oasis-open.org/wss/2004/01/"
                  "oasis-200401-wss-soap-message-security-1.0#STR-Transform")
+MOVED_WHOLE = "the signed assertion is moved aside, with its signature"
 TWICE = outside(f"Reference '#{ID}' names 2 elements of the document")
 WSU = "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd"
 
@@ -79,10 +80,13 @@ def _changed_digit(value, position):
 def _tampering(c):
     good = signed(LEAN.but(renew_count="1"))
 
-    def add(name, *edits, refusals=TAMPERED, text=good):
+    def add(name, *edits, refusals=TAMPERED, text=good, rule="tampering"):
         for edit in edits:
             text = replaced(text, *edit)
-        c.refuse("tampered-" + name, "changed after it was signed", text, refusals, "invalid")
+        c.refuse(f"{rule}/tampered-{name}", RULE_SAYS_IT, text, refusals, "invalid")
+
+    def add_value(name, *edits, refusals=OUTSIDE_PROFILE + TAMPERED + SIGNATURE_SYNTAX):
+        add(name, *edits, refusals=refusals, rule="signature-values")
     digest, value = value_of(good, "DigestValue"), value_of(good, "SignatureValue")
     for name, position in (("first", 0), ("middle", 20)):
         add(f"digest-{name}-digit", (digest, _changed_digit(digest, position)))
@@ -90,22 +94,23 @@ def _tampering(c):
         add(f"signature-{name}-digit", (value, _changed_digit(value, position)))
     add("digest-of-another", (digest, base64.b64encode(bytes(32)).decode()))
     add("signature-of-another", (value, value_of(signed(LEAN), "SignatureValue")))
-    short = OUTSIDE_PROFILE + TAMPERED + SIGNATURE_SYNTAX
-    add("digest-empty", (digest, ""), refusals=short)
-    add("digest-cut", (digest, digest[:40]), refusals=short)
-    add("digest-longer", (digest, base64.b64encode(base64.b64decode(digest) + b"\0").decode()),
-        refusals=short)
-    add("signature-empty", (value, ""), refusals=short)
-    add("signature-cut", (value, value[:-4]), refusals=short)
+    add_value("digest-empty", (digest, ""))
+    add_value("digest-cut", (digest, digest[:40]))
+    add_value("digest-longer",
+              (digest, base64.b64encode(base64.b64decode(digest) + b"\0").decode()))
+    add_value("signature-empty", (value, ""))
+    add_value("signature-cut", (value, value[:-4]))
     longer = base64.b64encode(base64.b64decode(value) + b"\0").decode()
-    add("signature-longer", (value, longer), refusals=short)
+    add_value("signature-longer", (value, longer))
     zero_led = base64.b64encode(b"\0" + base64.b64decode(value)).decode()
-    add("signature-zero-led", (value, zero_led), refusals=short)
-    add("signature-zeros", (value, base64.b64encode(bytes(256)).decode()))
-    add("signature-ones", (value, base64.b64encode(b"\xff" * 256).decode()))
+    add_value("signature-zero-led", (value, zero_led))
+    add_value("signature-zeros", (value, base64.b64encode(bytes(256)).decode()),
+              refusals=TAMPERED)
+    add_value("signature-ones", (value, base64.b64encode(b"\xff" * 256).decode()),
+              refusals=TAMPERED)
     for name, bad in (("bad-digit", "*" + value[1:]), ("url-alphabet", "-_" + value[2:]),
                       ("padding-inside", value[:100] + "=" + value[101:])):
-        add(f"signature-{name}", (value, bad), refusals=short)
+        add_value(f"signature-{name}", (value, bad))
     add("subject", ("user@example.com", "admin@example.com"))
     add("group", ("example.com\\Users", "example.com\\Administrators"))
     add("issuer", ("https://sts.example.com/STS", "https://sts.example.com/STT"))
@@ -148,8 +153,8 @@ def _tampering(c):
 
 
 def _other_keys(c):
-    def add(name, about, text, refusals, **conditions):
-        c.refuse("key-" + name, about, text, refusals, "invalid", **conditions)
+    def add(name, about, text, refusals, rule="signing-key", **conditions):
+        c.refuse(f"{rule}/key-{name}", about, text, refusals, "invalid", **conditions)
     any_way = TAMPERED + OUTSIDE_PROFILE
     add("foreign", "another key of the same name signed", signed(LEAN, key="foreign"), TAMPERED)
     add("foreign-own-certificate", "the signer brings its own certificate",
@@ -161,17 +166,17 @@ def _other_keys(c):
     add("foreign-key-value", "the signer brings its bare key",
         signed(LEAN.signed_as(key_info=rsa_key_value("foreign")), key="foreign"), any_way)
     add("client", "the holder of the key signed for itself", signed(LEAN_HOLDER, key="client"), TAMPERED)
-    c.refuse("key-info-untrusted", "a trusted key signed, but KeyInfo shows another certificate",
+    c.refuse("signing-key/key-info-untrusted", "a trusted key signed, but KeyInfo shows another certificate",
              signed(LEAN.signed_as(key_info=key_info("foreign"))), OUTSIDE_PROFILE, "valid")
-    c.refuse("key-info-picks-another", "a trusted key signed, KeyInfo picks another trusted one",
+    c.refuse("signing-key/key-info-picks-another", "a trusted key signed, KeyInfo picks another trusted one",
              signed(LEAN.signed_as(key_info=key_info("sts-second"))), TAMPERED, "valid",
              trust=["sts", "sts-second"])
     almost = keys.certificate_base64("sts")
     almost = almost[:-8] + _changed_digit(almost[-8:], 0)
-    c.refuse("key-info-almost-trusted", "one bit of the certificate in KeyInfo differs",
+    c.refuse("signing-key/key-info-almost-trusted", "one bit of the certificate in KeyInfo differs",
              signed(LEAN.signed_as(key_info=key_info("sts"))).replace(
                  keys.certificate_base64("sts"), almost), OUTSIDE_PROFILE)
-    c.refuse("key-none-trusted", "nobody is trusted", signed(LEAN), OUTSIDE_PROFILE, trust=[])
+    c.refuse("signing-key/key-none-trusted", "nobody is trusted", signed(LEAN), OUTSIDE_PROFILE, trust=[])
     add("other-kind", "an RSA signature where an elliptic curve is trusted", signed(LEAN),
         OUTSIDE_PROFILE, trust=["sts-p256"])
     add("other-curve", "the same algorithm by a key of another curve",
@@ -179,9 +184,9 @@ def _other_keys(c):
         trust=["sts-p384"])
     add("method-of-other-kind", "an ECDSA method where RSA is trusted",
         signed(LEAN.signed_as(method=names.ECDSA_SHA256), key="sts-p256"), OUTSIDE_PROFILE)
-    c.refuse("key-weak", "a trusted RSA key of 1024 bits", signed(LEAN, key="weak"),
+    c.refuse("signing-key/key-weak", "a trusted RSA key of 1024 bits", signed(LEAN, key="weak"),
              OUTSIDE_PROFILE, "valid", trust=["weak"])
-    c.refuse("key-weak-picked", "the weak key among strong ones",
+    c.refuse("signing-key/key-weak-picked", "the weak key among strong ones",
              signed(LEAN.signed_as(key_info=key_info("weak")), key="weak"), OUTSIDE_PROFILE,
              "valid", trust=["sts", "weak"])
     ecdsa = signed(LEAN.signed_as(method=names.ECDSA_SHA256), key="sts-p256")
@@ -190,7 +195,8 @@ def _other_keys(c):
                          ("longer", base64.b64decode(value) + b"\0"),
                          ("der", _der(base64.b64decode(value)))):
         add(f"ecdsa-{name}", "an ECDSA value of a wrong form",
-            ecdsa.replace(value, base64.b64encode(forged).decode()), any_way, trust=["sts-p256"])
+            ecdsa.replace(value, base64.b64encode(forged).decode()), any_way, "signature-values",
+            trust=["sts-p256"])
 
 
 def _der(plain):
@@ -208,11 +214,11 @@ def _hmac(c):
             ("certificate-pem", certificate.public_bytes(Encoding.PEM)),
             ("certificate-der", certificate.public_bytes(Encoding.DER)),
             ("modulus", keys.modulus_bytes("sts")), ("empty", b"")):
-        c.refuse(f"hmac-{name}", "HMAC keyed with what everybody knows",
+        c.refuse(f"algorithms/hmac-{name}", "HMAC keyed with what everybody knows",
                  signed(LEAN.signed_as(method=names.HMAC_SHA256), hmac_key=secret),
                  OUTSIDE_PROFILE)
     method = f'<ds:SignatureMethod Algorithm="{names.HMAC_SHA256}"/>'
-    c.refuse("hmac-cut-to-nothing", "HMACOutputLength of zero",
+    c.refuse("algorithms/hmac-cut-to-nothing", "HMACOutputLength of zero",
              signed(LEAN.signed_as(method=names.HMAC_SHA256),
                     (method, method.replace("/>", "><ds:HMACOutputLength>0</ds:HMACOutputLength>"
                                             "</ds:SignatureMethod>")),
@@ -221,7 +227,7 @@ def _hmac(c):
 
 def _weak_algorithms(c):
     def add(name, token, key="sts", trust=None, xmlsec1="none"):
-        c.refuse("algorithm-" + name, "an algorithm outside the profile", signed(token, key=key),
+        c.refuse("algorithms/algorithm-" + name, RULE_SAYS_IT, signed(token, key=key),
                  OUTSIDE_PROFILE, xmlsec1, trust=trust or ["sts"])
     add("rsa-sha1", LEAN.signed_as(method=names.RSA_SHA1), xmlsec1="valid")
     add("rsa-md5", LEAN.signed_as(method=names.RSA_MD5))
@@ -244,9 +250,8 @@ def _weak_algorithms(c):
 
 
 def _references(c):
-    def add(name, refusals, *edits, token=LEAN, xmlsec1="none"):
-        c.refuse("reference-" + name, "what the signature refers to", signed(token, *edits),
-                 refusals, xmlsec1)
+    def add(name, refusals, *edits, token=LEAN, rule="signature-coverage"):
+        c.refuse(f"{rule}/reference-{name}", RULE_SAYS_IT, signed(token, *edits), refusals)
 
     def uri(value):
         return LEAN.signed_as(uri=value)
@@ -260,7 +265,8 @@ def _references(c):
             ("document-and-id", f"token.xml#{ID}"), ("query-and-id", f"?#{ID}"),
             ("two-hashes", f"##{ID}"), ("blank", " "), ("cid", "cid:token")):
         add(name, NOT_COVERED, token=uri(value))
-    add("absent-uri", syntax("'Reference' has no attribute 'URI'"), (f' URI="#{ID}"', ""))
+    add("absent-uri", syntax("'Reference' has no attribute 'URI'"), (f' URI="#{ID}"', ""),
+        rule="signature-structure")
     child = ("<saml:AuthnContextClassRef>", '<saml:AuthnContextClassRef ID="_child">')
     add("child", NOT_COVERED, child, token=uri("#_child"))
     value = ("<ds:SignatureValue>", '<ds:SignatureValue ID="_child">')
@@ -280,18 +286,19 @@ def _references(c):
     add("none", NOT_COVERED, (reference, ""))
     second_info = expected("SignatureValue", "Signature", "'ds:SignedInfo'")
     add("two-signed-infos", second_info,
-        ("</ds:SignedInfo>", f"</ds:SignedInfo><ds:SignedInfo>{reference}</ds:SignedInfo>"))
+        ("</ds:SignedInfo>", f"</ds:SignedInfo><ds:SignedInfo>{reference}</ds:SignedInfo>"),
+        rule="signature-structure")
     # The second, genuine SignedInfo stands where a careless search finds it first.
     good = signed(LEAN)
     info = good[good.index("<ds:SignedInfo>"):good.index("<ds:SignatureValue>")]
     forged = replaced(info, value_of(good, "DigestValue"), base64.b64encode(bytes(32)).decode())
     for name, order in (("genuine-first", info + forged), ("forged-first", forged + info)):
-        c.refuse(f"reference-two-signed-infos-{name}", "a second SignedInfo",
+        c.refuse(f"signature-structure/reference-two-signed-infos-{name}", "a second SignedInfo",
                  replaced(good, info, order), second_info)
     hidden = replaced(good, info, forged).replace(
         "</ds:Signature>", f"<ds:Object>{info}</ds:Object></ds:Signature>")
-    c.refuse("reference-signed-info-in-object", "the genuine SignedInfo hides in an Object", hidden,
-             surplus("ds:Object", "Signature"))
+    c.refuse("signature-structure/reference-signed-info-in-object",
+             "the genuine SignedInfo hides in an Object", hidden, surplus("ds:Object", "Signature"))
 
 
 def _transforms(c):
@@ -300,7 +307,7 @@ def _transforms(c):
     exclusive = f'<ds:Transform Algorithm="{names.EXC_C14N}"/>'
 
     def add(name, refusals, *edits, token=LEAN, xmlsec1="none"):
-        c.refuse("transform-" + name, "what is done before digesting", signed(token, *edits),
+        c.refuse("transforms/transform-" + name, RULE_SAYS_IT, signed(token, *edits),
                  refusals, xmlsec1)
 
     def transform(algorithm, content=""):
@@ -365,13 +372,13 @@ def _signature_shape(c):
     digest = "<ds:DigestValue>@DIGEST@</ds:DigestValue>"
 
     def add(name, refusals, *edits):
-        c.refuse("shape-" + name, "how the signature is built", signed(LEAN, *edits), refusals)
+        c.refuse("signature-structure/shape-" + name, RULE_SAYS_IT, signed(LEAN, *edits), refusals)
 
     def add_changed(name, refusals, *edits):
         text = good
         for edit in edits:
             text = replaced(text, *edit)
-        c.refuse("shape-" + name, "how the signature is built", text, refusals)
+        c.refuse("signature-structure/shape-" + name, RULE_SAYS_IT, text, refusals)
     no_object = surplus("ds:Object", "Signature")
     add_changed("empty", expected("SignedInfo", "Signature", "nothing"), (info + value, ""))
     add_changed("no-signed-info", expected("SignedInfo", "Signature", "'ds:SignatureValue'"), (info, ""))
@@ -443,24 +450,25 @@ def _comments(c):
 
     def add(name, before, text=good):
         position = text.index(before) + len(before) + 10
-        c.refuse("comment-in-" + name, "a comment inside a value of the signature",
+        c.refuse("signature-structure/comment-in-" + name, "a comment inside a value of the signature",
                  text[:position] + "<!-- -->" + text[position:], SIGNATURE_SYNTAX)
     add("digest-value", "<ds:DigestValue>")
     add("signature-value", "<ds:SignatureValue>")
     with_certificate = signed(LEAN.signed_as(key_info=key_info("sts")))
     position = with_certificate.index("<ds:X509Certificate>") + 60
-    c.refuse("comment-in-key-info-certificate", "a comment inside KeyInfo's certificate",
+    c.refuse("signature-structure/comment-in-key-info-certificate",
+             "a comment inside KeyInfo's certificate",
              with_certificate[:position] + "<!-- -->" + with_certificate[position:],
              SYNTAX_OR_OUTSIDE)
     for name, element in (("digest-value", "DigestValue"), ("signature-value", "SignatureValue")):
-        c.refuse(f"instruction-in-{name}", "a processing instruction inside a value",
+        c.refuse(f"signature-structure/instruction-in-{name}",
+                 "a processing instruction inside a value",
                  replaced(good, f"</ds:{element}>", f"<?a?></ds:{element}>"), SIGNATURE_SYNTAX)
 
 
 def _duplicate_ids(c):
     def add(name, *edits, token=LEAN):
-        c.refuse("duplicate-" + name, "the signed ID stands twice in the document",
-                 signed(token, *edits), TWICE)
+        c.refuse("duplicate-ids/duplicate-" + name, RULE_SAYS_IT, signed(token, *edits), TWICE)
     value = '<saml:AttributeValue xsi:type="xs:string">Ada'
     for name, attribute in (
             ("id", f'ID="{ID}"'), ("id-mixed-case", f'Id="{ID}"'), ("id-lower-case", f'id="{ID}"'),
@@ -502,14 +510,14 @@ def _wrap_all(c, name, evil_id, uri, whole_too):
 
     def add(place, refusals, before, after):
         text = replaced(evil, before, after).replace("@SIGNATURE@", signature)
-        c.refuse(f"wrapped-{place}-{name}", "the signed assertion is moved aside", text,
+        c.refuse(f"wrapping/wrapped-{place}-{name}", RULE_SAYS_IT, text,
                  NOT_COVERED if not_covered else refusals)
 
     def in_signature(place, refusals, open_tag, close_tag, content):
         inside = signature.replace("</ds:Signature>", open_tag + content + close_tag
                                    + "</ds:Signature>")
         text = evil.replace("@SIGNATURE@", inside)
-        c.refuse(f"wrapped-{place}-{name}", "the signed assertion is moved aside", text, refusals)
+        c.refuse(f"wrapping/wrapped-{place}-{name}", RULE_SAYS_IT, text, refusals)
     in_signature("signature-child", surplus("saml:Assertion", "Signature"), "", "", bare)
     for form, moved in (("", bare), ("-with-signature", original))[:1 + whole_too]:
         in_signature("object" + form, surplus("ds:Object", "Signature"),
@@ -523,13 +531,13 @@ def _wrap_all(c, name, evil_id, uri, whole_too):
     if not uri:
         return
     text = replaced(evil, "<saml:Issuer ", original + "<saml:Issuer ").replace("@SIGNATURE@", "")
-    c.refuse(f"wrapped-first-child-{name}", "the signed assertion is moved aside, whole", text,
+    c.refuse(f"wrapping/wrapped-first-child-{name}", MOVED_WHOLE, text,
              says("Expected element 'Issuer' not found."))
     text = evil.replace("@SIGNATURE@", original)
-    c.refuse(f"wrapped-in-place-of-signature-{name}", "the signed assertion is moved aside, whole",
-             text, syntax("Expected element 'Signature', found 'saml:Assertion'"))
+    c.refuse(f"wrapping/wrapped-in-place-of-signature-{name}", MOVED_WHOLE, text,
+             syntax("Expected element 'Signature', found 'saml:Assertion'"))
     response = '<samlp:Response xmlns:samlp="urn:oasis:names:tc:SAML:2.0:protocol">'
-    c.refuse(f"wrapped-in-response-{name}", "both assertions stand in a response",
+    c.refuse(f"wrapping/wrapped-in-response-{name}", "both assertions stand in a response",
              response + evil.replace("@SIGNATURE@", "") + original + "</samlp:Response>",
              says("Expected element 'Assertion' not found."))
 

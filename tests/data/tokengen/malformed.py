@@ -2,7 +2,7 @@
 
 from . import names
 from .accepted import LEAN
-from .catalogue import MALFORMED, outside, replaced, says, signed, syntax
+from .catalogue import MALFORMED, RULE_SAYS_IT, outside, replaced, says, signed, syntax
 
 
 def add_all(catalogue):
@@ -20,7 +20,7 @@ def _doctypes(c):
         text = doctype + good
         for edit in edits:
             text = replaced(text, *edit)
-        c.refuse("doctype-" + name, "a document type declaration", text, MALFORMED)
+        c.refuse("doctype/doctype-" + name, RULE_SAYS_IT, text, MALFORMED)
     use = (">Ada<", ">&e;<")
     add("empty", "<!DOCTYPE saml:Assertion>")
     add("empty-subset", "<!DOCTYPE saml:Assertion []>")
@@ -52,10 +52,10 @@ def _doctypes(c):
     add("quadratic", f'<!DOCTYPE saml:Assertion [<!ENTITY e "{"a" * 5000}">]>',
         (">Ada<", ">" + "&e;" * 1000 + "<"))
     add("recursive", '<!DOCTYPE saml:Assertion [<!ENTITY e "&f;"><!ENTITY f "&e;">]>', use)
-    c.refuse("doctype-inside-root", "a declaration out of place",
+    c.refuse("doctype/doctype-inside-root", "a declaration out of place",
              replaced(good, "<saml:Subject>", "<!DOCTYPE a><saml:Subject>"), MALFORMED)
-    c.refuse("doctype-after-root", "a declaration out of place", good + "<!DOCTYPE a>", MALFORMED)
-    c.refuse("doctype-lower-case", "not a declaration at all", "<!doctype html>" + good, MALFORMED)
+    c.refuse("doctype/doctype-after-root", "a declaration out of place", good + "<!DOCTYPE a>", MALFORMED)
+    c.refuse("doctype/doctype-lower-case", "not a declaration at all", "<!doctype html>" + good, MALFORMED)
 
 
 def _references(c):
@@ -65,10 +65,10 @@ def _references(c):
             ("surrogate", "&#xD800;"), ("noncharacter", "&#xFFFE;"), ("too-large", "&#x110000;"),
             ("overflowing", "&#4294967361;"), ("unfinished", "&amp"), ("bare", "& "),
             ("empty", "&#;"), ("bad-digit", "&#12a;"), ("upper-case-x", "&#X41;")):
-        c.refuse(f"entity-{name}", "a reference that is none", replaced(good, ">Ada<", f">{reference}<"),
-                 MALFORMED)
+        c.refuse(f"entity-references/entity-{name}", RULE_SAYS_IT,
+                 replaced(good, ">Ada<", f">{reference}<"), MALFORMED)
     for name, reference in (("undefined", "&e;"), ("nul", "&#0;"), ("bare", "&")):
-        c.refuse(f"entity-in-attribute-{name}", "a reference that is none",
+        c.refuse(f"entity-references/entity-in-attribute-{name}", RULE_SAYS_IT,
                  replaced(good, "<saml:AuthnContextClassRef>",
                           f'<saml:AuthnContextClassRef a="{reference}">'), MALFORMED)
 
@@ -78,7 +78,7 @@ def _encodings(c):
     head, tail = (part.encode() for part in good.split(">Ada<"))
 
     def value(name, data, about="bytes that are not UTF-8"):
-        c.refuse(f"utf8-{name}", about, head + b">" + data + b"<" + tail, MALFORMED)
+        c.refuse(f"encoding/utf8-{name}", about, head + b">" + data + b"<" + tail, MALFORMED)
     value("overlong-two", b"\xc0\xaf")
     value("overlong-three", b"\xe0\x80\xaf")
     value("overlong-four", b"\xf0\x80\x80\xaf")
@@ -97,32 +97,32 @@ def _encodings(c):
     value("nul", b"A\0da", "a character that XML forbids")
     value("control", b"A\x01da", "a character that XML forbids")
     value("escape", b"A\x1bda", "a character that XML forbids")
-    c.refuse("nul-last", "a NUL byte after the root", good.encode() + b"\0", MALFORMED)
-    c.refuse("nul-first", "a NUL byte before the root", b"\0" + good.encode(), MALFORMED)
-    c.refuse("nul-then-more", "more text behind a NUL byte", good.encode() + b"\0<a/>", MALFORMED)
+    c.refuse("encoding/nul-last", "a NUL byte after the root", good.encode() + b"\0", MALFORMED)
+    c.refuse("encoding/nul-first", "a NUL byte before the root", b"\0" + good.encode(), MALFORMED)
+    c.refuse("encoding/nul-then-more", "more text behind a NUL byte", good.encode() + b"\0<a/>", MALFORMED)
     for name, encoding in (("utf16-le", "utf-16-le"), ("utf16-be", "utf-16-be"),
                            ("utf32", "utf-32-le")):
-        c.refuse(f"encoding-{name}", "another encoding", good.encode(encoding), MALFORMED)
-    c.refuse("encoding-utf16-marked", "another encoding, with a byte order mark",
+        c.refuse(f"encoding/encoding-{name}", "another encoding", good.encode(encoding), MALFORMED)
+    c.refuse("encoding/encoding-utf16-marked", "another encoding, with a byte order mark",
              good.encode("utf-16"), MALFORMED)
-    c.refuse("encoding-utf16-declared", "another encoding, declared",
+    c.refuse("encoding/encoding-utf16-declared", "another encoding, declared",
              ('<?xml version="1.0" encoding="UTF-16"?>' + good).encode("utf-16"), MALFORMED)
     for name in ("ISO-8859-1", "US-ASCII", "UTF-16", "UTF-7", "EBCDIC-CP-US", "windows-1252",
                  "unknown"):
         text = f'<?xml version="1.0" encoding="{name}"?>' + good
-        c.refuse(f"encoding-declared-{name.lower()}", "a declared encoding other than UTF-8", text,
+        c.refuse(f"encoding/encoding-declared-{name.lower()}", "a declared encoding other than UTF-8", text,
                  MALFORMED)
     # The declared encoding gives the bytes another meaning than the one that was signed.
     text = '<?xml version="1.0" encoding="ISO-8859-1"?>' + signed(LEAN.but(given_name="Zo\u00eb"))
-    c.refuse("encoding-latin-1-text", "text outside ASCII under another encoding",
+    c.refuse("encoding/encoding-latin-1-text", "text outside ASCII under another encoding",
              text.encode("latin-1"), MALFORMED)
 
 
 def _broken(c):
     good = signed(LEAN)
 
-    def add(name, text, about="not well-formed"):
-        c.refuse("broken-" + name, about, text, MALFORMED)
+    def add(name, text):
+        c.refuse("well-formedness/broken-" + name, RULE_SAYS_IT, text, MALFORMED)
     add("empty-file", "")
     add("blank-file", " \n")
     add("comment-only", "<!-- a -->")
@@ -179,7 +179,7 @@ def _namespaces(c):
     ref, end = "<saml:AuthnContextClassRef>", "</saml:AuthnContextClassRef>"
 
     def add(name, *edits, refusals=MALFORMED):
-        c.refuse("namespace-" + name, "names that break the rules of namespaces",
+        c.refuse("namespaces/namespace-" + name, RULE_SAYS_IT,
                  signed(LEAN, *edits), refusals)
     def undeclared(element, prefix):
         return outside(f"Element '{element}' uses the undeclared prefix '{prefix}'")
@@ -200,7 +200,7 @@ def _namespaces(c):
         refusals=other_namespace("Assertion"))
     add("undeclared-xsi", (f'xmlns:xsi="{names.XSI}" ', ""),
         refusals=undeclared("saml:AttributeValue", "xsi"))
-    c.refuse("namespace-undeclared-ds", "names that break the rules of namespaces",
+    c.refuse("namespaces/namespace-undeclared-ds", RULE_SAYS_IT,
              replaced(signed(LEAN), f' xmlns:ds="{names.DS}"', ""),
              syntax("Expected element 'Signature', found 'ds:Signature'"))
     add("prefix-unbound", (ref, '<saml:AuthnContextClassRef xmlns:a="">'))
@@ -221,5 +221,5 @@ def _namespaces(c):
                                     ("relative-uri-inclusive", inclusive, used),
                                     ("relative-default-inclusive", inclusive, default)):
         text = signed(token, (ref, ref[:-1] + attributes), stand_in=stand_in)
-        c.refuse("namespace-" + name, "a relative namespace URI, which has no canonical form",
+        c.refuse("namespaces/namespace-" + name, "a relative namespace URI, which has no canonical form",
                  text, outside("The namespace URI 'relative/path' is relative"))

@@ -36,21 +36,21 @@ def _foreign_children(c):
                 ("length", "<ds:HMACOutputLength>0</ds:HMACOutputLength>", "ds:HMACOutputLength"),
                 ("foreign", '<x:a xmlns:x="urn:x"></x:a>', "x:a"),
                 ("list", listed("xs"), "InclusiveNamespaces")):
-            _refuse(c, f"parameter-{element.lower()}-{name}", about, no_parameter(algorithm, told),
+            _refuse(c, f"algorithm-parameters/parameter-{element.lower()}-{name}", about, no_parameter(algorithm, told),
                     LEAN, (bare, bare[:-2] + f">{child}</ds:{element}>"), xmlsec1="valid")
-    _refuse(c, "parameter-canonicalizationmethod-foreign", about,
+    _refuse(c, "algorithm-parameters/parameter-canonicalizationmethod-foreign", about,
             no_parameter(names.EXC_C14N, "x:a"), LEAN,
             (C14N_LIST + "/>", C14N_LIST + '><x:a xmlns:x="urn:x"/></ds:CanonicalizationMethod>'))
 
 
 def _many_references(c):
     one = good_reference(LEAN)
-    _refuse(c, "references-nine", "one more good reference than is looked at",
+    _refuse(c, "signature-coverage/references-nine", "one more good reference than is looked at",
             outside("The signature has 9 references; 1 to 8 are accepted"), LEAN,
             (one, one * 9), xmlsec1="valid")
     wrong = one.replace("@DIGEST@", base64.b64encode(bytes(32)).decode())
     for name, pair in (("first", wrong + one), ("second", one + wrong)):
-        _refuse(c, f"references-two-{name}-wrong", "one of two references has another digest",
+        _refuse(c, f"tampering/references-two-{name}-wrong", "one of two references has another digest",
                 TAMPERED, LEAN, (one, pair), xmlsec1="invalid")
 
 
@@ -61,10 +61,10 @@ def _misplaced_lists(c):
             ("c14n", "CanonicalizationMethod", LEAN.signed_as(c14n=names.C14N)),
             ("transform", "Transform", LEAN.signed_as(transforms=(names.ENVELOPED, names.C14N)))):
         bare = f'<ds:{element} Algorithm="{names.C14N}"/>'
-        _refuse(c, f"prefix-list-inclusive-{name}", about, refused, token,
+        _refuse(c, f"prefix-lists/prefix-list-inclusive-{name}", about, refused, token,
                 (bare, bare[:-2] + f">{listed('xs')}</ds:{element}>"), xmlsec1="valid")
     bare = f'<ds:Transform Algorithm="{names.ENVELOPED}"/>'
-    _refuse(c, "prefix-list-enveloped", about, no_parameter(names.ENVELOPED, "InclusiveNamespaces"),
+    _refuse(c, "prefix-lists/prefix-list-enveloped", about, no_parameter(names.ENVELOPED, "InclusiveNamespaces"),
             LEAN, (bare, bare[:-2] + f">{listed('xs')}</ds:Transform>"), xmlsec1="valid")
 
 
@@ -72,12 +72,12 @@ def _two_lists(c):
     refused = no_parameter(names.EXC_C14N, "ec:InclusiveNamespaces")
     for name, lists in (("first", ("xs", "xsi")), ("last", ("xsi", "xs"))):
         digest = value_of(signed(LEAN.signed_as(transform_prefixes="xs")), "DigestValue")
-        _refuse(c, f"prefix-list-twice-{name}-verifies", "which of two prefix lists holds?", refused,
+        _refuse(c, f"prefix-lists/prefix-list-twice-{name}-verifies", "which of two prefix lists holds?", refused,
                 LEAN, ("@DIGEST@", digest),
                 (TRANSFORM_LIST + "/>",
                  TRANSFORM_LIST + ">" + "".join(map(listed, lists)) + "</ds:Transform>"))
     # In CanonicalizationMethod the lists are signed themselves, by the first of them.
-    _refuse(c, "prefix-list-twice-c14n", "which of two prefix lists holds?", refused, LEAN,
+    _refuse(c, "prefix-lists/prefix-list-twice-c14n", "which of two prefix lists holds?", refused, LEAN,
             (C14N_LIST + "/>",
              C14N_LIST + f">{listed('xs')}{listed('xsi')}</ds:CanonicalizationMethod>"))
 
@@ -96,7 +96,7 @@ def _bad_lists(c):
              good.replace(' PrefixList="xs"', ""))):
         for place, element, start in (("c14n", "CanonicalizationMethod", C14N_LIST),
                                       ("transform", "Transform", TRANSFORM_LIST)):
-            _refuse(c, f"prefix-list-{name}-{place}", "a prefix list that is more or less than one",
+            _refuse(c, f"prefix-lists/prefix-list-{name}-{place}", "a prefix list that is more or less than one",
                     refusals, LEAN, (start + "/>", f"{start}>{bad}</ds:{element}>"),
                     xmlsec1="none" if name == "absent" else "valid")
 
@@ -105,7 +105,7 @@ def _long_lists(c):
     prefixes = " ".join(listed_prefixes(65))
     for place, token in (("c14n", LEAN.signed_as(c14n_prefixes=prefixes)),
                          ("transform", LEAN.signed_as(transform_prefixes=prefixes))):
-        _refuse(c, f"prefix-list-65-{place}", "one more prefix than is looked up",
+        _refuse(c, f"prefix-lists/prefix-list-65-{place}", "one more prefix than is looked up",
                 outside("More than 64 prefixes in a PrefixList"), token, xmlsec1="valid")
 
 
@@ -114,7 +114,7 @@ def _digests(c):
         return lambda text: base64.b64encode(change(base64.b64decode(text))).decode()
 
     def add(name, refusals, form):
-        _refuse(c, "digest-" + name, "SignedInfo is genuine, the digest in it is not", refusals,
+        _refuse(c, "signature-values/digest-" + name, "SignedInfo is genuine, the digest in it is not", refusals,
                 LEAN, digest_form=form, xmlsec1="invalid")
     add("byte-short", TAMPERED, changed(lambda digest: digest[:-1]))
     add("one-byte", TAMPERED, changed(lambda digest: digest[:1]))

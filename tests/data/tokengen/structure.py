@@ -4,7 +4,7 @@ the named rule can refuse them."""
 from . import keys, names
 from .accepted import ADVICE, DELEGATES, LEAN, LEAN_HOLDER
 from .assertion import ID
-from .catalogue import SIGNATURE_SYNTAX, begins, says, signed
+from .catalogue import RULE_SAYS_IT, SIGNATURE_SYNTAX, begins, says, signed
 
 EMPTY_REFERENCE = LEAN.signed_as(uri="")
 ISSUER = f'<saml:Issuer Format="{names.ENTITY_FORMAT}">https://sts.example.com/STS</saml:Issuer>'
@@ -13,6 +13,7 @@ BEARER_DATA = ('<saml:SubjectConfirmationData NotOnOrAfter="2026-12-31T00:00:00Z
                "</saml:SubjectConfirmationData>")
 CLASS_REF = (f"<saml:AuthnContextClassRef>{names.PASSWORD_CONTEXT}</saml:AuthnContextClassRef>")
 HOLDER_DATA = '<saml:SubjectConfirmationData xsi:type="saml:KeyInfoConfirmationDataType">'
+UNKNOWN = "Unknown or duplicate restriction node under Conditions"
 BAD_DATES = {
     "empty": "", "word": "yesterday", "date-only": "2026-01-01", "month-13": "2026-13-01T00:00:00Z",
     "february-30": "2026-02-30T00:00:00Z", "february-29": "2026-02-29T00:00:00Z",
@@ -52,8 +53,11 @@ def add_all(catalogue):
     _issuer(catalogue)
     _signature_place(catalogue)
     _subject(catalogue)
+    _confirmation(catalogue)
     _holder_data(catalogue)
     _conditions(catalogue)
+    _audience(catalogue)
+    _counts(catalogue)
     _delegation(catalogue)
     _advice(catalogue)
     _authn_statement(catalogue)
@@ -64,13 +68,12 @@ def add_all(catalogue):
 
 
 def _add(catalogue, name, token, refusals, *edits, **conditions):
-    catalogue.refuse(name, "one rule broken, signed as it stands", signed(token, *edits), refusals,
-                     "valid", **conditions)
+    catalogue.refuse(name, RULE_SAYS_IT, signed(token, *edits), refusals, "valid", **conditions)
 
 
 def _assertion(c):
-    def add(name, refusals, *edits):
-        _add(c, "assertion-" + name, EMPTY_REFERENCE, refusals, *edits)
+    def add(name, refusals, *edits, rule="assertion"):
+        _add(c, f"{rule}/assertion-{name}", EMPTY_REFERENCE, refusals, *edits)
     tag = "saml:Assertion"
     add("other-name", not_found("Assertion"),
         ("<saml:Assertion ", "<saml:EncryptedAssertion "),
@@ -100,7 +103,7 @@ def _assertion(c):
     add("xml-id", unexpected("Assertion"), (" Version=", f' xml:id="{ID}x" Version='))
     add("xml-lang", unexpected("Assertion"), (" Version=", ' xml:lang="en" Version='))
     add("issue-instant-bad", says("Assertion/@IssueInstant is not a date"),
-        (' IssueInstant="2026-01-01T00:00:00Z"', ' IssueInstant="2026-01-01"'))
+        (' IssueInstant="2026-01-01T00:00:00Z"', ' IssueInstant="2026-01-01"'), rule="dates")
     add("text-first", not_found("Issuer"), (ISSUER, "text" + ISSUER))
     add("text-last", says("Unexpected elements under Assertion"),
         ("</saml:Assertion>", "text</saml:Assertion>"))
@@ -118,14 +121,15 @@ def _assertion(c):
     for name, version in (("1.1", "1.1"), ("2", "2"), ("2.00", "2.00"), ("empty", ""),
                           ("blank", " 2.0"), ("2.1", "2.1")):
         add(f"version-{name}", says("Invalid token version"),
-            (' Version="2.0"', f' Version="{version}"'))
+            (' Version="2.0"', f' Version="{version}"'), rule="version-and-id")
     for name, value in (("letter", "abc"), ("empty", ""), ("digit", "1_a"), ("blank", " _a")):
-        add(f"id-{name}", says("Invalid token ID"), (f' ID="{ID}"', f' ID="{value}"'))
+        add(f"id-{name}", says("Invalid token ID"), (f' ID="{ID}"', f' ID="{value}"'),
+            rule="version-and-id")
 
 
 def _issuer(c):
     def add(name, refusals, *edits):
-        _add(c, "issuer-" + name, LEAN, refusals, *edits)
+        _add(c, "issuer/issuer-" + name, LEAN, refusals, *edits)
     add("missing", not_found("Issuer"), (ISSUER, ""))
     add("no-format", missing("Issuer", "Format"), (f' Format="{names.ENTITY_FORMAT}"', ""))
     for attribute in ("NameQualifier", "SPNameQualifier", "SPProvidedID"):
@@ -144,7 +148,7 @@ def _signature_place(c):
     not_there = says("Expected element ds:Signature not found")
 
     def add(name, refusals, text):
-        c.refuse("signature-" + name, "where the signature stands", text, refusals)
+        c.refuse("signature-place/signature-" + name, RULE_SAYS_IT, text, refusals)
     add("missing", SIGNATURE_SYNTAX, unsigned)
     head, _ = unsigned.split("<saml:Subject>", 1)
     add("missing-and-nothing-else", not_there, head + "</saml:Assertion>")
@@ -169,10 +173,9 @@ def _signature_place(c):
 
 def _subject(c):
     def add(name, refusals, *edits):
-        _add(c, "subject-" + name, LEAN, refusals, *edits)
+        _add(c, "subject/subject-" + name, LEAN, refusals, *edits)
     confirmation = LEAN.text()[LEAN.text().index("<saml:SubjectConfirmation "):]
     confirmation = confirmation[:confirmation.index("</saml:Subject>")]
-    data = "SubjectConfirmationData"
     add("attribute", unexpected("Subject"), ("<saml:Subject>", '<saml:Subject a="b">'))
     add("other-name", not_found("Subject"),
         ("<saml:Subject>", "<saml:Subjekt>"), ("</saml:Subject>", "</saml:Subjekt>"))
@@ -196,6 +199,12 @@ def _subject(c):
         (confirmation, confirmation * 2))
     add("text-last", says("Unexpected elements after SubjectConfirmation"),
         ("</saml:Subject>", "x</saml:Subject>"))
+
+
+def _confirmation(c):
+    def add(name, refusals, *edits, rule="subject-confirmation"):
+        _add(c, f"{rule}/subject-{name}", LEAN, refusals, *edits)
+    data = "SubjectConfirmationData"
     for name, method in (
             ("sender-vouches", "urn:oasis:names:tc:SAML:2.0:cm:sender-vouches"),
             ("saml1-bearer", "urn:oasis:names:tc:SAML:1.0:cm:bearer"),
@@ -217,7 +226,7 @@ def _subject(c):
         (f'<saml:{data} NotOnOrAfter="2026-12-31T00:00:00Z">', f"<saml:{data}>"))
     add("data-bad-date", says(f"{data}/@NotOnOrAfter is not a date"),
         (f'<saml:{data} NotOnOrAfter="2026-12-31T00:00:00Z">',
-         f'<saml:{data} NotOnOrAfter="2026-12-32T00:00:00Z">'))
+         f'<saml:{data} NotOnOrAfter="2026-12-32T00:00:00Z">'), rule="dates")
     for name, content in (("element", "<saml:a/>"), ("text", "a"), ("instruction", "<?a?>")):
         add(f"data-{name}", says(f"Element '{data}' must be empty"),
             (f"></saml:{data}>", f">{content}</saml:{data}>"))
@@ -228,7 +237,7 @@ def _holder_data(c):
     xsi_type = f"{names.XSI}:type"
 
     def add(name, refusals, *edits):
-        _add(c, "holder-" + name, LEAN_HOLDER, refusals, *edits)
+        _add(c, "holder-of-key/holder-" + name, LEAN_HOLDER, refusals, *edits)
     text = LEAN_HOLDER.text()
     key_info = text[text.index("<ds:KeyInfo xmlns"):text.index(f"</saml:{data}>")]
     certificate = keys.certificate_base64("client")
@@ -290,14 +299,13 @@ def _with_trailing_byte(quantum):
     return b64encode(b64decode(quantum) + b"\0").decode()
 
 
+def inside(content):
+    return "</saml:Conditions>", content + "</saml:Conditions>"
+
+
 def _conditions(c):
-    unknown = "Unknown or duplicate restriction node under Conditions"
-
-    def add(name, refusals, *edits, token=LEAN):
-        _add(c, "conditions-" + name, token, refusals, *edits)
-
-    def inside(content):
-        return "</saml:Conditions>", content + "</saml:Conditions>"
+    def add(name, refusals, *edits, rule="conditions"):
+        _add(c, f"{rule}/conditions-{name}", LEAN, refusals, *edits)
     start, end = ' NotBefore="2026-01-01T00:00:00Z"', ' NotOnOrAfter="2026-12-31T00:00:00Z"'
     both = f"<saml:Conditions{start}{end}>"
     add("missing", not_found("Conditions"),
@@ -309,33 +317,44 @@ def _conditions(c):
     add("attribute", unexpected("Conditions"), (both, both[:-1] + ' a="b">'))
     for name, value in BAD_DATES.items():
         add(f"start-{name}", says("Conditions/@NotBefore is not a date"),
-            (both, both.replace("2026-01-01T00:00:00Z", value)))
+            (both, both.replace("2026-01-01T00:00:00Z", value)), rule="dates")
     add("end-bad", says("Conditions/@NotOnOrAfter is not a date"),
-        (both, both.replace("2026-12-31T00:00:00Z", "2026-12-31T00:00:00ZZ")))
-    add("one-time-use", says(unknown + ": OneTimeUse"), inside("<saml:OneTimeUse/>"))
-    add("text", says(unknown), inside("text"))
-    add("instruction", says(unknown), inside("<?a b?>"))
-    add("condition-untyped", says(unknown + ": Condition"), inside("<saml:Condition/>"))
-    add("condition-unknown", says(unknown + ": Condition"),
+        (both, both.replace("2026-12-31T00:00:00Z", "2026-12-31T00:00:00ZZ")), rule="dates")
+    add("one-time-use", says(UNKNOWN + ": OneTimeUse"), inside("<saml:OneTimeUse/>"))
+    add("text", says(UNKNOWN), inside("text"))
+    add("instruction", says(UNKNOWN), inside("<?a b?>"))
+    add("condition-untyped", says(UNKNOWN + ": Condition"), inside("<saml:Condition/>"))
+    add("condition-unknown", says(UNKNOWN + ": Condition"),
         inside('<saml:Condition xmlns:a="urn:a" xsi:type="a:RenewRestrictionType"/>'))
-    add("condition-unprefixed", says(unknown + ": Condition"),
+    add("condition-unprefixed", says(UNKNOWN + ": Condition"),
         inside('<saml:Condition xsi:type="RenewRestrictionType"/>'))
     add("condition-undefined-prefix",
         [{"class": "SsoClient::ParseException", "prefix": "Element Conditionat ",
           "contains": " uses undefined prefix: `nowhere'"}],
         inside('<saml:Condition xsi:type="nowhere:RenewRestrictionType"/>'))
-    add("other-namespace", says(unknown + ": AudienceRestriction"),
+    add("other-namespace", says(UNKNOWN + ": AudienceRestriction"),
         inside('<x:AudienceRestriction xmlns:x="urn:x"/>'))
+
+
+def _audience(c):
+    def add(name, refusals, *edits):
+        _add(c, "audience/conditions-audience-" + name, LEAN, refusals, *edits)
     audience = "<saml:AudienceRestriction><saml:Audience>a</saml:Audience></saml:AudienceRestriction>"
-    add("audience-twice", says(unknown + ": AudienceRestriction"), inside(audience * 2))
-    add("audience-other-child", not_found("Audience"),
+    add("twice", says(UNKNOWN + ": AudienceRestriction"), inside(audience * 2))
+    add("other-child", not_found("Audience"),
         inside("<saml:AudienceRestriction><saml:Foo/></saml:AudienceRestriction>"))
-    add("audience-text", not_found("Audience"),
+    add("text", not_found("Audience"),
         inside("<saml:AudienceRestriction>urn:a</saml:AudienceRestriction>"))
-    add("audience-empty", only_text("Audience"),
+    add("empty", only_text("Audience"),
         inside("<saml:AudienceRestriction><saml:Audience/></saml:AudienceRestriction>"))
-    add("audience-comment", only_text("Audience"), inside(audience.replace(">a<", ">a<!-- -->b<")))
-    add("proxy-twice", says(unknown + ": ProxyRestriction"),
+    add("comment", only_text("Audience"), inside(audience.replace(">a<", ">a<!-- -->b<")))
+
+
+def _counts(c):
+    """The two restrictions that count: how often a token may be passed on, and renewed."""
+    def add(name, refusals, *edits):
+        _add(c, "counted-restrictions/conditions-" + name, LEAN, refusals, *edits)
+    add("proxy-twice", says(UNKNOWN + ": ProxyRestriction"),
         inside('<saml:ProxyRestriction Count="1"/>' * 2))
     add("proxy-no-count", missing("ProxyRestriction", "Count"), inside("<saml:ProxyRestriction/>"))
     add("proxy-attribute", unexpected("ProxyRestriction"),
@@ -357,12 +376,12 @@ def _conditions(c):
     for name, count in counts[:3]:
         add(f"renew-count-{name}", says("Condition/@Count is not a non-negative integer."),
             inside(renew(f' Count="{count}"')))
-    add("renew-twice", says(unknown + ": Condition"), inside(renew(' Count="1"') * 2))
+    add("renew-twice", says(UNKNOWN + ": Condition"), inside(renew(' Count="1"') * 2))
     add("renew-attribute", begins("Unexpected attribute 'Foo' on element 'Condition'"),
         inside(renew(' Foo="1"')))
     add("renew-prefixed-count", begins("Unexpected attribute '"), inside(renew(' rsa:Count="1"')))
     # Only the exact namespace of the token service makes the restriction.
-    add("renew-other-namespace", says(unknown + ": Condition"),
+    add("renew-other-namespace", says(UNKNOWN + ": Condition"),
         inside(renew("").replace(names.RSA, names.RSA + "/")))
 
 
@@ -374,8 +393,8 @@ def _delegation(c):
     condition = condition[:condition.index("\n")]
     confirmed = f'Method="{names.BEARER}">\n{second}'
 
-    def add(name, refusals, *edits):
-        _add(c, "delegation-" + name, token, refusals, *edits)
+    def add(name, refusals, *edits, rule="delegation"):
+        _add(c, f"{rule}/delegation-{name}", token, refusals, *edits)
     mismatch = says("The SubjectConfirmation delegate id does not match the id of the last delegate")
     add("twice", says("Unknown or duplicate restriction node under Conditions: Condition"),
         (condition, condition * 2))
@@ -389,7 +408,7 @@ def _delegation(c):
     instant = ' DelegationInstant="2026-01-01T01:00:00Z"'
     add("no-instant", missing("Delegate", "DelegationInstant"), (instant, ""))
     add("bad-instant", says("Delegate/@DelegationInstant is not a date"),
-        (instant, ' DelegationInstant="now"'))
+        (instant, ' DelegationInstant="now"'), rule="dates")
     add("confirmation-method", unexpected("Delegate"),
         (instant, instant + f' ConfirmationMethod="{names.BEARER}"'))
     add("no-name-id", not_found("NameID"), (first, ""))
@@ -416,7 +435,7 @@ def _delegation(c):
 
 def _advice(c):
     def add(name, refusals, *edits):
-        _add(c, "advice-" + name, LEAN.but(advice=ADVICE[:1]), refusals, *edits)
+        _add(c, "advice/advice-" + name, LEAN.but(advice=ADVICE[:1]), refusals, *edits)
     text = LEAN.but(advice=ADVICE[:1]).text()
     advice = text[text.index("<rsa:RSAAdvice"):text.index("\n</saml:Advice>")]
     inner = advice[advice.index("<saml:Attribute"):-len("</rsa:RSAAdvice>")]
@@ -440,8 +459,8 @@ def _advice(c):
 
 
 def _authn_statement(c):
-    def add(name, refusals, *edits):
-        _add(c, "authn-" + name, LEAN, refusals, *edits)
+    def add(name, refusals, *edits, rule="authn-statement"):
+        _add(c, f"{rule}/authn-{name}", LEAN, refusals, *edits)
     text = LEAN.text()
     statement = text[text.index("<saml:AuthnStatement"):text.index("\n<saml:AttributeStatement")]
     context = f"<saml:AuthnContext>{CLASS_REF}</saml:AuthnContext>"
@@ -453,7 +472,7 @@ def _authn_statement(c):
     instant = ' AuthnInstant="2026-01-01T00:00:00Z"'
     add("no-instant", missing("AuthnStatement", "AuthnInstant"), (instant, ""))
     add("bad-instant", says("AuthnStatement/@AuthnInstant is not a date"),
-        (instant, ' AuthnInstant="2026-01-01T00:00Z"'))
+        (instant, ' AuthnInstant="2026-01-01T00:00Z"'), rule="dates")
     add("locality-first", not_found("AuthnContext"), (context, "<saml:SubjectLocality/>" + context))
     add("locality-last", says("Unexpected elements after AuthnContext"),
         (context, context + "<saml:SubjectLocality/>"))
@@ -471,7 +490,7 @@ def _authn_statement(c):
 
 def _attribute_statement(c):
     def add(name, refusals, *edits):
-        _add(c, "attributes-" + name, LEAN, refusals, *edits)
+        _add(c, "attribute-statement/attributes-" + name, LEAN, refusals, *edits)
     name_format = f' NameFormat="{names.NAME_FORMAT}"'
     given = LEAN.attribute(names.GIVEN_NAME, ["Ada"])
     all_of_them = "\n".join(LEAN.attribute(*a) for a in (
@@ -509,29 +528,30 @@ def _properties(c):
     unsatisfiable = says("Unsatisfiable token validity conditions: NotBefore must be less than "
                          "NotOnOrAfter.")
     instant = "2026-06-15T12:00:00Z"
-    _add(c, "validity-empty", LEAN.but(start=instant, end=instant), unsatisfiable)
-    _add(c, "validity-empty-large-tolerance", LEAN.but(start=instant, end=instant), unsatisfiable,
+    _add(c, "validity-period/validity-empty", LEAN.but(start=instant, end=instant), unsatisfiable)
+    _add(c, "validity-period/validity-empty-large-tolerance", LEAN.but(start=instant, end=instant), unsatisfiable,
          tolerance=1000000)
-    _add(c, "validity-empty-other-offset",
+    _add(c, "validity-period/validity-empty-other-offset",
          LEAN.but(start=instant, end="2026-06-15T14:00:00+02:00"), unsatisfiable)
-    _add(c, "validity-reversed", LEAN.but(start="2026-12-31T00:00:00Z", end="2026-01-01T00:00:00Z"),
+    _add(c, "validity-period/validity-reversed", LEAN.but(start="2026-12-31T00:00:00Z", end="2026-01-01T00:00:00Z"),
          unsatisfiable)
     shorter = says("Invalid token subject validity")
-    _add(c, "confirmation-ends-earlier", LEAN.but(confirmed_until="2026-12-30T23:59:59Z"), shorter)
-    _add(c, "confirmation-ends-a-microsecond-earlier",
+    _add(c, "subject-confirmation/confirmation-ends-earlier", LEAN.but(confirmed_until="2026-12-30T23:59:59Z"), shorter)
+    _add(c, "subject-confirmation/confirmation-ends-a-microsecond-earlier",
          LEAN.but(confirmed_until="2026-12-30T23:59:59.999999Z"), shorter)
     # The checks have an order, and the first that fails speaks.
-    _add(c, "order-version-before-id", EMPTY_REFERENCE, says("Invalid token version"),
+    _add(c, "order-of-checks/order-version-before-id", EMPTY_REFERENCE, says("Invalid token version"),
          (' Version="2.0"', ' Version="3.0"'), (f' ID="{ID}"', ' ID="a"'))
-    _add(c, "order-id-before-validity", EMPTY_REFERENCE.but(start=instant, end=instant),
+    _add(c, "order-of-checks/order-id-before-validity", EMPTY_REFERENCE.but(start=instant, end=instant),
          says("Invalid token ID"), (f' ID="{ID}"', ' ID="a"'))
-    _add(c, "order-expiry-before-confirmation",
+    _add(c, "order-of-checks/order-expiry-before-confirmation",
          LEAN.but(end="2026-02-01T00:00:00Z", confirmed_until="2026-01-02T00:00:00Z"),
          says("The token has expired at: 2026-02-01T00:00:00.000Z"))
     forged = signed(LEAN.but(end="2026-02-01T00:00:00Z"), key="foreign")
-    c.refuse("order-expiry-before-signature", "an expired forged token reports expiry", forged,
-             says("The token has expired at: 2026-02-01T00:00:00.000Z"), "invalid")
-    c.refuse("order-signature-before-subject", "a forged token with a bad subject reports forgery",
+    c.refuse("order-of-checks/order-expiry-before-signature",
+             "an expired forged token reports expiry", forged, says("The token has expired at: 2026-02-01T00:00:00.000Z"), "invalid")
+    c.refuse("order-of-checks/order-signature-before-subject",
+             "a forged token with a bad subject reports forgery",
              signed(LEAN, ("user@example.com", "user"), key="foreign"),
              [{"class": "SsoClient::InvalidSignatureException"}], "invalid")
 
@@ -549,8 +569,8 @@ def _clock(c):
             ("expired-at-end-of-tolerance", expired, "2026-06-15T13:10:00Z", 600),
             ("expired-now-without-tolerance", expired, end, 0),
             ("expired-long-ago", expired, "2036-06-15T13:00:00Z", 600)):
-        _add(c, "clock-" + name, token, refusals, now=now, tolerance=tolerance)
-    _add(c, "clock-offset-read-right",
+        _add(c, "validity-period/clock-" + name, token, refusals, now=now, tolerance=tolerance)
+    _add(c, "validity-period/clock-offset-read-right",
          LEAN.but(start="2026-06-15T12:00:00-01:00", end="2026-06-16T00:00:00Z"),
          says("Token start date is in the future: 2026-06-15T13:00:00.000Z"),
          now="2026-06-15T12:30:00Z", tolerance=0)
@@ -563,17 +583,17 @@ def _values(c):
             ("email", names.EMAIL_FORMAT), ("empty", ""), ("upper-case", names.UPN.upper()),
             ("lower-case", names.UPN.lower()), ("other-host", "http://example.com/claims/UPN"),
             ("trailing-slash", names.UPN + "/")):
-        _add(c, f"format-{name}", LEAN, format_error(value), (names.UPN, value))
+        _add(c, f"principal-names/format-{name}", LEAN, format_error(value), (names.UPN, value))
     for name, value in (("no-at", "user"), ("at-first", "@example.com"), ("at-last", "user@"),
                         ("at-only", "@"), ("two-at-last", "user@example.com@")):
-        _add(c, f"upn-{name}", LEAN,
+        _add(c, f"principal-names/upn-{name}", LEAN,
              says(f"Failed to parse the UPN NameID: `{value}'; name or domain part is missing."),
              ("user@example.com", value))
     for name, value in (("no-backslash", "Admins"), ("first", "\\Admins"), ("last", "DOMAIN\\"),
                         ("only", "\\"), ("slash", "DOMAIN/Admins"), ("empty", ""), ("at", "a@b")):
-        _add(c, f"group-{name}", LEAN,
+        _add(c, f"principal-names/group-{name}", LEAN,
              says(f"Failed to parse Group Identity value: `{value}'; domain or group missing"),
              ("example.com\\Users", value))
-    _add(c, "group-second-bad", LEAN.but(groups=[("Users", "example.com"), ("Admins", "D")]),
+    _add(c, "principal-names/group-second-bad", LEAN.but(groups=[("Users", "example.com"), ("Admins", "D")]),
          says("Failed to parse Group Identity value: `Admins'; domain or group missing"),
          ("D\\Admins", "Admins"))
