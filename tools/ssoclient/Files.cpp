@@ -8,6 +8,7 @@
 #include <sys/stat.h>
 
 #include <cerrno>
+#include <csignal>
 #include <cstdio>
 #include <cstdlib>
 
@@ -54,16 +55,21 @@ std::string ReadAll(int descriptor, const std::string& name)
     ThrowSystemError("cannot write `" + path + "'");
 }
 
-/** Renaming over a device or a pipe would replace it instead of writing to it. */
+/**
+ * Renaming over a device or a pipe would replace it instead of writing to it. A link is refused
+ * rather than followed: somebody else may have laid it where the file was expected.
+ */
 void RequireRegularOrAbsent(const std::string& path)
 {
     struct stat status = {};
-    if (::stat(path.c_str(), &status) == 0) {
-        if (!S_ISREG(status.st_mode)) {
-            throw UsageError(MessageFormatter::ASPrint("`%1' is not a regular file", path));
+    if (::lstat(path.c_str(), &status) != 0) {
+        if (errno != ENOENT) {
+            ThrowWriteError(path);
         }
-    } else if (errno != ENOENT) {
-        ThrowWriteError(path);
+    } else if (S_ISLNK(status.st_mode)) {
+        throw UsageError(MessageFormatter::ASPrint("`%1' is a link: name the file itself", path));
+    } else if (!S_ISREG(status.st_mode)) {
+        throw UsageError(MessageFormatter::ASPrint("`%1' is not a regular file", path));
     }
 }
 
@@ -92,6 +98,24 @@ void WriteAll(int descriptor, const std::string& text, const std::string& path)
         at += static_cast<std::size_t>(count);
     }
 }
+
+/**
+ * For as long as it lives, a file beyond the limit of the process is an error of `write`, not a
+ * signal that would leave the temporary file behind.
+ */
+class FileSizeSignalGuard
+{
+public:
+    FileSizeSignalGuard()
+        : _before(std::signal(SIGXFSZ, SIG_IGN))
+    {}
+    FileSizeSignalGuard(const FileSizeSignalGuard&) = delete;
+    FileSizeSignalGuard& operator=(const FileSizeSignalGuard&) = delete;
+    ~FileSizeSignalGuard() { std::signal(SIGXFSZ, _before); }
+
+private:
+    void (*_before)(int);
+};
 
 /** A file beside the one that it is to become; it goes if it does not become that. */
 class TemporaryFile
@@ -141,6 +165,8 @@ OutputFile::OutputFile(std::string path)
 
 void OutputFile::Write(const std::string& text) const
 {
+    RequireRegularOrAbsent(_path); // it may be another one than when the token was asked for
+    const FileSizeSignalGuard guard;
     const TemporaryFile file(_path);
     WriteAll(file.GetDescriptor(), text, _path);
     if (::fsync(file.GetDescriptor()) != 0

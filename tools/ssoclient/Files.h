@@ -18,11 +18,12 @@ std::string ReadFile(const std::string& path);
 class OutputFile
 {
 public:
-    /** @throws UsageError  no file can be made there. */
+    /** @throws UsageError  no file can be made there, or what is there is no regular file. */
     explicit OutputFile(std::string path);
 
     /**
-     * Writes a file with `text` in place of one that was there.
+     * Writes a file with `text` in place of one that was there; nothing but a regular file is
+     * ever replaced.
      *
      * @throws UsageError  that fails.
      */

@@ -3,6 +3,7 @@
 #include "Arguments.h"
 #include "ExitCode.h"
 #include "OneLine.h"
+#include "Terminal.h"
 
 #include "ssoClient/Descriptions.h"
 #include "ssoClient/Exceptions.h"
@@ -62,6 +63,13 @@ std::string CreateJsonDescription(const SsoClient::SamlToken& token)
     return json.dump(2, ' ', true);
 }
 
+void Print(const std::string& text)
+{
+    if (!(std::cout << text << std::flush)) {
+        throw UsageError("cannot write to standard output");
+    }
+}
+
 } // namespace
 
 void OutputOptions::AddJsonTo(const Command& command)
@@ -71,17 +79,28 @@ void OutputOptions::AddJsonTo(const Command& command)
 
 void OutputOptions::AddOutTo(const Command& command)
 {
-    command.AddOption("--out", outFile, "Write the assertion to this file (mode 0600)")
+    obtains = true;
+    command
+        .AddOption(
+            "--out",
+            outFile,
+            "Write the assertion to this file (mode 0600), - for standard output; the description "
+            "goes to standard error then")
         .Check(CheckNotEmpty)
         .ValueName("FILE");
 }
 
 TokenOutput::TokenOutput(const OutputOptions& options)
-    : _json(options.json)
+    : _options(options)
 {
-    if (!options.outFile.empty()) {
+    if (!options.outFile.empty() && !ToStandardOutput()) {
         _file.emplace(options.outFile);
     }
+}
+
+bool TokenOutput::ToStandardOutput() const
+{
+    return _options.outFile == "-";
 }
 
 void TokenOutput::Show(const boost::shared_ptr<const SsoClient::SamlToken>& token)
@@ -91,15 +110,27 @@ void TokenOutput::Show(const boost::shared_ptr<const SsoClient::SamlToken>& toke
     }
     if (_file) {
         _file->Write(token->ToXml());
+    } else if (ToStandardOutput()) {
+        Print(token->ToXml());
     }
-    PrintLine(
-        _json ? CreateJsonDescription(*token)
-              : ToOneLine(SsoClient::CreateRedactedDescription(*token)));
+    Describe(*token);
+    if (_options.obtains && _options.outFile.empty() && IsTerminal()) {
+        Notice("the token is not kept: use --out FILE to keep it");
+    }
+}
+
+void TokenOutput::Describe(const SsoClient::SamlToken& token) const
+{
+    const std::string line = _options.json ? CreateJsonDescription(token)
+                                           : ToOneLine(SsoClient::CreateRedactedDescription(token));
+    if (ToStandardOutput()) {
+        std::cerr << line + "\n" << std::flush;
+    } else {
+        PrintLine(line);
+    }
 }
 
 void PrintLine(const std::string& line)
 {
-    if (!(std::cout << line << "\n" << std::flush)) {
-        throw UsageError("cannot write to standard output");
-    }
+    Print(line + "\n");
 }

@@ -14,7 +14,8 @@
 struct OutputOptions
 {
     bool json = false;
-    std::string outFile;
+    bool obtains = false; ///< whether the command obtains a token, which it may keep
+    std::string outFile;  ///< `-` is standard output
 
     void AddJsonTo(const Command& command);
     void AddOutTo(const Command& command);
@@ -27,15 +28,19 @@ public:
     explicit TokenOutput(const OutputOptions& options);
 
     /**
-     * Writes the assertion to the file, if there is one, and then the redacted description or the
-     * same facts as JSON to standard output.
+     * Writes the assertion to where `--out` says, and then the redacted description or the facts as
+     * JSON to standard output, or to standard error where the assertion has gone there. Says at a
+     * terminal that a token which was obtained is not kept.
      *
      * @throws SsoException  there is no token: the service answered with an empty one.
      */
     void Show(const boost::shared_ptr<const SsoClient::SamlToken>& token);
 
 private:
-    bool _json;
+    bool ToStandardOutput() const;
+    void Describe(const SsoClient::SamlToken& token) const;
+
+    OutputOptions _options;
     std::optional<OutputFile> _file;
 };
 

@@ -3,6 +3,7 @@
 import fcntl
 import os
 import pty
+import select
 import subprocess
 import termios
 
@@ -18,15 +19,20 @@ class TerminalTest(ServiceTest):
         self.addCleanup(os.close, self.terminal)
         self.addCleanup(os.close, self.far_end)
 
-    def start(self, *arguments, launcher=(), stdin=subprocess.DEVNULL):
+    def start_with_terminal_error(self, *arguments, **others):
+        """Starts the program with the terminal as its standard error."""
+        return self.start(*arguments, stderr=self.far_end, **others)
+
+    def start(self, *arguments, launcher=(), stdin=subprocess.DEVNULL, stderr=subprocess.PIPE):
         """Starts the program with the terminal as its controlling one, not as its output."""
         def take_terminal():
             os.setsid()
             fcntl.ioctl(self.far_end, termios.TIOCSCTTY, 0)
 
         process = subprocess.Popen(
-            [*launcher, SSOCLIENT, *map(str, arguments)], stdin=stdin, stdout=subprocess.PIPE, stderr=subprocess.PIPE, text=True,
-            preexec_fn=take_terminal, pass_fds=[self.far_end])
+            [*launcher, SSOCLIENT, *map(str, arguments)], stdin=stdin,
+            stdout=subprocess.PIPE, stderr=stderr, text=True, preexec_fn=take_terminal,
+            pass_fds=[self.far_end])
         self.addCleanup(self.end, process)
         return process
 
@@ -36,13 +42,21 @@ class TerminalTest(ServiceTest):
             process.kill()
         process.wait()
         process.stdout.close()
-        process.stderr.close()
+        if process.stderr is not None:
+            process.stderr.close()
 
     def read_until(self, text):
         """What the terminal shows, up to and including the text."""
         shown = b""
         while not shown.endswith(text):
             shown += os.read(self.terminal, 1)
+        return shown
+
+    def read_what_is_there(self):
+        """What the terminal shows by now."""
+        shown = b""
+        while select.select([self.terminal], [], [], 0)[0]:
+            shown += os.read(self.terminal, 4096)
         return shown
 
     def echoes(self):
