@@ -131,6 +131,18 @@ Ref<const Certificate> CreateCertificate(const void* bytes, std::size_t length)
         std::move(certificate), std::vector<unsigned char>(begin, begin + length), std::move(key)));
 }
 
+std::string GetSerialNumber(const Certificate& certificate)
+{
+    const ErrorQueueScope errors;
+    const BignumOwner number(
+        ASN1_INTEGER_to_BN(X509_get0_serialNumber(GetX509(certificate)), nullptr));
+    const OpenSslMemory<char> text(number ? BN_bn2dec(number.get()) : nullptr);
+    if (!text) {
+        throw CryptoException("Cannot read a serial number: " + GetOpenSslError());
+    }
+    return text.get();
+}
+
 std::list<Ref<const Certificate>> ParsePemCertificates(std::string_view pem)
 {
     const ErrorQueueScope errors;

@@ -4,11 +4,13 @@
 // the translation of its errors.
 
 #include <openssl/bio.h>
+#include <openssl/bn.h>
 #include <openssl/crypto.h>
 #include <openssl/ec.h>
 #include <openssl/ecdsa.h>
 #include <openssl/err.h>
 #include <openssl/evp.h>
+#include <openssl/param_build.h>
 #include <openssl/pem.h>
 #include <openssl/rsa.h>
 #include <openssl/ssl.h>
@@ -48,6 +50,7 @@ template <class T>
 using OpenSslMemory = std::unique_ptr<T, OpenSslMemoryDeleter>;
 
 using BioOwner = std::unique_ptr<BIO, OpenSslDeleter<BIO_free_all>>;
+using BignumOwner = std::unique_ptr<BIGNUM, OpenSslDeleter<BN_free>>;
 using EcdsaSigOwner = std::unique_ptr<ECDSA_SIG, OpenSslDeleter<ECDSA_SIG_free>>;
 using StoreContextOwner = std::unique_ptr<OSSL_STORE_CTX, OpenSslDeleter<OSSL_STORE_close>>;
 using StoreInfoOwner = std::unique_ptr<OSSL_STORE_INFO, OpenSslDeleter<OSSL_STORE_INFO_free>>;

@@ -72,4 +72,41 @@ bool PublicKeyImpl::VerifyDigest(
            == 1;
 }
 
+bool PublicKeyImpl::VerifyPssDigest(
+    HashAlgorithm algorithm,
+    const unsigned char* digest,
+    const unsigned char* signature,
+    std::size_t signatureLength) const
+{
+    if (_type != KeyType::RSA) {
+        return false;
+    }
+    const ErrorQueueScope errors;
+    const KeyContextOwner context(EVP_PKEY_CTX_new_from_pkey(nullptr, _key.get(), nullptr));
+    const EVP_MD* const hash = GetDigest(algorithm);
+    if (!context || EVP_PKEY_verify_init(context.get()) != 1
+        || EVP_PKEY_CTX_set_rsa_padding(context.get(), RSA_PKCS1_PSS_PADDING) != 1
+        || EVP_PKEY_CTX_set_signature_md(context.get(), hash) != 1
+        || EVP_PKEY_CTX_set_rsa_mgf1_md(context.get(), hash) != 1
+        || EVP_PKEY_CTX_set_rsa_pss_saltlen(context.get(), RSA_PSS_SALTLEN_DIGEST) != 1) {
+        throw CryptoException("Cannot verify with a key of type " + GetDescription());
+    }
+    return EVP_PKEY_verify(
+               context.get(), signature, signatureLength, digest, GetDigestLength(algorithm))
+           == 1;
+}
+
+std::vector<unsigned char> PublicKeyImpl::GetEncoded() const
+{
+    const ErrorQueueScope errors;
+    const int size = i2d_PUBKEY(_key.get(), nullptr);
+    if (size <= 0) {
+        throw CryptoException("Cannot encode a key of type " + GetDescription());
+    }
+    std::vector<unsigned char> der(static_cast<std::size_t>(size));
+    unsigned char* out = der.data();
+    i2d_PUBKEY(_key.get(), &out);
+    return der;
+}
+
 } // namespace Quillon::Crypto

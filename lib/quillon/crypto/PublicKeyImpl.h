@@ -21,6 +21,12 @@ public:
         const unsigned char* digest,
         const unsigned char* signature,
         std::size_t signatureLength) const override;
+    bool VerifyPssDigest(
+        HashAlgorithm algorithm,
+        const unsigned char* digest,
+        const unsigned char* signature,
+        std::size_t signatureLength) const override;
+    std::vector<unsigned char> GetEncoded() const override;
 
 private:
     KeyOwner _key;

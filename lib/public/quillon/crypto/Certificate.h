@@ -44,6 +44,9 @@ public:
  */
 QUILLON_API Ref<const Certificate> CreateCertificate(const void* bytes, std::size_t length);
 
+/** The serial number [RFC 5280 4.1.2.2] in decimal digits. @throws CryptoException */
+QUILLON_API std::string GetSerialNumber(const Certificate& certificate);
+
 /**
  * Reads all certificates of a PEM text [RFC 7468], in order; other PEM blocks are passed over.
  *

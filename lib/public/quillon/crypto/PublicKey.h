@@ -4,6 +4,7 @@
 
 #include <cstddef>
 #include <string>
+#include <vector>
 
 namespace Quillon::Crypto {
 
@@ -63,6 +64,19 @@ public:
         const unsigned char* digest,
         const unsigned char* signature,
         std::size_t signatureLength) const = 0;
+
+    /**
+     * The same for RSASSA-PSS [RFC 8017 8.1] with MGF1 on `algorithm` and a salt as long as the
+     * digest; false for a key that is not RSA.
+     */
+    virtual bool VerifyPssDigest(
+        HashAlgorithm algorithm,
+        const unsigned char* digest,
+        const unsigned char* signature,
+        std::size_t signatureLength) const = 0;
+
+    /** The DER form of SubjectPublicKeyInfo [RFC 5280 4.1]. @throws CryptoException */
+    virtual std::vector<unsigned char> GetEncoded() const = 0;
 
 protected:
     ~PublicKey() = default;

@@ -27,17 +27,32 @@ constexpr std::array<SignatureAlgorithm, 6> SignatureAlgorithms{{
     {EcdsaSha512, KeyType::EC, HashAlgorithm::SHA512},
 }};
 
-} // namespace
+constexpr std::array<SignatureAlgorithm, 3> PssAlgorithms{{
+    {RsaPssSha256, KeyType::RSA, HashAlgorithm::SHA256, true},
+    {RsaPssSha384, KeyType::RSA, HashAlgorithm::SHA384, true},
+    {RsaPssSha512, KeyType::RSA, HashAlgorithm::SHA512, true},
+}};
 
-const SignatureAlgorithm& GetSignatureAlgorithm(std::string_view identifier)
+template <class Algorithms>
+const SignatureAlgorithm* Find(const Algorithms& algorithms, std::string_view identifier) noexcept
 {
     const auto* found = std::find_if(
-        SignatureAlgorithms.begin(),
-        SignatureAlgorithms.end(),
-        [identifier](const SignatureAlgorithm& algorithm) {
+        algorithms.begin(), algorithms.end(), [identifier](const SignatureAlgorithm& algorithm) {
             return identifier == algorithm.identifier;
         });
-    if (found == SignatureAlgorithms.end()) {
+    return found == algorithms.end() ? nullptr : found;
+}
+
+} // namespace
+
+const SignatureAlgorithm& GetSignatureAlgorithm(
+    std::string_view identifier, SignatureProfile profile)
+{
+    const SignatureAlgorithm* found = Find(SignatureAlgorithms, identifier);
+    if (found == nullptr && profile == SignatureProfile::WITH_RSA_PSS) {
+        found = Find(PssAlgorithms, identifier);
+    }
+    if (found == nullptr) {
         throw XmlSecurityException("Signature algorithm " + Quote(identifier) + " is not accepted");
     }
     return *found;

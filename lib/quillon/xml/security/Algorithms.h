@@ -1,6 +1,7 @@
 #pragma once
 
 #include "quillon/crypto/PublicKey.h"
+#include "quillon/xml/security/Signature.h"
 
 #include <string_view>
 
@@ -13,10 +14,12 @@ struct SignatureAlgorithm
     const char* identifier;
     Crypto::KeyType keyType;
     Crypto::HashAlgorithm hash;
+    bool isPss = false;
 };
 
 /** @throws XmlSecurityException  not in the profile. */
-const SignatureAlgorithm& GetSignatureAlgorithm(std::string_view identifier);
+const SignatureAlgorithm& GetSignatureAlgorithm(
+    std::string_view identifier, SignatureProfile profile);
 
 /** @throws XmlSecurityException  not in the profile. */
 Crypto::HashAlgorithm GetDigestAlgorithm(std::string_view identifier);

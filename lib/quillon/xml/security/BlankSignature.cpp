@@ -67,7 +67,7 @@ public:
     BlankSignature(
         ElementNode* context, const std::string& signatureMethod, const std::string& prefix)
         : _context(context)
-        , _algorithm(GetSignatureAlgorithm(signatureMethod))
+        , _algorithm(GetSignatureAlgorithm(signatureMethod, SignatureProfile::NARROW))
         , _prefix(prefix)
     {
         CreateElementNode(prefix, "Signature", _element);
@@ -84,6 +84,11 @@ public:
     }
 
     bool Verify(const KeyInfoResolver* /*resolver*/) const override
+    {
+        throw InvalidStateException("A signature that was just made is not verified");
+    }
+
+    bool CoversBinding(const ElementNode& /*element*/, std::string_view /*prefix*/) const override
     {
         throw InvalidStateException("A signature that was just made is not verified");
     }

@@ -3,6 +3,7 @@
 #include "xml/security/Algorithms.h"
 #include "xml/security/CanonicalDigest.h"
 #include "xml/security/Canonicalization.h"
+#include "xml/security/NamespaceCoverage.h"
 #include "xml/security/SignatureModel.h"
 #include "xml/security/SignatureTarget.h"
 
@@ -98,6 +99,17 @@ std::vector<const Crypto::PublicKey*> SelectKeys(
     return keys;
 }
 
+bool VerifyWith(
+    const Crypto::PublicKey& key,
+    const SignatureAlgorithm& algorithm,
+    const Crypto::DigestValue& digest,
+    const std::vector<unsigned char>& value)
+{
+    const auto verify =
+        algorithm.isPss ? &Crypto::PublicKey::VerifyPssDigest : &Crypto::PublicKey::VerifyDigest;
+    return (key.*verify)(algorithm.hash, digest.bytes.data(), value.data(), value.size());
+}
+
 [[noreturn]] void RefuseToSign()
 {
     throw InvalidStateException("A signature that was read from a document is not signed again");
@@ -122,9 +134,10 @@ private:
 class SignatureImpl final : public Signature
 {
 public:
-    SignatureImpl(ElementNode* parent, ElementNode* element)
+    SignatureImpl(ElementNode* parent, ElementNode* element, SignatureProfile profile)
         : _parent(parent)
         , _element(element)
+        , _profile(profile)
         , _model(ReadSignature(*element))
     {
         for (const ReferenceModel& reference : _model.references) {
@@ -149,7 +162,7 @@ public:
     bool Verify(const KeyInfoResolver* resolver) const override
     {
         const SignatureAlgorithm& algorithm =
-            GetSignatureAlgorithm(_model.signatureMethod.identifier);
+            GetSignatureAlgorithm(_model.signatureMethod.identifier, _profile);
         RequireNoChild(_model.signatureMethod);
         const CanonicalizationMethod method = GetCanonicalization(_model.canonicalization);
         const std::vector<CheckedReference> references = CheckReferences();
@@ -162,6 +175,14 @@ public:
                    references.begin(), references.end(), [this](const CheckedReference& reference) {
                        return DigestMatches(reference);
                    });
+    }
+
+    bool CoversBinding(const ElementNode& element, std::string_view prefix) const override
+    {
+        return std::any_of(
+            _model.references.begin(), _model.references.end(), [&](const auto& reference) {
+                return Covers(CheckTransforms(reference.transforms), *_parent, element, prefix);
+            });
     }
 
 private:
@@ -189,11 +210,7 @@ private:
         const Crypto::DigestValue digest =
             DigestElement(algorithm.hash, method, *_model.signedInfo, nullptr);
         return std::any_of(candidates.begin(), candidates.end(), [&](const Crypto::PublicKey* key) {
-            return key->VerifyDigest(
-                algorithm.hash,
-                digest.bytes.data(),
-                _model.signatureValue.data(),
-                _model.signatureValue.size());
+            return VerifyWith(*key, algorithm, digest, _model.signatureValue);
         });
     }
 
@@ -212,6 +229,7 @@ private:
 
     Ref<ElementNode> _parent;
     Ref<ElementNode> _element;
+    SignatureProfile _profile;
     SignatureModel _model;
     std::vector<ReadReference> _references;
 };
@@ -220,10 +238,19 @@ private:
 
 void CreateSignatureFromDom(ElementNode* parent, ElementNode* signatureElement, Ref<Signature>& out)
 {
+    CreateSignatureFromDom(parent, signatureElement, SignatureProfile::NARROW, out);
+}
+
+void CreateSignatureFromDom(
+    ElementNode* parent,
+    ElementNode* signatureElement,
+    SignatureProfile profile,
+    Ref<Signature>& out)
+{
     if (signatureElement->GetParent() != parent) {
         throw SignatureSyntaxException("The signature is not a child of the element that it signs");
     }
-    out.reset(new SignatureImpl(parent, signatureElement));
+    out.reset(new SignatureImpl(parent, signatureElement, profile));
 }
 
 } // namespace Quillon::Xml::Security

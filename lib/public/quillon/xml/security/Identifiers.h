@@ -17,6 +17,10 @@ inline constexpr char DigestSha512[] = "http://www.w3.org/2001/04/xmlenc#sha512"
 inline constexpr char RsaSha256[] = "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256";
 inline constexpr char RsaSha384[] = "http://www.w3.org/2001/04/xmldsig-more#rsa-sha384";
 inline constexpr char RsaSha512[] = "http://www.w3.org/2001/04/xmldsig-more#rsa-sha512";
+// RSASSA-PSS with MGF1 on the same hash and a salt as long as the digest [RFC 9231 2.3.10].
+inline constexpr char RsaPssSha256[] = "http://www.w3.org/2007/05/xmldsig-more#sha256-rsa-MGF1";
+inline constexpr char RsaPssSha384[] = "http://www.w3.org/2007/05/xmldsig-more#sha384-rsa-MGF1";
+inline constexpr char RsaPssSha512[] = "http://www.w3.org/2007/05/xmldsig-more#sha512-rsa-MGF1";
 inline constexpr char EcdsaSha256[] = "http://www.w3.org/2001/04/xmldsig-more#ecdsa-sha256";
 inline constexpr char EcdsaSha384[] = "http://www.w3.org/2001/04/xmldsig-more#ecdsa-sha384";
 inline constexpr char EcdsaSha512[] = "http://www.w3.org/2001/04/xmldsig-more#ecdsa-sha512";

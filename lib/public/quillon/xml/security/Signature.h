@@ -7,6 +7,7 @@
 
 #include <list>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace Quillon::Xml::Security {
@@ -40,6 +41,13 @@ public:
  */
 QUILLON_API Ref<KeyInfoResolver> CreateTrustSetKeyResolver(
     const std::list<Ref<const Crypto::Certificate>>& trustedCertificates);
+
+/** Which signature algorithms are accepted; everything else of a signature is held to the same. */
+enum class SignatureProfile
+{
+    NARROW,      ///< as `Signature` describes it
+    WITH_RSA_PSS ///< and RSASSA-PSS with SHA-256, SHA-384 and SHA-512, the salt as long as these
+};
 
 /** One `ds:Reference` of a signature. */
 class QUILLON_API Reference
@@ -110,6 +118,19 @@ public:
 
     /** The `ds:Signature` element. */
     virtual ElementNode* GetElement() const noexcept = 0;
+
+    /**
+     * Whether the signature fixes what `prefix` (empty for the default namespace) is bound to at
+     * `element`, which stands in the signed element. A name in a value, as that of `xsi:type`, may
+     * decide something only then: the exclusive form does not carry a declaration that no element
+     * or attribute name uses [EXC-C14N 1.3], so anyone could have changed it. Says nothing about
+     * whether the signature verifies.
+     *
+     * @return true if one of the references is in inclusive form, or lists the prefix, or renders
+     *         the same binding at the element or the nearest of its ancestors that uses the prefix.
+     * @throws XmlSecurityException  a canonicalization lies outside the profile.
+     */
+    virtual bool CoversBinding(const ElementNode& element, std::string_view prefix) const = 0;
 };
 
 /**
@@ -120,6 +141,13 @@ public:
  */
 QUILLON_API void CreateSignatureFromDom(
     ElementNode* parent, ElementNode* signatureElement, Ref<Signature>& out);
+
+/** The same in a profile that the caller chooses. */
+QUILLON_API void CreateSignatureFromDom(
+    ElementNode* parent,
+    ElementNode* signatureElement,
+    SignatureProfile profile,
+    Ref<Signature>& out);
 
 /**
  * Makes a signature without references, whose element stands in no tree yet.
