@@ -46,6 +46,16 @@ public:
         return true;
     }
 
+    /** Lets TLS, if there is any, end without its own notice. */
+    virtual void EndWithoutNotice() {}
+
+    /** Lets the connection end with a reset in place of an ordinary end. */
+    void ResetAtClose()
+    {
+        const linger atOnce{1, 0};
+        setsockopt(_descriptor, SOL_SOCKET, SO_LINGER, &atOnce, sizeof atOnce);
+    }
+
 protected:
     const int _descriptor;
 };

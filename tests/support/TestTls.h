@@ -76,13 +76,17 @@ struct CertificateOptions
     bool isAuthority = false;
     long notBeforeSec = -3600; ///< from now
     long notAfterSec = 3600;
+    unsigned rsaBits = 0; ///< 0 makes a P-256 key
+    const EVP_MD* digest = EVP_sha256();
 };
 
-/** Makes a P-256 key and a certificate for it; self-signed without an issuer. */
+/** Makes a key and a certificate for it; self-signed without an issuer. */
 inline Identity MakeIdentity(const CertificateOptions& options, const Identity* issuer = nullptr)
 {
     static std::atomic<long> nextSerial{1};
-    Identity made{KeyHandle(EVP_EC_gen("P-256")), X509Handle(X509_new())};
+    Identity made{
+        KeyHandle(options.rsaBits != 0 ? EVP_RSA_gen(options.rsaBits) : EVP_EC_gen("P-256")),
+        X509Handle(X509_new())};
     X509* const certificate = made.certificate.get();
     X509_set_version(certificate, 2);
     ASN1_INTEGER_set(X509_get_serialNumber(certificate), nextSerial++);
@@ -109,7 +113,7 @@ inline Identity MakeIdentity(const CertificateOptions& options, const Identity* 
     if (!options.alternativeNames.empty()) {
         addExtension(NID_subject_alt_name, options.alternativeNames);
     }
-    X509_sign(certificate, issuer != nullptr ? issuer->key.get() : made.key.get(), EVP_sha256());
+    X509_sign(certificate, issuer != nullptr ? issuer->key.get() : made.key.get(), options.digest);
     return made;
 }
 
@@ -165,7 +169,14 @@ private:
             : ByteStream(descriptor)
             , _ssl(std::move(ssl))
         {}
-        ~TlsStream() override { SSL_shutdown(_ssl.get()); }
+        ~TlsStream() override
+        {
+            if (!_isSilent) {
+                SSL_shutdown(_ssl.get());
+            }
+        }
+
+        void EndWithoutNotice() override { _isSilent = true; }
 
         long Read(char* buffer, std::size_t size) override
         {
@@ -178,6 +189,7 @@ private:
 
     private:
         SslHandle _ssl;
+        bool _isSilent = false;
     };
 
     void Note(SSL* ssl)

@@ -23,6 +23,7 @@ public:
     void SetHeader(const std::string& name, const std::string& value) override;
     Writer* GetBodyWriter() noexcept override { return _writer.get(); }
     void SetTimeout(long long timeout) override;
+    void SetBodyStatuses(StatusTest wantsBody) noexcept override { _wantsBody = wantsBody; }
 
     const std::string& GetPath() const noexcept { return _path; }
     const std::map<std::string, std::string, HeaderNameLess>& GetHeaders() const noexcept
@@ -31,6 +32,7 @@ public:
     }
     const WipedBytes& GetBody() const noexcept { return _writer->bytes; }
     long long GetTimeout() const noexcept { return _timeout; }
+    StatusTest GetBodyStatuses() const noexcept { return _wantsBody; }
 
 private:
     class BodyWriter final : public Writer
@@ -45,6 +47,7 @@ private:
     std::map<std::string, std::string, HeaderNameLess> _headers;
     const Ref<BodyWriter> _writer;
     long long _timeout;
+    StatusTest _wantsBody = nullptr;
 };
 
 } // namespace Quillon::Http

@@ -122,9 +122,10 @@ PendingRequestItemImpl::PendingRequestItemImpl(Ref<Exchange> exchange)
     : _exchange(std::move(exchange))
 {}
 
-PendingRequestItemImpl::~PendingRequestItemImpl()
+bool PendingRequestItemImpl::Cancel() noexcept
 {
-    _exchange->Cancel();
+    // An exchange of the parent never completes in a forked child, whose lock may never be free.
+    return HttpEngine::Get().HasForked() || _exchange->Cancel();
 }
 
 TimeoutException MakeTimeoutException(const std::string& server, long long timeout)

@@ -67,9 +67,7 @@ class PendingRequestItemImpl final : public PendingRequestItem
 {
 public:
     explicit PendingRequestItemImpl(Ref<Exchange> exchange);
-    ~PendingRequestItemImpl() override;
-
-    bool Cancel() noexcept override { return _exchange->Cancel(); }
+    bool Cancel() noexcept override;
 
     Exchange& GetExchange() const noexcept { return *_exchange; }
 

@@ -2,7 +2,10 @@
 
 #include "threads/ProcessEnd.h"
 #include "threads/SignalBlock.h"
+#include "threads/SystemError.h"
 
+#include <cerrno>
+#include <system_error>
 #include <unistd.h>
 #include <utility>
 
@@ -12,6 +15,9 @@ namespace {
 
 /** The poll returns for every event; this only bounds the harm of one that got lost. */
 constexpr int LongestPollMs = 60'000;
+
+/** No process has this one. */
+constexpr int NoProcess = -1;
 
 /** Never destroyed, see the class. */
 union ImmortalEngine {
@@ -28,6 +34,12 @@ Outcome MakeFailure(const std::string& text)
     return {std::make_shared<HttpException>(text), {}};
 }
 
+[[noreturn]] void ThrowForked()
+{
+    throw HttpException("The process has forked after its first HTTP exchange; the child "
+                        "cannot send. Fork first.");
+}
+
 [[noreturn]] void ThrowEnded()
 {
     throw HttpException("The process is about to end and sends nothing any more.");
@@ -41,14 +53,16 @@ HttpEngine& HttpEngine::Get() noexcept
     return immortal.engine;
 }
 
+/** Made while the program is loaded: a fork must not meet a thread that makes it. */
+[[maybe_unused]] const HttpEngine& madeEarly = HttpEngine::Get();
+
 void HttpEngine::RequireRunning()
 {
-    // Before the lock, which a thread of the parent may have held at the fork.
-    if (HasForked()) {
-        throw HttpException("The process has forked after its first HTTP exchange; the child "
-                            "cannot send. Fork first.");
+    RequireOwnProcess();
+    const System::ProcessLock lock(_mutex);
+    if (!IsOwn(lock)) {
+        ThrowForked();
     }
-    const std::lock_guard<std::mutex> lock(_mutex);
     if (_state == State::ENDED) {
         ThrowEnded();
     }
@@ -64,10 +78,7 @@ void HttpEngine::Start()
         if (curl_global_init(CURL_GLOBAL_SSL) != CURLE_OK) {
             throw HttpException("libcurl cannot be initialised.");
         }
-        _multi = curl_multi_init();
-    }
-    if (_multi == nullptr) {
-        throw std::bad_alloc();
+        MakeMulti();
     }
     // libcurl has initialised OpenSSL by now, so OpenSSL takes itself down after the threads.
     static const bool stops =
@@ -81,15 +92,33 @@ void HttpEngine::Start()
         _callbackThread.Start();
         _ioThread = std::thread([this] { Run(); });
     } catch (const std::system_error& error) {
-        throw HttpException(std::string("The HTTP threads cannot be started: ") + error.what());
+        throw HttpException(
+            "The HTTP threads cannot be started: "
+            + System::DescribeSystemError(error.code().value()));
     }
     _pid = getpid();
+}
+
+void HttpEngine::MakeMulti()
+{
+    errno = 0;
+    std::unique_ptr<CURLM, CurlDeleter<curl_multi_cleanup>> owner(curl_multi_init());
+    const int error = errno;
+    if (owner == nullptr) {
+        throw std::bad_alloc();
+    }
+    // Without a free descriptor libcurl makes a handle that nothing can wake up.
+    if (curl_multi_wakeup(owner.get()) != CURLM_OK) {
+        throw HttpException(
+            "The HTTP threads cannot be started: " + System::DescribeSystemError(error));
+    }
+    _multi = owner.release();
 }
 
 void HttpEngine::Submit(std::unique_ptr<Transfer> transfer)
 {
     {
-        const std::lock_guard<std::mutex> lock(_mutex);
+        const System::ProcessLock lock(_mutex);
         if (_state != State::RUNNING) {
             ThrowEnded();
         }
@@ -104,25 +133,48 @@ void HttpEngine::NoteCancellation() noexcept
     Wake();
 }
 
+void HttpEngine::RequireOwnProcess() const
+{
+    if (HasForked()) {
+        ThrowForked();
+    }
+}
+
 std::list<Connections>::iterator HttpEngine::AddConnections(Ref<const ConnectionSpecImpl> spec)
 {
-    const std::lock_guard<std::mutex> lock(_mutex);
+    RequireOwnProcess();
+    const System::ProcessLock lock(_mutex);
+    if (!IsOwn(lock)) {
+        ThrowForked();
+    }
     return _connections.emplace(_connections.end(), std::move(spec));
 }
 
 void HttpEngine::RetireConnections(std::list<Connections>::iterator connections) noexcept
 {
     if (HasForked()) {
-        return; // they are the parent's, and its threads' lock may never be free here
+        return; // they are the parent's
     }
     std::list<Connections> unused; // goes after the lock
-    const std::lock_guard<std::mutex> lock(_mutex);
+    const System::ProcessLock lock(_mutex);
+    if (!IsOwn(lock)) {
+        return;
+    }
     const bool areOpen = connections->share != nullptr;
     std::list<Connections>& target = areOpen ? _retired : unused;
     target.splice(target.end(), _connections, connections);
     if (areOpen) {
         Wake();
     }
+}
+
+/** A child that finds the engine half changed by a thread of its parent cannot use it. */
+bool HttpEngine::IsOwn(const System::ProcessLock& lock) noexcept
+{
+    if (!lock.IsIntact()) {
+        _pid = NoProcess;
+    }
+    return !HasForked();
 }
 
 bool HttpEngine::HasForked() const noexcept
@@ -159,7 +211,7 @@ void HttpEngine::Run()
 bool HttpEngine::TakeWork(std::vector<std::unique_ptr<Transfer>>& submitted)
 {
     std::list<Connections> retired; // closed after the lock
-    const std::lock_guard<std::mutex> lock(_mutex);
+    const System::ProcessLock lock(_mutex);
     retired.swap(_retired);
     if (_state == State::ENDED) {
         return false;
@@ -237,7 +289,7 @@ void HttpEngine::CloseEverything()
 {
     std::vector<std::unique_ptr<Transfer>> transfers;
     {
-        const std::lock_guard<std::mutex> lock(_mutex);
+        const System::ProcessLock lock(_mutex);
         transfers.swap(_submitted);
     }
     while (!_transfers.empty()) {
@@ -249,7 +301,7 @@ void HttpEngine::CloseEverything()
     }
     transfers.clear();
     std::list<Connections> retired;
-    const std::lock_guard<std::mutex> lock(_mutex);
+    const System::ProcessLock lock(_mutex);
     retired.swap(_retired);
     for (Connections& connections : _connections) {
         connections.share.reset();
@@ -263,8 +315,8 @@ void HttpEngine::Stop()
         return;
     }
     {
-        const std::lock_guard<std::mutex> lock(_mutex);
-        if (std::exchange(_state, State::ENDED) != State::RUNNING) {
+        const System::ProcessLock lock(_mutex);
+        if (!IsOwn(lock) || std::exchange(_state, State::ENDED) != State::RUNNING) {
             return;
         }
     }

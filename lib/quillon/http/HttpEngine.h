@@ -4,12 +4,12 @@
 #include "http/ConnectionPoolImpl.h"
 #include "http/Curl.h"
 #include "http/Transfer.h"
+#include "threads/ProcessMutex.h"
 
 #include <atomic>
 #include <list>
 #include <map>
 #include <memory>
-#include <mutex>
 #include <thread>
 #include <vector>
 
@@ -45,9 +45,16 @@ public:
     /** @throws HttpException  the process is about to end. */
     void Submit(std::unique_ptr<Transfer> transfer);
 
+    /** Whether the process is a child that was forked too late to use the engine. */
+    bool HasForked() const noexcept;
+
+    /** @throws HttpException  `HasForked`. */
+    void RequireOwnProcess() const;
+
     /** Makes the I/O thread look for exchanges that were called off. */
     void NoteCancellation() noexcept;
 
+    /** @throws HttpException  the process is a child that was forked too late. */
     std::list<Connections>::iterator AddConnections(Ref<const ConnectionSpecImpl> spec);
     void RetireConnections(std::list<Connections>::iterator connections) noexcept;
 
@@ -63,7 +70,7 @@ private:
     };
 
     void Start();
-    bool HasForked() const noexcept;
+    void MakeMulti();
     void Wake() noexcept;
 
     // On the I/O thread.
@@ -76,7 +83,9 @@ private:
     std::unique_ptr<Transfer> Remove(CURL* easy);
     void CloseEverything();
 
-    std::mutex _mutex; // guards the next group
+    bool IsOwn(const System::ProcessLock& lock) noexcept;
+
+    System::ProcessMutex _mutex; // guards the next group
     State _state = State::IDLE;
     std::vector<std::unique_ptr<Transfer>> _submitted;
     std::list<Connections> _connections;

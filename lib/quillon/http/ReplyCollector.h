@@ -1,45 +1,85 @@
 #pragma once
 
+#include "quillon/http/ClientRequest.h"
 #include "quillon/http/ClientResponse.h"
 
+#include <optional>
 #include <string>
 #include <string_view>
 
 namespace Quillon::Http {
 
 /**
- * Gathers a reply as it comes in, and refuses one that grows too large or comes in an encoding
- * that was not asked for.
+ * Gathers a reply as it comes in, decides when it is an answer, and refuses one that grows too
+ * large, contradicts itself or comes in an encoding that was not asked for.
  */
 class ReplyCollector
 {
 public:
-    /** Takes one line of a header, interim replies and trailers included. @return acceptance. */
+    /** @param wantsBody  for which status codes the body counts; null: for all. */
+    explicit ReplyCollector(StatusTest wantsBody) noexcept
+        : _wantsBody(wantsBody)
+    {}
+
+    /**
+     * Takes one line of a header, interim replies and trailers included.
+     *
+     * @return whether more is to be read. If not, there is a problem, or `IsAnswered`.
+     */
     bool AddHeaderLine(std::string_view line);
 
     /** Takes a piece of the body. @return acceptance. */
     bool AddBody(std::string_view piece);
 
-    /** Why a line or piece was refused, as the end of a sentence about the reply; else empty. */
+    /** Counts octets of the body as they came over the wire, with what frames its chunks. */
+    void AddWireBytes(std::size_t count);
+
+    /** Why the reply was refused, as the end of a sentence about it; else empty. */
     const std::string& GetProblem() const noexcept { return _problem; }
 
     /** The latest status line. */
     const HttpStatus& GetStatus() const noexcept { return _status; }
 
+    /** Whether the head of a final reply is complete. */
+    bool HasHead() const noexcept { return _next == Next::BODY || _next == Next::NOTHING; }
+
+    /** Whether the latest head says all, so that nothing behind it counts. */
+    bool IsAnswered() const noexcept { return _next == Next::NOTHING; }
+
     /**
-     * Whether the latest status is an interim one other than 100 (Continue) [RFC 9110 15.2]. If
-     * the server ends the exchange with it, it was the answer.
+     * Whether the latest status is an interim one other than 100 (Continue) [RFC 9110 15.2]. If no
+     * other status follows, it was the answer.
      */
-    bool HasInterimStatus() const noexcept { return _status.code > 100 && _status.code < 200; }
+    bool HasInterimStatus() const noexcept { return _next == Next::STATUS && _status.code > 100; }
+
+    /** The problem of a reply whose headers exceed their limit. */
+    static std::string DescribeTooManyHeaders();
 
     std::string TakeBody() noexcept { return std::move(_body); }
 
 private:
+    enum class Next
+    {
+        STATUS,
+        FIELDS,
+        BODY,
+        NOTHING
+    };
+
     bool AddStatusLine(std::string_view line);
     bool AddField(std::string_view name, std::string_view value);
+    bool EndHead() noexcept;
+    bool IsInterim() const noexcept;
+    bool WantsBody() const;
+    bool AddEncoding(std::string_view value, bool isWanted);
+    bool AddContentLength(std::string_view value);
 
+    const StatusTest _wantsBody;
+    Next _next = Next::STATUS;
     std::size_t _headerBytes = 0;
-    bool _expectsStatus = true;
+    std::size_t _wireBytes = 0;
+    bool _hasBodyFields = false;
+    std::optional<std::string> _contentLength;
     HttpStatus _status;
     std::string _body;
     std::string _problem;

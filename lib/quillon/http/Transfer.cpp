@@ -1,11 +1,12 @@
 #include "http/Transfer.h"
 
 #include "http/ClientResponseImpl.h"
+#include "threads/SystemError.h"
 
 #include <algorithm>
+#include <cerrno>
 #include <climits>
 #include <sys/socket.h>
-#include <system_error>
 #include <utility>
 
 namespace Quillon::Http {
@@ -30,12 +31,6 @@ void Append(StringListOwner& list, const std::string& text)
     list.reset(longer);
 }
 
-/** Programs that the host starts do not inherit the connection. */
-curl_socket_t OpenSocket(void* /*data*/, curlsocktype /*purpose*/, curl_sockaddr* address)
-{
-    return socket(address->family, address->socktype | SOCK_CLOEXEC, address->protocol);
-}
-
 } // namespace
 
 Transfer::Transfer(
@@ -48,6 +43,8 @@ Transfer::Transfer(
     , _spec(_pool->GetSpec())
     , _cookies(std::move(cookies))
     , _exchange(std::move(exchange))
+    , _reply(_request->GetBodyStatuses())
+    , _alert(new Ssl::PeerAlert)
     , _easy(curl_easy_init())
 {
     if (_easy == nullptr) {
@@ -79,7 +76,6 @@ void Transfer::SetLimits()
     const long timeout = ToMilliseconds(_request->GetTimeout());
     Set(CURLOPT_TIMEOUT_MS, timeout);
     Set(CURLOPT_CONNECTTIMEOUT_MS, timeout);
-    Set(CURLOPT_MAXFILESIZE_LARGE, static_cast<curl_off_t>(ReplyLimits::MaxBodyBytes));
     Set(CURLOPT_NOSIGNAL, 1L);
     // A transfer that ends early does not wait for its name look-up, and with it all the others.
     Set(CURLOPT_QUICK_EXIT, 1L);
@@ -142,7 +138,7 @@ void Transfer::SetTls()
     Set(CURLOPT_CA_CACHE_TIMEOUT, 0L);
     Set(CURLOPT_SSL_SESSIONID_CACHE, 0L);
     Set(CURLOPT_SSL_CTX_FUNCTION, &Transfer::OnSslContext);
-    Set(CURLOPT_SSL_CTX_DATA, _spec.tls.get());
+    Set(CURLOPT_SSL_CTX_DATA, this);
     if (!_spec.pin.empty()) {
         Set(CURLOPT_PINNEDPUBLICKEY, _spec.pin.c_str());
     }
@@ -155,7 +151,15 @@ void Transfer::SetCallbacks()
     Set(CURLOPT_HEADERDATA, this);
     Set(CURLOPT_WRITEFUNCTION, &Transfer::OnBody);
     Set(CURLOPT_WRITEDATA, this);
-    Set(CURLOPT_OPENSOCKETFUNCTION, &OpenSocket);
+    Set(CURLOPT_OPENSOCKETFUNCTION, &Transfer::OnSocket);
+    Set(CURLOPT_OPENSOCKETDATA, this);
+    Set(CURLOPT_PREREQFUNCTION, &Transfer::OnRequest);
+    Set(CURLOPT_PREREQDATA, this);
+    Set(CURLOPT_DEBUGFUNCTION, &Transfer::OnTrace);
+    Set(CURLOPT_DEBUGDATA, this);
+    Set(CURLOPT_XFERINFOFUNCTION, &Transfer::OnProgress);
+    Set(CURLOPT_XFERINFODATA, this);
+    Set(CURLOPT_NOPROGRESS, 0L);
 }
 
 void Transfer::Prepare()
@@ -173,10 +177,21 @@ std::size_t Transfer::OnHeader(char* data, std::size_t size, std::size_t count, 
 {
     try {
         const std::string_view line(data, size * count);
-        return static_cast<Transfer*>(self)->_reply.AddHeaderLine(line) ? line.size() : 0;
-    } catch (const std::bad_alloc&) {
+        return static_cast<Transfer*>(self)->Take(line) ? line.size() : 0;
+    } catch (const std::exception&) {
         return 0;
     }
+}
+
+bool Transfer::Take(std::string_view headerLine)
+{
+    if (!_reply.AddHeaderLine(headerLine)) {
+        return false;
+    }
+    if (_reply.HasHead()) {
+        Set(CURLOPT_VERBOSE, 1L); // from now on `OnTrace` sees the body with its framing
+    }
+    return true;
 }
 
 std::size_t Transfer::OnBody(char* data, std::size_t size, std::size_t count, void* self)
@@ -189,9 +204,54 @@ std::size_t Transfer::OnBody(char* data, std::size_t size, std::size_t count, vo
     }
 }
 
+int Transfer::OnTrace(
+    CURL* /*easy*/, curl_infotype type, char* /*data*/, std::size_t size, void* self)
+{
+    if (type == CURLINFO_DATA_IN) {
+        try {
+            static_cast<Transfer*>(self)->_reply.AddWireBytes(size);
+        } catch (const std::bad_alloc&) { // NOLINT(bugprone-empty-catch): the next octets tell
+        }
+    }
+    return 0;
+}
+
+/** Ends a transfer whose reply was refused where no other callback comes. */
+int Transfer::OnProgress(void* self, curl_off_t, curl_off_t, curl_off_t, curl_off_t)
+{
+    return static_cast<Transfer*>(self)->_reply.GetProblem().empty() ? 0 : 1;
+}
+
+/**
+ * libcurl sends a request again, over another connection, when a connection that was kept ends
+ * before the reply begins. The server may have acted on the request by then, so that it goes out
+ * once. A kept connection that libcurl finds closed before it sends does not get here.
+ */
+int Transfer::OnRequest(void* self, char* /*ip*/, char* /*localIp*/, int /*port*/, int /*local*/)
+{
+    Transfer& transfer = *static_cast<Transfer*>(self);
+    transfer._isRepeated = std::exchange(transfer._isSent, true);
+    return transfer._isRepeated ? CURL_PREREQFUNC_ABORT : CURL_PREREQFUNC_OK;
+}
+
+curl_socket_t Transfer::OnSocket(void* self, curlsocktype /*purpose*/, curl_sockaddr* address)
+{
+    Transfer& transfer = *static_cast<Transfer*>(self);
+    transfer._isRepeated = transfer._isSent;
+    if (transfer._isRepeated) {
+        return CURL_SOCKET_BAD;
+    }
+    // Programs that the host starts do not inherit the connection.
+    const int descriptor =
+        socket(address->family, address->socktype | SOCK_CLOEXEC, address->protocol);
+    transfer._socketError = descriptor < 0 ? errno : 0;
+    return descriptor;
+}
+
 CURLcode Transfer::OnSslContext(CURL* /*easy*/, void* context, void* self)
 {
-    return static_cast<Ssl::TlsPeer*>(self)->Prepare(static_cast<SSL_CTX*>(context))
+    const Transfer& transfer = *static_cast<Transfer*>(self);
+    return transfer._spec.tls->Prepare(static_cast<SSL_CTX*>(context), transfer._alert)
                ? CURLE_OK
                : CURLE_SSL_CERTPROBLEM;
 }
@@ -201,10 +261,7 @@ Outcome Transfer::Finish(CURLcode result)
     if (_cookies != nullptr) {
         _cookies->Merge(_givenCookies, ReadCookies());
     }
-    if (result == CURLE_GOT_NOTHING && _reply.HasInterimStatus()) {
-        result = CURLE_OK;
-    }
-    if (result == CURLE_OK) {
+    if (IsAnswered(result)) {
         return {nullptr, MakeClientResponse(_reply.GetStatus(), _reply.TakeBody())};
     }
     if (result == CURLE_OPERATION_TIMEDOUT) {
@@ -214,6 +271,19 @@ Outcome Transfer::Finish(CURLcode result)
             {}};
     }
     return {std::make_shared<HttpException>(Describe(result)), {}};
+}
+
+bool Transfer::IsAnswered(CURLcode result) const noexcept
+{
+    if (_reply.IsAnswered()) {
+        return true; // the transfer was ended there
+    }
+    if (_reply.HasInterimStatus()) {
+        // Nothing follows, or something that is no reply.
+        return result == CURLE_GOT_NOTHING || result == CURLE_UNSUPPORTED_PROTOCOL;
+    }
+    // libcurl takes the end of the connection for the end of a head.
+    return result == CURLE_OK && _reply.HasHead();
 }
 
 CookieLines Transfer::ReadCookies() const
@@ -237,14 +307,55 @@ std::string Transfer::DescribeTlsRefusal() const
            + ". It must name \"" + _spec.tls->GetName() + "\" and lead to a trusted authority.";
 }
 
-std::string Transfer::DescribeRefusedConnection() const
+std::string Transfer::DescribeAlert(CURLcode result) const
+{
+    const std::string& server = _exchange->GetServer();
+    const std::string words = Ssl::DescribeAlert(_alert->code) + ".";
+    if (!Ssl::IsAboutCertificate(_alert->code)) {
+        return result == CURLE_SSL_CONNECT_ERROR
+                   ? "The TLS handshake with " + server + " failed: the server refuses it: " + words
+                   : "The server " + server + " ended the TLS connection: " + words;
+    }
+    return "The server " + server
+           + (_spec.tls->HasIdentity() ? " refuses the client's TLS certificate: "
+                                       : " refuses a client without a TLS certificate: ")
+           + words;
+}
+
+int Transfer::GetSystemError() const
 {
     long error = 0;
     curl_easy_getinfo(_easy.get(), CURLINFO_OS_ERRNO, &error);
+    return error != 0 ? static_cast<int>(error) : _socketError;
+}
+
+std::string Transfer::DescribeRefusedConnection() const
+{
+    const int error = GetSystemError();
     return "Cannot connect to " + _spec.connectHost + " port " + std::to_string(_spec.port) + ": "
-           + (error != 0 ? std::generic_category().message(static_cast<int>(error))
-                         : _errorText.data())
-           + ".";
+           + (error != 0 ? System::DescribeSystemError(error) : _errorText.data()) + ".";
+}
+
+std::string Transfer::DescribeBrokenConnection() const
+{
+    const std::string& server = _exchange->GetServer();
+    if (std::string_view(_errorText.data()).find("unexpected eof") != std::string_view::npos) {
+        return "The reply of " + server
+               + " ended too early: the TLS connection ended without notice.";
+    }
+    const int error = GetSystemError();
+    return "The exchange with " + server + " failed: "
+           + (error != 0 ? System::DescribeSystemError(error) : GetDetail(CURLE_RECV_ERROR)) + ".";
+}
+
+/** libcurl's words for a failure, without the codes of OpenSSL that may stand before them. */
+std::string Transfer::GetDetail(CURLcode result) const
+{
+    std::string detail = _errorText[0] != '\0' ? _errorText.data() : curl_easy_strerror(result);
+    if (detail.find("error:") != std::string::npos) {
+        detail.erase(0, detail.rfind(':') + 1);
+    }
+    return detail;
 }
 
 std::string Transfer::Describe(CURLcode result) const
@@ -253,9 +364,19 @@ std::string Transfer::Describe(CURLcode result) const
     if (!_reply.GetProblem().empty()) {
         return "The reply of " + server + " " + _reply.GetProblem() + ".";
     }
-    const std::string detail =
-        _errorText[0] != '\0' ? _errorText.data() : curl_easy_strerror(result);
+    if (_alert->code != 0) {
+        return DescribeAlert(result);
+    }
+    if (_isRepeated) {
+        result = CURLE_GOT_NOTHING;
+    }
+    if (result == CURLE_OUT_OF_MEMORY && _isSent && !_reply.HasHead()) {
+        // libcurl's words for a line that is longer than its own limit, which is above ours.
+        return "The reply of " + server + " " + ReplyCollector::DescribeTooManyHeaders() + ".";
+    }
     switch (result) {
+    case CURLE_OK:
+        return "The reply of " + server + " ended too early: its headers are not complete.";
     case CURLE_COULDNT_RESOLVE_HOST:
         return "The host name " + _spec.connectHost + " cannot be resolved.";
     case CURLE_COULDNT_CONNECT:
@@ -265,19 +386,19 @@ std::string Transfer::Describe(CURLcode result) const
     case CURLE_SSL_PINNEDPUBKEYNOTMATCH:
         return "The TLS key of " + server + " is not the pinned one, " + _spec.pin + ".";
     case CURLE_SSL_CONNECT_ERROR:
-        return "The TLS handshake with " + server + " failed: " + detail + ".";
-    case CURLE_FILESIZE_EXCEEDED:
-        return "The reply of " + server + " is larger than "
-               + std::to_string(ReplyLimits::MaxBodyBytes) + " bytes.";
+        return "The TLS handshake with " + server + " failed: " + GetDetail(result) + ".";
     case CURLE_GOT_NOTHING:
         return "The server " + server + " closed the connection without a reply.";
     case CURLE_PARTIAL_FILE:
-        return "The reply of " + server + " ended too early: " + detail + ".";
+        return "The reply of " + server + " ended too early: " + GetDetail(result) + ".";
+    case CURLE_SEND_ERROR:
+    case CURLE_RECV_ERROR:
+        return DescribeBrokenConnection();
     case CURLE_UNSUPPORTED_PROTOCOL:
     case CURLE_WEIRD_SERVER_REPLY:
-        return "The reply of " + server + " is not HTTP: " + detail + ".";
+        return "The reply of " + server + " is not HTTP: " + GetDetail(result) + ".";
     default:
-        return "The exchange with " + server + " failed: " + detail + ".";
+        return "The exchange with " + server + " failed: " + GetDetail(result) + ".";
     }
 }
 

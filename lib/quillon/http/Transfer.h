@@ -37,6 +37,10 @@ public:
 private:
     static std::size_t OnHeader(char* data, std::size_t size, std::size_t count, void* self);
     static std::size_t OnBody(char* data, std::size_t size, std::size_t count, void* self);
+    static int OnTrace(CURL* easy, curl_infotype type, char* data, std::size_t size, void* self);
+    static int OnProgress(void* self, curl_off_t, curl_off_t, curl_off_t, curl_off_t);
+    static int OnRequest(void* self, char*, char*, int, int);
+    static curl_socket_t OnSocket(void* self, curlsocktype purpose, curl_sockaddr* address);
     static CURLcode OnSslContext(CURL* easy, void* context, void* self);
 
     template <class T>
@@ -48,10 +52,16 @@ private:
     void SetTls();
     void SetCallbacks();
 
+    bool Take(std::string_view headerLine);
+    bool IsAnswered(CURLcode result) const noexcept;
     CookieLines ReadCookies() const;
     std::string Describe(CURLcode result) const;
     std::string DescribeTlsRefusal() const;
     std::string DescribeRefusedConnection() const;
+    std::string DescribeBrokenConnection() const;
+    std::string DescribeAlert(CURLcode result) const;
+    std::string GetDetail(CURLcode result) const;
+    int GetSystemError() const;
 
     const Ref<ClientRequestImpl> _request;
     const Ref<ConnectionPoolImpl> _pool;
@@ -61,6 +71,10 @@ private:
 
     CookieLines _givenCookies;
     ReplyCollector _reply;
+    const Ref<Ssl::PeerAlert> _alert; // of the connection that this transfer opens
+    bool _isSent = false;             // libcurl has begun to send the request
+    bool _isRepeated = false;         // libcurl has tried to send it again
+    int _socketError = 0;
     std::array<char, CURL_ERROR_SIZE> _errorText{};
     StringListOwner _headers;
     StringListOwner _connectTo;

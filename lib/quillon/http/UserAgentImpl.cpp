@@ -36,6 +36,7 @@ public:
     void WaitForResponse(
         PendingRequestItem* pending, long long timeout, Ref<ClientResponse>& response) override
     {
+        HttpEngine::Get().RequireOwnProcess();
         response = static_cast<PendingRequestItemImpl*>(pending)->GetExchange().Wait(timeout);
     }
 

@@ -15,6 +15,8 @@ public:
     /** Gives `context`, of one connection, this trust and identity. @return success. */
     bool Apply(SSL_CTX* context) const noexcept;
 
+    bool HasIdentity() const noexcept { return _clientKey != nullptr; }
+
 private:
     Crypto::X509StoreOwner _authorities;
     std::list<Ref<const Crypto::Certificate>> _clientCertificates;

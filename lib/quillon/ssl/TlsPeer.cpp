@@ -1,5 +1,8 @@
 #include "ssl/TlsPeer.h"
 
+#include <algorithm>
+#include <memory>
+#include <new>
 #include <utility>
 
 namespace Quillon::Ssl {
@@ -16,6 +19,48 @@ int GetPeerSlot()
     return slot;
 }
 
+void ReleaseAlert(void* /*owner*/, void* alert, CRYPTO_EX_DATA* /*data*/, int /*slot*/, long, void*)
+{
+    delete static_cast<Ref<PeerAlert>*>(alert);
+}
+
+/** The slot of an `SSL_CTX` that owns a reference to its `PeerAlert`. */
+int GetAlertSlot()
+{
+    static const int slot = SSL_CTX_get_ex_new_index(0, nullptr, nullptr, nullptr, &ReleaseAlert);
+    return slot;
+}
+
+bool AttachAlert(SSL_CTX* connection, const Ref<PeerAlert>& alert) noexcept
+{
+    std::unique_ptr<Ref<PeerAlert>> owned(new (std::nothrow) Ref<PeerAlert>(alert));
+    if (owned == nullptr || SSL_CTX_set_ex_data(connection, GetAlertSlot(), owned.get()) != 1) {
+        return false;
+    }
+    static_cast<void>(owned.release()); // goes with the connection
+    return true;
+}
+
+/** The end of a connection in order is no reason for anything. */
+void NoteAlert(const SSL* ssl, int alert)
+{
+    const int code = alert & 0xFF;
+    if (code != SSL_AD_CLOSE_NOTIFY && code != SSL_AD_NO_RENEGOTIATION) {
+        const void* const slot = SSL_CTX_get_ex_data(SSL_get_SSL_CTX(ssl), GetAlertSlot());
+        (*static_cast<const Ref<PeerAlert>*>(slot))->code = code;
+    }
+}
+
+/**
+ * What OpenSSL's configuration, which the environment can name, says about security counts only
+ * where it is stricter.
+ */
+void RequireSecurityLevel(SSL_CTX* connection) noexcept
+{
+    constexpr int Level = 2; // 112 bits: no RSA below 2048 bits, no SHA-1 in signatures
+    SSL_CTX_set_security_level(connection, std::max(SSL_CTX_get_security_level(connection), Level));
+}
+
 TlsPeer* GetPeer(const SSL* ssl)
 {
     return static_cast<TlsPeer*>(SSL_CTX_get_ex_data(SSL_get_SSL_CTX(ssl), GetPeerSlot()));
@@ -29,20 +74,22 @@ TlsPeer::TlsPeer(Ref<const SSLContextImpl> context, std::string name, bool nameI
     , _nameIsAddress(nameIsAddress)
 {}
 
-bool TlsPeer::Prepare(SSL_CTX* connection) noexcept
+bool TlsPeer::Prepare(SSL_CTX* connection, const Ref<PeerAlert>& alert) noexcept
 {
     // libcurl set most of this already; it stands here so that the safety of a connection does
     // not hang on options of another layer.
     SSL_CTX_set_verify(connection, SSL_VERIFY_PEER, nullptr);
+    RequireSecurityLevel(connection);
     // libcurl writes the keys of all connections to the file that SSLKEYLOGFILE names.
     SSL_CTX_set_keylog_callback(connection, nullptr);
     SSL_CTX_set_session_cache_mode(connection, SSL_SESS_CACHE_CLIENT | SSL_SESS_CACHE_NO_INTERNAL);
     SSL_CTX_clear_options(connection, SSL_OP_NO_TICKET);
     SSL_CTX_set_options(connection, SSL_OP_NO_RENEGOTIATION);
     SSL_CTX_sess_set_new_cb(connection, &TlsPeer::OnNewSession);
-    SSL_CTX_set_info_callback(connection, &TlsPeer::OnHandshake);
+    SSL_CTX_set_info_callback(connection, &TlsPeer::OnEvent);
     return SSL_CTX_set_min_proto_version(connection, TLS1_2_VERSION) == 1
-           && SSL_CTX_set_ex_data(connection, GetPeerSlot(), this) == 1 && RequireName(connection)
+           && SSL_CTX_set_ex_data(connection, GetPeerSlot(), this) == 1
+           && AttachAlert(connection, alert) && RequireName(connection)
            && _context->Apply(connection);
 }
 
@@ -59,11 +106,18 @@ bool TlsPeer::RequireName(SSL_CTX* connection) const noexcept
            == 1;
 }
 
-void TlsPeer::OnHandshake(const SSL* ssl, int where, int /*result*/)
+void TlsPeer::OnEvent(const SSL* ssl, int where, int result)
 {
-    if ((where & SSL_CB_HANDSHAKE_START) == 0 || SSL_get_session(ssl) != nullptr) {
-        return;
+    if ((where & SSL_CB_READ_ALERT) == SSL_CB_READ_ALERT) {
+        NoteAlert(ssl, result);
     }
+    if ((where & SSL_CB_HANDSHAKE_START) != 0 && SSL_get_session(ssl) == nullptr) {
+        OfferSession(ssl);
+    }
+}
+
+void TlsPeer::OfferSession(const SSL* ssl)
+{
     // The start of the handshake is the last moment at which a session can be offered, and the
     // only one at which libcurl lets us at the connection. The callback's const is historical.
     const SessionOwner session = GetPeer(ssl)->Take();
@@ -104,6 +158,28 @@ TlsPeer::SessionOwner TlsPeer::Take()
         _sessions.emplace_back(session.get());
     }
     return session;
+}
+
+std::string DescribeAlert(int code)
+{
+    return SSL_alert_desc_string_long(code);
+}
+
+bool IsAboutCertificate(int code) noexcept
+{
+    switch (code) {
+    case SSL_AD_NO_CERTIFICATE:
+    case SSL_AD_BAD_CERTIFICATE:
+    case SSL_AD_UNSUPPORTED_CERTIFICATE:
+    case SSL_AD_CERTIFICATE_REVOKED:
+    case SSL_AD_CERTIFICATE_EXPIRED:
+    case SSL_AD_CERTIFICATE_UNKNOWN:
+    case SSL_AD_UNKNOWN_CA:
+    case SSL_AD_CERTIFICATE_REQUIRED:
+        return true;
+    default:
+        return false;
+    }
 }
 
 std::string DescribeVerifyResult(long result)

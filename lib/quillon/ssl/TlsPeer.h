@@ -7,6 +7,12 @@
 
 namespace Quillon::Ssl {
 
+/** The alert with which the peer of one connection ended it; 0 if there was none. */
+struct PeerAlert final : public RefCounted
+{
+    int code = 0;
+};
+
 /**
  * The TLS side of one connection spec: what its peer must prove, and the sessions that can be
  * resumed. The sessions live here because they stand for a verification that is already done: one
@@ -20,15 +26,24 @@ public:
     /** @param name  the DNS name or IP address that the peer's certificate must have. */
     TlsPeer(Ref<const SSLContextImpl> context, std::string name, bool nameIsAddress);
 
-    /** Sets up `connection`, which must not outlive this object. @return success. */
-    bool Prepare(SSL_CTX* connection) noexcept;
+    /**
+     * Sets up `connection`, which must not outlive this object.
+     *
+     * @param alert  learns of the alert with which the peer ends the connection.
+     * @return success.
+     */
+    bool Prepare(SSL_CTX* connection, const Ref<PeerAlert>& alert) noexcept;
+
+    /** Whether the client has a certificate to show. */
+    bool HasIdentity() const noexcept { return _context->HasIdentity(); }
 
     const std::string& GetName() const noexcept { return _name; }
 
 private:
     using SessionOwner = std::unique_ptr<SSL_SESSION, Crypto::OpenSslDeleter<SSL_SESSION_free>>;
 
-    static void OnHandshake(const SSL* ssl, int where, int result);
+    static void OnEvent(const SSL* ssl, int where, int result);
+    static void OfferSession(const SSL* ssl);
     static int OnNewSession(SSL* ssl, SSL_SESSION* session);
 
     bool RequireName(SSL_CTX* connection) const noexcept;
@@ -40,6 +55,12 @@ private:
     bool _nameIsAddress;
     std::vector<SessionOwner> _sessions; // newest last
 };
+
+/** OpenSSL's words for an alert. */
+std::string DescribeAlert(int code);
+
+/** Whether an alert is about the certificate of the one who receives it [RFC 8446 6.2]. */
+bool IsAboutCertificate(int code) noexcept;
 
 /** OpenSSL's words for the outcome of a certificate verification. */
 std::string DescribeVerifyResult(long result);

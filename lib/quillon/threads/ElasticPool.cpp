@@ -1,6 +1,7 @@
 #include "threads/ElasticPool.h"
 
 #include "threads/SignalBlock.h"
+#include "threads/SystemError.h"
 
 #include "quillon/Exceptions.h"
 #include "quillon/service/Logger.h"
@@ -213,7 +214,7 @@ void ElasticPool::AddThread()
             return;
         }
         throw InvalidStateException(
-            std::string("The thread pool cannot start a thread: ") + error.what());
+            "The thread pool cannot start a thread: " + DescribeSystemError(error.code().value()));
     }
     _idle.splice(_idle.begin(), fresh);
 }

@@ -16,6 +16,12 @@ namespace Http = Quillon::Http;
 /** SOAP 1.1 faults come with this status [SOAP11 6.2]. */
 constexpr int SoapFaultStatus = 500;
 
+/** Whether a reply of this status is the service's word, so that its body counts. */
+bool IsAcceptable(int status) noexcept
+{
+    return status / 100 == 2 || status == SoapFaultStatus;
+}
+
 Quillon::Ref<Http::ClientRequest> ComposeRequest(
     Request const& request, std::string const& path, long long timeout)
 {
@@ -26,6 +32,7 @@ Quillon::Ref<Http::ClientRequest> ComposeRequest(
     httpRequest->SetHeader("SOAPAction", "\"" + request.soapAction + "\"");
     httpRequest->GetBodyWriter()->Write(request.body.data(), request.body.size());
     httpRequest->SetTimeout(timeout);
+    httpRequest->SetBodyStatuses(&IsAcceptable);
     return httpRequest;
 }
 
@@ -115,7 +122,7 @@ void TranslateResponse(
         Quillon::PanicVerify("response != __null", "lib/ssoClient/HttpsClient", __LINE__);
     }
     const Http::HttpStatus& status = response->GetStatus();
-    if (status.code / 100 == 2 || status.code == SoapFaultStatus) {
+    if (IsAcceptable(status.code)) {
         outBody = response->GetBody();
         return;
     }

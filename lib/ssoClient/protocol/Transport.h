@@ -42,7 +42,8 @@ public:
      * Sends a request and returns at once; `callback` is called once, on a thread of the HTTP
      * client. Every failure is a `CommunicationException` there.
      *
-     * @param pending  receives what can be called off; letting go of it calls it off, too.
+     * @param pending  receives what can be called off with `Cancel`, after which `callback` is not
+     *                 called. It need not be kept: letting go of it changes nothing.
      */
     virtual void SendRequestAsync(
         Request const& request,

@@ -13,6 +13,9 @@ enum class HttpMethod : int
     POST = 3
 };
 
+/** Answers a question about a status code. Called on a thread of the HTTP client. */
+using StatusTest = bool (*)(int status) noexcept;
+
 /**
  * A request in the making. Its body is wiped from memory when the request goes.
  *
@@ -40,6 +43,13 @@ public:
      * @throws InvalidArgumentException  `timeout` is not positive.
      */
     virtual void SetTimeout(long long timeout) = 0;
+
+    /**
+     * Says for which status codes the body of the reply counts; without it, for all. A reply of
+     * another status ends with its head: its body is empty, nothing behind the head is waited for
+     * or judged, and the connection is closed.
+     */
+    virtual void SetBodyStatuses(StatusTest wantsBody) noexcept = 0;
 };
 
 /**

@@ -5,8 +5,9 @@
 namespace Quillon::Http {
 
 /**
- * An HTTP exchange failed: the server cannot be reached, is not who it should be, or its reply is
- * not HTTP or too large. The text names the server and the reason, never what was sent.
+ * An HTTP exchange failed: the server cannot be reached, is not who it should be, refuses the
+ * client's certificate, or its reply is not HTTP, not complete or too large. The text names the
+ * server and the reason, never what was sent; it is English whatever the locale is.
  */
 class QUILLON_API HttpException : public ExceptionOf<HttpException, Exception>
 {

@@ -13,8 +13,8 @@
 namespace Quillon::Http {
 
 /**
- * An exchange that was started. Keep it: when its last reference goes before the exchange has
- * completed, the exchange is called off.
+ * An exchange that was started. Keep it to wait for the exchange or to call it off; letting go of
+ * it changes nothing.
  */
 class QUILLON_API PendingRequestItem : public System::ScheduledItem
 {};
@@ -30,13 +30,21 @@ using Completion = boost::function<void(const Exception*, ClientResponse*, Pendi
 class QUILLON_API HttpConnectionPool : public RefCounted
 {};
 
+/** @throws HttpException  the process has forked after its first exchange. */
 QUILLON_API void CreateHttpConnectionPool(ConnectionSpec* spec, Ref<HttpConnectionPool>& out);
 
 /**
  * Sends requests to one server, over HTTP/1.1.
  *
  * Nothing outside the arguments has a say in an exchange: no environment, proxy or .netrc.
- * Redirects are not followed. A reply may have 8 MiB of body and 64 KiB of headers.
+ * Redirects are not followed. A request goes out once: if a connection that was kept ends before
+ * the reply begins, that is the exchange's failure, because the server may have acted on it. A
+ * connection that is found closed before anything is sent is replaced. A reply may have 8 MiB of
+ * body and 64 KiB of headers.
+ *
+ * Replies of status 100, 102 and 103 are passed over. Another of status 1xx is the answer if it is
+ * a 101, announces a body or the end of the connection, or if no other reply follows; it has no
+ * body.
  *
  * The libraries below look at the environment when they initialise, with the first exchange at the
  * latest: libcurl creates the file that SSLKEYLOGFILE names (no keys land in it), and OpenSSL reads
@@ -46,8 +54,12 @@ QUILLON_API void CreateHttpConnectionPool(ConnectionSpec* spec, Ref<HttpConnecti
  * All exchanges of the process run on one I/O thread, which starts with the first of them.
  * Completions run on a second thread, one after another, and should return soon: a slow one
  * delays the others, but no exchange and no wait. At the exit of the process both threads stop;
- * what is still in flight fails, and its completion is not called. A process that forks after
- * its first exchange cannot send in the child.
+ * what is still in flight fails, and its completion is not called.
+ *
+ * A child that is forked before the process has any thread can send. A child that is forked after
+ * the first exchange cannot: everything here that would send or wait throws an `HttpException`, at
+ * once. In between, when the process has threads but has sent nothing, a lock of a library below
+ * may be taken for ever; fork before that.
  *
  * Thread safety: any number of threads. Concurrent exchanges use connections of their own.
  */
@@ -59,8 +71,9 @@ public:
      * of the HTTP client, unless the exchange is called off; it may be empty. The agent may go
      * before. What the completion throws is logged and dropped.
      *
-     * @param pending  receives the item to wait on, and to hold as long as the exchange matters.
-     * @throws HttpException  the process has forked or is about to end.
+     * @param pending  receives the item to wait on or to call the exchange off with.
+     * @throws HttpException  the HTTP threads cannot be started (a later call tries again), or the
+     *                        process has forked or is about to end.
      */
     virtual void SendRequestAsync(
         ClientRequest* request, const Completion& completion, Ref<PendingRequestItem>& pending) = 0;
@@ -70,7 +83,8 @@ public:
      *
      * @param timeout  in microseconds.
      * @throws TimeoutException  the time is over; the exchange is then called off.
-     * @throws HttpException     the exchange failed or was called off.
+     * @throws HttpException     the exchange failed or was called off, or is one of the process
+     *                           that this one was forked from.
      */
     virtual void WaitForResponse(
         PendingRequestItem* pending, long long timeout, Ref<ClientResponse>& response) = 0;
@@ -81,6 +95,7 @@ public:
  * @param pool         a pool of the same spec, or null: the agent then keeps connections for
  *                     itself and closes them when it goes.
  * @throws InvalidArgumentException  `spec` is null, or the pool is for another spec.
+ * @throws HttpException             the process has forked after its first exchange.
  */
 QUILLON_API void CreateHttpUserAgent(
     ConnectionSpec* spec, CookieStore* cookieStore, HttpConnectionPool* pool, Ref<UserAgent>& out);

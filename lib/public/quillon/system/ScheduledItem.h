@@ -5,7 +5,8 @@
 namespace Quillon::System {
 
 /**
- * Something that is going to happen: work that is queued or under way.
+ * Something that is going to happen: work that is queued or under way. Letting go of the item
+ * does not stop it; `Cancel` does.
  *
  * Thread safety: any number of threads.
  */

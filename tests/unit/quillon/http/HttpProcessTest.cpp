@@ -230,9 +230,8 @@ std::string PostTo(int port)
 {
     Ref<ConnectionSpec> spec;
     CreateTCPConnectionSpec("127.0.0.1", port, false, spec);
-    HttpClient client(spec);
     try {
-        return client.Post().body;
+        return HttpClient(spec).Post().body;
     } catch (const HttpException& error) {
         return error.what();
     }

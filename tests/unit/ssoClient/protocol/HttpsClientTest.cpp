@@ -231,6 +231,42 @@ TEST(SendRequest, TakesAFinal199ForAServerError)
     EXPECT_EQ("Server returned error: 199 Odd", SendAndFail(*MakeClient(server).CreateSession()));
 }
 
+/** What follows the status line of an answer that is only a server error. */
+class DislikedBodies : public testing::TestWithParam<std::string>
+{};
+
+TEST_P(DislikedBodies, DoNotHideTheStatus)
+{
+    const TestServer server([](ServerConnection& connection) {
+        connection.ReadRequest();
+        connection.Write("HTTP/1.1 503 Service Unavailable\r\n" + GetParam());
+        connection.WaitForClose();
+    });
+    constexpr long long Bound = 10'000'000; // of an exchange that would wait for the body
+    EXPECT_EQ(
+        "Server returned error: 503 Service Unavailable",
+        SendAndFail(*MakeClient(server, Bound).CreateSession()));
+    EXPECT_EQ(
+        "Server returned error: 503 Service Unavailable",
+        SendAsync(*MakeClient(server, Bound).CreateSession()).errorText);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    SendRequest,
+    DislikedBodies,
+    Values(
+        "Content-Encoding: gzip\r\nContent-Length: 4\r\n\r\nbody",
+        "Content-Length: 9000000\r\n\r\nand so on",
+        "Content-Length: 100\r\n\r\nshort",
+        "Transfer-Encoding: chunked\r\n\r\nno chunk"));
+
+TEST(SendRequest, JudgesTheBodyOfASoapFault)
+{
+    const TestServer server(
+        AnswerAndClose("HTTP/1.1 500 Internal Server Error\r\nContent-Length: 100\r\n\r\nshort"));
+    EXPECT_THROW(Send(*MakeClient(server).CreateSession()), Quillon::Http::HttpException);
+}
+
 TEST(SendRequest, KeepsTheBlankBeforeAMissingReasonPhrase)
 {
     const TestServer server(AnswerAll(MakeReply("404", "")));
@@ -308,27 +344,36 @@ TEST(SendRequestAsync, GivesAnItemThatCallsItOff)
     EXPECT_FALSE(called);
 }
 
-TEST(SendRequestAsync, EndsTheExchangeWhenItsItemIsLetGo)
+TEST(SendRequestAsync, CallsBackOnceAlthoughItsItemIsLetGo)
 {
     std::promise<void> asked;
-    std::promise<void> closed;
+    std::promise<void> mayAnswer;
     const TestServer server([&](ServerConnection& connection) {
-        connection.ReadRequest();
-        asked.set_value();
-        connection.WaitForClose();
-        closed.set_value();
+        if (connection.ReadRequest()) {
+            asked.set_value();
+            mayAnswer.get_future().wait();
+            connection.Write(MakeReply("200 OK", "body"));
+        }
     });
-    std::atomic<bool> called{false};
-    const auto kept = std::make_shared<int>();
+    std::atomic<int> calls{0};
+    std::promise<std::string> body;
     const boost::shared_ptr<TransportSession> session = MakeClient(server).CreateSession();
     Ref<ScheduledItem> pending;
     session->SendRequestAsync(
-        MakeRequest(), [&called, kept](const Exception*, Reader*) { called = true; }, pending);
+        MakeRequest(),
+        [&](const Exception*, Reader* reader) {
+            if (++calls == 1) {
+                body.set_value(ReadAll(Ref<Reader>(reader)));
+            }
+        },
+        pending);
     asked.get_future().wait();
     pending.reset();
-    EXPECT_EQ(kept.use_count(), 1); // the callback has gone with it
-    closed.get_future().wait();
-    EXPECT_FALSE(called);
+    mayAnswer.set_value();
+    std::future<std::string> told = body.get_future();
+    ASSERT_EQ(std::future_status::ready, told.wait_for(std::chrono::seconds(10)));
+    EXPECT_EQ("body", told.get());
+    EXPECT_EQ(1, calls);
 }
 
 /** The thread on which a request that this thread sends calls back. */
