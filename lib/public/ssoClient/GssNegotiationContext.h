@@ -33,12 +33,16 @@ public:
      * Sends a leg and waits for the answer. The first leg begins the negotiation; so does the one
      * after a reply without context id. Nothing is logged, and the leg may be empty.
      *
-     * @throws Quillon::InvalidArgumentException  the lifetime asked for is not positive.
+     * @throws Quillon::InvalidArgumentException  the lifetime asked for is not positive or too long
+     *                                            for a date, or a trusted certificate is null.
      * @throws ParseException, InvalidSignatureException  the token is unacceptable.
      * @throws SsoException  a fault, or a failure as of a blocking operation of
      *                       `SecurityTokenService`. The negotiation stays where it was.
      */
     virtual NegotiationResult NegotiateToken(const Leg& leg) = 0;
+
+protected:
+    ~GssNegotiationContext() = default;
 };
 
 /**

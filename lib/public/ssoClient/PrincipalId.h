@@ -12,7 +12,12 @@ class SSOCLIENT_API PrincipalId
 {
 public:
     /** Stops the process if either is empty; check text from outside first. */
-    PrincipalId(std::string name, std::string domain);
+    PrincipalId(const std::string& name, const std::string& domain);
+
+    // There is no move: what a move leaves behind would have the empty name that no principal has.
+    PrincipalId(const PrincipalId&) = default;
+    PrincipalId& operator=(const PrincipalId&) = default;
+    ~PrincipalId() = default;
 
     const std::string& GetName() const noexcept { return _name; }
     const std::string& GetDomain() const noexcept { return _domain; }

@@ -140,6 +140,9 @@ public:
         const boost::shared_ptr<const SamlToken>& token,
         long long lifetimeSec,
         const TokenCompletion& completion) const = 0;
+
+protected:
+    ~SecurityTokenService() = default;
 };
 
 /**

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "ssoClient/Advice.h"
+#include "ssoClient/Export.h"
 
 #include <boost/optional.hpp>
 
@@ -28,6 +29,11 @@ struct TokenSpec
     boost::optional<std::string> delegateTo; ///< the principal to delegate to, if any
     bool renewable = false;
     Confirmation confirmation = CONFIRMATION_DEFAULT;
+
+    TokenSpec() = default;
+    SSOCLIENT_API TokenSpec(const TokenSpec& other);
+    TokenSpec& operator=(const TokenSpec& other) = default;
+    SSOCLIENT_API ~TokenSpec();
 };
 
 } // namespace SsoClient

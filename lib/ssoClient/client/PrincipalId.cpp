@@ -4,8 +4,6 @@
 #include "quillon/StringUtil.h"
 #include "ssoClient/wire/assertionPlaces.h"
 
-#include <utility>
-
 namespace SsoClient {
 
 namespace {
@@ -17,9 +15,9 @@ bool EqualIgnoringCase(const std::string& a, const std::string& b)
 
 } // namespace
 
-PrincipalId::PrincipalId(std::string name, std::string domain)
-    : _name(std::move(name))
-    , _domain(std::move(domain))
+PrincipalId::PrincipalId(const std::string& name, const std::string& domain)
+    : _name(name)
+    , _domain(domain)
 {
     if (_name.empty()) {
         Quillon::PanicVerify(

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <csignal>
+#include <utility>
 
 using SsoClient::PrincipalId;
 
@@ -34,6 +35,18 @@ TEST(PrincipalId, NeverEqualsALookAlike)
 {
     EXPECT_FALSE(PrincipalId("admin", "a") == PrincipalId("adm\u0131n", "a"));
     EXPECT_FALSE(PrincipalId("sales", "a") == PrincipalId("\u017Fales", "a"));
+}
+
+TEST(PrincipalId, KeepsItsNameWhenMovedFrom)
+{
+    PrincipalId id("a", "b");
+    const PrincipalId taken(std::move(id));
+    EXPECT_EQ(id, taken); // NOLINT(bugprone-use-after-move)
+    PrincipalId assigned("c", "d");
+    assigned = std::move(id);
+    EXPECT_EQ(id, assigned); // NOLINT(bugprone-use-after-move)
+    EXPECT_EQ("a", id.GetName());
+    EXPECT_EQ("b", id.GetDomain());
 }
 
 TEST(ToString, HasNoBlankBeforeTheDomain)

@@ -1,3 +1,4 @@
+#include "ssoClient/Exceptions.h"
 #include "ssoClient/GssNegotiationContext.h"
 #include "ssoClient/SecurityTokenService.h"
 #include "ssoClient/protocol/RequestBuilder.h"
@@ -7,6 +8,7 @@
 #include <gmock/gmock.h>
 
 #include <cstring>
+#include <type_traits>
 #include <vector>
 
 // The order of virtual operations is part of the binary interface: callers that were built against
@@ -111,4 +113,37 @@ TEST(SamlTokenInterface, KeepsItsOrder)
             &SamlToken::GetConfirmationCertificate,
             &SamlToken::ToXml),
         ElementsAre(0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14));
+}
+
+namespace {
+
+template <class Error>
+class ExceptionInterface : public testing::Test
+{};
+
+using Errors = testing::Types<
+    SsoException,
+    InvalidTokenException,
+    ParseException,
+    InvalidSignatureException,
+    CommunicationException,
+    InvalidCredentialsException,
+    Quillon::InvalidArgumentException,
+    Quillon::InvalidStateException>;
+TYPED_TEST_SUITE(ExceptionInterface, Errors);
+
+} // namespace
+
+TYPED_TEST(ExceptionInterface, KeepsItsOrder)
+{
+    EXPECT_TRUE(std::has_virtual_destructor_v<TypeParam>);
+    EXPECT_THAT(
+        GetSlots(
+            &TypeParam::what,
+            &TypeParam::GetBacktrace,
+            &TypeParam::Dump,
+            &TypeParam::Where,
+            &TypeParam::Clone,
+            &TypeParam::Throw),
+        ElementsAre(2, 3, 4, 5, 6, 7)); // the destructor has two entries
 }

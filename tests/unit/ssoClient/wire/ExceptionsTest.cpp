@@ -30,6 +30,15 @@ TYPED_TEST(ExceptionFamily, CloneKeepsTypeAndText)
     EXPECT_STREQ("some text", cloned.what());
 }
 
+TYPED_TEST(ExceptionFamily, CloneKeepsTheStack)
+{
+    const TypeParam error("some text");
+    const std::string stack = error.GetBacktrace();
+    EXPECT_NE("", stack);
+    const std::unique_ptr<Quillon::Exception> copy(error.Clone());
+    EXPECT_EQ(stack, copy->GetBacktrace());
+}
+
 TYPED_TEST(ExceptionFamily, ThrowKeepsType)
 {
     const TypeParam error("some text");
