@@ -5,7 +5,11 @@
 
 namespace SsoClient {
 
-/** The caller's own identity, for holder-of-key tokens and signed requests. */
+/**
+ * The caller's own identity, for holder-of-key tokens and signed requests. If either half is null,
+ * the service works as if there were no identity: it asks for bearer tokens, and what needs the
+ * identity fails.
+ */
 struct HolderOfKeyConfig
 {
     Quillon::Ref<const Quillon::Crypto::PrivateKey> privateKey;   ///< signs requests

@@ -29,10 +29,10 @@ using ValidationCompletion =
  * has a blocking and an asynchronous form.
  *
  * No operation retries. Each may throw:
- * - `Quillon::InvalidArgumentException`, before anything is sent, for a bad argument (only a
- *   trusted certificate that is null is noticed later, when there is a token to verify);
+ * - `Quillon::InvalidArgumentException`, before anything is sent, for a bad argument, or if a
+ *   trusted certificate is null and the operation gives a token;
  * - `Quillon::InvalidStateException`, before anything is sent, if it needs the holder-of-key
- *   identity and the configuration has none;
+ *   identity and the configuration has none or half of one;
  * - `CommunicationException`, or the transport's own exception, if the exchange fails;
  * - `InvalidCredentialsException` if the service rejects the credentials;
  * - `InvalidSignatureException` if the token it sends does not verify;

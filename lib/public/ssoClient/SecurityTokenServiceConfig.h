@@ -27,7 +27,8 @@ struct SecurityTokenServiceConfig
      */
     std::string sslPeerParameter;
 
-    /** The caller's own identity; absent for a bearer-only client. */
+    /** The caller's own identity; absent, or without key or certificate, for a bearer-only client.
+     */
     boost::optional<HolderOfKeyConfig> holderOfKeyConfig;
 
     /**

@@ -3,6 +3,7 @@
 #include "quillon/Exceptions.h"
 #include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/client/LegDriver.h"
+#include "ssoClient/client/trustedCertificates.h"
 
 #include <boost/smart_ptr/make_shared.hpp>
 
@@ -27,6 +28,7 @@ GssNegotiationContextImpl::GssNegotiationContextImpl(
 
 NegotiationResult GssNegotiationContextImpl::NegotiateToken(const Leg& leg)
 {
+    RefuseNullCertificate(_trustedCertificates);
     SPNegoResponse response;
     LegDriver(*_requestBuilder, *_responseHandler, LegDriver::EmptyLeg::IsSent)
         .Exchange(*_session, leg, _spec, _contextId, response);

@@ -7,6 +7,7 @@
 #include "ssoClient/client/descriptions.h"
 #include "ssoClient/client/negotiation.h"
 #include "ssoClient/client/operation.h"
+#include "ssoClient/client/trustedCertificates.h"
 
 #include <boost/none.hpp>
 #include <boost/smart_ptr/make_shared.hpp>
@@ -35,11 +36,29 @@ SecurityTokenServiceImpl::SecurityTokenServiceImpl(
     , _trustedCertificates(trustedCertificates)
 {}
 
-boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireToken(
-    const std::string& userName, const std::string& password, const TokenSpec& spec) const
+template <class Describe, class Build, class Read>
+boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::RunForToken(
+    const char* operationName, const Describe& describe, const Build& build, const Read& read) const
 {
     return Run(
         *_transport,
+        operationName,
+        describe,
+        [&](Request& request) {
+            build(request);
+            RefuseNullCertificate(_trustedCertificates);
+        },
+        [&](Quillon::Reader* reply) {
+            std::string tokenXml;
+            read(reply, tokenXml);
+            return ToSamlToken(tokenXml);
+        });
+}
+
+boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireToken(
+    const std::string& userName, const std::string& password, const TokenSpec& spec) const
+{
+    return RunForToken(
         "AcquireToken",
         [&] {
             return MessageFormatter::ASPrint(
@@ -49,9 +68,9 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireToken(
             _requestBuilder->BuildUserPassTokenRequest(userName, password, spec, request);
             LogTrace([] { return "SecurityTokenServiceImpl::AcquireToken sending request"; });
         },
-        [&](Quillon::Reader* reply) {
+        [&](Quillon::Reader* reply, std::string& tokenXml) {
             LogTrace([] { return "SecurityTokenServiceImpl::AcquireToken processing response"; });
-            return ReadIssuedToken(reply);
+            _responseHandler->HandleAcquireTokenResponse(reply, tokenXml);
         });
 }
 
@@ -62,6 +81,7 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByGSS(
         "AcquireTokenByGSS",
         [&] { return DescribeRequest(spec); },
         [&] {
+            RefuseNullCertificate(_trustedCertificates);
             const LegDriver legs(
                 *_requestBuilder, *_responseHandler, LegDriver::EmptyLeg::StopsTheProcess);
             const boost::shared_ptr<TransportSession> session = _transport->CreateSession();
@@ -72,19 +92,19 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByGSS(
 boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByCertificate(
     const TokenSpec& spec) const
 {
-    return Run(
-        *_transport,
+    return RunForToken(
         "AcquireTokenByCertificate",
         [&] { return DescribeRequest(spec); },
         [&](Request& request) { _requestBuilder->BuildCertificateTokenRequest(spec, request); },
-        [&](Quillon::Reader* reply) { return ReadIssuedToken(reply); });
+        [&](Quillon::Reader* reply, std::string& tokenXml) {
+            _responseHandler->HandleAcquireTokenResponse(reply, tokenXml);
+        });
 }
 
 boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByToken(
     const SamlToken& token, const TokenSpec& spec) const
 {
-    return Run(
-        *_transport,
+    return RunForToken(
         "AcquireTokenByToken",
         [&] {
             return MessageFormatter::ASPrint(
@@ -93,7 +113,9 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByToken
                 WriteTokenSpec(spec));
         },
         [&](Request& request) { _requestBuilder->BuildExchangeTokenRequest(token, spec, request); },
-        [&](Quillon::Reader* reply) { return ReadIssuedToken(reply); });
+        [&](Quillon::Reader* reply, std::string& tokenXml) {
+            _responseHandler->HandleAcquireTokenResponse(reply, tokenXml);
+        });
 }
 
 bool SecurityTokenServiceImpl::ValidateSubject(const SamlToken& token) const
@@ -116,8 +138,7 @@ bool SecurityTokenServiceImpl::ValidateSubject(const SamlToken& token) const
 boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::RenewToken(
     const SamlToken& token, long long lifetimeSec) const
 {
-    return Run(
-        *_transport,
+    return RunForToken(
         "RenewToken",
         [&] {
             return MessageFormatter::ASPrint(
@@ -126,7 +147,9 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::RenewToken(
                 lifetimeSec);
         },
         [&](Request& request) { _requestBuilder->BuildRenewRequest(token, lifetimeSec, request); },
-        [&](Quillon::Reader* reply) { return ReadRenewedToken(reply); });
+        [&](Quillon::Reader* reply, std::string& tokenXml) {
+            _responseHandler->HandleRenewTokenResponse(reply, tokenXml);
+        });
 }
 
 void SecurityTokenServiceImpl::AcquireTokenAsync(
@@ -195,22 +218,6 @@ void SecurityTokenServiceImpl::RenewTokenAsync(
 boost::shared_ptr<const SecurityTokenService> SecurityTokenServiceImpl::Copy() const
 {
     return boost::make_shared<SecurityTokenServiceImpl>(*this);
-}
-
-boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::ReadIssuedToken(
-    Quillon::Reader* reply) const
-{
-    std::string tokenXml;
-    _responseHandler->HandleAcquireTokenResponse(reply, tokenXml);
-    return ToSamlToken(tokenXml);
-}
-
-boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::ReadRenewedToken(
-    Quillon::Reader* reply) const
-{
-    std::string tokenXml;
-    _responseHandler->HandleRenewTokenResponse(reply, tokenXml);
-    return ToSamlToken(tokenXml);
 }
 
 boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::ToSamlToken(

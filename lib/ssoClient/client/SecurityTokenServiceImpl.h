@@ -60,12 +60,16 @@ public:
         const TokenCompletion& completion) const override;
 
 private:
+    /** Runs an operation whose reply has a token, the text of which `read` stores. */
+    template <class Describe, class Build, class Read>
+    boost::shared_ptr<const SamlToken> RunForToken(
+        const char* operationName,
+        const Describe& describe,
+        const Build& build,
+        const Read& read) const;
+
     /** What an asynchronous operation works with: the caller's object may go meanwhile. */
     boost::shared_ptr<const SecurityTokenService> Copy() const;
-
-    // What the reply to a request, or its text, gives as a token.
-    boost::shared_ptr<const SamlToken> ReadIssuedToken(Quillon::Reader* reply) const;
-    boost::shared_ptr<const SamlToken> ReadRenewedToken(Quillon::Reader* reply) const;
 
     /** @return the verified token; null for an empty text. */
     boost::shared_ptr<const SamlToken> ToSamlToken(const std::string& tokenXml) const;

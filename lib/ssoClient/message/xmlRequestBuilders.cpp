@@ -44,7 +44,13 @@ DateTime AddSecondsToDate(const DateTime& time, long long seconds)
         sum = seconds < 0 ? std::numeric_limits<long long>::min()
                           : std::numeric_limits<long long>::max();
     }
-    return Quillon::System::DateTimeFromUtc(sum, false);
+    try {
+        return Quillon::System::DateTimeFromUtc(sum, false);
+    } catch (const Quillon::InvalidArgumentException&) {
+        throw Quillon::InvalidArgumentException(
+            "Token lifetime of " + std::to_string(seconds)
+            + " seconds ends outside the years 1 to 9999");
+    }
 }
 
 boost::shared_ptr<XMLCompositeBuilder> CreateRequestSecurityToken(

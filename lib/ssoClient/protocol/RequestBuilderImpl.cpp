@@ -39,6 +39,14 @@ void ValidateTokenIsHok(const SamlToken& token, const std::string& operationName
     }
 }
 
+// A key that no certificate speaks for proves nothing, nor does a certificate without its key: half
+// an identity is none.
+boost::optional<HolderOfKeyConfig> GetWhole(const boost::optional<HolderOfKeyConfig>& config)
+{
+    const bool isWhole = config && config->privateKey && config->certificate;
+    return isWhole ? config : boost::none;
+}
+
 // A request that delegates goes unsigned, whatever its body asks for.
 TokenSpec::Confirmation ConfOverrideWithDelegate(const TokenSpec& spec)
 {
@@ -74,7 +82,7 @@ std::string BuildUnSignedRequest(XMLBuilderPtr headerBuilder, XMLBuilderPtr body
 } // namespace
 
 RequestBuilderImpl::RequestBuilderImpl(const boost::optional<HolderOfKeyConfig>& holderOfKeyConfig)
-    : _holderOfKeyConfig(holderOfKeyConfig)
+    : _holderOfKeyConfig(GetWhole(holderOfKeyConfig))
 {}
 
 void RequestBuilderImpl::BuildUserPassTokenRequest(
@@ -214,10 +222,6 @@ const HolderOfKeyConfig& RequestBuilderImpl::GetHolderOfKeyConfig() const
             "_holderOfKeyConfig.is_initialized()",
             AssertionPlaces::RequestBuilderImpl,
             AssertionPlaces::SigningWithoutIdentity);
-    }
-    if (!_holderOfKeyConfig->privateKey || !_holderOfKeyConfig->certificate) {
-        throw Quillon::InvalidArgumentException(
-            "HolderOfKeyConfig must hold a private key and a certificate");
     }
     return *_holderOfKeyConfig;
 }

@@ -11,7 +11,8 @@ namespace SsoClient {
 class RequestBuilderImpl final : public RequestBuilder
 {
 public:
-    /** @param holderOfKeyConfig  the caller's own identity, if there is one. */
+    /** @param holderOfKeyConfig  the caller's own identity. Without key or certificate it is none.
+     */
     explicit RequestBuilderImpl(const boost::optional<HolderOfKeyConfig>& holderOfKeyConfig);
 
     void BuildUserPassTokenRequest(

@@ -39,7 +39,7 @@ protected:
                    boost::make_shared<RequestBuilderImpl>(boost::none),
                    transport,
                    boost::make_shared<ResponseHandlerImpl>(),
-                   GetTestCertificates("sts"))
+                   trusted)
             .AcquireTokenByGSS(spec, handler);
     }
 
@@ -50,6 +50,8 @@ protected:
 
     TokenSpec spec;
     boost::shared_ptr<FakeTransport> transport = boost::make_shared<FakeTransport>();
+    std::list<Quillon::Ref<const Quillon::Crypto::Certificate>> trusted =
+        GetTestCertificates("sts");
     FixedClock clock{WhenTokensAreValid};
 };
 
@@ -305,4 +307,27 @@ TEST_F(AcquireTokenByGSS, ReportsAnAssertionThatDoesNotVerify)
     transport->replies = {NegotiationReply("c1", "", assertion)};
     ScriptedHandler handler({"one"});
     EXPECT_THAT(GetAcquireFailure(handler), testing::StartsWith("InvalidSignatureException: "));
+}
+
+TEST_F(AcquireTokenByGSS, ToleratesTenMinutesAndNoMore)
+{
+    for (const auto& [time, failure] :
+         {std::pair("2026-12-31T00:09:59Z", "none"),
+          std::pair("2026-12-31T00:10:01Z", "SsoException: The token has expired at: ")}) {
+        const FixedClock now(time);
+        transport->replies = {NegotiationReply("c1", "", GetSignedAssertion())};
+        ScriptedHandler handler({"one"});
+        EXPECT_THAT(GetAcquireFailure(handler), testing::StartsWith(failure)) << time;
+    }
+}
+
+TEST_F(AcquireTokenByGSS, AsksForNoLegIfATrustedCertificateIsNull)
+{
+    trusted.push_back(nullptr);
+    ScriptedHandler handler({"one"});
+    EXPECT_EQ(
+        GetAcquireFailure(handler),
+        "InvalidArgumentException: Invalid argument : A trusted certificate is null");
+    EXPECT_THAT(handler.asked, IsEmpty());
+    EXPECT_THAT(transport->sent, IsEmpty());
 }

@@ -33,11 +33,13 @@ protected:
             boost::make_shared<RequestBuilderImpl>(boost::none),
             transport->CreateSession(),
             boost::make_shared<ResponseHandlerImpl>(),
-            GetTestCertificates("sts"));
+            trusted);
     }
 
     TokenSpec spec;
     boost::shared_ptr<FakeTransport> transport = boost::make_shared<FakeTransport>();
+    std::list<Quillon::Ref<const Quillon::Crypto::Certificate>> trusted =
+        GetTestCertificates("sts");
     FixedClock clock{WhenTokensAreValid};
 };
 
@@ -161,6 +163,30 @@ TEST_F(NegotiateToken, ReportsAnAssertionThatDoesNotVerify)
     assertion[name] = 'x';
     transport->replies = {NegotiationReply("c1", "", assertion)};
     EXPECT_THROW(MakeContext()->NegotiateToken(ToLeg("one")), InvalidSignatureException);
+}
+
+// The clocks of service and caller may differ by ten minutes. The token is valid in 2026.
+TEST_F(NegotiateToken, ToleratesTenMinutesAndNoMore)
+{
+    transport->reply = NegotiationReply("c1", "", GetSignedAssertion());
+    for (const char* const good : {"2025-12-31T23:50:01Z", "2026-12-31T00:09:59Z"}) {
+        const FixedClock now(good);
+        EXPECT_NE(MakeContext()->NegotiateToken(ToLeg("one")).token, nullptr) << good;
+    }
+    for (const char* const bad : {"2025-12-31T23:49:59Z", "2026-12-31T00:10:01Z"}) {
+        const FixedClock now(bad);
+        EXPECT_THROW(MakeContext()->NegotiateToken(ToLeg("one")), ParseException) << bad;
+    }
+}
+
+TEST_F(NegotiateToken, SendsNothingIfATrustedCertificateIsNull)
+{
+    trusted.push_back(nullptr);
+    const auto context = MakeContext();
+    EXPECT_EQ(
+        GetFailure([&context] { context->NegotiateToken(ToLeg("one")); }),
+        "InvalidArgumentException: Invalid argument : A trusted certificate is null");
+    EXPECT_THAT(transport->sent, IsEmpty());
 }
 
 TEST_F(NegotiateToken, LogsNothing)

@@ -227,6 +227,22 @@ TEST_F(AcquireToken, ReportsMalformedAssertionAsFailureOfTheService)
     EXPECT_EQ(GetFailureThrough(responseHandler), "SsoException: " + parserText);
 }
 
+// The clocks of service and caller may differ by ten minutes. The token is valid in 2026.
+TEST_F(AcquireToken, ToleratesTenMinutesAndNoMore)
+{
+    transport->reply = GetSignedAssertion();
+    trusted = GetTestCertificates("sts");
+    for (const char* const good : {"2025-12-31T23:50:01Z", "2026-12-31T00:09:59Z"}) {
+        const FixedClock now(good);
+        EXPECT_EQ(GetFailureThrough(responseHandler), "none") << good;
+    }
+    for (const char* const bad : {"2025-12-31T23:49:59Z", "2026-12-31T00:10:01Z"}) {
+        const FixedClock now(bad);
+        EXPECT_THAT(GetFailureThrough(responseHandler), testing::StartsWith("SsoException: "))
+            << bad;
+    }
+}
+
 TEST_F(AcquireToken, ReportsAssertionThatDoesNotVerify)
 {
     transport->reply = GetSignedAssertion();
@@ -238,6 +254,18 @@ TEST_F(AcquireToken, ReportsEveryAssertionAsUnverifiedWithoutTrustedCertificates
 {
     transport->reply = GetSignedAssertion();
     EXPECT_THROW(Acquire(), InvalidSignatureException);
+}
+
+TEST_F(AcquireToken, SendsNoPasswordIfATrustedCertificateIsNull)
+{
+    trusted = GetTestCertificates("sts");
+    trusted.push_back(nullptr);
+    EXPECT_EQ(
+        GetFailureThrough(responseHandler),
+        "InvalidArgumentException: Invalid argument : A trusted certificate is null");
+    EXPECT_EQ(transport->sessionsMade, 0);
+    spec.tokenLifetimeSec = 0;
+    EXPECT_THAT(GetFailureThrough(responseHandler), HasSubstr("Token lifetime must be positive"));
 }
 
 TEST_F(AcquireToken, LetsOtherExceptionsPass)

@@ -7,6 +7,7 @@
 #include "ssoClient/client/descriptions.h"
 #include "ssoClient/protocol/RequestBuilderImpl.h"
 #include "ssoClient/protocol/ResponseHandlerImpl.h"
+#include "support/Failure.h"
 #include "support/FakeSamlToken.h"
 #include "support/FixedClock.h"
 
@@ -70,11 +71,22 @@ protected:
             boost::make_shared<RequestBuilderImpl>(identity),
             transport,
             boost::make_shared<ResponseHandlerImpl>(),
-            GetTestCertificates("sts")};
+            trusted};
+    }
+
+    /** @return class and text of what the operation throws before anything is sent. */
+    template <class Call>
+    std::string GetEarlyFailure(const Call& call) const
+    {
+        const std::string failure = GetFailure([&] { call(GetService()); });
+        EXPECT_EQ(transport->sessionsMade, 0);
+        return failure;
     }
 
     TokenSpec spec;
     FakeSamlToken presented;
+    std::list<Quillon::Ref<const Quillon::Crypto::Certificate>> trusted =
+        GetTestCertificates("sts");
     boost::shared_ptr<FakeTransport> transport = boost::make_shared<FakeTransport>();
     FixedClock clock{WhenTokensAreValid};
 };
@@ -88,7 +100,25 @@ class ValidateSubject : public Operation
 class RenewToken : public Operation
 {};
 
+constexpr char NullCertificate[] =
+    "InvalidArgumentException: Invalid argument : A trusted certificate is null";
+
 } // namespace
+
+TEST_F(Operation, SendsNothingIfATrustedCertificateIsNull)
+{
+    trusted.push_front(nullptr);
+    EXPECT_EQ(
+        GetEarlyFailure([this](const auto& service) { service.AcquireTokenByCertificate(spec); }),
+        NullCertificate);
+    EXPECT_EQ(
+        GetEarlyFailure(
+            [this](const auto& service) { service.AcquireTokenByToken(presented, spec); }),
+        NullCertificate);
+    EXPECT_EQ(
+        GetEarlyFailure([this](const auto& service) { service.RenewToken(presented, 600); }),
+        NullCertificate);
+}
 
 TEST_F(AcquireTokenByCertificate, GivesVerifiedTokenAndLogsEveryStep)
 {
@@ -181,6 +211,13 @@ TEST_F(ValidateSubject, NeedsNoIdentity)
     LogCapture log(64);
     EXPECT_FALSE(GetService(boost::none).ValidateSubject(presented));
     EXPECT_THAT(log.lines, testing::Contains("SsoClient[64]: Result: false"));
+}
+
+TEST_F(ValidateSubject, NeedsNoTrustedCertificate)
+{
+    trusted = {nullptr};
+    transport->reply = StatusReply(WST "/status/valid");
+    EXPECT_TRUE(GetService().ValidateSubject(presented));
 }
 
 TEST_F(ValidateSubject, LogsTheEndWhenTheReplyIsBad)

@@ -1,6 +1,8 @@
 #include "ssoClient/protocol/RequestBuilderImpl.h"
 
+#include "quillon/system/Clock.h"
 #include "quillon/xml/Parser.h"
+#include "quillon/xml/security/Signature.h"
 #include "support/Failure.h"
 #include "support/FakeSamlToken.h"
 #include "support/FixedClock.h"
@@ -167,7 +169,7 @@ TEST(BuildUserPassTokenRequest, WithIdentityAndBearerConfirmationIsUnsignedBeare
     TokenSpec spec = SpecWithLifetime(300);
     for (const int confirmation : {1, 7}) {
         spec.confirmation = static_cast<TokenSpec::Confirmation>(confirmation);
-        const Request request = BuildUserPass(spec, HolderOfKeyConfig());
+        const Request request = BuildUserPass(spec, GetIdentity());
         EXPECT_THAT(request.body, HasSubstr("<wst:KeyType>" WST "/Bearer</wst:KeyType>"));
         EXPECT_THAT(request.body, Not(HasSubstr("Signature")));
     }
@@ -177,7 +179,7 @@ TEST(BuildUserPassTokenRequest, WithIdentityAndDelegationIsUnsignedHolderOfKey)
 {
     TokenSpec spec = SpecWithLifetime(300);
     spec.delegateTo = "proxy";
-    const Request request = BuildUserPass(spec, HolderOfKeyConfig());
+    const Request request = BuildUserPass(spec, GetIdentity());
     EXPECT_THAT(request.body, HasSubstr("<wst:KeyType>" WST "/PublicKey</wst:KeyType>"));
     EXPECT_THAT(request.body, Not(HasSubstr("Signature")));
     EXPECT_THAT(request.body, Not(HasSubstr("UseKey")));
@@ -263,24 +265,6 @@ TEST(BuildContinuedSPNegoRequest, IsAnUnsignedResponse)
         request.body,
         HasSubstr(">bGVn</wst:BinaryExchange></wst:RequestSecurityTokenResponse></soapenv:Body>"));
     EXPECT_THAT(GetHeaderParts(request.body), ElementsAre("wsu:Timestamp"));
-}
-
-TEST(BuildCertificateTokenRequest, NeedsBothHalvesOfTheIdentity)
-{
-    const std::string expected =
-        "InvalidArgumentException: Invalid argument : HolderOfKeyConfig must "
-        "hold a private key and a certificate";
-    for (const bool hasKey : {false, true}) {
-        HolderOfKeyConfig identity = hasKey ? GetIdentity() : HolderOfKeyConfig();
-        identity.certificate.reset();
-        Request request;
-        EXPECT_EQ(
-            GetFailure([&] {
-                RequestBuilderImpl(identity).BuildCertificateTokenRequest(
-                    SpecWithLifetime(300), request);
-            }),
-            expected);
-    }
 }
 
 TEST(BuildCertificateTokenRequest, IsSignedWithTheCertificate)
@@ -456,6 +440,362 @@ TEST(BuildRenewRequest, ChecksLifetimeThenIdentityThenToken)
         "InvalidArgumentException: Invalid argument : "
         "Unable to renew token: the provided token must be Holder Of Key");
     EXPECT_EQ(request.soapAction, "");
+}
+
+// --------------------------------------------------------------------------- what all have
+
+namespace {
+
+/** One of the requests, by the name of the operation that builds it. */
+struct RequestKind
+{
+    const char* name;
+    void (*build)(const RequestBuilderImpl& builder, const TokenSpec& spec, Request& request);
+    const char* action;
+    bool hasLifetime;
+    bool isSigned;
+};
+
+std::ostream& operator<<(std::ostream& out, const RequestKind& kind)
+{
+    return out << kind.name;
+}
+
+FakeSamlToken GetHolderOfKeyToken()
+{
+    FakeSamlToken token = GetToken("holder-of-key");
+    token.confirmationMethod = SamlToken::CONFIRM_HOLDER_OF_KEY;
+    return token;
+}
+
+const RequestKind Password{
+    "Password",
+    [](const auto& builder, const auto& spec, auto& request) {
+        builder.BuildUserPassTokenRequest("jdoe", "s3cret", spec, request);
+    },
+    WST "/RST/Issue",
+    true,
+    true};
+const RequestKind InitialSPNego{
+    "InitialSPNego",
+    [](const auto& builder, const auto& spec, auto& request) {
+        builder.BuildInitialSPNegoRequest(spec, FirstLeg, request);
+    },
+    WST "/RST/Issue",
+    true,
+    true};
+const RequestKind ContinuedSPNego{
+    "ContinuedSPNego",
+    [](const auto& builder, const auto&, auto& request) {
+        builder.BuildContinuedSPNegoRequest("ctx", FirstLeg, request);
+    },
+    WST "/RSTR/Issue",
+    false,
+    false};
+const RequestKind Certificate{
+    "Certificate",
+    [](const auto& builder, const auto& spec, auto& request) {
+        builder.BuildCertificateTokenRequest(spec, request);
+    },
+    WST "/RST/Issue",
+    true,
+    true};
+const RequestKind Exchange{
+    "Exchange",
+    [](const auto& builder, const auto& spec, auto& request) {
+        builder.BuildExchangeTokenRequest(GetToken("bearer"), spec, request);
+    },
+    WST "/RST/Issue",
+    true,
+    true};
+const RequestKind Validate{
+    "Validate",
+    [](const auto& builder, const auto&, auto& request) {
+        builder.BuildValidateSubjectRequest(GetToken("bearer"), request);
+    },
+    WST "/RST/Validate",
+    false,
+    false};
+const RequestKind Renew{
+    "Renew",
+    [](const auto& builder, const auto& spec, auto& request) {
+        builder.BuildRenewRequest(GetHolderOfKeyToken(), spec.tokenLifetimeSec, request);
+    },
+    WST "/RST/Renew",
+    true,
+    true};
+
+class EveryRequest : public testing::TestWithParam<RequestKind>
+{
+protected:
+    static Request Build(
+        const TokenSpec& spec, const boost::optional<HolderOfKeyConfig>& identity = GetIdentity())
+    {
+        Request request;
+        GetParam().build(RequestBuilderImpl(identity), spec, request);
+        return request;
+    }
+};
+class RequestWithLifetime : public EveryRequest
+{};
+class SignedRequest : public EveryRequest
+{};
+
+std::string ToName(const testing::TestParamInfo<RequestKind>& info)
+{
+    return info.param.name;
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    All,
+    EveryRequest,
+    testing::Values(
+        Password, InitialSPNego, ContinuedSPNego, Certificate, Exchange, Validate, Renew),
+    ToName);
+INSTANTIATE_TEST_SUITE_P(
+    All,
+    RequestWithLifetime,
+    testing::Values(Password, InitialSPNego, Certificate, Exchange, Renew),
+    ToName);
+INSTANTIATE_TEST_SUITE_P(
+    All,
+    SignedRequest,
+    testing::Values(Password, InitialSPNego, Certificate, Exchange, Renew),
+    ToName);
+
+/** The time moves on by a second whenever it is read. */
+class MovingClock final : public Quillon::System::Clock
+{
+public:
+    explicit MovingClock(std::string_view start)
+        : _now(Quillon::System::DateTime(start).GetUtcTime())
+        , _before(Quillon::System::ReplaceClock(this))
+    {}
+    MovingClock(const MovingClock&) = delete;
+    MovingClock& operator=(const MovingClock&) = delete;
+    ~MovingClock() { Quillon::System::ReplaceClock(_before); }
+
+    Quillon::System::DateTime Now() const override
+    {
+        return Quillon::System::DateTimeFromUtc(_now += 1'000'000, false);
+    }
+
+private:
+    mutable long long _now;
+    const Quillon::System::Clock* _before;
+};
+
+/** Seconds from the first Created behind `start` to the Expires that follows it. */
+long long GetSpan(const std::string& text, const std::string& start)
+{
+    const auto read = [&text](const std::string& tag, std::size_t from) {
+        const std::size_t begin = text.find(tag, from) + tag.size();
+        return Quillon::System::DateTime(text.substr(begin, text.find('<', begin) - begin))
+            .GetUtcTime();
+    };
+    const std::size_t from = text.find(start);
+    EXPECT_NE(from, std::string::npos) << start;
+    return (read("<wsu:Expires>", from) - read("<wsu:Created>", from)) / 1'000'000;
+}
+
+} // namespace
+
+TEST_P(EveryRequest, HasItsActionAndATimestampOfTenMinutes)
+{
+    const FixedClock clock("2026-11-20T12:00:00Z");
+    const Request request = Build(SpecWithLifetime(300));
+    EXPECT_EQ(request.soapAction, GetParam().action);
+    EXPECT_THAT(
+        request.body,
+        HasSubstr("<wsu:Created>2026-11-20T12:00:00.000Z</wsu:Created>"
+                  "<wsu:Expires>2026-11-20T12:10:00.000Z</wsu:Expires></wsu:Timestamp>"));
+    EXPECT_EQ(
+        GetParam().isSigned,
+        request.body.find(" Id=\"holderOfKeyProofSignature\"") != std::string::npos);
+}
+
+TEST_P(EveryRequest, ReadsTheTimeOnceForItsTimestamp)
+{
+    const MovingClock clock("2026-11-20T12:00:00Z");
+    EXPECT_EQ(GetSpan(Build(SpecWithLifetime(300)).body, "<wsu:Timestamp "), 600);
+}
+
+TEST_P(RequestWithLifetime, ReadsTheTimeOnceForItsLifetime)
+{
+    const MovingClock clock("2026-11-20T12:00:00Z");
+    EXPECT_EQ(GetSpan(Build(SpecWithLifetime(300)).body, "<wst:Lifetime "), 300);
+}
+
+TEST_P(RequestWithLifetime, RefusesLifetimeThatIsNotPositive)
+{
+    for (const long long seconds : {0LL, -1LL}) {
+        EXPECT_EQ(GetFailure([&] { Build(SpecWithLifetime(seconds)); }), BadLifetime);
+        EXPECT_EQ(GetFailure([&] { Build(SpecWithLifetime(seconds), boost::none); }), BadLifetime);
+    }
+}
+
+TEST_P(RequestWithLifetime, NamesALifetimeThatNoDateCanHold)
+{
+    const FixedClock clock("9999-12-31T23:00:00Z"); // an hour before the last date ends
+    EXPECT_EQ(GetFailure([] { Build(SpecWithLifetime(3599)); }), "none");
+    for (const long long seconds : {3600LL, 9'223'372'036'855LL, 9'223'372'036'854'775'807LL}) {
+        EXPECT_EQ(
+            GetFailure([&] { Build(SpecWithLifetime(seconds)); }),
+            "InvalidArgumentException: Invalid argument : Token lifetime of "
+                + std::to_string(seconds) + " seconds ends outside the years 1 to 9999");
+    }
+}
+
+TEST_P(SignedRequest, SetsTheActionBeforeItBuildsTheEnvelope)
+{
+    const HolderOfKeyConfig cannotSign{GetTestKey("weak"), GetTestCertificates("weak").front()};
+    Request request;
+    request.body = "before";
+    EXPECT_THROW(
+        GetParam().build(RequestBuilderImpl(cannotSign), SpecWithLifetime(300), request),
+        Quillon::Xml::Security::XmlSecurityException);
+    EXPECT_EQ(request.soapAction, GetParam().action);
+    EXPECT_EQ(request.body, "before");
+}
+
+// --------------------------------------------------------------------------- half an identity
+
+namespace {
+
+HolderOfKeyConfig GetOnlyTheKey()
+{
+    return {GetTestKey("client"), nullptr};
+}
+HolderOfKeyConfig GetOnlyTheCertificate()
+{
+    return {nullptr, GetTestCertificates("client").front()};
+}
+
+} // namespace
+
+TEST(HalfAnIdentity, IsNone)
+{
+    for (const HolderOfKeyConfig& half :
+         {HolderOfKeyConfig(), GetOnlyTheKey(), GetOnlyTheCertificate()}) {
+        for (const auto& [kind, operation] :
+             {std::pair(Certificate, "acquire token by certificate"),
+              std::pair(Exchange, "acquire token by token"),
+              std::pair(Renew, "renew token")}) {
+            Request request;
+            EXPECT_EQ(
+                GetFailure([&, build = kind.build] {
+                    build(RequestBuilderImpl(half), SpecWithLifetime(300), request);
+                }),
+                std::string("InvalidStateException: No HolderOfKeyConfig provided. Unable to ")
+                    + operation);
+            EXPECT_EQ(request.soapAction, "");
+            EXPECT_EQ(request.body, "");
+        }
+    }
+}
+
+TEST(HalfAnIdentity, AsksForAnUnsignedBearerToken)
+{
+    for (const HolderOfKeyConfig& half :
+         {HolderOfKeyConfig(), GetOnlyTheKey(), GetOnlyTheCertificate()}) {
+        for (const RequestKind& kind : {Password, InitialSPNego}) {
+            Request request;
+            kind.build(RequestBuilderImpl(half), SpecWithLifetime(300), request);
+            EXPECT_THAT(request.body, HasSubstr(BearerKeyType));
+            EXPECT_THAT(request.body, Not(HasSubstr("Signature")));
+        }
+    }
+}
+
+// --------------------------------------------------------------------------- what is asked for
+
+namespace {
+
+TokenSpec GetRichSpec()
+{
+    TokenSpec spec = SpecWithLifetime(7200);
+    spec.advice = {{"urn:source", {{"urn:name", {"one", "two"}}}}};
+    spec.audienceRestriction = {"urn:audience"};
+    spec.renewable = true;
+    spec.delegable = true;
+    return spec;
+}
+
+void ExpectToAskForAllOfIt(const Request& request)
+{
+    EXPECT_THAT(
+        request.body,
+        HasSubstr("<rsa-advice:Advice AdviceSource=\"urn:source\">"
+                  "<rsa-advice:Attribute Name=\"urn:name\">"
+                  "<rsa-advice:AttributeValue xsi:type=\"xs:string\">one"
+                  "</rsa-advice:AttributeValue>"
+                  "<rsa-advice:AttributeValue xsi:type=\"xs:string\">two"
+                  "</rsa-advice:AttributeValue></rsa-advice:Attribute></rsa-advice:Advice>"));
+    EXPECT_THAT(request.body, HasSubstr(">urn:audience</wsa:Address>"));
+    EXPECT_THAT(request.body, HasSubstr("<wst:Renewing Allow=\"true\" OK=\"false\"/>"));
+    EXPECT_THAT(request.body, HasSubstr("<wst:Delegatable>true</wst:Delegatable>"));
+    EXPECT_THAT(
+        request.body,
+        HasSubstr("<wsu:Created>2026-11-20T12:00:00.000Z</wsu:Created>"
+                  "<wsu:Expires>2026-11-20T14:00:00.000Z</wsu:Expires></wst:Lifetime>"));
+}
+
+} // namespace
+
+// The token presented has neither advice nor audience and is not renewable.
+TEST(BuildExchangeTokenRequest, AsksForWhatTheSpecSaysAndNotForWhatTheTokenHas)
+{
+    const FixedClock clock("2026-11-20T12:00:00Z");
+    Request request;
+    Exchange.build(RequestBuilderImpl(GetIdentity()), GetRichSpec(), request);
+    ExpectToAskForAllOfIt(request);
+}
+
+TEST(BuildInitialSPNegoRequest, AsksForWhatTheSpecSays)
+{
+    const FixedClock clock("2026-11-20T12:00:00Z");
+    ExpectToAskForAllOfIt(BuildInitialSPNego(GetRichSpec()));
+}
+
+// An empty name is a name: what counts is that there is one.
+TEST(EmptyDelegate, IsADelegateInEveryRequest)
+{
+    TokenSpec spec = SpecWithLifetime(300);
+    spec.delegateTo = "";
+    for (const RequestKind& kind : {Password, InitialSPNego, Exchange, Certificate}) {
+        Request request;
+        kind.build(RequestBuilderImpl(GetIdentity()), spec, request);
+        EXPECT_THAT(request.body, HasSubstr("<wst:DelegateTo><wsse:UsernameToken ")) << kind.name;
+        EXPECT_THAT(request.body, Not(HasSubstr("UseKey"))) << kind.name;
+    }
+    for (const RequestKind& kind : {Password, InitialSPNego}) {
+        Request request;
+        kind.build(RequestBuilderImpl(GetIdentity()), spec, request);
+        EXPECT_THAT(request.body, HasSubstr(PublicKeyType)) << kind.name;
+        EXPECT_THAT(request.body, Not(HasSubstr("Signature"))) << kind.name;
+    }
+}
+
+// A parser makes a line feed of a carriage return that is written as it is [XML 2.11].
+TEST(BuildUserPassTokenRequest, KeepsCarriageReturns)
+{
+    TokenSpec spec = SpecWithLifetime(300);
+    spec.audienceRestriction = {"a\rb"};
+    spec.advice = {{"c\rd", {{"e\rf", {"g\rh"}}}}};
+    spec.delegateTo = "i\rj";
+    Request request;
+    RequestBuilderImpl(boost::none).BuildUserPassTokenRequest("k\rl", "m\rn", spec, request);
+    EXPECT_THAT(request.body, Not(HasSubstr("\r")));
+    for (const char* const written :
+         {">a&#xD;b<",
+          "\"c&#xD;d\"",
+          "\"e&#xD;f\"",
+          ">g&#xD;h<",
+          ">i&#xD;j<",
+          ">k&#xD;l<",
+          ">m&#xD;n<"}) {
+        EXPECT_THAT(request.body, HasSubstr(written));
+    }
 }
 
 TEST(Request, IsIndependentOfItsCopy)
