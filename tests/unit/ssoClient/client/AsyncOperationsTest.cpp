@@ -16,6 +16,8 @@
 #include <boost/smart_ptr/weak_ptr.hpp>
 #include <gmock/gmock.h>
 
+#include <atomic>
+#include <chrono>
 #include <csignal>
 #include <cstdio>
 #include <future>
@@ -313,6 +315,200 @@ TEST_F(AsyncOperation, ReleasesEverythingAfterItRan)
     while (!observer.expired()) {
         std::this_thread::yield();
     }
+}
+
+TEST_F(AsyncOperation, RenewTokenAsyncTakesALifetimeOf64Bits)
+{
+    transport->reply = Reply(TokenResponse());
+    AwaitedToken awaited;
+    MakeService()->RenewTokenAsync(MakePresented(), 5'000'000'000, awaited.GetCompletion());
+    EXPECT_EQ(awaited.Get().Describe(), "success");
+    EXPECT_THAT(
+        transport->sent[0].body,
+        HasSubstr("<wsu:Expires>2184-11-23T20:53:20.000Z</wsu:Expires></wst:Lifetime>"));
+}
+
+namespace {
+
+/** Builds requests that say which audience the spec has, when it is told to go on. */
+class WaitingRequestBuilder final : public RequestBuilder
+{
+public:
+    std::promise<void> goOn;
+
+    void BuildUserPassTokenRequest(
+        const std::string&,
+        const std::string&,
+        const TokenSpec& spec,
+        Request& request) const override
+    {
+        Build(spec, request);
+    }
+    void BuildInitialSPNegoRequest(
+        const TokenSpec& spec, const Leg&, Request& request) const override
+    {
+        Build(spec, request);
+    }
+    void BuildContinuedSPNegoRequest(const std::string&, const Leg&, Request&) const override {}
+    void BuildCertificateTokenRequest(const TokenSpec& spec, Request& request) const override
+    {
+        Build(spec, request);
+    }
+    void BuildExchangeTokenRequest(
+        const SamlToken&, const TokenSpec& spec, Request& request) const override
+    {
+        Build(spec, request);
+    }
+    void BuildValidateSubjectRequest(const SamlToken&, Request&) const override {}
+    void BuildRenewRequest(const SamlToken&, long long, Request&) const override {}
+
+private:
+    void Build(const TokenSpec& spec, Request& request) const
+    {
+        _mayGoOn.wait();
+        for (const std::string& audience : spec.audienceRestriction) {
+            request.body += audience;
+        }
+    }
+
+    std::shared_future<void> _mayGoOn = goOn.get_future();
+};
+
+/** Queues an operation whose spec is changed before it is used. @return what was sent. */
+template <class Call>
+std::string GetAudienceSent(const Call& call)
+{
+    const auto builder = boost::make_shared<WaitingRequestBuilder>();
+    const auto transport = boost::make_shared<FakeTransport>();
+    const SecurityTokenServiceImpl service(
+        builder, transport, boost::make_shared<ResponseHandlerImpl>(), {});
+    AwaitedToken awaited;
+    TokenSpec spec;
+    spec.audienceRestriction = {"before"};
+    call(service, spec, awaited.GetCompletion());
+    spec.audienceRestriction = {"after"};
+    builder->goOn.set_value();
+    awaited.Get(); // an exception: there is no reply
+    return transport->sent.at(0).body;
+}
+
+} // namespace
+
+TEST_F(AsyncOperation, CopiesItsSpec)
+{
+    EXPECT_EQ(
+        GetAudienceSent([](const auto& service, const TokenSpec& given, const auto& completion) {
+            service.AcquireTokenAsync("jdoe", "s3cret", given, completion);
+        }),
+        "before");
+    EXPECT_EQ(
+        GetAudienceSent([](const auto& service, const TokenSpec& given, const auto& completion) {
+            const auto handler =
+                boost::make_shared<ScriptedHandler>(std::deque<std::string>{"one"});
+            service.AcquireTokenByGssAsync(given, handler, completion);
+        }),
+        "before");
+    EXPECT_EQ(
+        GetAudienceSent([](const auto& service, const TokenSpec& given, const auto& completion) {
+            service.AcquireTokenByCertificateAsync(given, completion);
+        }),
+        "before");
+    EXPECT_EQ(
+        GetAudienceSent([](const auto& service, const TokenSpec& given, const auto& completion) {
+            service.AcquireTokenByTokenAsync(MakePresented(), given, completion);
+        }),
+        "before");
+}
+
+// ------------------------------------------------------------------------ completions
+
+namespace {
+
+/** Counts the calls of a completion until the last copy of it is gone. */
+template <class Result>
+class Counted
+{
+public:
+    boost::function<void(const Result&, const Quillon::Exception*)> TakeCompletion()
+    {
+        return [count = std::move(_count)](const Result&, const Quillon::Exception*) {
+            ++count->calls;
+        };
+    }
+
+    int GetCallsWhenAllIsOver() { return _calls.get(); }
+
+private:
+    struct Count
+    {
+        std::promise<int> all;
+        std::atomic<int> calls{0};
+        ~Count() { all.set_value(calls); }
+    };
+
+    std::shared_ptr<Count> _count = std::make_shared<Count>();
+    std::future<int> _calls = _count->all.get_future();
+};
+
+} // namespace
+
+TEST_F(AsyncOperation, CallsEachCompletionOnce)
+{
+    const auto service = MakeService();
+    const auto countTokens = [](const auto& call) {
+        Counted<TokenPtr> counted;
+        call(counted.TakeCompletion());
+        return counted.GetCallsWhenAllIsOver();
+    };
+    for (const std::string& reply : {IssueReply(), Reply(TokenResponse()), FaultReply("w:No")}) {
+        transport->reply = reply; // each is good for some operations and bad for others
+        EXPECT_EQ(1, countTokens([&](const TokenCompletion& completion) {
+                      service->AcquireTokenAsync("jdoe", "s3cret", spec, completion);
+                  }));
+        EXPECT_EQ(1, countTokens([&](const TokenCompletion& completion) {
+                      const auto handler =
+                          boost::make_shared<ScriptedHandler>(std::deque<std::string>{"one"});
+                      service->AcquireTokenByGssAsync(spec, handler, completion);
+                  }));
+        EXPECT_EQ(1, countTokens([&](const TokenCompletion& completion) {
+                      service->AcquireTokenByCertificateAsync(spec, completion);
+                  }));
+        EXPECT_EQ(1, countTokens([&](const TokenCompletion& completion) {
+                      service->AcquireTokenByTokenAsync(MakePresented(), spec, completion);
+                  }));
+        EXPECT_EQ(1, countTokens([&](const TokenCompletion& completion) {
+                      service->RenewTokenAsync(MakePresented(), 300, completion);
+                  }));
+    }
+    for (const std::string& reply : {StatusReply("valid"), FaultReply("w:No")}) {
+        transport->reply = reply;
+        Counted<boost::optional<bool>> counted;
+        service->ValidateSubjectAsync(MakePresented(), counted.TakeCompletion());
+        EXPECT_EQ(1, counted.GetCallsWhenAllIsOver());
+    }
+}
+
+TEST_F(AsyncOperation, RunsCompletionsAtOnce)
+{
+    transport->reply = StatusReply("valid");
+    const auto service = MakeService();
+    std::promise<void> firstBegan;
+    std::promise<void> secondBegan;
+    const std::shared_future<void> second = secondBegan.get_future();
+    std::promise<bool> together;
+    service->ValidateSubjectAsync(
+        MakePresented(), [&](const boost::optional<bool>&, const Quillon::Exception*) {
+            firstBegan.set_value();
+            // Far longer than it takes: only a pool that waits for this completion makes it end.
+            together.set_value(
+                second.wait_for(std::chrono::seconds(30)) == std::future_status::ready);
+        });
+    firstBegan.get_future().wait();
+    service->ValidateSubjectAsync(
+        MakePresented(),
+        [&](const boost::optional<bool>&, const Quillon::Exception*) { secondBegan.set_value(); });
+    EXPECT_TRUE(together.get_future().get());
+    second.wait();
 }
 
 // ------------------------------------------------------------------- what leaves a work item

@@ -1,59 +1,156 @@
+#include "quillon/ssl/SSLContext.h"
+#include "ssoClient/Exceptions.h"
 #include "ssoClient/GssNegotiationContext.h"
 #include "ssoClient/SecurityTokenService.h"
 #include "ssoClient/protocol/HttpsClient.h"
+#include "support/Failure.h"
 #include "support/TestData.h"
 
+#include <boost/smart_ptr/make_shared.hpp>
 #include <gmock/gmock.h>
 
 #include <vector>
 
-using testing::ElementsAre;
+using namespace SsoClient;
+using testing::HasSubstr;
+using testing::Not;
 
-// The transport of this program, which only notes its time-out.
+// The transport of this program, which only notes what it is given and answers nothing.
 
 namespace {
 
-std::vector<long long> timeouts;
-
-SsoClient::SecurityTokenServiceConfig MakeConfig()
+struct Given
 {
-    SsoClient::SecurityTokenServiceConfig config;
-    config.url = "http://127.0.0.1/sts";
-    config.trustedCertificates = GetTestCertificates("sts");
-    return config;
-}
+    std::string url;
+    Quillon::Ssl::SSLContext* sslContext;
+    std::string peer;
+    long long timeout;
+};
+std::vector<Given> given;
+std::vector<std::string> sent;
+
+class MuteSession final : public TransportSession
+{
+public:
+    void SendRequest(const Request& request, Quillon::Ref<Quillon::Reader>&) override
+    {
+        sent.push_back(request.body);
+        throw CommunicationException("mute");
+    }
+    void SendRequestAsync(
+        const Request&,
+        const ResponseCallback&,
+        Quillon::Ref<Quillon::System::ScheduledItem>&) override
+    {
+        FAIL();
+    }
+};
 
 } // namespace
 
 namespace SsoClient {
 
 HttpsClient::HttpsClient(
-    std::string const& /*url*/,
-    Quillon::Ssl::SSLContext* /*sslContext*/,
-    std::string const& /*peer*/,
+    std::string const& url,
+    Quillon::Ssl::SSLContext* sslContext,
+    std::string const& peer,
     long long timeout)
     : _timeout(timeout)
 {
-    timeouts.push_back(timeout);
+    given.push_back({url, sslContext, peer, timeout});
 }
 
 boost::shared_ptr<TransportSession> HttpsClient::CreateSession() const
 {
-    return nullptr;
+    return boost::make_shared<MuteSession>();
 }
 
 } // namespace SsoClient
 
-TEST(CreateSecurityTokenService, GivesEachExchange240Seconds)
+namespace {
+
+class Factory : public testing::Test
 {
-    timeouts.clear();
-    SsoClient::CreateSecurityTokenService(MakeConfig());
-    EXPECT_THAT(timeouts, ElementsAre(240'000'000));
+protected:
+    Factory()
+    {
+        given.clear();
+        sent.clear();
+        config.url = "https://sts.example.com:7444/sts/STSService";
+        config.trustedCertificates = GetTestCertificates("sts");
+        config.sslPeerParameter = "sha256//AAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAAA=";
+        config.holderOfKeyConfig =
+            HolderOfKeyConfig{GetTestKey("client"), GetTestCertificates("client").front()};
+        config.sslContext = sslContext.get();
+    }
+
+    /** What a negotiation's first leg goes out with. */
+    std::string SendLeg() const
+    {
+        const auto context = InternalApi::CreateGssNegotiationContext(config, TokenSpec());
+        EXPECT_EQ(
+            GetFailure([&context] {
+                context->NegotiateToken({'l', 'e', 'g'});
+            }),
+            "CommunicationException: mute");
+        return sent.back();
+    }
+
+    std::string SendPassword() const
+    {
+        const auto service = CreateSecurityTokenService(config);
+        EXPECT_EQ(
+            GetFailure([&service] { service->AcquireToken("user", "password", TokenSpec()); }),
+            "CommunicationException: mute");
+        return sent.back();
+    }
+
+    Quillon::Ref<Quillon::Ssl::SSLContext> sslContext = Quillon::Ssl::CreateSSLContext({});
+    SecurityTokenServiceConfig config;
+};
+
+class CreateSecurityTokenServiceTest : public Factory
+{};
+class CreateGssNegotiationContextTest : public Factory
+{};
+
+} // namespace
+
+TEST_F(CreateSecurityTokenServiceTest, GivesEachExchange240Seconds)
+{
+    CreateSecurityTokenService(config);
+    ASSERT_EQ(given.size(), 1U);
+    EXPECT_EQ(given[0].timeout, 240'000'000);
 }
 
-TEST(CreateGssNegotiationContext, GivesEachExchange40Seconds)
+TEST_F(CreateGssNegotiationContextTest, GivesEachExchange40Seconds)
 {
-    timeouts.clear();
-    SsoClient::InternalApi::CreateGssNegotiationContext(MakeConfig(), {});
-    EXPECT_THAT(timeouts, ElementsAre(40'000'000));
+    InternalApi::CreateGssNegotiationContext(config, {});
+    ASSERT_EQ(given.size(), 1U);
+    EXPECT_EQ(given[0].timeout, 40'000'000);
+}
+
+TEST_F(Factory, GivesTheTransportWhatTheConfigurationSays)
+{
+    CreateSecurityTokenService(config);
+    InternalApi::CreateGssNegotiationContext(config, {});
+    ASSERT_EQ(given.size(), 2U);
+    for (const Given& each : given) {
+        EXPECT_EQ(each.url, config.url);
+        EXPECT_EQ(each.sslContext, sslContext.get());
+        EXPECT_EQ(each.peer, config.sslPeerParameter);
+    }
+}
+
+TEST_F(Factory, SignsWithTheIdentityOfTheConfiguration)
+{
+    EXPECT_THAT(SendLeg(), HasSubstr("<ds:Signature "));
+    EXPECT_THAT(SendPassword(), HasSubstr("<ds:Signature "));
+}
+
+TEST_F(Factory, TakesHalfAnIdentityForNone)
+{
+    config.holderOfKeyConfig->certificate.reset();
+    EXPECT_THAT(SendLeg(), Not(HasSubstr("Signature")));
+    EXPECT_THAT(SendPassword(), Not(HasSubstr("Signature")));
 }
