@@ -43,10 +43,6 @@ def outside(message):
     return [{"class": SIGNATURE, "message": "Signature verification error. " + message}]
 
 
-def begins(prefix):
-    return [{"class": PARSE, "prefix": prefix}]
-
-
 def replaced(text, old, new, count=1):
     """The text with `old` replaced, which must stand there exactly `count` times."""
     if text.count(old) != count:

@@ -59,6 +59,10 @@ def no_parameter(algorithm, parameter):
     return outside(f"Algorithm '{algorithm}' does not take the parameter '{parameter}'")
 
 
+def no_signature_algorithm(algorithm):
+    return outside(f"Signature algorithm '{algorithm}' is not accepted")
+
+
 def no_canonicalization(algorithm):
     return outside(f"Canonicalization '{algorithm}' is not accepted")
 
@@ -166,9 +170,11 @@ def _other_keys(c):
     add("foreign-key-value", "the signer brings its bare key",
         signed(LEAN.signed_as(key_info=rsa_key_value("foreign")), key="foreign"), any_way)
     add("client", "the holder of the key signed for itself", signed(LEAN_HOLDER, key="client"), TAMPERED)
-    c.refuse("signing-key/key-info-untrusted", "a trusted key signed, but KeyInfo shows another certificate",
+    c.refuse("signing-key/key-info-untrusted",
+             "a trusted key signed, but KeyInfo shows another certificate",
              signed(LEAN.signed_as(key_info=key_info("foreign"))), OUTSIDE_PROFILE, "valid")
-    c.refuse("signing-key/key-info-picks-another", "a trusted key signed, KeyInfo picks another trusted one",
+    c.refuse("signing-key/key-info-picks-another",
+             "a trusted key signed, KeyInfo picks another trusted one",
              signed(LEAN.signed_as(key_info=key_info("sts-second"))), TAMPERED, "valid",
              trust=["sts", "sts-second"])
     almost = keys.certificate_base64("sts")
@@ -176,7 +182,8 @@ def _other_keys(c):
     c.refuse("signing-key/key-info-almost-trusted", "one bit of the certificate in KeyInfo differs",
              signed(LEAN.signed_as(key_info=key_info("sts"))).replace(
                  keys.certificate_base64("sts"), almost), OUTSIDE_PROFILE)
-    c.refuse("signing-key/key-none-trusted", "nobody is trusted", signed(LEAN), OUTSIDE_PROFILE, trust=[])
+    c.refuse("signing-key/key-none-trusted", "nobody is trusted", signed(LEAN),
+             outside("There are no trusted certificates"), trust=[])
     add("other-kind", "an RSA signature where an elliptic curve is trusted", signed(LEAN),
         OUTSIDE_PROFILE, trust=["sts-p256"])
     add("other-curve", "the same algorithm by a key of another curve",
@@ -216,7 +223,7 @@ def _hmac(c):
             ("modulus", keys.modulus_bytes("sts")), ("empty", b"")):
         c.refuse(f"algorithms/hmac-{name}", "HMAC keyed with what everybody knows",
                  signed(LEAN.signed_as(method=names.HMAC_SHA256), hmac_key=secret),
-                 OUTSIDE_PROFILE)
+                 no_signature_algorithm(names.HMAC_SHA256))
     method = f'<ds:SignatureMethod Algorithm="{names.HMAC_SHA256}"/>'
     c.refuse("algorithms/hmac-cut-to-nothing", "HMACOutputLength of zero",
              signed(LEAN.signed_as(method=names.HMAC_SHA256),
@@ -226,26 +233,33 @@ def _hmac(c):
 
 
 def _weak_algorithms(c):
-    def add(name, token, key="sts", trust=None, xmlsec1="none"):
-        c.refuse("algorithms/algorithm-" + name, RULE_SAYS_IT, signed(token, key=key),
-                 OUTSIDE_PROFILE, xmlsec1, trust=trust or ["sts"])
-    add("rsa-sha1", LEAN.signed_as(method=names.RSA_SHA1), xmlsec1="valid")
-    add("rsa-md5", LEAN.signed_as(method=names.RSA_MD5))
-    add("ecdsa-sha1", LEAN.signed_as(method=names.ECDSA_SHA1), "sts-p256", ["sts-p256"], "valid")
-    add("hmac-sha1-named", LEAN.signed_as(method=names.HMAC_SHA1.replace("hmac", "rsa") + "x"))
-    add("digest-sha1", LEAN.signed_as(digest=names.SHA1), xmlsec1="valid")
-    add("digest-md5", LEAN.signed_as(digest=names.MD5))
+    def add(name, refusals, token, key="sts", trust=None, xmlsec1="none"):
+        c.refuse("algorithms/algorithm-" + name, RULE_SAYS_IT, signed(token, key=key), refusals,
+                 xmlsec1, trust=trust or ["sts"])
+
+    def add_method(name, method, *signer, **opinion):
+        add(name, no_signature_algorithm(method), LEAN.signed_as(method=method), *signer, **opinion)
+
+    def add_digest(name, digest, **opinion):
+        add(name, outside(f"Digest algorithm '{digest}' is not accepted"),
+            LEAN.signed_as(digest=digest), **opinion)
+    add_method("rsa-sha1", names.RSA_SHA1, xmlsec1="valid")
+    add_method("rsa-md5", names.RSA_MD5)
+    add_method("ecdsa-sha1", names.ECDSA_SHA1, "sts-p256", ["sts-p256"], xmlsec1="valid")
+    add_method("hmac-sha1-named", names.HMAC_SHA1.replace("hmac", "rsa") + "x")
+    add_digest("digest-sha1", names.SHA1, xmlsec1="valid")
+    add_digest("digest-md5", names.MD5)
     for name, method in (("unknown", "urn:unknown"), ("empty", ""), ("blank", names.RSA_SHA256 + " "),
                          ("upper-case", names.RSA_SHA256.upper()), ("digest", names.SHA256),
                          ("pss", "http://www.w3.org/2007/05/xmldsig-more#sha256-rsa-MGF1")):
-        add(f"method-{name}", LEAN.signed_as(method=method))
-        add(f"digest-{name}", LEAN.signed_as(digest=method if name != "digest" else names.RSA_SHA256))
+        add_method(f"method-{name}", method)
+        add_digest(f"digest-{name}", method if name != "digest" else names.RSA_SHA256)
     for name, method in (
             ("unknown", "urn:unknown"), ("empty", ""), ("c14n11", "http://www.w3.org/2006/12/xml-c14n11"),
             ("with-comments", names.C14N + "#WithComments"),
             ("exclusive-with-comments", names.EXC_C14N + "WithComments"),
             ("enveloped", names.ENVELOPED)):
-        add(f"c14n-{name}", LEAN.signed_as(c14n=method),
+        add(f"c14n-{name}", no_canonicalization(method), LEAN.signed_as(c14n=method),
             xmlsec1="valid" if "comments" in name else "none")
 
 
@@ -260,7 +274,9 @@ def _references(c):
             ("relative-file", "token.xml"), ("absolute-path", "/etc/passwd"),
             ("xpointer-root", "#xpointer(/)"), ("xpointer-id", f"#xpointer(id('{ID}'))"),
             ("element-scheme", "#element(/1)"), ("other-id", "#_other"), ("hash-only", "#"),
-            ("id-without-hash", ID), ("id-in-other-case", "#" + ID.upper()),
+            ("id-without-hash", ID),
+            ("letter-for-hash", "x" + ID), ("longer-id", f"#{ID}2"), ("shorter-id", f"#{ID[:-1]}"),
+            ("id-in-other-case", "#" + ID.upper()),
             ("id-with-blank", f"#{ID} "), ("id-percent-encoded", "#%5f" + ID[1:]),
             ("document-and-id", f"token.xml#{ID}"), ("query-and-id", f"?#{ID}"),
             ("two-hashes", f"##{ID}"), ("blank", " "), ("cid", "cid:token")):
@@ -448,22 +464,22 @@ def _signature_shape(c):
 def _comments(c):
     good = signed(LEAN)
 
-    def add(name, before, text=good):
-        position = text.index(before) + len(before) + 10
+    def add(name, element, text=good):
+        position = text.index(f"<ds:{element}>") + len(f"<ds:{element}>") + 10
         c.refuse("signature-structure/comment-in-" + name, "a comment inside a value of the signature",
-                 text[:position] + "<!-- -->" + text[position:], SIGNATURE_SYNTAX)
-    add("digest-value", "<ds:DigestValue>")
-    add("signature-value", "<ds:SignatureValue>")
+                 text[:position] + "<!-- -->" + text[position:], only_text(element))
+    add("digest-value", "DigestValue")
+    add("signature-value", "SignatureValue")
     with_certificate = signed(LEAN.signed_as(key_info=key_info("sts")))
     position = with_certificate.index("<ds:X509Certificate>") + 60
     c.refuse("signature-structure/comment-in-key-info-certificate",
              "a comment inside KeyInfo's certificate",
              with_certificate[:position] + "<!-- -->" + with_certificate[position:],
-             SYNTAX_OR_OUTSIDE)
+             only_text("X509Certificate"))
     for name, element in (("digest-value", "DigestValue"), ("signature-value", "SignatureValue")):
         c.refuse(f"signature-structure/instruction-in-{name}",
                  "a processing instruction inside a value",
-                 replaced(good, f"</ds:{element}>", f"<?a?></ds:{element}>"), SIGNATURE_SYNTAX)
+                 replaced(good, f"</ds:{element}>", f"<?a?></ds:{element}>"), only_text(element))
 
 
 def _duplicate_ids(c):

@@ -54,8 +54,10 @@ def _doctypes(c):
     add("recursive", '<!DOCTYPE saml:Assertion [<!ENTITY e "&f;"><!ENTITY f "&e;">]>', use)
     c.refuse("doctype/doctype-inside-root", "a declaration out of place",
              replaced(good, "<saml:Subject>", "<!DOCTYPE a><saml:Subject>"), MALFORMED)
-    c.refuse("doctype/doctype-after-root", "a declaration out of place", good + "<!DOCTYPE a>", MALFORMED)
-    c.refuse("doctype/doctype-lower-case", "not a declaration at all", "<!doctype html>" + good, MALFORMED)
+    c.refuse("doctype/doctype-after-root", "a declaration out of place",
+             good + "<!DOCTYPE a>", MALFORMED)
+    c.refuse("doctype/doctype-lower-case", "not a declaration at all",
+             "<!doctype html>" + good, MALFORMED)
 
 
 def _references(c):
@@ -99,7 +101,8 @@ def _encodings(c):
     value("escape", b"A\x1bda", "a character that XML forbids")
     c.refuse("encoding/nul-last", "a NUL byte after the root", good.encode() + b"\0", MALFORMED)
     c.refuse("encoding/nul-first", "a NUL byte before the root", b"\0" + good.encode(), MALFORMED)
-    c.refuse("encoding/nul-then-more", "more text behind a NUL byte", good.encode() + b"\0<a/>", MALFORMED)
+    c.refuse("encoding/nul-then-more", "more text behind a NUL byte",
+             good.encode() + b"\0<a/>", MALFORMED)
     for name, encoding in (("utf16-le", "utf-16-le"), ("utf16-be", "utf-16-be"),
                            ("utf32", "utf-32-le")):
         c.refuse(f"encoding/encoding-{name}", "another encoding", good.encode(encoding), MALFORMED)
@@ -110,8 +113,8 @@ def _encodings(c):
     for name in ("ISO-8859-1", "US-ASCII", "UTF-16", "UTF-7", "EBCDIC-CP-US", "windows-1252",
                  "unknown"):
         text = f'<?xml version="1.0" encoding="{name}"?>' + good
-        c.refuse(f"encoding/encoding-declared-{name.lower()}", "a declared encoding other than UTF-8", text,
-                 MALFORMED)
+        c.refuse(f"encoding/encoding-declared-{name.lower()}", "a declared encoding other than UTF-8",
+                 text, MALFORMED)
     # The declared encoding gives the bytes another meaning than the one that was signed.
     text = '<?xml version="1.0" encoding="ISO-8859-1"?>' + signed(LEAN.but(given_name="Zo\u00eb"))
     c.refuse("encoding/encoding-latin-1-text", "text outside ASCII under another encoding",

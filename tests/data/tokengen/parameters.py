@@ -36,7 +36,8 @@ def _foreign_children(c):
                 ("length", "<ds:HMACOutputLength>0</ds:HMACOutputLength>", "ds:HMACOutputLength"),
                 ("foreign", '<x:a xmlns:x="urn:x"></x:a>', "x:a"),
                 ("list", listed("xs"), "InclusiveNamespaces")):
-            _refuse(c, f"algorithm-parameters/parameter-{element.lower()}-{name}", about, no_parameter(algorithm, told),
+            _refuse(c, f"algorithm-parameters/parameter-{element.lower()}-{name}", about,
+                    no_parameter(algorithm, told),
                     LEAN, (bare, bare[:-2] + f">{child}</ds:{element}>"), xmlsec1="valid")
     _refuse(c, "algorithm-parameters/parameter-canonicalizationmethod-foreign", about,
             no_parameter(names.EXC_C14N, "x:a"), LEAN,
@@ -64,7 +65,8 @@ def _misplaced_lists(c):
         _refuse(c, f"prefix-lists/prefix-list-inclusive-{name}", about, refused, token,
                 (bare, bare[:-2] + f">{listed('xs')}</ds:{element}>"), xmlsec1="valid")
     bare = f'<ds:Transform Algorithm="{names.ENVELOPED}"/>'
-    _refuse(c, "prefix-lists/prefix-list-enveloped", about, no_parameter(names.ENVELOPED, "InclusiveNamespaces"),
+    _refuse(c, "prefix-lists/prefix-list-enveloped", about,
+            no_parameter(names.ENVELOPED, "InclusiveNamespaces"),
             LEAN, (bare, bare[:-2] + f">{listed('xs')}</ds:Transform>"), xmlsec1="valid")
 
 
@@ -72,7 +74,8 @@ def _two_lists(c):
     refused = no_parameter(names.EXC_C14N, "ec:InclusiveNamespaces")
     for name, lists in (("first", ("xs", "xsi")), ("last", ("xsi", "xs"))):
         digest = value_of(signed(LEAN.signed_as(transform_prefixes="xs")), "DigestValue")
-        _refuse(c, f"prefix-lists/prefix-list-twice-{name}-verifies", "which of two prefix lists holds?", refused,
+        _refuse(c, f"prefix-lists/prefix-list-twice-{name}-verifies",
+                "which of two prefix lists holds?", refused,
                 LEAN, ("@DIGEST@", digest),
                 (TRANSFORM_LIST + "/>",
                  TRANSFORM_LIST + ">" + "".join(map(listed, lists)) + "</ds:Transform>"))
@@ -96,7 +99,8 @@ def _bad_lists(c):
              good.replace(' PrefixList="xs"', ""))):
         for place, element, start in (("c14n", "CanonicalizationMethod", C14N_LIST),
                                       ("transform", "Transform", TRANSFORM_LIST)):
-            _refuse(c, f"prefix-lists/prefix-list-{name}-{place}", "a prefix list that is more or less than one",
+            _refuse(c, f"prefix-lists/prefix-list-{name}-{place}",
+                    "a prefix list that is more or less than one",
                     refusals, LEAN, (start + "/>", f"{start}>{bad}</ds:{element}>"),
                     xmlsec1="none" if name == "absent" else "valid")
 
@@ -114,7 +118,8 @@ def _digests(c):
         return lambda text: base64.b64encode(change(base64.b64decode(text))).decode()
 
     def add(name, refusals, form):
-        _refuse(c, "signature-values/digest-" + name, "SignedInfo is genuine, the digest in it is not", refusals,
+        _refuse(c, "signature-values/digest-" + name,
+                "SignedInfo is genuine, the digest in it is not", refusals,
                 LEAN, digest_form=form, xmlsec1="invalid")
     add("byte-short", TAMPERED, changed(lambda digest: digest[:-1]))
     add("one-byte", TAMPERED, changed(lambda digest: digest[:1]))

@@ -10,7 +10,6 @@ using namespace TokenText;
 
 namespace {
 
-constexpr char AuthnStatement[] = "<saml:AuthnStatement ";
 constexpr char EndOfAssertion[] = "</saml:Assertion>";
 
 class ReadStatements : public testing::Test
@@ -18,17 +17,6 @@ class ReadStatements : public testing::Test
 protected:
     FixedClock _clock; // NOLINT(readability-identifier-naming): a fixture's member is protected
 };
-
-std::string JudgeReplaced(const std::string& from, const std::string& to)
-{
-    return JudgeUnsigned(Replace(Bearer(), from, to));
-}
-
-std::string JudgeAdvice(const std::string& content)
-{
-    return JudgeUnsigned(
-        InsertBefore(Bearer(), AuthnStatement, "<saml:Advice>" + content + "</saml:Advice>"));
-}
 
 std::string JudgeAttributes(const std::string& content)
 {
@@ -60,104 +48,37 @@ std::string ReadValues(const std::string& content)
 
 } // namespace
 
-TEST_F(ReadStatements, ReadsTheAuthnStatementStrictly)
+TEST_F(ReadStatements, DoesNotCheckTheAttributesOfTheClassReference)
 {
-    EXPECT_EQ(
-        "ParseException: Unexpected attributes on element 'AuthnStatement'",
-        JudgeReplaced(AuthnStatement, "<saml:AuthnStatement SessionIndex=\"1\" "));
-    EXPECT_EQ(
-        "ParseException: Node 'AuthnStatement is missing required attribute 'AuthnInstant'",
-        JudgeReplaced(" AuthnInstant=\"2012-01-31T11:59:00Z\"", ""));
-    EXPECT_EQ(
-        "ParseException: AuthnStatement/@AuthnInstant is not a date",
-        JudgeReplaced("AuthnInstant=\"2012-01-31T11:59:00Z\"", "AuthnInstant=\"\""));
-    EXPECT_EQ(
-        "ParseException: Expected element 'AuthnContext' not found.",
-        JudgeReplaced("<saml:AuthnContext>", "<saml:SubjectLocality/><saml:AuthnContext>"));
-    EXPECT_EQ(
-        "ParseException: Unexpected elements after AuthnContext",
-        JudgeReplaced("</saml:AuthnContext>", "</saml:AuthnContext><a/>"));
-}
-
-TEST_F(ReadStatements, ReadsTheAuthnContextStrictly)
-{
-    EXPECT_EQ(
-        "ParseException: Unexpected attributes on element 'AuthnContext'",
-        JudgeReplaced("<saml:AuthnContext>", "<saml:AuthnContext a=\"\">"));
-    EXPECT_EQ(
-        "ParseException: Expected element 'AuthnContextClassRef' not found.",
-        JudgeReplaced("<saml:AuthnContext>", "<saml:AuthnContext><saml:AuthnContextDecl/>"));
-    EXPECT_EQ(
-        "ParseException: Unexpected elements after AuthnContextClassRef",
-        JudgeReplaced("</saml:AuthnContextClassRef>", "</saml:AuthnContextClassRef><a/>"));
-    EXPECT_EQ(
-        "ParseException: Element 'AuthnContextClassRef' must only have textual content (but has "
-        "extra children or is empty).",
-        JudgeReplaced(">password<", "><"));
     EXPECT_EQ(
         ReachesSignature,
-        JudgeReplaced("<saml:AuthnContextClassRef>", "<saml:AuthnContextClassRef a=\"\">"));
+        JudgeUnsigned(Replace(
+            Bearer(), "<saml:AuthnContextClassRef>", "<saml:AuthnContextClassRef a=\"\">")));
 }
 
-TEST_F(ReadStatements, ReadsTheAttributeStatementStrictly)
+TEST_F(ReadStatements, AcceptsSeveralAttributes)
 {
     EXPECT_EQ(ReachesSignature, JudgeAttributes(Attribute("n", {"v"}) + Attribute("m", {})));
-    EXPECT_EQ("ParseException: Expected element 'Attribute' not found.", JudgeAttributes(""));
-    EXPECT_EQ(
-        "ParseException: Expected element 'Attribute' not found.",
-        JudgeAttributes(Attribute("n", {"v"}) + "<saml:EncryptedAttribute/>"));
-    EXPECT_EQ(
-        "ParseException: Unexpected attributes on element 'AttributeStatement'",
-        JudgeUnsigned(InsertBefore(Bearer(), EndOfAssertion, "<saml:AttributeStatement a=\"\"/>")));
 }
 
-TEST_F(ReadStatements, ReadsAttributesStrictly)
+TEST_F(ReadStatements, AttributesMayHaveAFriendlyName)
 {
-    const auto judge = [](const std::string& attributes, const std::string& content = "") {
-        return JudgeAttributes(
-            "<saml:Attribute" + attributes + ">" + content + "</saml:Attribute>");
-    };
-    const std::string both = R"( Name="n" NameFormat="f")";
-    EXPECT_EQ(ReachesSignature, judge(both + " FriendlyName=\"g\""));
     EXPECT_EQ(
-        "ParseException: Node 'Attribute is missing required attribute 'NameFormat'",
-        judge(" Name=\"n\""));
-    EXPECT_EQ(
-        "ParseException: Node 'Attribute is missing required attribute 'Name'",
-        judge(" NameFormat=\"f\""));
-    EXPECT_EQ(
-        "ParseException: Unexpected attributes on element 'Attribute'", judge(both + " a=\"\""));
-    EXPECT_EQ(
-        "ParseException: Expected element 'AttributeValue' not found.",
-        judge(both, "<saml:AttributeValue>v</saml:AttributeValue><saml:Value/>"));
-    EXPECT_EQ("ParseException: Expected element 'AttributeValue' not found.", judge(both, "v"));
+        ReachesSignature,
+        JudgeAttributes(
+            R"(<saml:Attribute Name="n" NameFormat="f" FriendlyName="g"></saml:Attribute>)"));
 }
 
-TEST_F(ReadStatements, ReadsAdviceStrictly)
+TEST_F(ReadStatements, AcceptsAdviceOfSeveralSources)
 {
-    const std::string attribute = Attribute("n", {"v"});
     const std::string advice =
-        "<rsa:RSAAdvice AdviceSource=\"s\">" + attribute + "</rsa:RSAAdvice>";
-    EXPECT_EQ(ReachesSignature, JudgeAdvice(advice + advice));
-    EXPECT_EQ("ParseException: Expected element 'RSAAdvice' not found.", JudgeAdvice(""));
+        "<rsa:RSAAdvice AdviceSource=\"s\">" + Attribute("n", {"v"}) + "</rsa:RSAAdvice>";
     EXPECT_EQ(
-        "ParseException: Expected element 'RSAAdvice' not found.",
-        JudgeAdvice(advice + "<saml:AssertionIDRef>a</saml:AssertionIDRef>"));
-    EXPECT_EQ(
-        "ParseException: Element 'RSAAdvice' has unexpected namespace",
-        JudgeAdvice("<saml:RSAAdvice/>"));
-    EXPECT_EQ(
-        "ParseException: Node 'RSAAdvice is missing required attribute 'AdviceSource'",
-        JudgeAdvice("<rsa:RSAAdvice/>"));
-    EXPECT_EQ(
-        "ParseException: Unexpected attributes on element 'RSAAdvice'",
-        JudgeAdvice("<rsa:RSAAdvice AdviceSource=\"s\" a=\"\"/>"));
-    EXPECT_EQ(
-        "ParseException: Expected element 'Attribute' not found.",
-        JudgeAdvice("<rsa:RSAAdvice AdviceSource=\"s\"/>"));
-    EXPECT_EQ(
-        "ParseException: Unexpected attributes on element 'Advice'",
-        JudgeUnsigned(InsertBefore(Bearer(), AuthnStatement, "<saml:Advice a=\"\"/>")));
+        ReachesSignature,
+        JudgeUnsigned(InsertBefore(
+            Bearer(),
+            "<saml:AuthnStatement ",
+            "<saml:Advice>" + advice + advice + "</saml:Advice>")));
 }
 
 TEST(ParseAttributeElement, KeepsValuesInOrder)
@@ -183,16 +104,4 @@ TEST(ParseAttributeElement, DoesNotCheckTheAttributesOfValues)
         "[v]",
         ReadValues("<saml:AttributeValue xmlns:xsi='http://www.w3.org/2001/XMLSchema-instance' "
                    "xsi:type='xs:string'>v</saml:AttributeValue>"));
-}
-
-TEST_F(ReadStatements, RefusesElementsInsideAValue)
-{
-    EXPECT_EQ(
-        "ParseException: Element 'AttributeValue' must only have textual content (but has extra "
-        "children or is empty).",
-        JudgeAttributes(Attribute("n", {"<a/>"})));
-    EXPECT_EQ(
-        "ParseException: Element 'AttributeValue' must only have textual content (but has extra "
-        "children or is empty).",
-        JudgeAttributes(Attribute("n", {"v<!-- -->w"})));
 }
