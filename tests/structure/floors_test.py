@@ -22,10 +22,11 @@ FLOORS = {
     },
     "ssoClient": {
         "wire": set(),
+        "assertion": {"wire"},
         "token": {"wire"},
         "message": {"wire"},
         "protocol": {"wire", "token", "message"},
-        "client": {"wire", "token", "message", "protocol"},
+        "client": {"wire", "assertion", "token", "message", "protocol"},
     },
 }
 
@@ -40,6 +41,7 @@ PUBLIC_FLOORS = {
         "Advice.h": "wire", "Delegate.h": "wire", "Exceptions.h": "wire", "Export.h": "wire",
         "HolderOfKeyConfig.h": "wire", "Leg.h": "wire", "PrincipalId.h": "wire",
         "SamlToken.h": "wire", "TokenSpec.h": "wire",
+        "Assertion.h": "assertion", "SubjectMapping.h": "assertion",
         "CreateSamlToken.h": "token",
         "Descriptions.h": "client", "GssNegotiationContext.h": "client",
         "NegotiationHandler.h": "client", "SecurityTokenService.h": "client",
@@ -128,6 +130,10 @@ class PlantedIncludes(unittest.TestCase):
     def test_the_transport_in_the_reader_of_statements(self):
         self.assert_found("ssoClient", "lib/ssoClient/token/samlStatements.cpp",
                           "ssoClient/protocol/HttpsClient.h")
+
+    def test_the_narrow_reader_in_the_general_one(self):
+        self.assert_found("ssoClient", "lib/ssoClient/assertion/subjectReading.cpp",
+                          "ssoClient/token/samlAssertion.h")
 
     def test_http_in_the_core(self):
         self.assert_found("quillon", "lib/quillon/core/StringWriter.cpp", "http/HttpEngine.h")

@@ -1,0 +1,109 @@
+#include "ssoClient/Assertion.h"
+#include "ssoClient/Exceptions.h"
+#include "ssoClient/assertion/assertionReading.h"
+#include "ssoClient/assertion/judging.h"
+#include "ssoClient/wire/wireNames.h"
+#include "ssoClient/wire/xmlReading.h"
+
+#include <algorithm>
+#include <tuple>
+
+namespace SsoClient {
+
+using Quillon::Ref;
+using Quillon::Crypto::Certificate;
+using Quillon::Xml::ElementNode;
+namespace Security = Quillon::Xml::Security;
+
+namespace {
+
+ElementNode& GetAssertionElement(const Quillon::Xml::Document& document)
+{
+    ElementNode& root = *document.GetRootElement();
+    if (root.HasQName("EncryptedAssertion", Wire::SamlNamespace)) {
+        throw ParseException("The assertion is encrypted; decrypt it first");
+    }
+    if (!root.HasQName("Assertion", Wire::SamlNamespace)) {
+        throw ParseException(
+            "Expected element 'Assertion' of SAML 2.0, found " + GeneralReader::Describe(root));
+    }
+    return root;
+}
+
+void Verify(const Security::Signature& signature, const std::list<Ref<const Certificate>>& trusted)
+{
+    const auto resolver = Security::CreateTrustSetKeyResolver(trusted);
+    bool verified = false;
+    try {
+        verified = signature.Verify(resolver.get());
+    } catch (const Security::XmlSecurityException& error) {
+        throw InvalidSignatureException(
+            std::string("Signature verification error. ") + error.what());
+    }
+    if (!verified) {
+        throw InvalidSignatureException(
+            "Failed to verify signature: token might have been tampered with.");
+    }
+}
+
+} // namespace
+
+bool operator==(const AssertionNameId& a, const AssertionNameId& b)
+{
+    return std::tie(a.value, a.format, a.nameQualifier, a.spNameQualifier, a.spProvidedId)
+           == std::tie(b.value, b.format, b.nameQualifier, b.spNameQualifier, b.spProvidedId);
+}
+
+bool VerifiedAssertion::IsFor(const std::string& audience) const
+{
+    const auto& restrictions = _facts.conditions.audienceRestrictions;
+    return std::all_of(
+        restrictions.begin(), restrictions.end(), [&audience](const AssertionAudience& named) {
+            return named.count(audience) != 0;
+        });
+}
+
+const AssertionAttribute* VerifiedAssertion::FindAttribute(const std::string& name) const noexcept
+{
+    const auto found = std::find_if(
+        _facts.attributes.begin(), _facts.attributes.end(), [&name](const auto& attribute) {
+            return attribute.name == name;
+        });
+    return found == _facts.attributes.end() ? nullptr : &*found;
+}
+
+/** Makes verified assertions; nobody else can. */
+class AssertionVerifier
+{
+public:
+    static boost::shared_ptr<const VerifiedAssertion> Verify(
+        const std::string& xml,
+        const std::list<Ref<const Certificate>>& trusted,
+        const AssertionRules& rules)
+    {
+        Ref<Quillon::Xml::Document> document;
+        ParseXML(xml, document);
+        ElementNode& root = GetAssertionElement(*document);
+        const Ref<Security::Signature> signature = GeneralReader::FindSignature(root);
+        SsoClient::Verify(*signature, trusted);
+
+        const boost::shared_ptr<VerifiedAssertion> assertion(new VerifiedAssertion);
+        assertion->_facts = GeneralReader::ReadAssertion(root, *signature);
+        const auto judgement = GeneralReader::Judge(assertion->_facts, rules);
+        assertion->_confirmation = judgement.confirmation;
+        assertion->_startDate = judgement.startDate;
+        assertion->_endDate = judgement.endDate;
+        assertion->_xml = xml;
+        return assertion;
+    }
+};
+
+boost::shared_ptr<const VerifiedAssertion> VerifyAssertion(
+    const std::string& xml,
+    const std::list<Ref<const Certificate>>& trustedCertificates,
+    const AssertionRules& rules)
+{
+    return AssertionVerifier::Verify(xml, trustedCertificates, rules);
+}
+
+} // namespace SsoClient
