@@ -1,11 +1,227 @@
 #include "CommandLine.h"
 
 #include "ExitCode.h"
+#include "Neighbour.h"
 
 #include <CLI/App.hpp>
 #include <CLI/Config.hpp>
 #include <CLI/Formatter.hpp>
 #include <CLI/Validators.hpp>
+
+#include <algorithm>
+#include <array>
+#include <cctype>
+
+namespace {
+
+using Words = std::vector<std::string>;
+
+bool IsOption(const std::string& word)
+{
+    return word.size() > 1 && word[0] == '-' && word != "--";
+}
+
+/** The command that the words named last. */
+const CLI::App& GetNamedCommand(const CLI::App& app)
+{
+    const std::vector<CLI::App*> named = app.get_subcommands();
+    return named.empty() ? app : GetNamedCommand(*named.front());
+}
+
+/** The command as it is typed, with those above it. */
+std::string GetPath(const CLI::App& app)
+{
+    return app.get_parent() == nullptr ? app.get_name()
+                                       : GetPath(*app.get_parent()) + " " + app.get_name();
+}
+
+Words GetCommandNames(const CLI::App& app)
+{
+    Words names;
+    for (const CLI::App* command : app.get_subcommands({})) {
+        names.push_back(command->get_name());
+    }
+    return names;
+}
+
+const CLI::App* FindCommand(const CLI::App& parent, const std::string& name)
+{
+    const auto found = parent.get_subcommands(
+        [&](const CLI::App* command) { return command->get_name() == name; });
+    return found.empty() ? nullptr : found.front();
+}
+
+Words GetOptionNames(const CLI::App& app)
+{
+    Words names;
+    for (const CLI::Option* option : app.get_options()) {
+        const Words& longNames = option->get_lnames();
+        names.insert(names.end(), longNames.begin(), longNames.end());
+    }
+    return names;
+}
+
+/** The first word that belongs to nothing, with the command that it was left to. */
+std::pair<const CLI::App*, std::string> FindUnknownWord(const CLI::App& app)
+{
+    const Words unknown = app.remaining();
+    if (!unknown.empty()) {
+        return {&app, unknown.front()};
+    }
+    const std::vector<CLI::App*> named = app.get_subcommands();
+    return named.empty() ? std::pair<const CLI::App*, std::string>() : FindUnknownWord(*named[0]);
+}
+
+/**
+ * The option that a word begins with. What follows it may be a secret, and what does not look like
+ * an option may be one itself: empty then.
+ */
+std::string GetShownOption(const std::string& word)
+{
+    constexpr std::size_t MaxShown = 32;
+    if (word[1] != '-') {
+        return std::isalpha(static_cast<unsigned char>(word[1])) != 0 ? word.substr(0, 2) : "";
+    }
+    const std::string name = word.substr(0, word.find('='));
+    const bool isPlain =
+        name.find_first_not_of("abcdefghijklmnopqrstuvwxyz0123456789-") == std::string::npos;
+    return isPlain && name.size() <= MaxShown ? name : "";
+}
+
+std::string DescribeUnknownOption(const CLI::App& command, const std::string& word)
+{
+    const std::string shown = GetShownOption(word);
+    if (shown.empty()) {
+        return GetPath(command) + " has no such option, which is not shown: it may be a secret";
+    }
+    const std::string text = GetPath(command) + " has no option " + shown;
+    const bool isLong = shown.size() > 2;
+    const std::string near = isLong ? FindNeighbour(shown.substr(2), GetOptionNames(command)) : "";
+    return near.empty() ? text : text + "; did you mean --" + near + "?";
+}
+
+/** Only a word that is nearly a command is shown. Any other may be anything, a secret included. */
+std::string DescribeUnknownCommand(const CLI::App& parent, const std::string& word)
+{
+    const Words names = GetCommandNames(parent);
+    const std::string near = FindNeighbour(word, names);
+    return near.empty()
+               ? GetPath(parent) + " has no such command, only " + CLI::detail::join(names, ", ")
+               : GetPath(parent) + " has no command " + word + "; did you mean " + near + "?";
+}
+
+/** Names the option that the last `word` of the arguments comes after. */
+std::string DescribeSurplusWord(
+    const CLI::App& command, const std::string& word, const Words& arguments)
+{
+    const Words options = GetOptionNames(command);
+    const auto isKnown = [&](const std::string& argument) {
+        return IsOption(argument)
+               && std::find(options.begin(), options.end(), argument.substr(2)) != options.end();
+    };
+    const auto at = std::find(arguments.rbegin(), arguments.rend(), word);
+    const auto before = std::find_if(at, arguments.rend(), isKnown);
+    return "there is an argument too many" + (before == arguments.rend() ? "" : " after " + *before)
+           + ", not shown because it may be a secret";
+}
+
+std::string DescribeUnknownWord(
+    const CLI::App& command, const std::string& word, const Words& arguments)
+{
+    if (IsOption(word)) {
+        return DescribeUnknownOption(command, word);
+    }
+    return GetCommandNames(command).empty() ? DescribeSurplusWord(command, word, arguments)
+                                            : DescribeUnknownCommand(command, word);
+}
+
+[[noreturn]] void ThrowUsageError(const CLI::App& command, const std::string& what)
+{
+    throw UsageError(what + " (see: " + GetPath(command) + " --help)");
+}
+
+/** The parser's own words, but for a value that stands where there can be none. */
+std::string DescribeBadValue(const std::string& error)
+{
+    const std::size_t end = error.find(" was given a disallowed flag override");
+    return end == std::string::npos ? error : "--" + error.substr(0, end) + " takes no value";
+}
+
+/** What was typed and is not understood comes before what was not typed or has a bad value. */
+[[noreturn]] void ThrowParseError(
+    const CLI::App& program, const CLI::ParseError& error, const Words& arguments)
+{
+    const auto [command, word] = FindUnknownWord(program);
+    if (command != nullptr) {
+        // Words after `--` are left to the commands above.
+        const CLI::App& place = IsOption(word) ? *command : GetNamedCommand(*command);
+        ThrowUsageError(place, DescribeUnknownWord(place, word, arguments));
+    }
+    ThrowUsageError(GetNamedCommand(program), DescribeBadValue(error.what()));
+}
+
+void RequireCommand(const CLI::App& named)
+{
+    const Words names = GetCommandNames(named);
+    if (!names.empty()) {
+        ThrowUsageError(
+            named, GetPath(named) + " needs a command: " + CLI::detail::join(names, ", "));
+    }
+}
+
+/** `help COMMAND...` and `version` mean `COMMAND... --help` and `--version`. */
+Words TranslateWordsForOptions(const CLI::App& program, const Words& arguments)
+{
+    if (arguments == Words{"version"}) {
+        return {"--version"};
+    }
+    if (arguments.empty() || arguments[0] != "help") {
+        return arguments;
+    }
+    const CLI::App* command = &program;
+    Words translated(arguments.begin() + 1, arguments.end());
+    for (const std::string& word : translated) {
+        const CLI::App* below = FindCommand(*command, word);
+        if (below == nullptr) {
+            ThrowUsageError(*command, DescribeUnknownWord(*command, word, arguments));
+        }
+        command = below;
+    }
+    translated.emplace_back("--help");
+    return translated;
+}
+
+struct Unit
+{
+    char letter;
+    long long seconds;
+};
+constexpr std::array<Unit, 4> Units = {{{'s', 1}, {'m', 60}, {'h', 3600}, {'d', 86400}}};
+
+/** The words after a value that has a unit: how it is written here. Empty for another value. */
+std::string ExplainUnit(const std::string& value)
+{
+    constexpr long long MaxCount = 1'000'000;
+    long long count = 0;
+    const auto unit = std::find_if(Units.begin(), Units.end(), [&](const Unit& candidate) {
+        return !value.empty() && candidate.letter == value.back();
+    });
+    if (unit == Units.end() || !ToNumber(value.substr(0, value.size() - 1), count) || count < 0
+        || count > MaxCount) {
+        return "";
+    }
+    return ": write " + std::to_string(count * unit->seconds);
+}
+
+std::string CheckSeconds(const std::string& value)
+{
+    long long seconds = 0;
+    return ToNumber(value, seconds)
+               ? ""
+               : "`" + value + "' is not a number of seconds" + ExplainUnit(value);
+}
+
+} // namespace
 
 Option Option::Required() const
 {
@@ -91,7 +307,7 @@ Option Command::AddOption(
 Option Command::AddOption(
     const std::string& name, long long& value, const std::string& description) const
 {
-    return Option(*_app->add_option(name, value, description));
+    return Option(*_app->add_option(name, value, description)->check(CheckSeconds));
 }
 
 Option Command::AddOption(
@@ -110,7 +326,7 @@ Option Command::AddPairOption(
 
 void Command::AddFlag(const std::string& name, bool& value, const std::string& description) const
 {
-    _app->add_flag(name, value, description);
+    _app->add_flag(name, value, description)->disable_flag_override();
 }
 
 void Command::AddFlag(
@@ -118,7 +334,7 @@ void Command::AddFlag(
     const std::function<void()>& action,
     const std::string& description) const
 {
-    _app->add_flag_callback(name, action, description);
+    _app->add_flag_callback(name, action, description)->disable_flag_override();
 }
 
 CommandLine::CommandLine(
@@ -135,17 +351,25 @@ Command CommandLine::GetRoot() const
     return Command(*_app);
 }
 
-bool CommandLine::Parse(int argc, const char* const* argv) const
+std::string CommandLine::GetHelp() const
+{
+    return _app->help();
+}
+
+bool CommandLine::Parse(const std::vector<std::string>& arguments) const
 {
     try {
-        _app->parse(argc, argv);
-        return true;
+        std::vector<std::string> reversed = TranslateWordsForOptions(*_app, arguments);
+        std::reverse(reversed.begin(), reversed.end());
+        _app->parse(std::move(reversed)); // takes them from the end
     } catch (const CLI::Success& request) {
         _app->exit(request); // prints what was asked for
         return false;
     } catch (const CLI::ParseError& error) {
-        throw UsageError(error.what());
+        ThrowParseError(*_app, error, arguments);
     }
+    RequireCommand(GetNamedCommand(*_app));
+    return true;
 }
 
 bool ToNumber(const std::string& text, long long& number)

@@ -72,6 +72,7 @@ public:
         const std::string& name,
         std::set<std::string>& value,
         const std::string& description) const;
+    /** The value is a number of seconds. */
     Option AddOption(
         const std::string& name, long long& value, const std::string& description) const;
     Option AddOption(
@@ -108,9 +109,14 @@ public:
      * Sets the variables and calls the functions that were given for what the arguments name.
      *
      * @return false if help or the version was asked for, which has then been printed.
-     * @throws UsageError  the arguments are not those that were added.
+     * @throws UsageError  the arguments are not those that were added. The text names what is not
+     *                     understood before what is missing, and never a word that belongs to no
+     *                     option: it may be a password.
      */
-    bool Parse(int argc, const char* const* argv) const;
+    bool Parse(const std::vector<std::string>& arguments) const;
+
+    /** What `--help` of the program prints. */
+    std::string GetHelp() const;
 
 private:
     std::unique_ptr<CLI::App> _app;

@@ -7,11 +7,13 @@
 #include "Trust.h"
 
 #include "quillon/MessageFormatter.h"
+#include "quillon/StringUtil.h"
 
 #include <algorithm>
 #include <array>
 #include <cstring>
 #include <random>
+#include <string_view>
 
 using Quillon::MessageFormatter;
 using Quillon::Crypto::Certificate;
@@ -88,6 +90,33 @@ bool IsKeyOf(const PrivateKey& key, const Certificate& certificate)
         Hash, digest.data(), signature.data(), signature.size());
 }
 
+/** `text`, which names the URI of a key, without the PIN that the URI may have [RFC 7512 2.4]. */
+std::string HidePin(std::string text, const std::string& uri)
+{
+    constexpr std::string_view Attribute = "pin-value=";
+    constexpr std::string_view Ends = "&;";
+    const std::size_t found = Quillon::StringUtil::ToLower(uri).find(Attribute);
+    if (found == std::string::npos) {
+        return text;
+    }
+    const std::size_t first = found + Attribute.size();
+    const std::string pin = uri.substr(first, uri.find_first_of(Ends, first) - first);
+    for (std::size_t at = 0; !pin.empty() && (at = text.find(pin, at)) != std::string::npos;) {
+        text.replace(at, pin.size(), "...");
+        at += 3;
+    }
+    return text;
+}
+
+/** Names the file; of a URI the text has the name already. */
+[[noreturn]] void ThrowKeyError(const std::string& key, const std::string& reason)
+{
+    throw UsageError(
+        IsUri(key)
+            ? MessageFormatter::ASPrint("cannot use the private key: %1", HidePin(reason, key))
+            : MessageFormatter::ASPrint("cannot use the private key `%1': %2", key, reason));
+}
+
 Quillon::Ref<const PrivateKey> ReadSigningKey(
     const IdentityOptions& options, const Certificate& certificate)
 {
@@ -100,7 +129,7 @@ Quillon::Ref<const PrivateKey> ReadSigningKey(
         }
         return key;
     } catch (const Quillon::Crypto::CryptoException& error) {
-        throw UsageError(MessageFormatter::ASPrint("cannot use the private key: %1", error.what()));
+        ThrowKeyError(*options.key, error.what());
     }
 }
 

@@ -1,4 +1,7 @@
 #include "Commands.h"
+#include "Terminal.h"
+
+#include <iostream>
 
 namespace {
 
@@ -14,19 +17,16 @@ void AddCommands(const Command& program, Action& action)
     AddInspectCommand(program, action);
 }
 
-ExitCode Run(int argc, char** argv)
+ExitCode Run(const std::vector<std::string>& arguments)
 {
     const CommandLine commandLine(
         "ssoclient", SSOCLIENT_VERSION, "Obtains, renews, validates and verifies SAML 2.0 tokens.");
     Action action;
     AddCommands(commandLine.GetRoot(), action);
-    if (!commandLine.Parse(argc, argv)) {
-        return ExitCode::DONE;
+    if (arguments.empty() && IsTerminal()) {
+        std::cerr << commandLine.GetHelp();
     }
-    if (!action) {
-        throw UsageError("A subcommand is required");
-    }
-    return action();
+    return commandLine.Parse(arguments) ? action() : ExitCode::DONE;
 }
 
 } // namespace
@@ -34,7 +34,7 @@ ExitCode Run(int argc, char** argv)
 int main(int argc, char** argv)
 {
     try {
-        return static_cast<int>(Run(argc, argv));
+        return static_cast<int>(Run({argv + 1, argv + argc}));
     } catch (const std::exception& error) {
         ReportFailure(Quillon::GetClassName(error), error.what());
         return static_cast<int>(GetExitCode(error));

@@ -57,8 +57,9 @@ class AcquireCertificate(ServiceTest):
         self.assert_fails_matching(result, REFUSED, "InvalidSignatureException", ".+")
 
     def test_is_never_bearer(self):
-        self.assert_fails(self.acquire_by_certificate("--bearer", service=self.nowhere),
-                          USAGE, "UsageError", "The following argument was not expected: --bearer")
+        self.assert_misused(self.acquire_by_certificate("--bearer", service=self.nowhere),
+                            "acquire certificate",
+                            "ssoclient acquire certificate has no option --bearer")
 
     def test_verbose_shows_no_key_and_no_token(self):
         out = self.folder / "token.xml"
@@ -110,10 +111,14 @@ class Advice(ServiceTest):
                                         "--advice", "urn:a", words)
 
     def test_takes_two_words_at_a_time(self):
-        self.assert_usage_error("--advice: 2 required SOURCE NAME=VALUE missing",
-                                "--advice", "urn:a")
-        self.assert_usage_error("The following arguments were not expected: urn:n=2 urn:b",
-                                "--advice", "urn:a", "urn:n=1", "urn:b", "urn:n=2")
+        self.assert_misused(
+            self.acquire_by_certificate("--advice", "urn:a", service=self.nowhere),
+            "acquire certificate", "--advice: 2 required SOURCE NAME=VALUE missing")
+        self.assert_misused(
+            self.acquire_by_certificate("--advice", "urn:a", "urn:n=1", "urn:b", "urn:n=2",
+                                        service=self.nowhere),
+            "acquire certificate",
+            "there is an argument too many after --advice, not shown because it may be a secret")
 
 
 class Keys(ServiceTest):
@@ -163,8 +168,8 @@ class Keys(ServiceTest):
         key = self.encrypted_key("key-secret")
         passphrase = self.write("passphrase", "wrong-secret\n")
         self.assert_usage_error(
-            "cannot use the private key: Cannot read the private key: the passphrase is wrong",
-            key, "--key-passphrase-file", passphrase)
+            f"cannot use the private key `{key}': Cannot read the private key: "
+            "the passphrase is wrong", key, "--key-passphrase-file", passphrase)
         self.assert_usage_error(
             f"cannot use the private key: There is no private key at 'file:{key}': "
             "the passphrase is wrong", f"file:{key}", "--key-passphrase-file", passphrase)
@@ -216,12 +221,25 @@ class Keys(ServiceTest):
                 result = self.with_key(name, service=self.nowhere)
                 self.assert_fails_matching(
                     result, USAGE, "UsageError",
-                    "cannot use the private key: Cannot read the private key: .+")
+                    f"cannot use the private key `{name}': Cannot read the private key: .+")
 
     def test_unknown_scheme(self):
         self.assert_fails_matching(
             self.with_key("unknown:key", service=self.nowhere), USAGE, "UsageError",
             "cannot use the private key: Cannot open 'unknown:key': .+")
+
+    def test_pin_in_the_uri_is_not_shown(self):
+        for uri, shown in (("unknown:x?pin-value=SECRET", "unknown:x?pin-value=..."),
+                           ("unknown:x?pin-value=SECRET&a=b", "unknown:x?pin-value=...&a=b"),
+                           ("unknown:PIN-VALUE=SECRET;x", "unknown:PIN-VALUE=...;x"),
+                           ("file:/no/such?pin-value=SECRET", "file:/no/such?pin-value=..."),
+                           ("unknown:pin-value=SEC'RET", "unknown:pin-value=...")):
+            with self.subTest(uri=uri):
+                result = self.with_key(uri, service=self.nowhere)
+                self.assert_fails_matching(
+                    result, USAGE, "UsageError",
+                    f"cannot use the private key: Cannot open '{re.escape(shown)}': .+")
+                self.assertNotIn("RET", result.err)
 
     def test_name_with_a_colon_is_a_file_after_a_slash(self):
         self.assert_usage_error("cannot open `./unknown:key': No such file or directory",

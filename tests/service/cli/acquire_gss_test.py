@@ -252,20 +252,23 @@ class Usage(ServiceTest):
         self.assert_fails(ssoclient("acquire", "gss", *self.nowhere, *options), USAGE, class_name,
                           message)
 
+    def assert_misuse(self, message, *options):
+        self.assert_misused(ssoclient("acquire", "gss", *self.nowhere, *options), "acquire gss",
+                            message)
+
     def test_cache_and_keytab_exclude_each_other(self):
-        self.assert_usage_error("--ccache excludes --keytab", "--ccache", "c", "--keytab", "k",
-                                "--principal", "p")
-        self.assert_usage_error("--ccache excludes --keytab", "--ccache", "c", "--keytab", "k")
-        self.assert_usage_error("--ccache excludes --principal", "--ccache", "c", "--principal",
-                                "p")
+        self.assert_misuse("--ccache excludes --keytab", "--ccache", "c", "--keytab", "k",
+                           "--principal", "p")
+        self.assert_misuse("--ccache excludes --keytab", "--ccache", "c", "--keytab", "k")
+        self.assert_misuse("--ccache excludes --principal", "--ccache", "c", "--principal", "p")
 
     def test_keytab_and_principal_need_each_other(self):
-        self.assert_usage_error("--keytab requires --principal", "--keytab", "k")
-        self.assert_usage_error("--principal requires --keytab", "--principal", "p")
+        self.assert_misuse("--keytab requires --principal", "--keytab", "k")
+        self.assert_misuse("--principal requires --keytab", "--principal", "p")
 
     def test_key_and_certificate_need_each_other(self):
-        self.assert_usage_error("--key requires --cert", "--key", self.sts.key)
-        self.assert_usage_error("--cert requires --key", "--cert", self.sts.certificate)
+        self.assert_misuse("--key requires --cert", "--key", self.sts.key)
+        self.assert_misuse("--cert requires --key", "--cert", self.sts.certificate)
 
     def test_name_that_is_no_service(self):
         for name in ("HTTP", "HTTP@", "@localhost", "HTTP/", "/localhost", "HTTP@a@b"):

@@ -80,10 +80,10 @@ class WithAKey(ServiceTest):
         self.assertEqual("bearer", facts["confirmationType"])
 
     def test_key_and_certificate_need_each_other(self):
-        self.assert_fails(self.acquire("--key", self.sts.key, service=self.nowhere),
-                          USAGE, "UsageError", "--key requires --cert")
-        self.assert_fails(self.acquire("--cert", self.sts.certificate, service=self.nowhere),
-                          USAGE, "UsageError", "--cert requires --key")
+        self.assert_misused(self.acquire("--key", self.sts.key, service=self.nowhere),
+                            "acquire password", "--key requires --cert")
+        self.assert_misused(self.acquire("--cert", self.sts.certificate, service=self.nowhere),
+                            "acquire password", "--cert requires --key")
 
     def test_passphrase_and_password_may_follow_each_other_on_standard_input(self):
         key = self.encrypted_key("key-secret")

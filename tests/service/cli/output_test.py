@@ -141,6 +141,16 @@ class StandardOutput(ServiceTest):
         self.assertEqual((-signal.SIGPIPE, b""), (result.returncode, result.stderr))
 
 
+class NoArguments(TerminalTest):
+    def test_show_a_terminal_the_help(self):
+        process = self.start_with_terminal_error()
+        self.assertEqual("", process.communicate(timeout=120)[0])
+        self.assertEqual(USAGE, process.returncode)
+        self.assertEqual(
+            ssoclient("--help").out + ssoclient().err,
+            self.read_what_is_there().decode().replace("\r\n", "\n"))
+
+
 class KeptOrNot(TerminalTest):
     """A terminal is told when there will be nothing left of a token."""
 

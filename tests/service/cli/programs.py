@@ -53,6 +53,11 @@ class ProgramTest(unittest.TestCase):
         self.assertEqual("", result.out)
         self.assertEqual(code, result.code)
 
+    def assert_misused(self, result, command, message):
+        """The command line itself is wrong, and the line says where its rules are."""
+        self.assert_fails(result, USAGE, "UsageError",
+                          f"{message} (see: {' '.join(['ssoclient', *command.split()])} --help)")
+
     def assert_fails_matching(self, result, code, class_name, pattern):
         self.assertRegex(result.err, rf"\Assoclient: {class_name}: {pattern}\n\Z")
         self.assertEqual(1, result.err.count("\n"))

@@ -138,7 +138,7 @@ class KeyPassphrasePrompt(TerminalTest):
         self.answer(self.PROMPT, "wrong-secret")
         _, err = process.communicate(timeout=120)
         self.assertEqual(
-            (USAGE, "ssoclient: UsageError: cannot use the private key: "
+            (USAGE, f"ssoclient: UsageError: cannot use the private key `{self.key}': "
              "Cannot read the private key: the passphrase is wrong\n"), (process.returncode, err))
 
 

@@ -43,26 +43,96 @@ class Help(unittest.TestCase):
         result = ssoclient("--version")
         self.assertEqual((0, ""), (result.code, result.err))
         self.assertRegex(result.out, r"\Assoclient \d+\.\d+\.\d+\n\Z")
+        self.assertEqual(result, ssoclient("version"))
+
+    def test_by_word(self):
+        for command in ("", "acquire", "acquire password", "inspect"):
+            with self.subTest(command=command):
+                words = command.split()
+                self.assertEqual(ssoclient(*words, "--help"), ssoclient("help", *words))
+
+    def test_of_an_unknown_command(self):
+        result = ssoclient("help", "acquire", "pasword")
+        self.assertEqual((USAGE, ""), (result.code, result.out))
+        self.assertEqual("ssoclient: UsageError: ssoclient acquire has no command pasword; did you "
+                         "mean password? (see: ssoclient acquire --help)\n", result.err)
 
 
 class UsageErrors(ProgramTest):
     def assert_usage_error(self, pattern, *arguments):
         self.assert_fails_matching(ssoclient(*arguments), USAGE, "UsageError", pattern)
 
+    def assert_misuse(self, command, message, *arguments):
+        self.assert_misused(ssoclient(*command.split(), *arguments), command, message)
+
     def test_without_a_command(self):
-        self.assert_usage_error("A subcommand is required")
+        self.assert_misuse("", "ssoclient needs a command: acquire, renew, validate, inspect")
+        self.assert_misuse("acquire", "ssoclient acquire needs a command: password, certificate, "
+                           "token, gss")
 
-    def test_unknown_command(self):
-        for command in ((), ("acquire",)):
-            with self.subTest(command=command):
-                self.assert_usage_error("The following argument was not expected: wish",
-                                        *command, "wish")
+    def test_command_that_is_nearly_one(self):
+        self.assert_misuse("", "ssoclient has no command aquire; did you mean acquire?", "aquire")
+        self.assert_misuse("acquire", "ssoclient acquire has no command cert; did you mean "
+                           "certificate?", "cert")
 
-    def test_acquire_without_a_way(self):
-        self.assert_usage_error("A subcommand is required", "acquire")
+    def test_unknown_command_is_not_shown(self):
+        self.assert_misuse("", "ssoclient has no such command, only acquire, renew, validate, "
+                           "inspect", "SECRET")
+        self.assert_misuse("acquire", "ssoclient acquire has no such command, only password, "
+                           "certificate, token, gss", "SECRET", "SECRET")
 
     def test_unknown_option(self):
-        self.assert_usage_error(".*--wish.*", "inspect", "x", "--trust", "y", "--wish")
+        for option, neighbour in (("--wish", ""), ("--trusts", "; did you mean --trust?"),
+                                  ("--truts", "; did you mean --trust?"),
+                                  ("--tolerance", "; did you mean --clock-tolerance?"),
+                                  ("--jsn", "; did you mean --json?"), ("--js", ""), ("-j", "")):
+            with self.subTest(option=option):
+                self.assert_misuse("inspect", f"ssoclient inspect has no option {option}"
+                                   f"{neighbour}", "x", "--trust", "y", option)
+
+    def test_unknown_option_comes_before_what_is_missing_or_bad(self):
+        for arguments in ((), ("--clock-tolerance", "x"), ("--trust",)):
+            with self.subTest(arguments=arguments):
+                self.assert_misuse("inspect", "ssoclient inspect has no option --wish",
+                                   "--wish", *arguments)
+        self.assert_misuse("", "ssoclient has no option --wish", "--wish", "acquire", "password")
+
+    # Where a secret may have been typed by mistake, and what is said.
+    SECRETS = (
+        (("--password", "SECRET"),
+         "ssoclient acquire password has no option --password; did you mean --password-file?"),
+        (("--password=SECRET",),
+         "ssoclient acquire password has no option --password; did you mean --password-file?"),
+        (("--key-passphrase", "SECRET"), "ssoclient acquire password has no option "
+         "--key-passphrase; did you mean --key-passphrase-file?"),
+        (("-p", "SECRET"), "ssoclient acquire password has no option -p"),
+        (("-pSECRET",), "ssoclient acquire password has no option -p"),
+        (("--SECRET",), "ssoclient acquire password has no such option, which is not shown: "
+         "it may be a secret"),
+        (("--user", "u", "SECRET"), "there is an argument too many after --user, not shown "
+         "because it may be a secret"),
+        (("--bearer", "--", "SECRET"), "there is an argument too many after --bearer, not shown "
+         "because it may be a secret"),
+        (("SECRET",), "there is an argument too many, not shown because it may be a secret"),
+        (("--bearer=SECRET",), "--bearer takes no value"))
+
+    def test_secrets_are_not_shown(self):
+        rest = ("--url", "https://127.0.0.1:1/sts", "--trust", "t", "--user", "u")
+        for words, message in self.SECRETS:
+            for arguments in (words, (*words, *rest)):
+                with self.subTest(arguments=arguments):
+                    result = ssoclient("acquire", "password", *arguments)
+                    self.assertNotIn("SECRET", result.err)
+                    self.assert_misused(result, "acquire password", message)
+
+    def test_number_with_a_unit(self):
+        for value, said in (("1h", ": write 3600"), ("90m", ": write 5400"), ("7d", ": write 604800"),
+                            ("30s", ": write 30"), ("h", ""), ("1w", ""), ("1h30m", ""),
+                            ("1.5h", ""), ("-1h", ""), ("99999999999999999999h", ""), ("", "")):
+            with self.subTest(value=value):
+                self.assert_misuse(
+                    "inspect", f"--clock-tolerance: `{value}' is not a number of seconds{said}",
+                    "x", "--trust", "y", "--clock-tolerance", value)
 
     def test_missing_options(self):
         service = {"--url": "https://127.0.0.1:1/sts", "--trust": STS_CERTIFICATE}
@@ -78,9 +148,9 @@ class UsageErrors(ProgramTest):
                 with self.subTest(command=command, missing=missing):
                     rest = [part for name, value in options.items() if name != missing
                             for part in (name, value)]
-                    self.assert_usage_error(f"{missing} is required", *command.split(), *rest)
-        self.assert_usage_error("--trust is required", "inspect", "x")
-        self.assert_usage_error("FILE is required", "inspect", "--trust", STS_CERTIFICATE)
+                    self.assert_misuse(command, f"{missing} is required", *rest)
+        self.assert_misuse("inspect", "--trust is required", "x")
+        self.assert_misuse("inspect", "FILE is required", "--trust", STS_CERTIFICATE)
 
     def test_clock_tolerance_that_is_no_tolerance(self):
         for value in ("-1", "3153600001", "ten", "9223372036854775808", ""):
@@ -102,8 +172,7 @@ class UsageErrors(ProgramTest):
     def assert_value_is_refused(self, message, command, option, value):
         options = {**self.COMMANDS[command], option: value}
         words = [word for pair in options.items() for word in pair]
-        self.assert_fails(ssoclient(*command.split(), *words), USAGE, "UsageError",
-                          f"{option}: {message}")
+        self.assert_misuse(command, f"{option}: {message}", *words)
 
     def test_empty_value_is_not_the_same_as_no_option(self):
         common = ("--trust", "--ca", "--peer", "--key", "--cert", "--out")
@@ -117,7 +186,7 @@ class UsageErrors(ProgramTest):
             for option in options:
                 with self.subTest(command=command, option=option):
                     self.assert_value_is_refused("must not be empty", command, option, "")
-        self.assert_usage_error("FILE: must not be empty", "inspect", "", "--trust", "t")
+        self.assert_misuse("inspect", "FILE: must not be empty", "", "--trust", "t")
 
     def test_name_with_control_characters(self):
         for command, option in (("acquire password", "--user"),

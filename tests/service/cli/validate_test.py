@@ -51,9 +51,8 @@ class Validate(ServiceTest):
                                    "HttpException", ".+")
 
     def test_takes_no_key(self):
-        self.assert_fails(
-            self.validate("x", "--key", self.sts.key, service=self.nowhere), USAGE, "UsageError",
-            f"The following arguments were not expected: {self.sts.key} --key")
+        self.assert_misused(self.validate("x", "--key", self.sts.key, service=self.nowhere),
+                            "validate", "ssoclient validate has no option --key")
 
     def test_verbose_tells_the_result(self):
         token = self.token_file(self.acquire)
