@@ -30,16 +30,6 @@ const ElementNode& RequireResponse(const ElementNode& soapBody)
                : RequireDescendant(soapBody, {"RequestSecurityTokenResponseCollection", Response});
 }
 
-// A comment or an element in the text would silently cut it.
-std::string GetWholeText(const ElementNode* element)
-{
-    const Quillon::Xml::Node* const child = element != nullptr ? element->GetFirstChild() : nullptr;
-    if (child != nullptr && (AsText(child) == nullptr || child->GetNextSibling() != nullptr)) {
-        ThrowUnexpectedFormat();
-    }
-    return GetElementText(element);
-}
-
 Leg DecodeLeg(const std::string& text)
 {
     Leg leg;
@@ -53,7 +43,7 @@ Leg DecodeLeg(const std::string& text)
 
 void RequireSamlToken(const ElementNode& response)
 {
-    const std::string tokenType = GetWholeText(response.FindChildElement("TokenType"));
+    const std::string tokenType = GetElementText(response.FindChildElement("TokenType"));
     if (tokenType != Wire::SamlNamespace) {
         throw SsoException(
             "Invalid token type: " + tokenType + " (expected: " + Wire::SamlNamespace);
@@ -107,7 +97,7 @@ SPNegoResponse ExtractSPNegoResponse(const ElementNode& soapBody)
     if (!response.GetAttribute(Context, result.contextId)) {
         ThrowUnexpectedFormat();
     }
-    result.leg = DecodeLeg(GetWholeText(exchange));
+    result.leg = DecodeLeg(GetElementText(exchange));
     if (const ElementNode* assertion = FindDescendant(response, {RequestedToken, "Assertion"})) {
         RequireSamlToken(response);
         result.token = ToAssertionText(*assertion);

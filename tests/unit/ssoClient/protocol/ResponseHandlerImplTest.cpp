@@ -219,6 +219,83 @@ TEST(HandleValidateSubjectResponse, RefusesCodeThatDoesNotStartWithText)
     }
 }
 
+// A comment ends the text that an element starts with.
+TEST(HandleValidateSubjectResponse, LooksAtTheFirstChildOfTheCodeOnly)
+{
+    EXPECT_TRUE(Validate(StatusReply("<wst:Code>" WST "/status/valid<!-- c -->x</wst:Code>")));
+    EXPECT_FALSE(Validate(StatusReply("<wst:Code>" WST "/status/invalid<x/></wst:Code>")));
+    EXPECT_EQ(
+        GetFailure(Validate, StatusReply("<wst:Code>x<!-- c -->" WST "/status/valid</wst:Code>")),
+        UnexpectedFormat);
+}
+
+TEST(ProcessResponse, LooksAtTheFirstBodyOnly)
+{
+    const std::string empty = "<S:Body/>";
+    const std::string verdict = "<S:Body><RequestSecurityTokenResponse><Status><Code>" WST
+                                "/status/valid</Code></Status></RequestSecurityTokenResponse>"
+                                "</S:Body>";
+    const std::string fault = "<S:Body><S:Fault><faultcode>S:Server</faultcode></S:Fault></S:Body>";
+    const auto envelope = [](const std::string& bodies) {
+        return "<S:Envelope xmlns:S=\"" SOAP "\">" + bodies + "</S:Envelope>";
+    };
+    EXPECT_EQ(GetFailure(Validate, envelope(empty + verdict)), UnexpectedFormat);
+    EXPECT_TRUE(Validate(envelope(verdict + empty)));
+    EXPECT_TRUE(Validate(envelope(verdict + fault)));
+    EXPECT_EQ(
+        GetFailure(Validate, envelope(fault + verdict)),
+        "SsoException: Unexpected SOAP fault: S:Server; request failed.");
+}
+
+TEST(ProcessResponse, LooksAtTheFirstFaultAndTheFirstFaultcodeOnly)
+{
+    const std::string server = "<faultcode>S:Server</faultcode>";
+    const std::string client = "<faultcode>S:Client</faultcode>";
+    const char expected[] = "SsoException: Unexpected SOAP fault: S:Server; request failed.";
+    EXPECT_EQ(GetFailure(Acquire, Fault(server + client)), expected);
+    EXPECT_EQ(
+        GetFailure(
+            Acquire,
+            Envelope("<S:Fault>" + server + "</S:Fault><S:Fault>" + client + "</S:Fault>")),
+        expected);
+}
+
+TEST(ProcessResponse, LooksAtTheFirstChildOfTheFaultcodeOnly)
+{
+    EXPECT_EQ(
+        GetFailure(Acquire, FaultWithCode("wst:FailedAuthentication<!-- c -->Not")),
+        "InvalidCredentialsException: Authentication failed");
+    EXPECT_EQ(
+        GetFailure(Acquire, FaultWithCode("S:Server<x/>wst:FailedAuthentication")),
+        "SsoException: Unexpected SOAP fault: S:Server; request failed.");
+    EXPECT_EQ(
+        GetFailure(Acquire, FaultWithCode("<!-- c -->wst:FailedAuthentication")),
+        "SsoException: Invalid SOAP response: missing faultcode.");
+}
+
+TEST(ProcessResponse, LooksAtTheFirstChildOfTheFaultstringOnly)
+{
+    const auto judge = [](const std::string& faultString) {
+        return GetFailure(
+            Acquire,
+            FaultWithCode(
+                "wst:FailedAuthentication", "<faultstring>" + faultString + "</faultstring>"));
+    };
+    EXPECT_EQ(
+        judge("Wrong <!-- c -->password"),
+        "InvalidCredentialsException: Authentication failed: Wrong ");
+    EXPECT_EQ(
+        judge("<!-- c -->Wrong password"), "InvalidCredentialsException: Authentication failed");
+    EXPECT_EQ(judge(" "), "InvalidCredentialsException: Authentication failed:  ");
+    EXPECT_EQ(
+        GetFailure(
+            Acquire,
+            FaultWithCode(
+                "wst:FailedAuthentication",
+                "<faultstring>one</faultstring><faultstring>two</faultstring>")),
+        "InvalidCredentialsException: Authentication failed: one");
+}
+
 TEST(ProcessResponse, ReportsWhatIsNotXml)
 {
     const std::string replies[] = {"", "<html><br></html>", "no markup", "<!DOCTYPE x><x/>"};

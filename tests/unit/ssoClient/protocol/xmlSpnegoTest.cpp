@@ -278,25 +278,46 @@ TEST(HandleSPNegoResponse, RefusesLegThatIsNotBase64)
     }
 }
 
-TEST(HandleSPNegoResponse, RefusesALegThatIsNotOneText)
+TEST(HandleSPNegoResponse, TakesTheTextThatALegStartsWith)
 {
-    for (const char* const content :
-         {"aGVs<!-- x -->bG8=",
-          "<!-- x -->aGVsbG8=",
-          "aGVsbG8=<!-- x -->",
-          "<x/>aGVsbG8=",
-          "<x/>"}) {
-        EXPECT_EQ(GetReplyFailure(Response(Exchange(content))), UnexpectedFormat) << content;
-    }
+    EXPECT_EQ(Handle(Reply(Response(Exchange("aGVsbG8=<!-- x -->")))).leg, Hello);
+    EXPECT_EQ(Handle(Reply(Response(Exchange("aGVsbG8=<x/>b3RoZXI=")))).leg, Hello);
     EXPECT_EQ(Handle(Reply(Response(Exchange("aGVs<![CDATA[bG8=]]>")))).leg, Hello);
+    EXPECT_EQ(
+        GetReplyFailure(Response(Exchange("aGV<!-- x -->sbG8="))),
+        "SsoException: Base64 format exception");
 }
 
-TEST(HandleSPNegoResponse, RefusesATokenTypeThatIsNotOneText)
+TEST(HandleSPNegoResponse, HasNoLegIfTheExchangeDoesNotStartWithText)
+{
+    for (const char* const content : {"<!-- x -->aGVsbG8=", "<x/>aGVsbG8=", "<x>?</x>"}) {
+        EXPECT_TRUE(Handle(Reply(Response(Exchange(content)))).leg.empty()) << content;
+    }
+}
+
+TEST(HandleSPNegoResponse, LooksAtTheFirstExchangeOnly)
+{
+    EXPECT_EQ(Handle(Reply(Response(Exchange("aGVsbG8=") + Exchange("b3RoZXI=")))).leg, Hello);
+}
+
+TEST(HandleSPNegoResponse, TakesALegOfAnyValueType)
+{
+    EXPECT_EQ(
+        Handle(Reply(Response("<w:BinaryExchange ValueType='urn:foreign' EncodingType='urn:hex'>"
+                              "aGVsbG8=</w:BinaryExchange>")))
+            .leg,
+        Hello);
+}
+
+TEST(HandleSPNegoResponse, TakesTheTextThatATokenTypeStartsWith)
 {
     for (const char* const end : {"<!-- x -->", "<!-- x -->#other", "<x/>"}) {
-        EXPECT_EQ(GetReplyFailure(Response(Token(std::string(SamlType) + end))), UnexpectedFormat)
+        EXPECT_EQ(Handle(Reply(Response(Token(std::string(SamlType) + end)))).token, AssertionText)
             << end;
     }
+    EXPECT_EQ(
+        GetReplyFailure(Response(Token(std::string("<!-- x -->") + SamlType))),
+        "SsoException: Invalid token type:  (expected: urn:oasis:names:tc:SAML:2.0:assertion");
 }
 
 TEST(HandleSPNegoResponse, RefusesAnyOtherTokenType)
