@@ -8,7 +8,6 @@
 #include <cstdio>
 #include <cstring>
 #include <ctime>
-#include <limits>
 
 namespace Quillon::Crypto {
 
@@ -43,7 +42,12 @@ System::DateTime ToDateTime(const ASN1_TIME* time)
         fields.tm_hour,
         fields.tm_min,
         fields.tm_sec);
-    return System::DateTime(text.data());
+    try {
+        return System::DateTime(text.data());
+    } catch (const System::DateTimeFormatException& error) {
+        // GeneralizedTime has the year 0 [RFC 5280 4.1.2.5.2], a DateTime has not.
+        throw CryptoException(std::string("The certificate has an unusable date: ") + error.what());
+    }
 }
 
 class CertificateImpl final : public Certificate
@@ -109,7 +113,7 @@ Ref<const Certificate> CreateCertificate(const void* bytes, std::size_t length)
 {
     const auto* begin = static_cast<const unsigned char*>(bytes);
     const unsigned char* next = begin;
-    if (length > static_cast<std::size_t>(std::numeric_limits<int>::max())) {
+    if (length > MaxReadableBytes) {
         throw CryptoException("Not a certificate: " + std::to_string(length) + " bytes");
     }
     const ErrorQueueScope errors;
@@ -146,7 +150,7 @@ std::string GetSerialNumber(const Certificate& certificate)
 std::list<Ref<const Certificate>> ParsePemCertificates(std::string_view pem)
 {
     const ErrorQueueScope errors;
-    const BioOwner in(BIO_new_mem_buf(pem.data(), static_cast<int>(pem.size())));
+    const BioOwner in = OpenForReading(pem);
     std::list<Ref<const Certificate>> certificates;
     char* name = nullptr;
     char* header = nullptr;

@@ -20,6 +20,15 @@ std::string GetOpenSslError()
     return reason != nullptr ? reason : "error " + std::to_string(code);
 }
 
+BioOwner OpenForReading(std::string_view text)
+{
+    if (text.size() > MaxReadableBytes) {
+        throw CryptoException(
+            "A text of " + std::to_string(text.size()) + " bytes is too long to be read");
+    }
+    return BioOwner(BIO_new_mem_buf(text.data(), static_cast<int>(text.size())));
+}
+
 const EVP_MD* GetDigest(HashAlgorithm algorithm)
 {
     // A fetch walks the providers; the first one is kept, and its result lives as long as the

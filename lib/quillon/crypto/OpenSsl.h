@@ -20,8 +20,11 @@
 #include <openssl/x509_vfy.h>
 #include <openssl/x509v3.h>
 
+#include <cstddef>
+#include <limits>
 #include <memory>
 #include <string>
+#include <string_view>
 
 namespace Quillon::Crypto {
 
@@ -56,6 +59,12 @@ using StoreContextOwner = std::unique_ptr<OSSL_STORE_CTX, OpenSslDeleter<OSSL_ST
 using StoreInfoOwner = std::unique_ptr<OSSL_STORE_INFO, OpenSslDeleter<OSSL_STORE_INFO_free>>;
 using UiMethodOwner = std::unique_ptr<UI_METHOD, OpenSslDeleter<UI_destroy_method>>;
 using SslContextOwner = std::unique_ptr<SSL_CTX, OpenSslDeleter<SSL_CTX_free>>;
+
+/** The longest text that OpenSSL can be given: it counts in `int`. */
+inline constexpr std::size_t MaxReadableBytes = std::numeric_limits<int>::max();
+
+/** `text` for OpenSSL to read in place; null if there is no memory. @throws CryptoException */
+BioOwner OpenForReading(std::string_view text);
 
 /** The reason of the latest error on OpenSSL's queue of this thread, for a message. */
 std::string GetOpenSslError();

@@ -126,7 +126,7 @@ private:
 
 KeyOwner DecodePem(std::string_view pem, PassphraseSource& passphrase)
 {
-    const BioOwner in(BIO_new_mem_buf(pem.data(), static_cast<int>(pem.size())));
+    const BioOwner in = OpenForReading(pem);
     return KeyOwner(
         in == nullptr ? nullptr
                       : PEM_read_bio_PrivateKey(
@@ -164,6 +164,9 @@ EVP_PKEY* GetKey(const PrivateKey& key) noexcept
 Ref<const PrivateKey> CreatePrivateKey(
     std::string_view pemOrDer, const PassphraseCallback& passphrase)
 {
+    if (pemOrDer.size() > MaxReadableBytes) {
+        throw CryptoException("Not a private key: " + std::to_string(pemOrDer.size()) + " bytes");
+    }
     const ErrorQueueScope errors;
     PassphraseSource source(passphrase);
     const bool isPem = pemOrDer.find("-----BEGIN ") != std::string_view::npos;

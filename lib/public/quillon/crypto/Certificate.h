@@ -32,6 +32,7 @@ public:
     /** The SHA-256 digest of the DER encoding in lower-case hexadecimal. */
     virtual std::string GetFingerprint() const = 0;
 
+    /** @throws CryptoException  the date is malformed, or of the year 0. */
     virtual System::DateTime GetNotBefore() const = 0;
     virtual System::DateTime GetNotAfter() const = 0;
 };
@@ -50,7 +51,8 @@ QUILLON_API std::string GetSerialNumber(const Certificate& certificate);
 /**
  * Reads all certificates of a PEM text [RFC 7468], in order; other PEM blocks are passed over.
  *
- * @throws CryptoException  the text holds no certificate, or one that cannot be decoded.
+ * @throws CryptoException  the text holds no certificate, or one that cannot be decoded, or has
+ *                          2 GiB or more.
  */
 QUILLON_API std::list<Ref<const Certificate>> ParsePemCertificates(std::string_view pem);
 

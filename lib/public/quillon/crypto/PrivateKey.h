@@ -41,7 +41,8 @@ using PassphraseCallback = boost::function<std::string()>;
 /**
  * Reads a private key from PEM (PKCS #8, plain or encrypted, or the traditional forms) or DER.
  *
- * @throws CryptoException  not a private key, or the passphrase is wrong or missing.
+ * @throws CryptoException  not a private key, the passphrase is wrong or missing, or the text has
+ *                          2 GiB or more.
  */
 QUILLON_API Ref<const PrivateKey> CreatePrivateKey(
     std::string_view pemOrDer, const PassphraseCallback& passphrase = PassphraseCallback());

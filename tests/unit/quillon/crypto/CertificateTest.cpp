@@ -4,6 +4,9 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <stdexcept>
+
 namespace Quillon::Crypto {
 
 namespace {
@@ -83,6 +86,39 @@ TEST(Certificate, TellsWhatOpenSslTells)
     EXPECT_EQ(
         certificate->GetFingerprint(),
         ToPlainHex(RunOpenSsl("x509 -noout -fingerprint -sha256 -in " + file)));
+}
+
+/** The certificate of `sts`, whose last day lies in 2126, with another year in its place. */
+Ref<const Certificate> MakeEndingIn(const std::string& year)
+{
+    std::vector<unsigned char> der = LoadCertificate("sts")->GetEncoded();
+    const std::string old = "2126";
+    const auto place = std::search(der.begin(), der.end(), old.begin(), old.end());
+    if (place == der.end()) {
+        throw std::logic_error("the certificate does not end in 2126");
+    }
+    std::copy(year.begin(), year.end(), place);
+    return CreateCertificate(der.data(), der.size());
+}
+
+TEST(Certificate, HasNoDateInTheYearZero)
+{
+    EXPECT_EQ(MakeEndingIn("0001")->GetNotAfter().ToString().substr(0, 4), "0001");
+    EXPECT_EQ(
+        GetCryptoError([] { MakeEndingIn("0000")->GetNotAfter(); }).substr(0, 93),
+        "The certificate has an unusable date: Not a date and time of the years 1 to 9999: "
+        "'0000-10-27");
+}
+
+TEST(ParsePemCertificates, RefusesATextThatOpenSslCannotCount)
+{
+    const HugeText text;
+    EXPECT_EQ(
+        GetCryptoError([&] { ParsePemCertificates(text.Get()); }),
+        "A text of 2147483648 bytes is too long to be read");
+    EXPECT_EQ(
+        GetCryptoError([&] { CreateCertificate(text.Get().data(), text.Get().size()); }),
+        "Not a certificate: 2147483648 bytes");
 }
 
 TEST(Certificate, DescribesItsKey)

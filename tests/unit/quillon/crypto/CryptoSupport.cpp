@@ -1,8 +1,11 @@
 #include "CryptoSupport.h"
 
+#include <sys/mman.h>
+
 #include <algorithm>
 #include <array>
 #include <cctype>
+#include <cerrno>
 #include <cstdio>
 #include <cstdlib>
 #include <filesystem>
@@ -10,6 +13,7 @@
 #include <memory>
 #include <sstream>
 #include <stdexcept>
+#include <system_error>
 
 namespace Quillon::Crypto {
 
@@ -98,6 +102,19 @@ void TemporaryFolder::WriteFile(const std::string& name, const std::string& cont
 std::string TemporaryFolder::ReadFile(const std::string& name) const
 {
     return ReadWholeFile(GetPath(name));
+}
+
+HugeText::HugeText()
+    : _memory(mmap(nullptr, Size, PROT_READ, MAP_PRIVATE | MAP_ANONYMOUS | MAP_NORESERVE, -1, 0))
+{
+    if (_memory == MAP_FAILED) {
+        throw std::system_error(errno, std::generic_category(), "mmap");
+    }
+}
+
+HugeText::~HugeText()
+{
+    munmap(_memory, Size);
 }
 
 } // namespace Quillon::Crypto

@@ -2,7 +2,9 @@
 
 #include "quillon/crypto/PublicKey.h"
 
+#include <cstddef>
 #include <string>
+#include <string_view>
 #include <vector>
 
 // What the tests of keys and certificates share.
@@ -37,6 +39,22 @@ public:
 
 private:
     std::string _path;
+};
+
+/** 2 GiB of zero bytes, which take no memory as long as nobody writes to them. */
+class HugeText
+{
+public:
+    HugeText();
+    ~HugeText();
+    HugeText(const HugeText&) = delete;
+    HugeText& operator=(const HugeText&) = delete;
+
+    std::string_view Get() const { return {static_cast<const char*>(_memory), Size}; }
+
+private:
+    static constexpr std::size_t Size = std::size_t{1} << 31U;
+    void* _memory;
 };
 
 /** The message of the `CryptoException` that `action` raises; "accepted" if it does not. */

@@ -6,6 +6,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <array>
 #include <atomic>
 #include <stdexcept>
 #include <thread>
@@ -73,6 +74,44 @@ TEST(VerifyDigest, AcceptsItsOwnKeyAndNoOther)
 }
 
 // [XMLDSIG 6.4.3]: r and s, each as long as the curve's order.
+/** The order of the group of P-256 [FIPS 186-4 D.1.2.3], most significant byte first. */
+constexpr std::array<unsigned char, 32> OrderOfP256{
+    0xff, 0xff, 0xff, 0xff, 0x00, 0x00, 0x00, 0x00, 0xff, 0xff, 0xff, 0xff, 0xff, 0xff, 0xff, 0xff,
+    0xbc, 0xe6, 0xfa, 0xad, 0xa7, 0x17, 0x9e, 0x84, 0xf3, 0xb9, 0xca, 0xc2, 0xfc, 0x63, 0x25, 0x51};
+
+/** r and n - s of a signature's r and s. */
+std::vector<unsigned char> Negate(const std::vector<unsigned char>& signature)
+{
+    std::vector<unsigned char> negated = signature;
+    int borrow = 0;
+    for (std::size_t i = 1; i <= OrderOfP256.size(); ++i) {
+        const int difference =
+            OrderOfP256.at(OrderOfP256.size() - i) - signature.at(signature.size() - i) - borrow;
+        negated.at(signature.size() - i) = static_cast<unsigned char>(difference & 0xff);
+        borrow = difference < 0 ? 1 : 0;
+    }
+    return negated;
+}
+
+// Anyone can make a second signature value of one that they see, so a signed text is no key.
+TEST(VerifyDigest, AcceptsBothFormsOfAnEcdsaSignature)
+{
+    const auto verify = [](const std::vector<unsigned char>& signature) {
+        return GetPublicKey(LoadCertificate("sts-p256"))
+            .VerifyDigest(
+                HashAlgorithm::SHA256, ToBytes(Digest32), signature.data(), signature.size());
+    };
+    const std::vector<unsigned char> signature =
+        LoadKey("sts-p256")->SignDigest(HashAlgorithm::SHA256, ToBytes(Digest32));
+    const std::vector<unsigned char> other = Negate(signature);
+    EXPECT_NE(signature, other);
+    EXPECT_TRUE(verify(signature));
+    EXPECT_TRUE(verify(other));
+    std::vector<unsigned char> third = other;
+    third[0] ^= 1U;
+    EXPECT_FALSE(verify(third));
+}
+
 TEST(SignDigest, GivesEcdsaValuesOfFixedLength)
 {
     const std::string digest(64, 'd');
@@ -192,6 +231,14 @@ TEST(CreatePrivateKey, RefusesWhatIsNoPrivateKey)
             GetCryptoError([&] { CreatePrivateKey(text); }),
             testing::StartsWith("Cannot read the private key: "));
     }
+}
+
+TEST(CreatePrivateKey, RefusesATextThatOpenSslCannotCount)
+{
+    const HugeText text;
+    EXPECT_EQ(
+        GetCryptoError([&] { CreatePrivateKey(text.Get()); }),
+        "Not a private key: 2147483648 bytes");
 }
 
 TEST(LoadPrivateKey, RefusesWhereThereIsNone)
