@@ -1,5 +1,6 @@
 #include "quillon/xml/Parser.h"
 
+#include "core/Quote.h"
 #include "xml/SourceCheck.h"
 #include "xml/TreeBuilder.h"
 
@@ -38,6 +39,11 @@ std::string CleanMessage(const char* message)
 {
     std::string text = message == nullptr ? "unknown error" : message;
     text.erase(text.find_last_not_of('\n') + 1);
+    // It may repeat names of the document, which are long only to be a nuisance.
+    constexpr std::size_t MaxLength = 500;
+    if (text.size() > MaxLength) {
+        text.replace(MaxLength, std::string::npos, "...");
+    }
     for (char& byte : text) {
         if (static_cast<unsigned char>(byte) < 0x20U) {
             byte = ' ';
@@ -141,13 +147,12 @@ private:
     {
         const std::string_view version = ToView(_context.version);
         if (version != "1.0") {
-            throw XMLParseException("XML version '" + std::string(version) + "' is not supported");
+            throw XMLParseException("XML version " + Quote(version) + " is not supported");
         }
         const xmlChar* declared =
             _context.encoding != nullptr ? _context.encoding : _context.input->encoding;
         if (declared != nullptr && xmlStrcasecmp(declared, BAD_CAST "UTF-8") != 0) {
-            throw XMLParseException(
-                "Encoding '" + std::string(ToView(declared)) + "' is not UTF-8");
+            throw XMLParseException("Encoding " + Quote(ToView(declared)) + " is not UTF-8");
         }
     }
 

@@ -184,6 +184,21 @@ TEST(Parse, RefusesAnotherXmlVersion)
         testing::HasSubstr("XML version '1.1' is not supported"));
 }
 
+TEST(Parse, SaysNoMoreThanALineOfADocumentThatItRefuses)
+{
+    const std::string name = Repeat("a", 49'000);
+    for (const std::string& text :
+         {"<?xml version='1." + Repeat("1", 100'000) + "'?><r/>",
+          "<?xml version='1.0' encoding='" + name + "'?><r/>",
+          "<" + name + "></r>",
+          "<r>&" + name + ";</r>",
+          "<r " + name + "='' " + name + "=''/>"}) {
+        const std::string error = GetParseError(text);
+        EXPECT_NE(error, "accepted");
+        EXPECT_LT(error.size(), 600U) << error.substr(0, 100);
+    }
+}
+
 TEST(Parse, RefusesOctetsThatAreNotUtf8)
 {
     const std::vector<std::string> malformed{
