@@ -71,9 +71,10 @@ std::string Nested(std::size_t depth)
     return Repeat("<a>", depth) + Repeat("</a>", depth);
 }
 
+/** Key information may hold elements of any namespace but none. */
 std::string InKeyInfo(const std::string& content)
 {
-    return "<ds:KeyInfo>" + content + "</ds:KeyInfo>";
+    return "<ds:KeyInfo xmlns=\"urn:other\">" + content + "</ds:KeyInfo>";
 }
 
 const char BeforeSubject[] = "<saml:Subject>";

@@ -209,9 +209,11 @@ class Refusals(KerberosTest):
     def test_token_signed_by_another_than_the_trusted(self):
         result = self.acquire_by_gss("--ccache", self.ccache, service=[
             "--url", self.sts.url, "--ca", self.sts.ca, "--trust", self.sts.certificate])
-        self.assert_fails(result, REFUSED, "InvalidSignatureException",
-                          "Signature verification error. The signing certificate is not one of the "
-                          "1 trusted certificates")
+        certificate = r"'[^']+' \(SHA-256 [0-9a-f]{64}\)"
+        self.assert_fails_matching(
+            result, REFUSED, "InvalidSignatureException",
+            "Signature verification error. The signing certificate is not one of the "
+            f"1 trusted certificates; the signature names {certificate}; trusted: {certificate}")
 
 
 class Verbose(KerberosTest):

@@ -188,10 +188,17 @@ TEST_P(FailedTokenOperation, ReportsTokenWithoutSignature)
 TEST_P(FailedTokenOperation, ReportsTokenOfAnotherSigner)
 {
     config.trustedCertificates = GetTestCertificates("foreign");
+    // The two have the same subject, so only their fingerprints tell them apart.
+    const auto describe = [](const std::string& name) {
+        const auto certificate = GetTestCertificates(name).front();
+        return "'" + certificate->GetSubjectName() + "' (SHA-256 " + certificate->GetFingerprint()
+               + ")";
+    };
     EXPECT_EQ(
         RunOn(*MakeService()),
         "InvalidSignatureException: Signature verification error. The signing certificate is not "
-        "one of the 1 trusted certificates");
+        "one of the 1 trusted certificates; the signature names "
+            + describe("sts") + "; trusted: " + describe("foreign"));
 }
 
 TEST_P(FailedTokenOperation, ReportsEveryTokenAsUnsignedIfNobodyIsTrusted)

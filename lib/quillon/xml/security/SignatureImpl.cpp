@@ -61,11 +61,13 @@ CanonicalizationMethod CheckTransforms(const std::vector<AlgorithmUse>& transfor
                                      + " stands where enveloped-signature must");
     }
     RequireNoChild(transforms.front());
+    const CanonicalizationMethod method =
+        transforms.size() == 1 ? CanonicalizationMethod() : GetCanonicalization(transforms[1]);
     if (transforms.size() > 2) {
         throw XmlSecurityException(
             "Transform " + Quote(transforms[2].identifier) + " follows a canonicalization");
     }
-    return transforms.size() == 1 ? CanonicalizationMethod() : GetCanonicalization(transforms[1]);
+    return method;
 }
 
 CheckedReference CheckReference(const ReferenceModel& reference, const ElementNode& parent)

@@ -1,7 +1,11 @@
 #include "core/Quote.h"
 #include "quillon/StringUtil.h"
 #include "quillon/xml/security/Identifiers.h"
+#include "xml/TreeWalk.h"
 #include "xml/security/SignatureModel.h"
+
+#include <algorithm>
+#include <array>
 
 namespace Quillon::Xml::Security {
 
@@ -180,25 +184,96 @@ void ReadSignedInfo(const ElementNode& element, SignatureModel& model)
     }
 }
 
+/** Whether `element` may stand where a schema says `##other`: in a namespace, and not in ours. */
+bool IsForeign(const ElementNode& element) noexcept
+{
+    std::string_view namespaceUri;
+    return element.LookupNamespace(element.GetPrefix(), namespaceUri) && !namespaceUri.empty()
+           && namespaceUri != DsNamespace;
+}
+
+/** Refuses an element that the schema does not have among the children of `parent`. */
+template <std::size_t Count>
+void RequireAllowed(
+    const ElementNode& element,
+    const ElementNode& parent,
+    const std::array<std::string_view, Count>& names)
+{
+    const bool isNamed = std::any_of(names.begin(), names.end(), [&](std::string_view name) {
+        return element.HasQName(name, DsNamespace);
+    });
+    if (!isNamed && !IsForeign(element)) {
+        Fail("Unexpected " + Quote(element.GetName()) + " in " + Quote(parent.GetLocalName()));
+    }
+}
+
+// [XMLDSIG 4.4.4]
+constexpr std::array<std::string_view, 5> X509DataContent{
+    "X509IssuerSerial", "X509SKI", "X509SubjectName", "X509Certificate", "X509CRL"};
+
 void ReadX509Data(const ElementNode& element, KeyInfo& keyInfo)
 {
     for (ChildCursor child(element); child.Get() != nullptr; child.Advance()) {
+        RequireAllowed(*child.Get(), element, X509DataContent);
         if (child.IsAt("X509Certificate")) {
             keyInfo.certificates.push_back(ReadBase64(*child.Get()));
         }
     }
 }
 
+// [XMLDSIG 4.4]
+constexpr std::array<std::string_view, 7> KeyInfoContent{
+    "KeyName", "KeyValue", "RetrievalMethod", "X509Data", "PGPData", "SPKIData", "MgmtData"};
+
 /** Gathers the certificates; whatever else a key information may hold picks no trusted key. */
 KeyInfo ReadKeyInfo(const ElementNode& element)
 {
     KeyInfo keyInfo;
     for (ChildCursor data(element); data.Get() != nullptr; data.Advance()) {
+        RequireAllowed(*data.Get(), element, KeyInfoContent);
         if (data.IsAt("X509Data")) {
             ReadX509Data(*data.Get(), keyInfo);
         }
     }
     return keyInfo;
+}
+
+/** Refuses names whose prefix nothing declares. */
+class PrefixCheck
+{
+public:
+    void Enter(const ElementNode& element) const
+    {
+        RequireDeclared(element, element.GetPrefix());
+        for (const Attribute& attribute : element.GetAttributes()) {
+            if (!attribute.IsNamespaceDeclaration()) {
+                RequireDeclared(element, attribute.GetPrefix());
+            }
+        }
+    }
+    void Leave(const ElementNode& /*element*/) const noexcept {}
+    template <class Leaf>
+    void Visit(const Leaf& /*leaf*/) const noexcept
+    {}
+
+private:
+    static void RequireDeclared(const ElementNode& element, std::string_view prefix)
+    {
+        std::string_view namespaceUri;
+        if (!prefix.empty() && !element.LookupNamespace(prefix, namespaceUri)) {
+            Fail(Quote(element.GetName()) + " uses the undeclared prefix " + Quote(prefix));
+        }
+    }
+};
+
+/**
+ * Verifying canonicalizes what the signature signs and SignedInfo, which refuses an undeclared
+ * prefix. The rest of the signature is not canonicalized, so it is looked through here.
+ */
+void RequireDeclaredPrefixes(const ElementNode& signature, const ElementNode& signedInfo)
+{
+    PrefixCheck check;
+    WalkTree(signature, &signedInfo, check);
 }
 
 } // namespace
@@ -218,6 +293,7 @@ SignatureModel ReadSignature(const ElementNode& signature)
         model.keyInfo = ReadKeyInfo(child.Take("KeyInfo"));
     }
     child.RequireEnd();
+    RequireDeclaredPrefixes(signature, *model.signedInfo);
     return model;
 }
 

@@ -1,10 +1,52 @@
 #include "quillon/xml/security/Signature.h"
 
+#include "core/Quote.h"
+
 #include <algorithm>
 
 namespace Quillon::Xml::Security {
 
 namespace {
+
+/** Subject and fingerprint, by which people tell certificates apart. */
+std::string Describe(const Ref<const Crypto::Certificate>& certificate)
+{
+    return Quote(certificate->GetSubjectName()) + " (SHA-256 " + certificate->GetFingerprint()
+           + ")";
+}
+
+/** The same for bytes that a document calls a certificate. */
+std::string Describe(const std::vector<unsigned char>& encoded)
+{
+    try {
+        return Describe(Crypto::CreateCertificate(encoded.data(), encoded.size()));
+    } catch (const Crypto::CryptoException&) {
+        return std::to_string(encoded.size()) + " bytes that are no certificate";
+    }
+}
+
+/** The first few of `items`: a document may hold many. */
+template <class Items>
+std::string DescribeFirst(const Items& items)
+{
+    constexpr std::size_t MaxDescribed = 4;
+    std::string text;
+    for (std::size_t i = 0; i < std::min(items.size(), MaxDescribed); ++i) {
+        text += (i == 0 ? "" : ", ") + Describe(items[i]);
+    }
+    return items.size() <= MaxDescribed
+               ? text
+               : text + " and " + std::to_string(items.size() - MaxDescribed) + " more";
+}
+
+[[noreturn]] void ThrowUntrusted(
+    const KeyInfo& keyInfo, const std::vector<Ref<const Crypto::Certificate>>& trusted)
+{
+    throw XmlSecurityException(
+        "The signing certificate is not one of the " + std::to_string(trusted.size())
+        + " trusted certificates; the signature names " + DescribeFirst(keyInfo.certificates)
+        + "; trusted: " + DescribeFirst(trusted));
+}
 
 /** The whole of the trust decision for signing keys. */
 class TrustSetKeyResolver final : public KeyInfoResolver
@@ -30,9 +72,7 @@ public:
             }
         }
         if (picked.empty()) {
-            throw XmlSecurityException(
-                "The signing certificate is not one of the " + std::to_string(_trusted.size())
-                + " trusted certificates");
+            ThrowUntrusted(keyInfo, _trusted);
         }
         return picked;
     }

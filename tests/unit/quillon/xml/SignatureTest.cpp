@@ -1,5 +1,6 @@
 #include "XmlSupport.h"
 
+#include "quillon/StringUtil.h"
 #include "quillon/xml/security/Signature.h"
 #include "support/TestData.h"
 
@@ -217,6 +218,113 @@ TEST(CreateSignatureFromDom, RefusesAnElementThatIsNoChildOfTheSignedOne)
     }
     CreateSignatureFromDom(part, part->FindChildElement("Signature"), signature);
     EXPECT_EQ(signature->GetElement()->GetParent(), part);
+}
+
+/** What comes of verifying `whole` with that KeyInfo, which its signature does not cover. */
+std::string VerifyWithKeyInfo(const std::string& keyInfo, const std::string& trusted = "sts")
+{
+    const std::string end = "</ds:Signature>";
+    std::string text = ReadTestData("documents/whole.xml");
+    const Ref<Document> document = ParseText(text.insert(text.find(end), keyInfo));
+    ElementNode* root = document->GetRootElement();
+    Ref<Signature> signature;
+    try {
+        CreateSignatureFromDom(root, root->FindChildElement("Signature"), signature);
+    } catch (const SignatureSyntaxException& error) {
+        return error.what();
+    }
+    return GetSecurityError(
+        [&] { signature->Verify(CreateTrustSetKeyResolver(GetTestCertificates(trusted)).get()); });
+}
+
+TEST(ReadKeyInfo, TakesWhatTheSchemaHas)
+{
+    for (const std::string content :
+         {"<ds:KeyName>k</ds:KeyName><ds:KeyValue><ds:RSAKeyValue/></ds:KeyValue>",
+          "<ds:RetrievalMethod URI='x'/><ds:PGPData/><ds:SPKIData/><ds:MgmtData/>",
+          "<ds:X509Data><ds:X509IssuerSerial/><ds:X509SKI/><ds:X509SubjectName/><ds:X509CRL/>"
+          "</ds:X509Data>",
+          "<ds:X509Data><o:Other xmlns:o='urn:o'/></ds:X509Data>",
+          "<Other xmlns='urn:o'/>",
+          "<o:Other xmlns:o='urn:o' xml:lang='en' o:a=''><b/></o:Other>"}) {
+        EXPECT_EQ(VerifyWithKeyInfo("<ds:KeyInfo>" + content + "</ds:KeyInfo>"), "accepted")
+            << content;
+    }
+    EXPECT_EQ(VerifyWithKeyInfo("<ds:KeyInfo Id='k'/>"), "accepted");
+}
+
+TEST(ReadKeyInfo, RefusesWhatTheSchemaHasNot)
+{
+    const auto judge = [](const std::string& content) {
+        return VerifyWithKeyInfo("<ds:KeyInfo>" + content + "</ds:KeyInfo>");
+    };
+    EXPECT_EQ(judge("<ds:Other/>"), "Unexpected 'ds:Other' in 'KeyInfo'");
+    EXPECT_EQ(judge("<ds:X509Certificate/>"), "Unexpected 'ds:X509Certificate' in 'KeyInfo'");
+    EXPECT_EQ(judge("<ds:KeyName/><KeyName/>"), "Unexpected 'KeyName' in 'KeyInfo'");
+    EXPECT_EQ(judge("<KeyName xmlns=''/>"), "Unexpected 'KeyName' in 'KeyInfo'");
+    EXPECT_EQ(judge("<o:Other/>"), "Unexpected 'o:Other' in 'KeyInfo'");
+    EXPECT_EQ(judge("text"), "Unexpected text in 'KeyInfo'");
+    EXPECT_EQ(
+        judge("<ds:X509Data><ds:KeyName/></ds:X509Data>"), "Unexpected 'ds:KeyName' in 'X509Data'");
+    EXPECT_EQ(judge("<ds:X509Data><a/></ds:X509Data>"), "Unexpected 'a' in 'X509Data'");
+}
+
+TEST(ReadKeyInfo, RefusesUndeclaredPrefixes)
+{
+    const auto judge = [](const std::string& content) {
+        return VerifyWithKeyInfo("<ds:KeyInfo>" + content + "</ds:KeyInfo>");
+    };
+    EXPECT_EQ(
+        judge("<ds:KeyValue><o:Other/></ds:KeyValue>"), "'o:Other' uses the undeclared prefix 'o'");
+    EXPECT_EQ(judge("<ds:KeyName o:a=''/>"), "'ds:KeyName' uses the undeclared prefix 'o'");
+    EXPECT_EQ(
+        VerifyWithKeyInfo("<ds:KeyInfo o:Id='k'/>"), "'ds:KeyInfo' uses the undeclared prefix 'o'");
+}
+
+/** Subject and fingerprint as the text of an untrusted signer has them. */
+std::string DescribeCertificate(const std::string& name)
+{
+    const auto certificate = GetTestCertificates(name).front();
+    return "'" + certificate->GetSubjectName() + "' (SHA-256 " + certificate->GetFingerprint()
+           + ")";
+}
+
+std::string InX509Data(const std::string& certificate)
+{
+    return "<ds:X509Data><ds:X509Certificate>" + certificate
+           + "</ds:X509Certificate></ds:X509Data>";
+}
+
+std::string EncodedCertificate(const std::string& name)
+{
+    return InX509Data(StringUtil::Base64Encode(GetTestCertificates(name).front()->GetEncoded()));
+}
+
+TEST(CreateTrustSetKeyResolver, NamesTheUntrustedSignerAndThoseTrusted)
+{
+    EXPECT_EQ(
+        VerifyWithKeyInfo("<ds:KeyInfo>" + EncodedCertificate("sts") + "</ds:KeyInfo>", "client"),
+        "The signing certificate is not one of the 1 trusted certificates; the signature names "
+            + DescribeCertificate("sts") + "; trusted: " + DescribeCertificate("client"));
+}
+
+TEST(CreateTrustSetKeyResolver, NamesOnlyTheFirstOfManyCertificates)
+{
+    std::string content;
+    for (int i = 0; i < 5; ++i) {
+        content += InX509Data("AAAA");
+    }
+    const std::string none = "3 bytes that are no certificate";
+    const std::string begin = "The signing certificate is not one of the 1 trusted certificates; "
+                              "the signature names "
+                              + none + ", " + none + ", " + none;
+    const std::string end = "; trusted: " + DescribeCertificate("sts");
+    EXPECT_EQ(
+        VerifyWithKeyInfo("<ds:KeyInfo>" + content + "</ds:KeyInfo>"),
+        begin + ", " + none + " and 1 more" + end);
+    EXPECT_EQ(
+        VerifyWithKeyInfo("<ds:KeyInfo>" + content.substr(content.size() / 5) + "</ds:KeyInfo>"),
+        begin + ", " + none + end);
 }
 
 TEST(CreateTrustSetKeyResolver, RefusesANullCertificate)
