@@ -24,6 +24,7 @@ inline constexpr long long DefaultClockToleranceSec = 600;
  * @param clockToleranceSec  by how much the validity window is widened at both ends.
  *
  * @throws ParseException                      a deviation in shape or values, or out of validity.
+ *                                             The text may be as long as `xml`.
  * @throws InvalidSignatureException           the signature does not verify.
  * @throws Quillon::Xml::XMLParseException     `xml` is not well-formed or exceeds a limit.
  * @throws Quillon::Crypto::CryptoException    the confirmation certificate cannot be decoded.
@@ -51,7 +52,9 @@ SSOCLIENT_API boost::shared_ptr<const SamlToken> CreateSamlToken(
  * The same for an assertion that is already parsed, possibly inside a larger document. The
  * token's XML is then the assertion's inclusive canonical form; the tree is not kept. That form
  * takes on the `xml:` attributes of the elements around the assertion: if there are any, the
- * token is good, but `CreateSamlToken` may refuse its XML.
+ * token is good, but `CreateSamlToken` may refuse its XML. The canonical form has no comments, so a
+ * comment beside a blank of a value is refused with a `ParseException`: the value would be another
+ * in the token's XML.
  *
  * @throws Quillon::Xml::Security::XmlSecurityException  the assertion has no canonical form: a
  *                                                       prefix is not declared.

@@ -10,7 +10,10 @@
  */
 namespace SsoClient {
 
-/** Any failure of a token-service operation or of token handling. */
+/**
+ * Any failure of a token-service operation or of token handling. The text repeats a reply's fault
+ * code or token type as it is, of whatever length.
+ */
 class SSOCLIENT_API SsoException : public Quillon::ExceptionOf<SsoException, Quillon::Exception>
 {
 public:
@@ -27,7 +30,11 @@ public:
     ~InvalidTokenException() override;
 };
 
-/** Token or response XML does not have the required structure or values, or has expired. */
+/**
+ * Token or response XML does not have the required structure or values, or has expired. The text
+ * repeats values of the document as they are: it may have as many bytes as the document, and line
+ * breaks. Cut it before it is logged.
+ */
 class SSOCLIENT_API ParseException
     : public Quillon::ExceptionOf<ParseException, InvalidTokenException>
 {
@@ -54,7 +61,7 @@ public:
     ~CommunicationException() override;
 };
 
-/** The token service rejected the presented credentials. */
+/** The token service rejected the presented credentials. The text repeats its fault string. */
 class SSOCLIENT_API InvalidCredentialsException
     : public Quillon::ExceptionOf<InvalidCredentialsException, SsoException>
 {

@@ -17,7 +17,10 @@ namespace SsoClient {
 using Quillon::Ref;
 using Quillon::Crypto::Certificate;
 using Quillon::System::DateTime;
+using Quillon::Xml::AsElement;
+using Quillon::Xml::AsText;
 using Quillon::Xml::ElementNode;
+using Quillon::Xml::Node;
 namespace Security = Quillon::Xml::Security;
 
 namespace {
@@ -108,6 +111,40 @@ void ValidateSignature(
     }
 }
 
+/** Whether the element's text stands in several nodes, as it does around a comment. */
+bool HasDividedText(const ElementNode& element)
+{
+    unsigned pieces = 0;
+    bool isBlank = true;
+    for (Node* node = element.GetFirstChild(); node != nullptr; node = node->GetNextSibling()) {
+        if (AsText(node) != nullptr) {
+            ++pieces;
+            isBlank = isBlank && !SkipWsAndCommentsFilter().Accept(node);
+        }
+    }
+    return pieces > 1 && !isBlank;
+}
+
+/**
+ * The canonical form has no comments, so it joins a value to the blanks that a comment parts from
+ * it in the tree: the token's facts would be others than those of its own text. The signature's
+ * values are no facts, and are read as one text anyway.
+ */
+void RequireUndividedValues(const ElementNode& element)
+{
+    if (HasDividedText(element)) {
+        throw ParseException(
+            "Element '" + std::string(element.GetLocalName())
+            + "' must only have textual content (but has extra children or is empty).");
+    }
+    for (Node* node = element.GetFirstChild(); node != nullptr; node = node->GetNextSibling()) {
+        const ElementNode* child = AsElement(node);
+        if (child != nullptr && !ElementQNameIs(child, "Signature", Wire::DsNamespace)) {
+            RequireUndividedValues(*child);
+        }
+    }
+}
+
 template <class Restriction>
 bool AllowsSome(const boost::optional<Restriction>& restriction)
 {
@@ -141,6 +178,7 @@ SamlTokenImpl::SamlTokenImpl(
     RequireElementQName(assertion, "Assertion", Wire::SamlNamespace);
     _xml = ToCanonicalXml(assertion, TokenTextCanonicalization);
     InitializeFromDom(assertion, keyResolver, clockToleranceSec);
+    RequireUndividedValues(*assertion);
 }
 
 void SamlTokenImpl::InitializeFromDom(

@@ -353,6 +353,15 @@ TEST(RequireElementAttributesQNames, ReportsTheFirstByRawName)
     EXPECT_EQ("Unexpected attribute 'a' on element 'Node'", check("foo:bar='' a=''"));
 }
 
+TEST(RequireElementAttributesQNamesDeathTest, StopsTheProcessIfNothingIsMissing)
+{
+    const Parsed parsed("<a b=''/>");
+    EXPECT_DEATH(
+        RequireElementAttributesQNames(parsed.root, {LocalName("b"), LocalName("b")}, {}),
+        "^PanicVerify failed: missing != required\\.end\\(\\) "
+        "\\(lib/ssoClient/xmlReading:[0-9]+\\)\n$");
+}
+
 TEST(GetDateAttribute, ReadsADate)
 {
     const Parsed parsed("<Conditions NotBefore='2012-01-31T12:00:00Z'/>");
