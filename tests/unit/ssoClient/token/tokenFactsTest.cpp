@@ -180,6 +180,12 @@ TEST_F(TokenFacts, SubjectValidityIsComparedToTheMicrosecond)
     EXPECT_EQ(ReachesSignature, judge("2012-01-31T12:05:00Z"));
     EXPECT_EQ(
         "ParseException: Invalid token subject validity", judge("2012-01-31T12:04:59.999999Z"));
+    EXPECT_EQ(
+        "ParseException: Invalid token subject validity",
+        JudgeUnsigned(Replace(
+            Bearer(),
+            "NotOnOrAfter=\"2012-01-31T12:05:00Z\"></saml:Conditions>",
+            "NotOnOrAfter=\"2012-01-31T12:05:00.000001Z\"></saml:Conditions>")));
 }
 
 TEST_F(TokenFacts, TheLastSolutionFlagCounts)
