@@ -5,6 +5,7 @@ import re
 import subprocess
 import unittest
 
+import error_texts
 import sources
 
 EXCEPTION = re.compile(r"^class (?:\w+_API )?(\w+)\s*:\s*public (?:Quillon::)?ExceptionOf<",
@@ -13,6 +14,11 @@ EXCEPTION = re.compile(r"^class (?:\w+_API )?(\w+)\s*:\s*public (?:Quillon::)?Ex
 
 def read(name):
     return (sources.ROOT / name).read_text("utf-8")
+
+
+def texts_that_are_no_errors():
+    lines = read("tests/structure/texts_that_are_no_errors.txt").splitlines()
+    return [line for line in lines if line and not line.startswith("#")]
 
 
 def help_of(*command):
@@ -35,14 +41,30 @@ class Documents(unittest.TestCase):
 
     def test_every_text_of_an_error_stands_in_the_code(self):
         text = read("docs/errors.md")
-        texts = re.findall(r"^\| `([^`]+)` \|", text[text.index("## Every operation"):], re.MULTILINE)
-        self.assertGreater(len(texts), 40)
-        code = "".join(sources.without_comments(path.read_text("utf-8"))
-                       for path in sources.files("lib"))
-        code = re.sub(r'"\s*"', "", code).replace("\\\\", "\\")
-        self.assertEqual([], [text for text in texts
-                              if any(piece.strip() not in code
-                                     for piece in re.split("'…'|…", text))])
+        rows = re.findall(r"^\| `([^`]+)` \|", text[text.index("## Every operation"):],
+                          re.MULTILINE)
+        self.assertGreater(len(rows), 100)
+        code = "\n".join(literal for path in sources.files("lib")
+                         for literal in error_texts.literals(path))
+        self.assertEqual([], [row for row in rows
+                              if any(piece not in code for piece in error_texts.pieces(row))])
+
+    def test_every_text_of_the_code_is_an_error_that_is_described_or_none(self):
+        described = read("docs/errors.md")
+        others = set(map(error_texts.trimmed, texts_that_are_no_errors()))
+        undescribed = {
+            f"{sources.name(path)}: {literal}" for path in sources.files("lib")
+            if path.parent.name != "assertion"
+            for literal in error_texts.literals(path)
+            if " " in literal.strip() and error_texts.trimmed(literal) not in others
+            and error_texts.trimmed(literal) not in described}
+        self.assertEqual([], sorted(undescribed))
+
+    def test_texts_that_are_no_errors_stand_in_the_code(self):
+        code = {error_texts.trimmed(literal) for path in sources.files("lib")
+                for literal in error_texts.literals(path)}
+        self.assertEqual([], [text for text in texts_that_are_no_errors()
+                              if error_texts.trimmed(text) not in code])
 
     @unittest.skipUnless("SSOCLIENT" in os.environ, "the command line is not built")
     def test_every_option_of_the_command_line_is_described(self):
