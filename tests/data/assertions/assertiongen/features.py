@@ -338,6 +338,36 @@ def _statements():
          "cuts the value of 'saml:NameID'")
 
 
+def _for_mapping():
+    """What the mapping of subjects and groups is tested with."""
+    _row("group-values", "groups in three forms", "SAML-CORE 2.7.3",
+         assertion(subject={"value": "alice@Example.COM", "format": names.UPN}, statements=[
+             ("attributes", [
+                 {"name": "qualified", "values": ["EXAMPLE\\Admins", "EXAMPLE\\A\\B"]},
+                 {"name": "slashed", "values": ["EXAMPLE/Admins"]},
+                 {"name": "plain", "values": ["Staff"]},
+                 {"name": "distinguished", "values": [
+                     "CN=Admins,OU=IT,DC=example,DC=com", "cn=A\\,B, DC=example"]},
+                 {"name": "user", "values": ["alice"]},
+                 {"name": "users", "values": ["alice", "bob"]},
+                 {"name": "none", "values": []},
+                 {"name": "given", "values": ["Alice", "second"]},
+                 {"name": "family", "values": ["Example"]}])]), "sha1", "")
+    for name, spelling in (("upn", "http://schemas.xmlsoap.org/claims/UPN"),
+                           ("upn-lower-case", "http://schemas.xmlsoap.org/claims/upn")):
+        _row(f"name-of-{name}", "a UPN in another spelling", "SAML-CORE 8.3",
+             assertion(subject={"value": "alice@example.com", "format": spelling}), "sha1", "")
+    _row("disjoint-audiences", "nobody is named by both", "SAML-CORE 2.5.1.4",
+         assertion(conditions={"start": names.START, "end": names.END,
+                               "audiences": [["urn:a", "urn:b"], ["urn:c"]]}),
+         "sha1", "", rules={"audience": None})
+    _row("other-method", "a method that the rules take", "SAML-CORE 2.4.1.1",
+         assertion(confirmations=[{"method": names.SENDER_VOUCHES, "data": False}]),
+         assertion(confirmations=[{"method": names.BEARER, "data": False}]),
+         "its method 'urn:oasis:names:tc:SAML:2.0:cm:bearer' is not accepted",
+         rules={"methods": [names.SENDER_VOUCHES]})
+
+
 def _whole():
     _row("id-without-underscore", "any NCName", "SAML-CORE 1.3.4", assertion(id="a-b.c_1"),
          assertion(id="1a"), "ID '1a' of 'saml:Assertion' at 1,1 is no NCName")
@@ -366,4 +396,5 @@ _keys()
 _subjects()
 _all_conditions()
 _statements()
+_for_mapping()
 _whole()
