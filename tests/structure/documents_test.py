@@ -54,7 +54,6 @@ class Documents(unittest.TestCase):
         others = set(map(error_texts.trimmed, texts_that_are_no_errors()))
         undescribed = {
             f"{sources.name(path)}: {literal}" for path in sources.files("lib")
-            if path.parent.name != "assertion"
             for literal in error_texts.literals(path)
             if " " in literal.strip() and error_texts.trimmed(literal) not in others
             and error_texts.trimmed(literal) not in described}
