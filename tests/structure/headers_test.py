@@ -2,7 +2,6 @@
 
 import concurrent.futures
 import os
-import shutil
 import subprocess
 import unittest
 
