@@ -7,6 +7,8 @@ import unittest
 
 import sources
 
+FOLDERS = {"quillon": "lib/quillon", "ssoClient": "lib/ssoClient", "devsts": "tools/devsts"}
+
 # Each folder with what it may include beside itself. Folders are floors, the lowest first.
 FLOORS = {
     "quillon": {
@@ -27,6 +29,16 @@ FLOORS = {
         "message": {"wire"},
         "protocol": {"wire", "token", "message"},
         "client": {"wire", "assertion", "token", "message", "protocol"},
+    },
+    "devsts": {
+        "wire": set(),
+        "security": {"wire"},
+        "state": {"wire", "security"},
+        "token": {"wire", "security", "state"},
+        "negotiation": {"wire", "security", "state", "token"},
+        "service": {"wire", "security", "state", "token", "negotiation"},
+        "http": {"wire", "security", "state", "service"},
+        ".": {"state", "http"},
     },
 }
 
@@ -62,7 +74,7 @@ def floor_of_target(library, root, target):
             return floor_of_public_header(library, path)
         return path.parent.as_posix()
     # Quillon's private headers are named from its own folder.
-    if (root / "lib" / library / target).is_file():
+    if (root / FOLDERS[library] / target).is_file():
         return pathlib.PurePath(target).parent.as_posix()
     return None
 
@@ -71,13 +83,13 @@ def floor_of_file(library, root, path):
     public = root / "lib" / "public" / library
     if path.is_relative_to(public):
         return floor_of_public_header(library, path.relative_to(public))
-    return path.relative_to(root / "lib" / library).parent.as_posix()
+    return path.relative_to(root / FOLDERS[library]).parent.as_posix()
 
 
 def climbing_includes(library, root):
     """The includes that go up or sideways, as text."""
     sees = FLOORS[library]
-    paths = [path for folder in (f"lib/{library}", f"lib/public/{library}")
+    paths = [path for folder in (FOLDERS[library], f"lib/public/{library}")
              for path in sorted((root / folder).rglob("*")) if path.suffix in (".h", ".cpp")]
     assert paths
     found = []
@@ -97,8 +109,8 @@ class Floors(unittest.TestCase):
 
     def test_every_folder_is_a_floor(self):
         for library, sees in FLOORS.items():
-            folders = {path.parent.relative_to(sources.ROOT / "lib" / library).as_posix()
-                       for path in sources.files(f"lib/{library}")}
+            folders = {path.parent.relative_to(sources.ROOT / FOLDERS[library]).as_posix()
+                       for path in sources.files(FOLDERS[library])}
             self.assertEqual(set(sees), folders)
 
     def test_floors_have_an_order(self):
@@ -117,6 +129,7 @@ class PlantedIncludes(unittest.TestCase):
         self.addCleanup(folder.cleanup)
         self.root = pathlib.Path(folder.name)
         shutil.copytree(sources.ROOT / "lib", self.root / "lib")
+        shutil.copytree(sources.ROOT / "tools", self.root / "tools")
 
     def assert_found(self, library, path, target):
         file = self.root / path
@@ -141,6 +154,9 @@ class PlantedIncludes(unittest.TestCase):
     def test_a_sideways_step(self):
         self.assert_found("ssoClient", "lib/ssoClient/message/xmlCommonBuilders.cpp",
                           "ssoClient/token/samlAssertion.h")
+
+    def test_the_server_in_the_reader_of_requests(self):
+        self.assert_found("devsts", "tools/devsts/wire/RequestReader.cpp", "devsts/http/Server.h")
 
     def test_a_public_header_of_a_higher_floor(self):
         self.assert_found("ssoClient", "lib/ssoClient/wire/xmlReading.cpp",

@@ -1,4 +1,4 @@
-#include "devsts/Server.h"
+#include "devsts/http/Server.h"
 
 #include <CLI/CLI.hpp>
 #include <csignal>

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "devsts/Server.h"
+#include "devsts/http/Server.h"
 #include "quillon/service/Logger.h"
 #include "quillon/ssl/SSLContext.h"
 #include "ssoClient/SecurityTokenService.h"

@@ -1,7 +1,6 @@
-#ifndef DEVSTS_TESTS_HARNESS_H
-#define DEVSTS_TESTS_HARNESS_H
+#pragma once
 
-#include "devsts/Server.h"
+#include "devsts/http/Server.h"
 
 #include <atomic>
 #include <filesystem>
@@ -109,5 +108,3 @@ protected:
 };
 
 } // namespace DevStsTests
-
-#endif

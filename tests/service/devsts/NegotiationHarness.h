@@ -1,5 +1,4 @@
-#ifndef DEVSTS_TESTS_NEGOTIATION_HARNESS_H
-#define DEVSTS_TESTS_NEGOTIATION_HARNESS_H
+#pragma once
 
 #include "Harness.h"
 #include "support/Initiator.h"
@@ -74,5 +73,3 @@ protected:
 };
 
 } // namespace DevStsTests
-
-#endif

@@ -1,5 +1,4 @@
-#ifndef DEVSTS_TESTS_REQUESTS_H
-#define DEVSTS_TESTS_REQUESTS_H
+#pragma once
 
 #include <map>
 #include <string>
@@ -38,5 +37,3 @@ std::string PasswordRequest(const std::string& extras = "");
 std::string DelegateTo(const std::string& name);
 
 } // namespace DevStsTests
-
-#endif

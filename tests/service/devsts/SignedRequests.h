@@ -1,5 +1,4 @@
-#ifndef DEVSTS_TESTS_SIGNED_REQUESTS_H
-#define DEVSTS_TESTS_SIGNED_REQUESTS_H
+#pragma once
 
 #include <filesystem>
 #include <string>
@@ -41,5 +40,3 @@ std::string Sign(const std::string& text, const Identity& identity = Client());
 constexpr const char* UseKey = "<wst:UseKey Sig=\"holderOfKeyProofSignature\"/>";
 
 } // namespace DevStsTests
-
-#endif
