@@ -9,7 +9,7 @@ if(NOT CMAKE_BUILD_TYPE)
     set(CMAKE_BUILD_TYPE Release)
 endif()
 
-add_compile_options(-Wall -Wextra -Wpedantic -Wshadow -Wno-non-virtual-dtor
+add_compile_options(-Wall -Wextra -Wpedantic -Wshadow
     -Woverloaded-virtual -Wcast-align -Wformat=2 -Wundef -Wconversion -Wno-sign-conversion)
 
 if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU" AND CMAKE_CXX_COMPILER_VERSION VERSION_LESS 13)

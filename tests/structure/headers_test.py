@@ -14,7 +14,7 @@ def compile_alone(compiler, header):
     """The compiler's complaints; empty if it has none."""
     result = subprocess.run(
         [compiler, "-std=c++17", "-pedantic-errors", "-Wall", "-Wextra", "-Werror",
-         "-Wno-non-virtual-dtor", "-fsyntax-only", f"-I{PUBLIC}", "-x", "c++", "-"],
+         "-Wnon-virtual-dtor", "-fsyntax-only", f"-I{PUBLIC}", "-x", "c++", "-"],
         input=f'#include "{header}"\n', text=True, capture_output=True)
     return "" if result.returncode == 0 else f"{compiler}: {header}:\n{result.stderr}"
 

@@ -61,6 +61,9 @@ public:
 
     /** The assertion's XML, for forwarding it. A bearer token's XML is a credential: guard it. */
     virtual const std::string& ToXml() const = 0;
+
+protected:
+    ~SamlToken() = default;
 };
 
 } // namespace SsoClient

@@ -6,6 +6,7 @@
 
 namespace Quillon::Http {
 
+/** A response whose whole body is at hand. */
 Ref<ClientResponse> MakeClientResponse(HttpStatus status, std::string body);
 
 } // namespace Quillon::Http

@@ -23,7 +23,7 @@ bool IsAcceptable(int status) noexcept
 }
 
 Quillon::Ref<Http::ClientRequest> ComposeRequest(
-    Request const& request, std::string const& path, long long timeout)
+    const Request& request, const std::string& path, long long timeout)
 {
     Quillon::Ref<Http::ClientRequest> httpRequest;
     Http::CreateHttpRequest(Http::HttpMethod::POST, path, httpRequest);
@@ -39,9 +39,9 @@ Quillon::Ref<Http::ClientRequest> ComposeRequest(
 } // namespace
 
 HttpsClient::HttpsClient(
-    std::string const& url,
+    const std::string& url,
     Quillon::Ssl::SSLContext* sslContext,
-    std::string const& peer,
+    const std::string& peer,
     long long timeout)
     : _sslContext(sslContext)
     , _timeout(timeout)
@@ -68,7 +68,7 @@ boost::shared_ptr<TransportSession> HttpsClient::CreateSession() const
     return boost::make_shared<HttpsSession>(_connectionSpec.get(), _path, _timeout);
 }
 
-HttpsSession::HttpsSession(Http::ConnectionSpec* spec, std::string const& path, long long timeout)
+HttpsSession::HttpsSession(Http::ConnectionSpec* spec, const std::string& path, long long timeout)
     : _path(path)
     , _timeout(timeout)
 {
@@ -77,7 +77,7 @@ HttpsSession::HttpsSession(Http::ConnectionSpec* spec, std::string const& path, 
     Http::CreateHttpUserAgent(spec, cookies.get(), nullptr, _userAgent);
 }
 
-void HttpsSession::SendRequest(Request const& request, Quillon::Ref<Quillon::Reader>& response)
+void HttpsSession::SendRequest(const Request& request, Quillon::Ref<Quillon::Reader>& response)
 {
     Quillon::Ref<Quillon::System::ScheduledItem> pending;
     SendRequestAsync(request, boost::bind(&noop), pending);
@@ -92,8 +92,8 @@ void HttpsSession::SendRequest(Request const& request, Quillon::Ref<Quillon::Rea
 }
 
 void HttpsSession::SendRequestAsync(
-    Request const& request,
-    ResponseCallback const& callback,
+    const Request& request,
+    const ResponseCallback& callback,
     Quillon::Ref<Quillon::System::ScheduledItem>& pending)
 {
     const Http::Completion completion = boost::bind(
@@ -131,7 +131,7 @@ void TranslateResponse(
 }
 
 void AsyncTranslateResponse(
-    ResponseCallback const& callback,
+    const ResponseCallback& callback,
     Quillon::Exception const* error,
     Http::ClientResponse* response,
     Http::PendingRequestItem* /*item*/)

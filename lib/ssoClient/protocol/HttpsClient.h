@@ -24,9 +24,9 @@ public:
      * @throws Quillon::InvalidArgumentException  a malformed URL or peer, or no SSL context.
      */
     HttpsClient(
-        std::string const& url,
+        const std::string& url,
         Quillon::Ssl::SSLContext* sslContext,
-        std::string const& peer,
+        const std::string& peer,
         long long timeout);
 
     boost::shared_ptr<TransportSession> CreateSession() const override;
@@ -42,12 +42,12 @@ private:
 class HttpsSession final : public TransportSession
 {
 public:
-    HttpsSession(Quillon::Http::ConnectionSpec* spec, std::string const& path, long long timeout);
+    HttpsSession(Quillon::Http::ConnectionSpec* spec, const std::string& path, long long timeout);
 
-    void SendRequest(Request const& request, Quillon::Ref<Quillon::Reader>& response) override;
+    void SendRequest(const Request& request, Quillon::Ref<Quillon::Reader>& response) override;
     void SendRequestAsync(
-        Request const& request,
-        ResponseCallback const& callback,
+        const Request& request,
+        const ResponseCallback& callback,
         Quillon::Ref<Quillon::System::ScheduledItem>& pending) override;
 
 private:
@@ -73,7 +73,7 @@ void TranslateResponse(
 
 /** Hands what `TranslateResponse` makes of a completed exchange to `callback`. */
 void AsyncTranslateResponse(
-    ResponseCallback const& callback,
+    const ResponseCallback& callback,
     Quillon::Exception const* error,
     Quillon::Http::ClientResponse* response,
     Quillon::Http::PendingRequestItem* item);

@@ -4,6 +4,7 @@
 
 namespace SsoClient {
 
+/** Keeps nothing from one reply to the next. */
 class ResponseHandlerImpl final : public ResponseHandler
 {
 public:

@@ -36,7 +36,7 @@ public:
      * @throws CommunicationException         the service answered with another status.
      * @throws Quillon::Http::HttpException   the exchange failed.
      */
-    virtual void SendRequest(Request const& request, Quillon::Ref<Quillon::Reader>& response) = 0;
+    virtual void SendRequest(const Request& request, Quillon::Ref<Quillon::Reader>& response) = 0;
 
     /**
      * Sends a request and returns at once; `callback` is called once, on a thread of the HTTP
@@ -46,8 +46,8 @@ public:
      *                 called. It need not be kept: letting go of it changes nothing.
      */
     virtual void SendRequestAsync(
-        Request const& request,
-        ResponseCallback const& callback,
+        const Request& request,
+        const ResponseCallback& callback,
         Quillon::Ref<Quillon::System::ScheduledItem>& pending) = 0;
 
 protected:

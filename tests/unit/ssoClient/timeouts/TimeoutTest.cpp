@@ -51,9 +51,9 @@ public:
 namespace SsoClient {
 
 HttpsClient::HttpsClient(
-    std::string const& url,
+    const std::string& url,
     Quillon::Ssl::SSLContext* sslContext,
-    std::string const& peer,
+    const std::string& peer,
     long long timeout)
     : _timeout(timeout)
 {
