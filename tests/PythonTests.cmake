@@ -3,7 +3,7 @@ find_package(Python3 REQUIRED COMPONENTS Interpreter)
 # One test for every class of `script` that derives from `unittest.TestCase` or from a `...Test`
 # class. The script stands in the calling folder. Further arguments are environment settings,
 # NAME=VALUE.
-function(sso_add_python_tests script)
+function(ssoclient_add_python_tests script)
     set_property(DIRECTORY APPEND PROPERTY CMAKE_CONFIGURE_DEPENDS ${script})
     get_filename_component(module ${script} NAME_WE)
     file(STRINGS ${script} classes REGEX "^class [A-Za-z]+\\(([a-z]+\\.TestCase|[A-Za-z]*Test)\\)")
