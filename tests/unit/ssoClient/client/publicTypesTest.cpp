@@ -59,6 +59,7 @@ TEST(DeletingThroughAnInterface, DoesNotCompile)
 {
     EXPECT_FALSE(std::is_destructible_v<SecurityTokenService>);
     EXPECT_FALSE(std::is_destructible_v<InternalApi::GssNegotiationContext>);
+    EXPECT_FALSE(std::is_destructible_v<SamlToken>);
 }
 
 TEST(Confirmation, KeepsItsNumbers)
