@@ -15,7 +15,6 @@ fail without it.
 import argparse
 import concurrent.futures
 import os
-import pathlib
 import queue
 import shutil
 import subprocess
