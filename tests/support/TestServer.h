@@ -49,6 +49,9 @@ public:
     /** Lets TLS, if there is any, end without its own notice. */
     virtual void EndWithoutNotice() {}
 
+    /** Has TLS, if there is any, begin anew. */
+    virtual void AskForANewHandshake() {}
+
     /** Lets the connection end with a reset in place of an ordinary end. */
     void ResetAtClose()
     {

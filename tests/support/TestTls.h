@@ -129,9 +129,11 @@ struct SeenHandshake
 class TlsServer
 {
 public:
-    explicit TlsServer(const Identity& identity)
+    /** @param securityLevel  0 lets it show what nobody should accept. */
+    explicit TlsServer(const Identity& identity, int securityLevel = 2)
         : _context(SSL_CTX_new(TLS_server_method()))
     {
+        SSL_CTX_set_security_level(_context.get(), securityLevel);
         SSL_CTX_use_certificate(_context.get(), identity.certificate.get());
         SSL_CTX_use_PrivateKey(_context.get(), identity.key.get());
         SSL_CTX_set_session_id_context(
@@ -154,6 +156,7 @@ public:
             SSL_set_fd(ssl.get(), descriptor);
             if (SSL_accept(ssl.get()) != 1) {
                 ERR_clear_error();
+                WaitForClose(descriptor);
                 return nullptr;
             }
             Note(ssl.get());
@@ -162,6 +165,15 @@ public:
     }
 
 private:
+    /** A connection that is closed with unread data takes the alert back that was just sent. */
+    static void WaitForClose(int descriptor)
+    {
+        shutdown(descriptor, SHUT_WR);
+        char buffer[1024];
+        while (recv(descriptor, buffer, sizeof buffer, 0) > 0) {
+        }
+    }
+
     class TlsStream : public ByteStream
     {
     public:
@@ -177,6 +189,12 @@ private:
         }
 
         void EndWithoutNotice() override { _isSilent = true; }
+        void AskForANewHandshake() override
+        {
+            SSL_renegotiate(_ssl.get());
+            SSL_do_handshake(_ssl.get());
+            ERR_clear_error();
+        }
 
         long Read(char* buffer, std::size_t size) override
         {

@@ -1,8 +1,8 @@
 #include "http/HttpEngine.h"
 
+#include "system/SystemError.h"
 #include "threads/ProcessEnd.h"
 #include "threads/SignalBlock.h"
-#include "threads/SystemError.h"
 
 #include <cerrno>
 #include <system_error>
@@ -94,7 +94,7 @@ void HttpEngine::Start()
     } catch (const std::system_error& error) {
         throw HttpException(
             "The HTTP threads cannot be started: "
-            + System::DescribeSystemError(error.code().value()));
+            + System::DescribeSystemError(error.code().value()) + ".");
     }
     _pid = getpid();
 }
@@ -110,7 +110,7 @@ void HttpEngine::MakeMulti()
     // Without a free descriptor libcurl makes a handle that nothing can wake up.
     if (curl_multi_wakeup(owner.get()) != CURLM_OK) {
         throw HttpException(
-            "The HTTP threads cannot be started: " + System::DescribeSystemError(error));
+            "The HTTP threads cannot be started: " + System::DescribeSystemError(error) + ".");
     }
     _multi = owner.release();
 }

@@ -4,7 +4,7 @@
 #include "http/ConnectionPoolImpl.h"
 #include "http/Curl.h"
 #include "http/Transfer.h"
-#include "threads/ProcessMutex.h"
+#include "system/ProcessMutex.h"
 
 #include <atomic>
 #include <list>

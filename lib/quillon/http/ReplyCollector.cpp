@@ -78,7 +78,8 @@ bool ReplyCollector::AddStatusLine(std::string_view line)
     }
     _status.code = code;
     _status.reasonPhrase = Trim(line.substr(digits));
-    _hasBodyFields = false;
+    _hasLength = false;
+    _announcesEnd = false;
     _contentLength.reset();
     _next = Next::FIELDS;
     return true;
@@ -89,18 +90,18 @@ bool ReplyCollector::AddField(std::string_view name, std::string_view value)
     const std::string lowerName = StringUtil::ToLower(name);
     const std::string lowerValue = StringUtil::ToLower(value);
     if (lowerName == "content-length") {
-        _hasBodyFields = true;
+        _hasLength = true;
         return !WantsBody() || AddContentLength(value);
     }
     if (lowerName == "transfer-encoding") {
-        _hasBodyFields = true;
+        _hasLength = true;
         return AddEncoding(value, lowerValue == "chunked");
     }
     if (lowerName == "content-encoding") {
         return AddEncoding(value, lowerValue.empty() || lowerValue == "identity");
     }
     if (lowerName == "connection") {
-        _hasBodyFields = _hasBodyFields || lowerValue == "close";
+        _announcesEnd = _announcesEnd || lowerValue == "close";
     }
     return true;
 }
@@ -152,8 +153,14 @@ bool ReplyCollector::IsInterim() const noexcept
     case 101: // Switching Protocols
         return false;
     default:
-        return _status.code < FirstFinalStatus && !_hasBodyFields;
+        return _status.code < FirstFinalStatus && !_hasLength && !_announcesEnd;
     }
+}
+
+bool ReplyCollector::EndsWithConnection() const noexcept
+{
+    constexpr int NoContent = 204;
+    return _next == Next::BODY && !_hasLength && _status.code != NoContent;
 }
 
 bool ReplyCollector::EndHead() noexcept

@@ -46,6 +46,9 @@ public:
     /** Whether the latest head says all, so that nothing behind it counts. */
     bool IsAnswered() const noexcept { return _next == Next::NOTHING; }
 
+    /** Whether only the end of the connection tells where the body ends. */
+    bool EndsWithConnection() const noexcept;
+
     /**
      * Whether the latest status is an interim one other than 100 (Continue) [RFC 9110 15.2]. If no
      * other status follows, it was the answer.
@@ -78,7 +81,8 @@ private:
     Next _next = Next::STATUS;
     std::size_t _headerBytes = 0;
     std::size_t _wireBytes = 0;
-    bool _hasBodyFields = false;
+    bool _hasLength = false;    // Content-Length or chunks tell where the body ends
+    bool _announcesEnd = false; // of the connection
     std::optional<std::string> _contentLength;
     HttpStatus _status;
     std::string _body;

@@ -1,7 +1,7 @@
 #include "http/Transfer.h"
 
 #include "http/ClientResponseImpl.h"
-#include "threads/SystemError.h"
+#include "system/SystemError.h"
 
 #include <algorithm>
 #include <cerrno>
@@ -230,8 +230,19 @@ int Transfer::OnProgress(void* self, curl_off_t, curl_off_t, curl_off_t, curl_of
 int Transfer::OnRequest(void* self, char* /*ip*/, char* /*localIp*/, int /*port*/, int /*local*/)
 {
     Transfer& transfer = *static_cast<Transfer*>(self);
+    transfer.FindAlert();
     transfer._isRepeated = std::exchange(transfer._isSent, true);
     return transfer._isRepeated ? CURL_PREREQFUNC_ABORT : CURL_PREREQFUNC_OK;
+}
+
+/** A connection that was kept has the one of the transfer that opened it. */
+void Transfer::FindAlert()
+{
+    curl_tlssessioninfo* info = nullptr;
+    curl_easy_getinfo(_easy.get(), CURLINFO_TLS_SSL_PTR, &info);
+    if (_spec.tls != nullptr && info != nullptr && info->internals != nullptr) {
+        _alert = Ssl::GetAlert(static_cast<const SSL*>(info->internals));
+    }
 }
 
 curl_socket_t Transfer::OnSocket(void* self, curlsocktype /*purpose*/, curl_sockaddr* address)
@@ -283,7 +294,16 @@ bool Transfer::IsAnswered(CURLcode result) const noexcept
         return result == CURLE_GOT_NOTHING || result == CURLE_UNSUPPORTED_PROTOCOL;
     }
     // libcurl takes the end of the connection for the end of a head.
-    return result == CURLE_OK && _reply.HasHead();
+    return result == CURLE_OK && _reply.HasHead() && !IsCutOff();
+}
+
+/**
+ * Whether the reply ends with the connection and TLS has not said that this is the end, so that
+ * whoever cuts the connection could choose it [RFC 9112 9.8].
+ */
+bool Transfer::IsCutOff() const noexcept
+{
+    return _spec.tls != nullptr && _reply.EndsWithConnection() && !_alert->isClosed;
 }
 
 CookieLines Transfer::ReadCookies() const
@@ -338,13 +358,8 @@ std::string Transfer::DescribeRefusedConnection() const
 
 std::string Transfer::DescribeBrokenConnection() const
 {
-    const std::string& server = _exchange->GetServer();
-    if (std::string_view(_errorText.data()).find("unexpected eof") != std::string_view::npos) {
-        return "The reply of " + server
-               + " ended too early: the TLS connection ended without notice.";
-    }
     const int error = GetSystemError();
-    return "The exchange with " + server + " failed: "
+    return "The exchange with " + _exchange->GetServer() + " failed: "
            + (error != 0 ? System::DescribeSystemError(error) : GetDetail(CURLE_RECV_ERROR)) + ".";
 }
 
@@ -376,7 +391,9 @@ std::string Transfer::Describe(CURLcode result) const
     }
     switch (result) {
     case CURLE_OK:
-        return "The reply of " + server + " ended too early: its headers are not complete.";
+        return "The reply of " + server + " ended too early: "
+               + (_reply.HasHead() ? "the TLS connection ended without notice."
+                                   : "its headers are not complete.");
     case CURLE_COULDNT_RESOLVE_HOST:
         return "The host name " + _spec.connectHost + " cannot be resolved.";
     case CURLE_COULDNT_CONNECT:

@@ -53,7 +53,9 @@ private:
     void SetCallbacks();
 
     bool Take(std::string_view headerLine);
+    void FindAlert();
     bool IsAnswered(CURLcode result) const noexcept;
+    bool IsCutOff() const noexcept;
     CookieLines ReadCookies() const;
     std::string Describe(CURLcode result) const;
     std::string DescribeTlsRefusal() const;
@@ -71,9 +73,9 @@ private:
 
     CookieLines _givenCookies;
     ReplyCollector _reply;
-    const Ref<Ssl::PeerAlert> _alert; // of the connection that this transfer opens
-    bool _isSent = false;             // libcurl has begun to send the request
-    bool _isRepeated = false;         // libcurl has tried to send it again
+    Ref<Ssl::PeerAlert> _alert; // of the connection
+    bool _isSent = false;       // libcurl has begun to send the request
+    bool _isRepeated = false;   // libcurl has tried to send it again
     int _socketError = 0;
     std::array<char, CURL_ERROR_SIZE> _errorText{};
     StringListOwner _headers;

@@ -1,10 +1,11 @@
 #include "quillon/service/Logger.h"
 
+#include "service/LogText.h"
+#include "system/ProcessMutex.h"
+
 #include <atomic>
 #include <cstdio>
-#include <map>
 #include <memory>
-#include <mutex>
 #include <new>
 #include <utility>
 
@@ -19,52 +20,39 @@ void WriteToStandardError(const std::string& logger, int level, const std::strin
     std::fwrite(line.data(), 1, line.size(), stderr);
 }
 
-bool IsControl(char character) noexcept
+/** A sink that is in use may be replaced: who delivers a line keeps it. */
+struct KeptSink final : public RefCounted
 {
-    const auto byte = static_cast<unsigned char>(character);
-    return (byte < 0x20 && byte != '\t') || byte == 0x7F;
-}
+    explicit KeptSink(LogSink wanted)
+        : sink(std::move(wanted))
+    {}
 
-/** Writes control characters out: a text from outside must not pass for a line of its own. */
-std::string EscapeControls(const std::string& text)
-{
-    constexpr char HexDigits[] = "0123456789abcdef";
-    std::string result;
-    for (const char character : text) {
-        if (IsControl(character)) {
-            const auto byte = static_cast<unsigned char>(character);
-            result += "\\x";
-            result += HexDigits[byte >> 4];
-            result += HexDigits[byte & 0x0FU];
-        } else {
-            result += character;
-        }
-    }
-    return result;
-}
+    const LogSink sink;
+};
 
 /** The current sink. A line is delivered outside the lock, to the sink it found. */
 class SharedSink
 {
 public:
-    SharedSink() { Set(LogSink()); }
-
     void Set(const LogSink& sink)
     {
-        auto fresh = std::make_shared<const LogSink>(sink ? sink : LogSink(&WriteToStandardError));
-        const std::lock_guard<std::mutex> lock(_mutex);
+        Ref<const KeptSink> fresh(sink ? new KeptSink(sink) : nullptr);
+        const System::ProcessLock lock(_mutex);
         _sink.swap(fresh);
     }
 
-    std::shared_ptr<const LogSink> Get() const
+    /** Null stands for standard error. */
+    Ref<const KeptSink> Get() const
     {
-        const std::lock_guard<std::mutex> lock(_mutex);
+        // In a forked child the lock may come from a thread of the parent: what it guards is one
+        // word, which is either the old or the new one.
+        const System::ProcessLock lock(_mutex);
         return _sink;
     }
 
 private:
-    mutable std::mutex _mutex;
-    std::shared_ptr<const LogSink> _sink;
+    mutable System::ProcessMutex _mutex;
+    Ref<const KeptSink> _sink;
 };
 
 class LoggerImpl : public Logger
@@ -87,7 +75,13 @@ public:
             return;
         }
         try {
-            (*_sink.Get())(_name, level, EscapeControls(text));
+            const Ref<const KeptSink> kept = _sink.Get();
+            const std::string line = ToLogText(text);
+            if (kept != nullptr) {
+                kept->sink(_name, level, line);
+            } else {
+                WriteToStandardError(_name, level, line);
+            }
         } catch (...) { // NOLINT(bugprone-empty-catch): a line that is lost harms nobody
         }
     }
@@ -98,25 +92,48 @@ private:
     std::atomic<int> _level{LOG_LEVEL_WARNING};
 };
 
+/** Loggers are kept in a list that only grows, without a lock: a forked
+ * child may find a lock taken by a thread that it does not have. */
 class LogFacilityImpl : public LogFacility
 {
 public:
     Ref<Logger> GetLogger(const std::string& name) override
     {
-        const std::lock_guard<std::mutex> lock(_mutex);
-        Ref<Logger>& logger = _loggers[name];
-        if (logger == nullptr) {
-            logger = new LoggerImpl(name, _sink);
+        const Node* const first = _first.load(std::memory_order_acquire);
+        if (const Node* const known = Find(name, first, nullptr)) {
+            return known->logger;
         }
-        return logger;
+        auto fresh = std::make_unique<Node>(Node{new LoggerImpl(name, _sink), first});
+        const Node* head = first;
+        while (!_first.compare_exchange_weak(head, fresh.get(), std::memory_order_acq_rel)) {
+            if (const Node* const known = Find(name, head, fresh->next)) {
+                return known->logger;
+            }
+            fresh->next = head;
+        }
+        return fresh.release()->logger;
     }
 
     void SetSink(const LogSink& sink) override { _sink.Set(sink); }
 
 private:
+    struct Node
+    {
+        Ref<Logger> logger;
+        const Node* next;
+    };
+
+    /** The logger of that name between `first` and `end`, or null. */
+    static const Node* Find(const std::string& name, const Node* first, const Node* end)
+    {
+        while (first != end && first->logger->GetName() != name) {
+            first = first->next;
+        }
+        return first != end ? first : nullptr;
+    }
+
     SharedSink _sink;
-    std::mutex _mutex;
-    std::map<std::string, Ref<Logger>> _loggers;
+    std::atomic<const Node*> _first{nullptr};
 };
 
 class AppImpl : public App
@@ -145,5 +162,12 @@ App* GetApp() noexcept
     static ImmortalApp immortal;
     return &immortal.app;
 }
+
+namespace {
+
+/** Made while the program is loaded: a fork must not meet a thread that makes it. */
+[[maybe_unused]] const App* const madeEarly = GetApp();
+
+} // namespace
 
 } // namespace Quillon::Service

@@ -41,13 +41,14 @@ bool AttachAlert(SSL_CTX* connection, const Ref<PeerAlert>& alert) noexcept
     return true;
 }
 
-/** The end of a connection in order is no reason for anything. */
 void NoteAlert(const SSL* ssl, int alert)
 {
     const int code = alert & 0xFF;
-    if (code != SSL_AD_CLOSE_NOTIFY && code != SSL_AD_NO_RENEGOTIATION) {
-        const void* const slot = SSL_CTX_get_ex_data(SSL_get_SSL_CTX(ssl), GetAlertSlot());
-        (*static_cast<const Ref<PeerAlert>*>(slot))->code = code;
+    const Ref<PeerAlert> noted = GetAlert(ssl);
+    if (code == SSL_AD_CLOSE_NOTIFY) {
+        noted->isClosed = true;
+    } else if (code != SSL_AD_NO_RENEGOTIATION) {
+        noted->code = code;
     }
 }
 
@@ -160,8 +161,17 @@ TlsPeer::SessionOwner TlsPeer::Take()
     return session;
 }
 
+Ref<PeerAlert> GetAlert(const SSL* connection)
+{
+    const void* const slot = SSL_CTX_get_ex_data(SSL_get_SSL_CTX(connection), GetAlertSlot());
+    return *static_cast<const Ref<PeerAlert>*>(slot);
+}
+
 std::string DescribeAlert(int code)
 {
+    if (code == SSL_AD_CERTIFICATE_REQUIRED) {
+        return "certificate required"; // OpenSSL has no words for it
+    }
     return SSL_alert_desc_string_long(code);
 }
 

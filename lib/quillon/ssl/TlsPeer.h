@@ -7,10 +7,11 @@
 
 namespace Quillon::Ssl {
 
-/** The alert with which the peer of one connection ended it; 0 if there was none. */
+/** What the peer of one connection said about its end. Used on the I/O thread. */
 struct PeerAlert final : public RefCounted
 {
-    int code = 0;
+    int code = 0;          ///< of the alert with which the peer ended it, if not in order
+    bool isClosed = false; ///< whether the peer ended it in order [RFC 8446 6.1]
 };
 
 /**
@@ -55,6 +56,9 @@ private:
     bool _nameIsAddress;
     std::vector<SessionOwner> _sessions; // newest last
 };
+
+/** That of a connection that was prepared here. */
+Ref<PeerAlert> GetAlert(const SSL* connection);
 
 /** OpenSSL's words for an alert. */
 std::string DescribeAlert(int code);

@@ -1,7 +1,7 @@
 #include "threads/ElasticPool.h"
 
+#include "system/SystemError.h"
 #include "threads/SignalBlock.h"
-#include "threads/SystemError.h"
 
 #include "quillon/Exceptions.h"
 #include "quillon/service/Logger.h"

@@ -17,9 +17,14 @@ enum LogLevel : int
 };
 
 /**
- * Takes the lines of all loggers: logger name, level and text. Control characters other than the
- * tab arrive written out as `\xNN`, so a line cannot pretend to be two. It is called on the thread
- * that logs, from several threads at once; what it throws is dropped with the line.
+ * Takes the lines of all loggers: logger name, level and text. The text is UTF-8. Control
+ * characters other than the tab (C1 included), U+2028, U+2029, those that change the direction of
+ * text, and octets that are no UTF-8 arrive written out as `\xNN`, octet by octet, so that a line
+ * cannot pretend to be two or another. A backslash arrives as `\x5c` where it would otherwise look
+ * like the beginning of that.
+ *
+ * It is called on the thread that logs, from several threads at once; what it throws is dropped
+ * with the line.
  */
 using LogSink =
     boost::function<void(const std::string& logger, int level, const std::string& text)>;
@@ -49,7 +54,7 @@ public:
  * The loggers of the process and the sink they share. The default sink writes
  * `name[level]: text` lines to standard error.
  *
- * Thread safety: any thread.
+ * Thread safety: any thread, also in a forked child.
  */
 class QUILLON_API LogFacility
 {

@@ -1,6 +1,7 @@
 #include "HttpClient.h"
 #include "NameLookup.h"
 #include "support/TestTls.h"
+#include "system/ProcessMutex.h"
 
 #include "quillon/ssl/SSLContext.h"
 
@@ -11,7 +12,9 @@
 #include <cstdlib>
 #include <fstream>
 #include <future>
+#include <iostream>
 #include <latch>
+#include <sys/resource.h>
 #include <sys/wait.h>
 #include <vector>
 
@@ -39,6 +42,13 @@ protected:
     ProcessTest() { GTEST_FLAG_SET(death_test_style, "threadsafe"); }
 };
 
+Identity MakeLocalIdentity()
+{
+    CertificateOptions options;
+    options.alternativeNames = "IP:127.0.0.1";
+    return MakeIdentity(options);
+}
+
 /** TLS to `server`, whose self-signed certificate is trusted. */
 Ref<ConnectionSpec> MakeTlsSpec(const TestServer& server, const Identity& identity)
 {
@@ -62,7 +72,7 @@ Ref<ConnectionSpec> MakeTlsSpec(const TestServer& server, const Identity& identi
         asked.count_down();
         connection.WaitForClose();
     };
-    static const Identity identity = MakeIdentity({"test", "IP:127.0.0.1"});
+    static const Identity identity = MakeLocalIdentity();
     static TlsServer tls(identity);
     static const TestServer plainServer(handler);
     static const TestServer tlsServer(handler, tls.GetStreams());
@@ -270,9 +280,116 @@ TEST_F(ProcessTest, MayForkBeforeItsFirstExchange)
     std::exit(childIsGood && parentIsGood && parentIsStillGood ? 0 : 1);
 }
 
+/** A child that waits for an exchange of its parent, calls it off and closes its connections. */
+[[noreturn]] void ForkWithAnExchangeUnderWay()
+{
+    std::promise<void> asked;
+    std::promise<void> mayAnswer;
+    const TestServer server([&](ServerConnection& connection) {
+        connection.ReadRequest();
+        asked.set_value();
+        mayAnswer.get_future().wait();
+        connection.Write(MakeReply("200 OK", "pong"));
+    });
+    auto client = std::make_unique<HttpClient>(server);
+    const Ref<PendingRequestItem> pending = client->Start(HttpClient::MakeRequest());
+    asked.get_future().wait();
+    const bool childIsGood = RunInChild([&] {
+                                 leakCheckIsOff = true;
+                                 alarm(10); // a child that hangs ends here
+                                 bool isTold = false;
+                                 try {
+                                     client->Wait(*pending);
+                                 } catch (const HttpException&) {
+                                     isTold = pending->Cancel();
+                                 }
+                                 client.reset();
+                                 return isTold;
+                             })
+                             == 0;
+    mayAnswer.set_value();
+    std::_Exit(childIsGood && client->Wait(*pending).body == "pong" ? 0 : 1);
+}
+
+TEST_F(ProcessTest, TellsAChildThatTheExchangesAreItsParents)
+{
+    EXPECT_EXIT(ForkWithAnExchangeUnderWay(), testing::ExitedWithCode(0), "^$");
+}
+
 TEST_F(ProcessTest, TellsAChildThatForkedTooLate)
 {
     EXPECT_EXIT(ForkAfterTheFirstExchange(), testing::ExitedWithCode(0), "^$");
+}
+
+/** Forks while a thread is inside the HTTP client's lock; the child makes a pool. */
+[[noreturn]] void ForkInsideTheLock()
+{
+    Quillon::System::ProcessMutex mutex;
+    std::promise<void> taken;
+    std::promise<void> mayLeave;
+    std::thread holder([&] {
+        const Quillon::System::ProcessLock lock(mutex);
+        taken.set_value();
+        mayLeave.get_future().wait();
+    });
+    taken.get_future().wait();
+    const bool childIsGood = RunInChild([&] {
+                                 leakCheckIsOff = true;
+                                 alarm(10); // a child that hangs ends here
+                                 const bool isTold =
+                                     !Quillon::System::ProcessLock(mutex).IsIntact();
+                                 return isTold && Quillon::System::ProcessLock(mutex).IsIntact();
+                             })
+                             == 0;
+    mayLeave.set_value();
+    holder.join();
+    std::exit(childIsGood && Quillon::System::ProcessLock(mutex).IsIntact() ? 0 : 1);
+}
+
+TEST_F(ProcessTest, TakesALockOverFromAThreadOfItsParent)
+{
+    EXPECT_EXIT(ForkInsideTheLock(), testing::ExitedWithCode(0), "^$");
+}
+
+/** @return 0 if an exchange without a free descriptor fails in words, and the next succeeds. */
+int PostWithoutDescriptors()
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
+    HttpClient client(server);
+    rlimit usual{};
+    getrlimit(RLIMIT_NOFILE, &usual);
+    const rlimit none{0, usual.rlim_max};
+    setrlimit(RLIMIT_NOFILE, &none);
+    const std::string failure = client.PostAndFail();
+    setrlimit(RLIMIT_NOFILE, &usual);
+    if (failure != "The HTTP threads cannot be started: Too many open files.") {
+        std::cerr << failure;
+        return 1;
+    }
+    // With a time-out that an engine which nothing can wake up would exceed.
+    const Ref<ClientRequest> request = HttpClient::MakeRequest();
+    request->SetTimeout(10'000'000);
+    return client.Post(request).body == "pong" ? 0 : 1;
+}
+
+TEST_F(ProcessTest, RecoversFromALackOfDescriptorsAtItsStart)
+{
+    EXPECT_EXIT(std::exit(PostWithoutDescriptors()), testing::ExitedWithCode(0), "^$");
+}
+
+TEST_F(ProcessTest, TellsThatThereIsNoDescriptorForAConnection)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
+    HttpClient(server).Post();
+    HttpClient client(server);
+    rlimit usual{};
+    getrlimit(RLIMIT_NOFILE, &usual);
+    const rlimit none{0, usual.rlim_max};
+    setrlimit(RLIMIT_NOFILE, &none);
+    const std::string failure = client.PostAndFail();
+    setrlimit(RLIMIT_NOFILE, &usual);
+    EXPECT_EQ("Cannot connect to " + Describe(server) + ": Too many open files.", failure);
+    EXPECT_EQ("pong", client.Post().body);
 }
 
 /** @return 0 if an exchange succeeds and leaves nothing in the file for TLS keys. */
@@ -280,7 +397,7 @@ int PostWithKeyLog()
 {
     const std::string path = testing::TempDir() + "keylog-" + std::to_string(getpid());
     setenv("SSLKEYLOGFILE", path.c_str(), 1);
-    const Identity identity = MakeIdentity({"test", "IP:127.0.0.1"});
+    const Identity identity = MakeLocalIdentity();
     TlsServer tls(identity);
     const TestServer server(AnswerAll(MakeReply("200 OK", "pong")), tls.GetStreams());
     const std::string body = HttpClient(MakeTlsSpec(server, identity)).Post().body;
@@ -292,6 +409,51 @@ int PostWithKeyLog()
 TEST_F(ProcessTest, WritesNoTlsKeysForTheEnvironment)
 {
     EXPECT_EXIT(std::exit(PostWithKeyLog()), testing::ExitedWithCode(0), "^$");
+}
+
+/** @return 0 if a server that shows a certificate of that digest is told from a good one. */
+int PostWithSecurityLevelOfTheEnvironment(int level, const EVP_MD* digest, bool isAccepted)
+{
+    const std::string path = testing::TempDir() + "openssl-" + std::to_string(getpid());
+    std::ofstream(path) << "openssl_conf = init\n[init]\nssl_conf = ssl\n[ssl]\n"
+                           "system_default = default\n[default]\n"
+                           "CipherString = DEFAULT:@SECLEVEL="
+                        << level << "\n";
+    setenv("OPENSSL_CONF", path.c_str(), 1);
+    CertificateOptions authorityOptions;
+    authorityOptions.isAuthority = true;
+    const Identity authority = MakeIdentity(authorityOptions);
+    CertificateOptions options;
+    options.alternativeNames = "IP:127.0.0.1";
+    options.digest = digest;
+    options.rsaBits = 2048;
+    const Identity identity = MakeIdentity(options, &authority);
+    TlsServer tls(identity, 0);
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")), tls.GetStreams());
+    const std::string failure = HttpClient(MakeTlsSpec(server, authority)).PostAndFail();
+    std::remove(path.c_str());
+    return failure.empty() == isAccepted ? 0 : 1;
+}
+
+TEST_F(ProcessTest, LetsTheEnvironmentWeakenNoTls)
+{
+    EXPECT_EXIT(
+        std::exit(PostWithSecurityLevelOfTheEnvironment(0, EVP_sha1(), false)),
+        testing::ExitedWithCode(0),
+        "^$");
+}
+
+TEST_F(ProcessTest, KeepsAStricterSecurityLevelOfTheEnvironment)
+{
+    // Level 3 wants 128 bits, which RSA has with 3072.
+    EXPECT_EXIT(
+        std::exit(PostWithSecurityLevelOfTheEnvironment(3, EVP_sha256(), false)),
+        testing::ExitedWithCode(0),
+        "^$");
+    EXPECT_EXIT(
+        std::exit(PostWithSecurityLevelOfTheEnvironment(2, EVP_sha256(), true)),
+        testing::ExitedWithCode(0),
+        "^$");
 }
 
 TEST_F(ProcessTest, TakesNoAuthoritiesFromTheEnvironment)

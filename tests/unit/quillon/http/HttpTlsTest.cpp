@@ -6,6 +6,9 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <atomic>
+#include <future>
+
 using namespace Quillon::Http;
 using namespace Testing;
 using Quillon::InvalidArgumentException;
@@ -395,6 +398,191 @@ TEST_F(TlsTest, ShowsTheClientCertificate)
     EXPECT_EQ("Test client", tls.GetHandshakes().at(0).clientCommonName);
 }
 
+/** The failure of a client that shows `client`, or nothing, to a server that refuses it. */
+class ClientCertificateTest : public TlsTest
+{
+protected:
+    std::string GetFailure(const Identity* client, int maxVersion, int verdict)
+    {
+        static int refusal = 0;
+        refusal = verdict;
+        SSL_CTX_set_max_proto_version(tls.GetContext(), maxVersion);
+        SSL_CTX_set_verify(
+            tls.GetContext(),
+            SSL_VERIFY_PEER | SSL_VERIFY_FAIL_IF_NO_PEER_CERT,
+            [](int, X509_STORE_CTX* store) {
+                X509_STORE_CTX_set_error(store, refusal);
+                return 0;
+            });
+        SSLContextOptions options;
+        options.useSystemAuthorities = false;
+        options.authorities.push_back(ToCertificate(authority));
+        if (client != nullptr) {
+            options.clientCertificates = {ToCertificate(*client)};
+            options.clientKey = Quillon::Crypto::CreatePrivateKey(client->GetKeyPem());
+        }
+        const Ref<SSLContext> own = CreateSSLContext(options);
+        return HttpClient(MakeSpec(own.get(), Host, "", server)).PostAndFail();
+    }
+};
+
+TEST_F(ClientCertificateTest, IsToldFromTheServers)
+{
+    CertificateOptions clientOptions;
+    clientOptions.commonName = "Test client";
+    const Identity client = MakeIdentity(clientOptions, &authority);
+    const std::string start =
+        "The server " + Describe(server, Host) + " refuses the client's TLS certificate: ";
+    for (const int version : {TLS1_2_VERSION, TLS1_3_VERSION}) {
+        EXPECT_EQ(
+            start + "certificate expired.",
+            GetFailure(&client, version, X509_V_ERR_CERT_HAS_EXPIRED));
+        EXPECT_EQ(
+            start + "unknown CA.",
+            GetFailure(&client, version, X509_V_ERR_UNABLE_TO_GET_ISSUER_CERT_LOCALLY));
+        EXPECT_EQ(
+            start + "certificate revoked.", GetFailure(&client, version, X509_V_ERR_CERT_REVOKED));
+    }
+}
+
+TEST_F(ClientCertificateTest, IsMissed)
+{
+    EXPECT_EQ(
+        "The server " + Describe(server, Host)
+            + " refuses a client without a TLS certificate: certificate required.",
+        GetFailure(nullptr, TLS1_3_VERSION, X509_V_OK));
+}
+
+TEST_F(TlsTest, TellsWhyTheServerRefusesTheHandshake)
+{
+    SSL_CTX_set_min_proto_version(tls.GetContext(), TLS1_2_VERSION);
+    SSL_CTX_set_max_proto_version(tls.GetContext(), TLS1_2_VERSION);
+    SSL_CTX_set_cipher_list(tls.GetContext(), "aNULL:@SECLEVEL=0");
+    EXPECT_EQ(
+        "The TLS handshake with " + Describe(server, Host)
+            + " failed: the server refuses it: handshake failure.",
+        HttpClient(MakeSpec()).PostAndFail());
+}
+
+/** Answers with `bytes` over TLS and ends, with or without the notice that TLS has for it. */
+TestServer::Handler AnswerAndEnd(const std::string& bytes, bool withNotice)
+{
+    return [bytes, withNotice](ServerConnection& connection) {
+        connection.ReadRequest();
+        connection.Write(bytes);
+        if (!withNotice) {
+            connection.GetStream().EndWithoutNotice();
+        }
+    };
+}
+
+TEST_F(TlsTest, ReportsAReplyThatIsCutInItsHead)
+{
+    const std::string head =
+        "HTTP/1.1 200 OK\r\nContent-Type: text/xml\r\nContent-Length: 0\r\n\r\n";
+    for (std::size_t size = 0; size <= head.size(); ++size) {
+        for (const bool withNotice : {true, false}) {
+            const TestServer cutting(
+                AnswerAndEnd(head.substr(0, size), withNotice), tls.GetStreams());
+            HttpClient client(MakeSpec(context.get(), Host, "", cutting));
+            EXPECT_EQ(size == head.size(), client.PostAndFail().empty()) << size << withNotice;
+        }
+    }
+}
+
+// Whoever can cut the connection could otherwise choose where the reply ends.
+TEST_F(TlsTest, RefusesAReplyWithoutLengthThatEndsWithoutNotice)
+{
+    const std::string reply = "HTTP/1.1 200 OK\r\n\r\nbody";
+    const TestServer honest(AnswerAndEnd(reply, true), tls.GetStreams());
+    EXPECT_EQ("body", HttpClient(MakeSpec(context.get(), Host, "", honest)).Post().body);
+    // Also on a connection that another exchange has opened.
+    const TestServer second(
+        [&](ServerConnection& connection) {
+            connection.ReadRequest();
+            connection.Write(MakeReply("200 OK", "pong"));
+            connection.ReadRequest();
+            connection.Write(reply);
+        },
+        tls.GetStreams());
+    HttpClient client(MakeSpec(context.get(), Host, "", second));
+    EXPECT_EQ("pong", client.Post().body);
+    EXPECT_EQ("body", client.Post().body);
+    const TestServer cut(AnswerAndEnd(reply, false), tls.GetStreams());
+    EXPECT_EQ(
+        "The reply of " + Describe(cut, Host)
+            + " ended too early: the TLS connection ended without notice.",
+        HttpClient(MakeSpec(context.get(), Host, "", cut)).PostAndFail());
+}
+
+TEST_F(TlsTest, TellsInWordsThatTheServerHasNoTls)
+{
+    const TestServer plain([](ServerConnection& connection) {
+        connection.Write("HTTP/1.1 400 Bad Request\r\n\r\n");
+        connection.WaitForClose();
+    });
+    EXPECT_EQ(
+        "The TLS handshake with " + Describe(plain, Host) + " failed: wrong version number.",
+        HttpClient(MakeSpec(context.get(), Host, "", plain)).PostAndFail());
+}
+
+TEST_F(TlsTest, DoesNotRenegotiate)
+{
+    SSL_CTX_set_max_proto_version(tls.GetContext(), TLS1_2_VERSION);
+    static std::atomic<bool> wasRefused{false};
+    SSL_CTX_set_info_callback(tls.GetContext(), [](const SSL*, int where, int result) {
+        if ((where & SSL_CB_READ_ALERT) == SSL_CB_READ_ALERT) {
+            wasRefused = wasRefused || (result & 0xFF) == SSL_AD_NO_RENEGOTIATION;
+        }
+    });
+    std::promise<void> closed;
+    const TestServer asking(
+        [&](ServerConnection& connection) {
+            connection.ReadRequest();
+            connection.GetStream().AskForANewHandshake();
+            connection.Write(MakeReply("200 OK", "pong"));
+            connection.WaitForClose();
+            closed.set_value();
+        },
+        tls.GetStreams());
+    {
+        HttpClient client(MakeSpec(context.get(), Host, "", asking));
+        const Ref<ClientRequest> request = HttpClient::MakeRequest();
+        request->SetTimeout(10'000'000);
+        client.PostAndFail(request); // how it ends is the server's affair
+    }
+    closed.get_future().wait();
+    EXPECT_TRUE(wasRefused);
+}
+
+/** The failure of an exchange with a server of such a certificate. */
+class WeakServerTest : public TlsTest
+{
+protected:
+    std::string GetFailure(const CertificateOptions& options)
+    {
+        CertificateOptions weak = options;
+        weak.alternativeNames = "DNS:sts.test";
+        const Identity shown = MakeIdentity(weak, &authority);
+        TlsServer weakTls(shown, 0);
+        const TestServer other(AnswerAll(MakeReply("200 OK", "pong")), weakTls.GetStreams());
+        return HttpClient(MakeSpec(context.get(), Host, "", other)).PostAndFail();
+    }
+};
+
+TEST_F(WeakServerTest, IsRefused)
+{
+    CertificateOptions shortKey;
+    shortKey.rsaBits = 1024;
+    EXPECT_NE("", GetFailure(shortKey));
+    CertificateOptions oldDigest;
+    oldDigest.digest = EVP_sha1();
+    EXPECT_NE("", GetFailure(oldDigest));
+    CertificateOptions good;
+    good.rsaBits = 2048;
+    EXPECT_EQ("", GetFailure(good));
+}
+
 class WildcardTest : public TlsTest
 {
 protected:
@@ -416,6 +604,22 @@ TEST_F(WildcardTest, RefusesTwoLabelsAndNone)
     EXPECT_EQ(
         GetRefusal("hostname mismatch", "example.test", "example.test"),
         HttpClient(MakeSpec("", "example.test")).PostAndFail());
+}
+
+class PartialWildcardTest : public TlsTest
+{
+protected:
+    PartialWildcardTest()
+        : TlsTest("DNS:s*.example.test")
+    {}
+};
+
+// [RFC 9525 6.3]: a wildcard is a whole label.
+TEST_F(PartialWildcardTest, IsNoName)
+{
+    EXPECT_EQ(
+        GetRefusal("hostname mismatch", "sts.example.test", "sts.example.test"),
+        HttpClient(MakeSpec("", "sts.example.test")).PostAndFail());
 }
 
 template <class Action>

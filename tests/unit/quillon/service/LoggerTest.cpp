@@ -99,6 +99,43 @@ TEST(SetSink, EmptyFunctionBringsTheDefaultBack)
     EXPECT_EQ("plain[8]: back\n", testing::internal::GetCapturedStderr());
 }
 
+/** What a sink gets of a text. */
+std::string GetLogged(const std::string& text)
+{
+    const Capture capture;
+    GetLogger("logged")->Log(8, text);
+    return capture.GetLines().at(0).substr(std::string("logged|8|").size());
+}
+
+TEST(Log, TellsWhatItWroteOutFromWhatWasThere)
+{
+    EXPECT_EQ("a\\x0ab", GetLogged("a\nb"));
+    EXPECT_EQ("a\\x5cx0ab", GetLogged("a\\x0ab"));
+    EXPECT_EQ("\\\\x0a", GetLogged("\\\n"));
+    EXPECT_EQ("DOMAIN\\group \\x \\xg0 \\", GetLogged("DOMAIN\\group \\x \\xg0 \\"));
+}
+
+TEST(Log, WritesOutWhatSteersATerminalOrTheReader)
+{
+    EXPECT_EQ("\\xc2\\x9b", GetLogged("\u009b"));
+    EXPECT_EQ("\\xe2\\x80\\xa8\\xe2\\x80\\xa9", GetLogged("\u2028\u2029"));
+    EXPECT_EQ("\\xe2\\x80\\xae", GetLogged("\u202e"));
+    EXPECT_EQ("\\xe2\\x81\\xa6", GetLogged("\u2066"));
+    EXPECT_EQ("\\xd8\\x9c", GetLogged("\u061c"));
+    EXPECT_EQ(
+        "\u00a0\u2027\u202f\u2065\u206a\U0001f511",
+        GetLogged("\u00a0\u2027\u202f\u2065\u206a\U0001f511"));
+}
+
+TEST(Log, WritesOutWhatIsNotUtf8)
+{
+    EXPECT_EQ("\\x9b", GetLogged("\x9b"));
+    EXPECT_EQ("\\xc0\\x8a", GetLogged("\xc0\x8a"));
+    EXPECT_EQ("\\xed\\xa0\\x80", GetLogged("\xed\xa0\x80"));
+    EXPECT_EQ("\\xe2\\x80", GetLogged("\xe2\x80"));
+    EXPECT_EQ("\\xf4\\x90\\x80\\x80", GetLogged("\xf4\x90\x80\x80"));
+}
+
 TEST(Log, WritesControlCharactersOut)
 {
     const Capture capture;
