@@ -391,9 +391,9 @@ std::string Transfer::Describe(CURLcode result) const
     }
     switch (result) {
     case CURLE_OK:
-        return "The reply of " + server + " ended too early: "
-               + (_reply.HasHead() ? "the TLS connection ended without notice."
-                                   : "its headers are not complete.");
+        return "The reply of " + server
+               + (_reply.HasHead() ? " ended too early: the TLS connection ended without notice."
+                                   : " ended too early: its headers are not complete.");
     case CURLE_COULDNT_RESOLVE_HOST:
         return "The host name " + _spec.connectHost + " cannot be resolved.";
     case CURLE_COULDNT_CONNECT:
