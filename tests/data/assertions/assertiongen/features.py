@@ -65,6 +65,11 @@ def _types():
          "SAML-CORE 2.5.1",
          _delegated("del"),
          _delegated("un"), "does not cover what the prefix of the xsi:type 'un:Delegation")
+    _row("delegate-without-instant", "when it was is not known", "SAML-DEL 2.2",
+         _delegated("del", instant=None),
+         changed(_delegated("un"), declare={"un": "urn:example:other"},
+                 sign={"prefix_list": "del un"}),
+         "of type '{urn:example:other}DelegationRestrictionType'")
     _row("type-of-confirmation-data", "the type that the data has anyway", "SAML-CORE 2.4.1.2",
          assertion(declare=_XSI, confirmations=[{
              "method": names.BEARER, "end": names.END,
@@ -79,9 +84,10 @@ def _types():
          "Unexpected attribute 'xsi:nil' of 'saml:Assertion' at 1,1")
 
 
-def _delegated(prefix):
+def _delegated(prefix, instant=names.ISSUED):
     name = {"value": "service@example.com", "format": names.UPN}
-    delegate = (f'<del:Delegate DelegationInstant="{names.ISSUED}"><saml:NameID '
+    when = "" if instant is None else f' DelegationInstant="{instant}"'
+    delegate = (f'<del:Delegate{when}><saml:NameID '
                 f'Format="{names.UPN}">service@example.com</saml:NameID></del:Delegate>')
     return assertion(
         declare={**_XSI, "del": names.DEL, "un": names.DEL},
@@ -89,7 +95,7 @@ def _delegated(prefix):
         sign={"prefix_list": "del"},
         conditions=_condition(
             f'<saml:Condition xsi:type="{prefix}:DelegationRestrictionType">{delegate}'
-            "</saml:Condition>", delegates=[{"name": name, "instant": names.ISSUED}]))
+            "</saml:Condition>", delegates=[{"name": name, "instant": instant}]))
 
 
 def _keys():
@@ -357,6 +363,8 @@ def _for_mapping():
                            ("upn-lower-case", "http://schemas.xmlsoap.org/claims/upn")):
         _row(f"name-of-{name}", "a UPN in another spelling", "SAML-CORE 8.3",
              assertion(subject={"value": "alice@example.com", "format": spelling}), "sha1", "")
+    _row("name-with-two-signs", "a UPN is split at the last sign", "SAML-CORE 8.3",
+         assertion(subject={"value": "alice@home@example.com", "format": names.UPN}), "sha1", "")
     _row("disjoint-audiences", "nobody is named by both", "SAML-CORE 2.5.1.4",
          assertion(conditions={"start": names.START, "end": names.END,
                                "audiences": [["urn:a", "urn:b"], ["urn:c"]]}),
