@@ -7,6 +7,12 @@
 /** An empty value must not pass for an option that was left out. */
 std::string CheckNotEmpty(const std::string& value);
 
+/** A text goes into the request, which is XML: no octets and characters that XML cannot hold. */
+std::string CheckText(const std::string& value);
+
+/** A text that is not empty. */
+std::string CheckNotEmptyText(const std::string& value);
+
 /** A name goes into the request and into descriptions: it is text without control characters. */
 std::string CheckName(const std::string& value);
 

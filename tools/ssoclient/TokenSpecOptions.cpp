@@ -54,7 +54,7 @@ void TokenSpecOptions::AddTo(const Command& command)
         .Check(CheckName)
         .ValueName("NAME");
     command.AddOption("--audience", spec.audienceRestriction, "Restrict the token to these parties")
-        .Check(CheckNotEmpty)
+        .Check(CheckNotEmptyText)
         .ValueName("URI");
     command
         .AddPairOption(
@@ -65,6 +65,7 @@ void TokenSpecOptions::AddTo(const Command& command)
                 }
             },
             "Ask for this attribute in the token's advice; may repeat")
+        .Check(CheckText)
         .ValueName("SOURCE NAME=VALUE");
 }
 

@@ -1,7 +1,9 @@
 #include "quillon/xml/Node.h"
 
+#include "core/Quote.h"
 #include "quillon/Exceptions.h"
 #include "xml/Arena.h"
+#include "xml/characters.h"
 
 #include <algorithm>
 #include <limits>
@@ -78,6 +80,11 @@ Node* Node::GetFirstChild() const noexcept
 
 void TextNode::SetText(std::string_view text)
 {
+    if (const auto fault = FindCharacterFault(text)) {
+        const std::string element =
+            _parent == nullptr ? "" : " of element " + Quote(_parent->GetName());
+        throw InvalidArgumentException("The text" + element + " " + *fault);
+    }
     _text = _arena->CopyText(text);
 }
 
@@ -218,6 +225,9 @@ ElementNode* ElementNode::FindChildElement(
 
 void ElementNode::DefineAttribute(std::string_view name, std::string_view value)
 {
+    if (const auto fault = FindCharacterFault(value)) {
+        throw InvalidArgumentException("The value of attribute " + Quote(name) + " " + *fault);
+    }
     const std::string_view ownValue = _arena->CopyText(value);
     for (std::uint32_t i = 0; i < _attributeCount; ++i) {
         if (_attributes[i].name == name) {

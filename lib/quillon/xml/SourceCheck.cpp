@@ -1,10 +1,9 @@
 #include "xml/SourceCheck.h"
 
 #include "quillon/xml/Parser.h"
+#include "xml/characters.h"
 
 #include <algorithm>
-#include <cstdint>
-#include <cstring>
 #include <string>
 #include <utility>
 
@@ -23,87 +22,11 @@ constexpr std::size_t HarmlessTagLength = ParserLimits::MaxAttributes * Shortest
     throw XMLParseException(what + " at octet " + std::to_string(offset));
 }
 
-constexpr unsigned char ByteAt(std::string_view text, std::size_t position) noexcept
-{
-    return position < text.size() ? static_cast<unsigned char>(text[position]) : 0;
-}
-
-/** A lead octet's sequence length and the range of its second octet; length 0 for no lead. */
-struct SequenceRule
-{
-    unsigned length;
-    unsigned char secondMin;
-    unsigned char secondMax;
-};
-
-/** [RFC 3629 4]: the narrowed ranges exclude overlong forms, surrogates and beyond U+10FFFF. */
-constexpr SequenceRule GetSequenceRule(unsigned char lead) noexcept
-{
-    if (lead < 0xC2) {
-        return {0, 0, 0};
-    }
-    if (lead < 0xE0) {
-        return {2, 0x80, 0xBF};
-    }
-    if (lead < 0xF0) {
-        return {
-            3,
-            static_cast<unsigned char>(lead == 0xE0 ? 0xA0 : 0x80),
-            static_cast<unsigned char>(lead == 0xED ? 0x9F : 0xBF)};
-    }
-    if (lead < 0xF5) {
-        return {
-            4,
-            static_cast<unsigned char>(lead == 0xF0 ? 0x90 : 0x80),
-            static_cast<unsigned char>(lead == 0xF4 ? 0x8F : 0xBF)};
-    }
-    return {0, 0, 0};
-}
-
-/** The length of the UTF-8 sequence at `position`, which is not ASCII; 0 if it is malformed. */
-unsigned GetSequenceLength(std::string_view source, std::size_t position) noexcept
-{
-    const SequenceRule rule = GetSequenceRule(ByteAt(source, position));
-    const unsigned char second = ByteAt(source, position + 1);
-    if (rule.length == 0 || second < rule.secondMin || second > rule.secondMax) {
-        return 0;
-    }
-    for (unsigned i = 2; i < rule.length; ++i) {
-        if ((ByteAt(source, position + i) & 0xC0U) != 0x80U) {
-            return 0;
-        }
-    }
-    return rule.length;
-}
-
-/** Whether a whole word of octets starts at `position`, and all of them are ASCII. */
-bool IsAsciiWord(std::string_view source, std::size_t position) noexcept
-{
-    constexpr std::uint64_t NotAscii = 0x8080808080808080U;
-    std::uint64_t word = NotAscii;
-    if (position + sizeof word <= source.size()) {
-        std::memcpy(&word, source.data() + position, sizeof word);
-    }
-    return (word & NotAscii) == 0;
-}
-
 void RequireUtf8(std::string_view source)
 {
-    std::size_t position = 0;
-    while (position < source.size()) {
-        if (IsAsciiWord(source, position)) {
-            position += sizeof(std::uint64_t);
-            continue;
-        }
-        if (ByteAt(source, position) < 0x80U) {
-            ++position;
-            continue;
-        }
-        const unsigned length = GetSequenceLength(source, position);
-        if (length == 0) {
-            Fail(position, "The text is not UTF-8");
-        }
-        position += length;
+    const std::size_t position = FindNotUtf8(source);
+    if (position != std::string_view::npos) {
+        Fail(position, "The text is not UTF-8");
     }
 }
 

@@ -79,6 +79,10 @@ TreeBuilder::TreeBuilder(Ref<Arena> arena, std::string_view source)
 void TreeBuilder::StartElement(const TagEvent& tag)
 {
     FlushText();
+    // The parser reports the tag first, and only then misses its end.
+    if (tag.tagEnd == _source.data() + _source.size()) {
+        throw XMLParseException("The document ends inside a tag");
+    }
     if (!IsInSource(std::string_view(tag.tagEnd, 1))) {
         throw XMLParseException("The parser does not read the text in place");
     }

@@ -56,6 +56,17 @@ class Acquire(ServiceTest):
             with self.subTest(text=text):
                 self.assert_done(self.acquire(password=self.write("other", text)))
 
+    def test_password_that_xml_cannot_hold(self):
+        for password, message in ((b"gr\xfc\xdf\n", "is not UTF-8"),
+                                  (b"a\x00b\n", "holds a character that XML does not allow"),
+                                  (b"a\x1b", "holds a character that XML does not allow")):
+            with self.subTest(password=password):
+                file = self.folder / "other"
+                file.write_bytes(password)
+                self.assert_fails_matching(
+                    self.acquire(password=file), USAGE, "UsageError",
+                    re.escape(f"--password-file: the password {message}"))
+
     def test_blanks_belong_to_the_password(self):
         self.assert_fails_matching(
             self.acquire(password=self.write("other", "alice-secret \n")),

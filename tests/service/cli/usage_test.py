@@ -203,6 +203,21 @@ class UsageErrors(ProgramTest):
                 self.assert_value_is_refused("is not UTF-8", "acquire password", "--user",
                                              os.fsdecode(value))
 
+    def test_text_that_xml_cannot_hold(self):
+        for value, message in ((b"\xff", "is not UTF-8"), (b"a\xfc", "is not UTF-8"),
+                               (b"\x01", "holds a character that XML does not allow"),
+                               (b"a\x1b[31m", "holds a character that XML does not allow"),
+                               (b"\xef\xbf\xbf", "holds a character that XML does not allow")):
+            with self.subTest(value=value):
+                text = os.fsdecode(value)
+                self.assert_value_is_refused(message, "acquire password", "--audience", text)
+                options = {**self.COMMANDS["acquire password"]}
+                words = [word for pair in options.items() for word in pair]
+                for advice in ((text, "n=v"), ("s", text + "=v"), ("s", "n=" + text)):
+                    self.assert_fails(
+                        ssoclient("acquire", "password", *words, "--advice", *advice), USAGE,
+                        "UsageError", f"--advice: {message}")
+
     def test_lifetime_that_is_too_long(self):
         for command in ("acquire password", "acquire certificate", "acquire token", "acquire gss",
                         "renew"):

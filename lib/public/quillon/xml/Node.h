@@ -88,7 +88,12 @@ class QUILLON_API TextNode : public Node
 public:
     std::string_view GetText() const noexcept { return _text; }
 
-    /** Replaces the text. It is kept as given; escaping is the writer's concern. */
+    /**
+     * Replaces the text. It is kept as given; escaping is the writer's concern.
+     *
+     * @throws InvalidArgumentException  the text is not UTF-8, or holds a character that XML does
+     *                                   not allow [XML 2.2]. Says at which octet, never the text.
+     */
     void SetText(std::string_view text);
 
 private:
@@ -233,7 +238,12 @@ public:
 
     Node* GetFirstChild() const noexcept { return _firstChild; }
 
-    /** Sets the attribute of that written name, after the existing ones or in its old place. */
+    /**
+     * Sets the attribute of that written name, after the existing ones or in its old place.
+     *
+     * @throws InvalidArgumentException  the value is not UTF-8, or holds a character that XML does
+     *                                   not allow [XML 2.2]. Says at which octet, never the value.
+     */
     void DefineAttribute(std::string_view name, std::string_view value);
 
     /**

@@ -107,6 +107,9 @@ public:
 
     void Sign(const Crypto::PrivateKey* key) override
     {
+        if (key == nullptr) {
+            throw InvalidArgumentException("A signature needs a private key");
+        }
         if (!IsAcceptedKey(_algorithm, key->GetKeyType(), key->GetBits())) {
             throw XmlSecurityException(
                 "A key of type " + key->GetDescription() + " cannot sign with "

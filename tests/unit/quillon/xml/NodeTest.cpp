@@ -13,12 +13,56 @@ Ref<ElementNode> MakeElement(const char* prefix, const char* localName)
     return element;
 }
 
-Ref<TextNode> MakeText(const char* content)
+Ref<TextNode> MakeText(std::string_view content)
 {
     Ref<TextNode> text;
     CreateTextNode(text);
     text->SetText(content);
     return text;
+}
+
+std::string ToUtf8(unsigned codePoint)
+{
+    const auto tail = [codePoint](int shift) {
+        return static_cast<char>(0x80U | ((codePoint >> shift) & 0x3FU));
+    };
+    const auto lead = [codePoint](unsigned mark, int shift) {
+        return static_cast<char>(mark | (codePoint >> shift));
+    };
+    if (codePoint < 0x80) {
+        return {static_cast<char>(codePoint)};
+    }
+    if (codePoint < 0x800) {
+        return {lead(0xC0, 6), tail(0)};
+    }
+    if (codePoint < 0x10000) {
+        return {lead(0xE0, 12), tail(6), tail(0)};
+    }
+    return {lead(0xF0, 18), tail(12), tail(6), tail(0)};
+}
+
+/** What is said of a text that is refused; "accepted" if it is not. */
+std::string GetTextFault(std::string_view content)
+{
+    try {
+        MakeText(content);
+    } catch (const InvalidArgumentException& error) {
+        return error.what();
+    }
+    return "accepted";
+}
+
+std::string GetValueFault(std::string_view value)
+{
+    const Ref<ElementNode> element = MakeElement("", "e");
+    element->DefineAttribute("p:name", "before");
+    try {
+        element->DefineAttribute("p:name", value);
+    } catch (const InvalidArgumentException& error) {
+        // What is refused changes nothing.
+        return element->FindAttribute("p:name")->value == "before" ? error.what() : "changed";
+    }
+    return "accepted";
 }
 
 TEST(CreateElementNode, JoinsPrefixAndLocalName)
@@ -45,6 +89,126 @@ TEST(CreateTextNode, IsEmptyUntilItsTextIsSet)
     EXPECT_EQ(text->GetText(), "");
     text->SetText("<&>");
     EXPECT_EQ(text->GetText(), "<&>");
+}
+
+// The parser's library is the judge: what it reads back, and nothing else, may be written.
+TEST(SetText, TakesExactlyTheCharactersThatXmlAllows)
+{
+    std::vector<unsigned> codePoints;
+    for (unsigned codePoint = 0; codePoint <= 0x10FFFF; ++codePoint) {
+        // All of the first 1,024, and of the rest both ends of every 256.
+        if (codePoint < 0x400 || (codePoint & 0xFFU) < 2 || (codePoint & 0xFFU) > 0xFC) {
+            codePoints.push_back(codePoint);
+        }
+    }
+    std::size_t acceptedCount = 0;
+    for (const unsigned codePoint : codePoints) {
+        const std::string text = ToUtf8(codePoint);
+        const bool isMarkup = text == "<" || text == "&";
+        const bool isAccepted = GetTextFault(text) == "accepted";
+        ASSERT_EQ(isAccepted, isMarkup || GetParseError("<e>" + text + "</e>") == "accepted")
+            << std::hex << codePoint;
+        ASSERT_EQ(isAccepted, GetValueFault(text) == "accepted") << std::hex << codePoint;
+        acceptedCount += isAccepted ? 1 : 0;
+    }
+    // [XML 2.2]: 29 control characters, the surrogates (five of each of 8 times 256) and two more.
+    EXPECT_EQ(codePoints.size() - acceptedCount, 29U + 8U * 5U + 2U);
+}
+
+TEST(SetText, SaysWhereTheFirstForbiddenCharacterIs)
+{
+    const std::vector<std::string> forbidden{
+        std::string(1, '\0'),
+        "\x01",
+        "\x08",
+        "\x0B",
+        "\x0C",
+        "\x0E",
+        "\x1B",
+        "\x1F",
+        "\xEF\xBF\xBE",
+        "\xEF\xBF\xBF"};
+    for (const std::string& character : forbidden) {
+        for (std::size_t before = 0; before < 18; ++before) {
+            const std::string text = std::string(before, 'a') + character + "b\x01 secret";
+            const std::string where =
+                "holds a character that XML does not allow at octet " + std::to_string(before);
+            EXPECT_EQ(GetTextFault(text), "Invalid argument : The text " + where);
+            EXPECT_EQ(
+                GetValueFault(text), "Invalid argument : The value of attribute 'p:name' " + where);
+        }
+    }
+}
+
+TEST(SetText, SaysWhereItIsNotUtf8)
+{
+    const std::vector<std::string> malformed{
+        "\x80",             // no lead
+        "\xFC\xBC",         // Latin-1
+        "\xC0\x80",         // NUL, overlong
+        "\xC1\x81",         // overlong
+        "\xE0\x9F\xBF",     // overlong
+        "\xF0\x8F\xBF\xBF", // overlong
+        "\xED\xA0\x80",     // a surrogate
+        "\xED\xBF\xBF",     // a surrogate
+        "\xF4\x90\x80\x80", // beyond U+10FFFF
+        "\xC3(",            // a tail is missing
+        "\xE2\x82 ",
+        "\xF0\x9F\x98 ",
+        "\xFE",
+        "\xFF"};
+    for (const std::string& octets : malformed) {
+        for (std::size_t before = 0; before < 18; ++before) {
+            const std::string text = std::string(before, 'a') + octets + "secret";
+            const std::string where = "is not UTF-8 at octet " + std::to_string(before);
+            EXPECT_EQ(GetTextFault(text), "Invalid argument : The text " + where);
+            EXPECT_EQ(
+                GetValueFault(text), "Invalid argument : The value of attribute 'p:name' " + where);
+        }
+    }
+    // Cut by the end of the text.
+    EXPECT_EQ(GetTextFault("\xC3"), "Invalid argument : The text is not UTF-8 at octet 0");
+    EXPECT_EQ(GetTextFault("ab\xE2\x82"), "Invalid argument : The text is not UTF-8 at octet 2");
+}
+
+TEST(SetText, TakesWhatIsNextToTheForbidden)
+{
+    const std::string text = "\t\n\r ~\x7F\xC2\x80\xDF\xBF\xE0\xA0\x80\xED\x9F\xBF\xEE\x80\x80"
+                             "\xEF\xBF\xBD\xF0\x90\x80\x80\xF0\x9F\xBF\xBF\xF4\x8F\xBF\xBF";
+    for (std::size_t before = 0; before < 18; ++before) {
+        EXPECT_EQ(GetTextFault(std::string(before, 'a') + text), "accepted");
+        EXPECT_EQ(GetValueFault(std::string(before, 'a') + text), "accepted");
+    }
+}
+
+TEST(SetText, NamesTheElementAroundTheTextAndKeepsTheOldText)
+{
+    const Ref<ElementNode> element = MakeElement("p", "e");
+    const Ref<TextNode> text = MakeText("before");
+    element->AppendChild(text.get());
+    try {
+        text->SetText("a\x02 secret");
+        FAIL() << "accepted";
+    } catch (const InvalidArgumentException& error) {
+        EXPECT_STREQ(
+            error.what(),
+            "Invalid argument : The text of element 'p:e' "
+            "holds a character that XML does not allow at octet 1");
+    }
+    EXPECT_EQ(text->GetText(), "before");
+}
+
+// A parser reads a plain carriage return as a line feed [XML 2.11].
+TEST(Serialize, KeepsCarriageReturns)
+{
+    const Ref<ElementNode> element = MakeElement("", "e");
+    element->DefineAttribute("a", "1\r2\r\n3\n\t");
+    element->AppendChild(MakeText("x\ry\r\nz\n\t").get());
+    const std::string written = SerializeToText(element.get());
+    EXPECT_EQ(written, "<e a=\"1&#xD;2&#xD;&#xA;3&#xA;&#x9;\">x&#xD;y&#xD;\nz\n\t</e>");
+    const Ref<Document> read = ParseText(written);
+    EXPECT_EQ(read->GetRootElement()->FindAttribute("a")->value, "1\r2\r\n3\n\t");
+    EXPECT_EQ(AsText(read->GetRootElement()->GetFirstChild())->GetText(), "x\ry\r\nz\n\t");
 }
 
 TEST(DefineAttribute, KeepsTheOrderAndReplacesInPlace)

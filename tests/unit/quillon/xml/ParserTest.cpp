@@ -230,6 +230,26 @@ TEST(Parse, RefusesOctetsThatAreNotUtf8)
         "accepted");
 }
 
+TEST(Parse, SaysThatATagIsCut)
+{
+    EXPECT_EQ(GetParseError("<a"), "The document ends inside a tag at line 1, column 3");
+    EXPECT_EQ(GetParseError("<r>\n<a"), "The document ends inside a tag at line 2, column 3");
+    EXPECT_EQ(GetParseError("<a "), "The document ends inside a tag at line 1, column 4");
+}
+
+// Wherever a document is cut, it is the parser's text or ours that says so, and names the place.
+TEST(Parse, RefusesADocumentThatIsCutAnywhere)
+{
+    const std::string document = "<?xml version='1.0'?><!--c--><p:r xmlns:p='urn:p' a='&lt;'>"
+                                 "t&amp;<![CDATA[d]]><?i n?><e/>\n</p:r>";
+    ASSERT_EQ(GetParseError(document), "accepted");
+    for (std::size_t length = 1; length < document.size(); ++length) {
+        const std::string error = GetParseError(document.substr(0, length));
+        EXPECT_THAT(error, testing::ContainsRegex("line [0-9]+, column [0-9]+$")) << length;
+        EXPECT_THAT(error, testing::Not(testing::HasSubstr("in place"))) << length;
+    }
+}
+
 TEST(Parse, RefusesEveryDoctype)
 {
     for (const char* doctype :

@@ -164,6 +164,96 @@ TEST(BuildUserPassTokenRequest, LeavesTheRequestUntouchedOnBadLifetime)
     EXPECT_EQ(request.body, "before");
 }
 
+// The envelope is built last: what no XML can hold leaves the body as it was.
+TEST(BuildUserPassTokenRequest, RefusesWhatXmlCannotHold)
+{
+    const auto expectRefusal = [](const std::string& user,
+                                  const std::string& password,
+                                  const TokenSpec& spec,
+                                  const std::string& message) {
+        Request request;
+        request.body = "before";
+        EXPECT_EQ(
+            GetFailure([&] {
+                RequestBuilderImpl(boost::none)
+                    .BuildUserPassTokenRequest(user, password, spec, request);
+            }),
+            "InvalidArgumentException: Invalid argument : " + message);
+        EXPECT_EQ(request.soapAction, WST "/RST/Issue");
+        EXPECT_EQ(request.body, "before");
+    };
+    const std::string control = " holds a character that XML does not allow at octet ";
+    TokenSpec spec = SpecWithLifetime(300);
+    expectRefusal("j\x01", "p", spec, "The text of element 'wsse:Username'" + control + "1");
+    expectRefusal(
+        "j", std::string("p\0w", 3), spec, "The text of element 'wsse:Password'" + control + "1");
+    expectRefusal(
+        "j", "gr\xFC\xDF", spec, "The text of element 'wsse:Password' is not UTF-8 at octet 2");
+    spec.delegateTo = "\xEF\xBF\xBF";
+    expectRefusal("j", "p", spec, "The text of element 'wsse:Username'" + control + "0");
+    spec.delegateTo = boost::none;
+    spec.audienceRestriction = {"a", "b\x1B"};
+    expectRefusal("j", "p", spec, "The text of element 'wsa:Address'" + control + "1");
+    spec.audienceRestriction.clear();
+    spec.advice = {{"urn:s\x02", {}}};
+    expectRefusal("j", "p", spec, "The value of attribute 'AdviceSource'" + control + "5");
+    spec.advice = {{"urn:s", {{"n\xC0\x80", {}}}}};
+    expectRefusal("j", "p", spec, "The value of attribute 'Name' is not UTF-8 at octet 1");
+    spec.advice = {{"urn:s", {{"n", {"v\x7F", "v\x0B"}}}}};
+    expectRefusal(
+        "j", "p", spec, "The text of element 'rsa-advice:AttributeValue'" + control + "1");
+    // The lifetime comes first, and before the action.
+    Request request;
+    spec.tokenLifetimeSec = 0;
+    EXPECT_EQ(
+        GetFailure([&] {
+            RequestBuilderImpl(boost::none).BuildUserPassTokenRequest("\x01", "p", spec, request);
+        }),
+        BadLifetime);
+    EXPECT_EQ(request.soapAction, "");
+}
+
+TEST(BuildContinuedSPNegoRequest, RefusesContextIdThatXmlCannotHold)
+{
+    Request request;
+    EXPECT_EQ(
+        GetFailure([&] {
+            RequestBuilderImpl(boost::none).BuildContinuedSPNegoRequest("id\x01", Leg(), request);
+        }),
+        "InvalidArgumentException: Invalid argument : The value of attribute 'Context' "
+        "holds a character that XML does not allow at octet 2");
+    EXPECT_EQ(request.body, "");
+}
+
+TEST(BuildExchangeTokenRequest, RefusesTokenIdThatXmlCannotHold)
+{
+    FakeSamlToken token = GetToken("bearer");
+    token.id = "_id\x0E";
+    Request request;
+    EXPECT_EQ(
+        GetFailure([&] {
+            RequestBuilderImpl(GetIdentity())
+                .BuildExchangeTokenRequest(token, SpecWithLifetime(300), request);
+        }),
+        "InvalidArgumentException: Invalid argument : The text of element 'wsse:KeyIdentifier' "
+        "holds a character that XML does not allow at octet 3");
+    EXPECT_EQ(request.body, "");
+}
+
+TEST(BuildUserPassTokenRequest, KeepsCarriageReturns)
+{
+    TokenSpec spec = SpecWithLifetime(300);
+    spec.audienceRestriction = {"a\rb"};
+    spec.advice = {{"s\r", {{"n", {"v\r\n"}}}}};
+    Request request;
+    RequestBuilderImpl(boost::none).BuildUserPassTokenRequest("u\r", "p\r\n", spec, request);
+    EXPECT_THAT(request.body, HasSubstr("<wsse:Username>u&#xD;</wsse:Username>"));
+    EXPECT_THAT(request.body, HasSubstr(">p&#xD;\n</wsse:Password>"));
+    EXPECT_THAT(request.body, HasSubstr("<wsa:Address>a&#xD;b</wsa:Address>"));
+    EXPECT_THAT(request.body, HasSubstr("AdviceSource=\"s&#xD;\""));
+    EXPECT_THAT(request.body, HasSubstr(">v&#xD;\n</rsa-advice:AttributeValue>"));
+}
+
 TEST(BuildUserPassTokenRequest, WithIdentityAndBearerConfirmationIsUnsignedBearer)
 {
     TokenSpec spec = SpecWithLifetime(300);

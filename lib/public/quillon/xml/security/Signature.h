@@ -110,6 +110,7 @@ public:
     /**
      * Computes the digests and the signature value, each in one pass over the tree as it is.
      *
+     * @throws InvalidArgumentException `key` is null.
      * @throws XmlSecurityException     the key does not fit the signature method, or a reference
      *                                  does not name exactly one element.
      * @throws Crypto::CryptoException  the key fails to sign.
