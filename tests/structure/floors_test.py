@@ -47,6 +47,7 @@ PUBLIC_FLOORS = {
     "quillon": {
         "Exceptions.h": "core", "Export.h": "core", "Functor.h": "core", "MessageFormatter.h": "core",
         "PanicVerify.h": "core", "Reader.h": "core", "Ref.h": "core", "StringUtil.h": "core",
+        "Wiped.h": "core",
         "system/ThreadPool.h": "threads",
     },
     "ssoClient": {

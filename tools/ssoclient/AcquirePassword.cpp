@@ -25,8 +25,8 @@ ExitCode AcquirePassword(const AcquirePasswordOptions& options)
     const auto service = options.service.CreateService(
         ReadCertificates(options.service.trustFiles), options.identity.Read());
     TokenOutput output(options.output);
-    SecretText password;
-    GetSecret(Password, options.passwordFile, password);
+    Quillon::Wiped password;
+    GetPassword(options.passwordFile, password);
     output.Show(service->AcquireToken(options.user, password.Get(), options.token.spec));
     return ExitCode::DONE;
 }

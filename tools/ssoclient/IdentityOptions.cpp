@@ -16,6 +16,7 @@
 #include <string_view>
 
 using Quillon::MessageFormatter;
+using Quillon::Wiped;
 using Quillon::Crypto::Certificate;
 using Quillon::Crypto::PassphraseCallback;
 using Quillon::Crypto::PrivateKey;
@@ -33,27 +34,10 @@ bool IsUri(const std::string& key)
     return end != 0 && end != std::string::npos && key[end] == ':';
 }
 
-/** The text of a key file, which is overwritten when it is no longer needed. */
-class KeyFile
-{
-public:
-    explicit KeyFile(const std::string& path)
-        : _text(ReadFile(path))
-    {}
-    KeyFile(const KeyFile&) = delete;
-    KeyFile& operator=(const KeyFile&) = delete;
-    ~KeyFile() { ::explicit_bzero(_text.data(), _text.size()); }
-
-    const std::string& GetText() const noexcept { return _text; }
-
-private:
-    std::string _text;
-};
-
 Quillon::Ref<const PrivateKey> ReadKey(const IdentityOptions& options)
 {
     // A store may ask more than once; the user is asked once.
-    SecretText passphrase;
+    Wiped passphrase;
     const PassphraseCallback getPassphrase = [&] {
         if (passphrase.Get().empty()) {
             GetSecret(KeyPassphrase, options.keyPassphraseFile, passphrase);
@@ -63,7 +47,8 @@ Quillon::Ref<const PrivateKey> ReadKey(const IdentityOptions& options)
     if (IsUri(*options.key)) {
         return Quillon::Crypto::LoadPrivateKey(*options.key, getPassphrase);
     }
-    return Quillon::Crypto::CreatePrivateKey(KeyFile(*options.key).GetText(), getPassphrase);
+    const Wiped file(ReadFile(*options.key));
+    return Quillon::Crypto::CreatePrivateKey(file.Get(), getPassphrase);
 }
 
 // The service would refuse the request, or, with a key that cannot sign at all, there would be

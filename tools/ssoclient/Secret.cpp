@@ -1,5 +1,6 @@
 #include "Secret.h"
 
+#include "Arguments.h"
 #include "ExitCode.h"
 #include "FileDescriptor.h"
 
@@ -17,8 +18,11 @@
 #include <unistd.h>
 
 using Quillon::MessageFormatter;
+using Quillon::Wiped;
 
 namespace {
+
+constexpr std::size_t MaxSecretBytes = 4096;
 
 [[noreturn]] void ThrowReadError(const SecretKind& kind, const std::string& source)
 {
@@ -30,8 +34,7 @@ namespace {
  * gives what `read` gives for one byte.
  */
 template <class ReadByte>
-void ReadLine(
-    const SecretKind& kind, ReadByte readByte, const std::string& source, SecretText& line)
+void ReadLine(const SecretKind& kind, ReadByte readByte, const std::string& source, Wiped& line)
 {
     for (;;) {
         char c = 0;
@@ -42,10 +45,11 @@ void ReadLine(
         if (count == 0 || c == '\n') {
             break;
         }
-        if (!line.Append(c)) {
+        if (line.Get().size() == MaxSecretBytes) {
             throw UsageError(MessageFormatter::ASPrint(
-                "the %1 from %2 is longer than %3 bytes", kind.name, source, SecretText::MaxBytes));
+                "the %1 from %2 is longer than %3 bytes", kind.name, source, MaxSecretBytes));
         }
+        line.Append({&c, 1});
     }
     if (!line.Get().empty() && line.Get().back() == '\r') {
         line.RemoveLast();
@@ -139,7 +143,7 @@ void WritePrompt(const SecretKind& kind, int terminal)
 }
 
 /** One prompt. @return the signal that interrupted it, with the terminal as it was; 0 for none. */
-int AskOnce(const SecretKind& kind, int terminal, SecretText& secret)
+int AskOnce(const SecretKind& kind, int terminal, Wiped& secret)
 {
     const SignalGuard signals;
     const EchoSwitch silence(kind, terminal);
@@ -152,7 +156,7 @@ int AskOnce(const SecretKind& kind, int terminal, SecretText& secret)
     return caughtSignal;
 }
 
-void Ask(const SecretKind& kind, SecretText& secret)
+void Ask(const SecretKind& kind, Wiped& secret)
 {
     const FileDescriptor terminal(::open("/dev/tty", O_RDWR | O_CLOEXEC));
     if (!terminal.IsOpen()) {
@@ -167,7 +171,7 @@ void Ask(const SecretKind& kind, SecretText& secret)
     }
 }
 
-void ReadSecretFile(const SecretKind& kind, const std::string& file, SecretText& secret)
+void ReadSecretFile(const SecretKind& kind, const std::string& file, Wiped& secret)
 {
     FileDescriptor opened;
     if (file != "-") {
@@ -185,29 +189,7 @@ void ReadSecretFile(const SecretKind& kind, const std::string& file, SecretText&
 
 } // namespace
 
-SecretText::~SecretText()
-{
-    Clear();
-}
-
-bool SecretText::Append(char c)
-{
-    if (_text.size() == MaxBytes) {
-        return false;
-    }
-    _text += c;
-    return true;
-}
-
-void SecretText::Clear()
-{
-    // What was removed from the end is still in the buffer.
-    _text.resize(_text.capacity());
-    ::explicit_bzero(_text.data(), _text.size());
-    _text.clear();
-}
-
-void GetSecret(const SecretKind& kind, const std::string& file, SecretText& secret)
+void GetSecret(const SecretKind& kind, const std::string& file, Wiped& secret)
 {
     if (file.empty()) {
         Ask(kind, secret);
@@ -216,5 +198,18 @@ void GetSecret(const SecretKind& kind, const std::string& file, SecretText& secr
     }
     if (secret.Get().empty()) {
         throw UsageError(MessageFormatter::ASPrint("the %1 is empty", kind.name));
+    }
+}
+
+void GetPassword(const std::string& file, Wiped& password)
+{
+    GetSecret(Password, file, password);
+    const std::string problem = CheckText(password.Get());
+    if (!problem.empty()) {
+        throw UsageError(MessageFormatter::ASPrint(
+            "%1the %2 %3",
+            file.empty() ? "" : Password.fileOption + std::string(": "),
+            Password.name,
+            problem));
     }
 }

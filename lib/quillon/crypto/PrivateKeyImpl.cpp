@@ -2,6 +2,7 @@
 
 #include "crypto/Handles.h"
 #include "crypto/keyFacts.h"
+#include "quillon/Wiped.h"
 
 #include <algorithm>
 #include <cstring>
@@ -85,7 +86,7 @@ public:
             return -1;
         }
         try {
-            return self.Copy(self._callback(), buffer, size);
+            return self.Copy(Wiped(self._callback()), buffer, size);
         } catch (...) {
             self._failure = std::current_exception();
             return -1;
@@ -108,15 +109,14 @@ public:
     }
 
 private:
-    static int Copy(std::string passphrase, char* buffer, int size)
+    static int Copy(const Wiped& passphrase, char* buffer, int size)
     {
-        const bool fits = passphrase.size() <= static_cast<std::size_t>(size);
-        if (fits) {
-            std::copy(passphrase.begin(), passphrase.end(), buffer);
+        const std::string& text = passphrase.Get();
+        if (text.size() > static_cast<std::size_t>(size)) {
+            return -1;
         }
-        const int length = fits ? static_cast<int>(passphrase.size()) : -1;
-        explicit_bzero(passphrase.data(), passphrase.size());
-        return length;
+        std::copy(text.begin(), text.end(), buffer);
+        return static_cast<int>(text.size());
     }
 
     const PassphraseCallback& _callback;

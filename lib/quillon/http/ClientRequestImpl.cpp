@@ -59,9 +59,9 @@ void ClientRequestImpl::SetTimeout(long long timeout)
     _timeout = timeout;
 }
 
-void ClientRequestImpl::BodyWriter::Write(const char* text, std::size_t size)
+void ClientRequestImpl::BodyWriter::Write(const char* bytes, std::size_t size)
 {
-    bytes.insert(bytes.end(), text, text + size);
+    text.Append({bytes, size});
 }
 
 void CreateHttpRequest(HttpMethod method, const std::string& path, Ref<ClientRequest>& out)

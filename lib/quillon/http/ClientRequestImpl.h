@@ -1,7 +1,6 @@
 #pragma once
 
-#include "http/WipedString.h"
-
+#include "quillon/Wiped.h"
 #include "quillon/http/ClientRequest.h"
 
 #include <map>
@@ -30,7 +29,7 @@ public:
     {
         return _headers;
     }
-    const WipedBytes& GetBody() const noexcept { return _writer->bytes; }
+    const std::string& GetBody() const noexcept { return _writer->text.Get(); }
     long long GetTimeout() const noexcept { return _timeout; }
     StatusTest GetBodyStatuses() const noexcept { return _wantsBody; }
 
@@ -38,9 +37,9 @@ private:
     class BodyWriter final : public Writer
     {
     public:
-        void Write(const char* text, std::size_t size) override;
+        void Write(const char* bytes, std::size_t size) override;
 
-        WipedBytes bytes;
+        Wiped text; // may hold a password
     };
 
     const std::string _path;

@@ -105,10 +105,10 @@ void Transfer::SetTarget()
 
 void Transfer::SetRequest()
 {
-    const WipedBytes& body = _request->GetBody();
+    const std::string& body = _request->GetBody();
     Set(CURLOPT_POST, 1L);
     // Not copied: the request outlives the transfer.
-    Set(CURLOPT_POSTFIELDS, body.empty() ? "" : body.data());
+    Set(CURLOPT_POSTFIELDS, body.data());
     Set(CURLOPT_POSTFIELDSIZE_LARGE, static_cast<curl_off_t>(body.size()));
     Set(CURLOPT_USERAGENT, Product);
     for (const auto& [name, value] : _request->GetHeaders()) {

@@ -1,5 +1,7 @@
 #include "xml/Arena.h"
 
+#include "quillon/Wiped.h"
+
 #include <algorithm>
 #include <cstring>
 #include <iterator>
@@ -38,9 +40,9 @@ Ref<Arena> Arena::Create(ArenaContent content, std::size_t expectedSize)
 Arena::~Arena()
 {
     if (_content == ArenaContent::COMPOSED) {
-        explicit_bzero(_inner.data(), _inner.size());
+        Wipe(_inner.data(), _inner.size());
         for (const Chunk& chunk : _chunks) {
-            explicit_bzero(chunk.memory.get(), chunk.size);
+            Wipe(chunk.memory.get(), chunk.size);
         }
     }
 }

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "quillon/Reader.h"
+#include "quillon/Wiped.h"
 #include "quillon/xml/Node.h"
 
 #include <array>
@@ -41,7 +42,7 @@ public:
     explicit OutputBuffer(ByteSink& sink) noexcept
         : _sink(sink)
     {}
-    ~OutputBuffer() { explicit_bzero(_bytes.data(), _size > _used ? _size : _used); }
+    ~OutputBuffer() { Wipe(_bytes.data(), _size > _used ? _size : _used); }
     OutputBuffer(const OutputBuffer&) = delete;
     OutputBuffer& operator=(const OutputBuffer&) = delete;
 

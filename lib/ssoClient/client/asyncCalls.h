@@ -3,9 +3,9 @@
 #include "quillon/Exceptions.h"
 #include "quillon/Functor.h"
 #include "quillon/PanicVerify.h"
+#include "quillon/Wiped.h"
 #include "quillon/system/ThreadPool.h"
 #include "ssoClient/SamlToken.h"
-#include "ssoClient/wire/WipedText.h"
 #include "ssoClient/wire/assertionPlaces.h"
 
 #include <boost/bind/bind.hpp>
@@ -54,8 +54,8 @@ PassByRefHelper<T> PassByRef(const boost::shared_ptr<T>& p)
 /** Bound calls are copied on their way to the pool; the copies share the one password. */
 inline PassByRefHelper<const std::string> PassSecret(const std::string& secret)
 {
-    const boost::shared_ptr<WipedText> copy = boost::make_shared<WipedText>(secret);
-    return PassByRef(boost::shared_ptr<const std::string>(copy, &copy->text));
+    const auto copy = boost::make_shared<Quillon::Wiped>(secret);
+    return PassByRef(boost::shared_ptr<const std::string>(copy, &copy->Get()));
 }
 
 /**

@@ -1,6 +1,7 @@
 #pragma once
 
-#include <string.h>
+#include "quillon/Wiped.h"
+
 #include <string>
 #include <utility>
 
@@ -18,7 +19,7 @@ struct Request
     Request() = default;
     Request(const Request&) = default;
     Request(Request&&) noexcept = default;
-    ~Request() { explicit_bzero(body.data(), body.size()); }
+    ~Request() { Quillon::Wipe(body); }
 
     /** By value: the old body goes with `other` and is overwritten there. */
     Request& operator=(Request other) noexcept
