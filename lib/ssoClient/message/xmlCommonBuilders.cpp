@@ -1,11 +1,13 @@
 #include "ssoClient/message/xmlCommonBuilders.h"
 
 #include "quillon/PanicVerify.h"
+#include "quillon/Wiped.h"
+#include "quillon/xml/Parser.h"
 #include "ssoClient/wire/xmlReading.h"
 
 #include <boost/smart_ptr/make_shared.hpp>
 
-#include <string.h>
+#include <atomic>
 #include <utility>
 
 using Quillon::Ref;
@@ -15,7 +17,10 @@ namespace SsoClient {
 
 namespace {
 
+// What a violated invariant is reported under. Operators search logs for these places, so they stay
+// as they are, wherever the checks themselves move.
 constexpr char Unit[] = "lib/ssoClient/xmlCommonBuilders";
+constexpr int RootBuilderLine = 168;
 
 void CreateElement(
     const std::string& prefix,
@@ -60,26 +65,35 @@ public:
         , _text(text)
     {}
 
-    /** The text may be a password: the builder keeps the only copy, and wipes it. */
-    ~TextElementBuilderImpl() { explicit_bzero(_text.data(), _text.size()); }
-    TextElementBuilderImpl(const TextElementBuilderImpl&) = delete;
-    TextElementBuilderImpl& operator=(const TextElementBuilderImpl&) = delete;
-
     void build(Ref<ElementNode>& out) const override
     {
         CreateElement(_prefix, _localName, _attributes, out);
         Ref<Quillon::Xml::TextNode> text;
         Quillon::Xml::CreateTextNode(text);
-        text->SetText(_text);
+        // First the one, then the other: a text that is refused is named by its element.
         out->AppendChild(text.get());
+        text->SetText(_text.Get());
     }
 
 private:
     std::string _prefix;
     std::string _localName;
     AttributeMap _attributes;
-    std::string _text;
+    Quillon::Wiped _text; // may be a password
 };
+
+/**
+ * A copy of a parsed element, comments and all. It is read anew from its text, which costs as much
+ * as reading it the first time did.
+ */
+Ref<ElementNode> CopyElement(const ElementNode& element)
+{
+    const Ref<Quillon::StringWriter> text = Quillon::CreateStringWriter();
+    Quillon::Xml::Serialize(&element, text.get());
+    Ref<Quillon::Xml::Document> document;
+    ParseXML(text->GetString(), document);
+    return Ref<ElementNode>(document->GetRootElement());
+}
 
 class PreBuiltElementImpl final : public XMLBaseBuilder
 {
@@ -90,8 +104,23 @@ public:
 
     void build(Ref<ElementNode>& out) const override { out = _element; }
 
+    /**
+     * The first call appends the element itself, the others copies of it. A copy reads only what is
+     * below the element and takes no reference to it: both stay as they are while the thread of the
+     * first call goes on with the tree that the element now stands in.
+     */
+    void AppendTo(ElementNode& parent) const
+    {
+        if (_isAppended.exchange(true) || _element->GetParent() != nullptr) {
+            parent.AppendChild(CopyElement(*_element).get());
+        } else {
+            parent.AppendChild(_element.get());
+        }
+    }
+
 private:
     Ref<ElementNode> _element;
+    mutable std::atomic<bool> _isAppended{false};
 };
 
 } // namespace
@@ -100,7 +129,7 @@ XMLCompositeBuilder::XMLCompositeBuilder(XMLBuilderPtr rootBuilder)
     : _rootBuilder(std::move(rootBuilder))
 {
     if (_rootBuilder == nullptr) {
-        Quillon::PanicVerify("rootBuilder != __null", Unit, 168);
+        Quillon::PanicVerify("rootBuilder != __null", Unit, RootBuilderLine);
     }
 }
 
@@ -118,6 +147,16 @@ void XMLCompositeBuilder::build(Ref<ElementNode>& out) const
     for (const XMLBuilderPtr& child : _children) {
         BuildAndAppendChildTo(out.get(), *child);
     }
+}
+
+boost::shared_ptr<XMLCompositeBuilder> Composite(
+    XMLBuilderPtr root, std::vector<XMLBuilderPtr> children)
+{
+    auto composite = boost::make_shared<XMLCompositeBuilder>(std::move(root));
+    for (XMLBuilderPtr& child : children) {
+        composite->Add(std::move(child));
+    }
+    return composite;
 }
 
 XMLBuilderPtr ElementBuilder(std::string prefix, std::string localName)
@@ -152,9 +191,14 @@ XMLBuilderPtr InsertSamlTokenBuilder(const SamlToken& token)
 
 void BuildAndAppendChildTo(ElementNode* parent, const XMLBaseBuilder& child)
 {
+    if (const auto* preBuilt = dynamic_cast<const PreBuiltElementImpl*>(&child)) {
+        preBuilt->AppendTo(*parent);
+        return;
+    }
     Ref<ElementNode> element;
     child.build(element);
-    parent->AppendChild(element.get());
+    parent->AppendChild(
+        element->GetParent() == nullptr ? element.get() : CopyElement(*element).get());
 }
 
 void ElementDefineAttribute(ElementNode* element, const AttributeMap::value_type& attribute)

@@ -18,8 +18,9 @@ namespace SsoClient {
  * There is no virtual destructor: a builder is made straight into a `boost::shared_ptr` of its
  * own class and never deleted through this interface.
  *
- * Thread safety: `build` may be called from any number of threads, except where a builder hands
- * out an element that exists already (`InsertSamlTokenBuilder`).
+ * Thread safety: any number of threads may build one tree of builders at once. Only a builder of
+ * `InsertSamlTokenBuilder` that is built by itself, or as the root of a composite, hands out the
+ * same element each time, and so belongs to one thread.
  */
 class XMLBaseBuilder
 {
@@ -61,6 +62,24 @@ private:
     std::vector<XMLBuilderPtr> _children;
 };
 
+/**
+ * The element that `root` makes, with `children` in their order, so that a function that makes a
+ * tree can be read as one. Null children are passed over.
+ */
+boost::shared_ptr<XMLCompositeBuilder> Composite(
+    XMLBuilderPtr root, std::vector<XMLBuilderPtr> children);
+
+/** A builder for each of `items`, in their order, by the factory `make`. */
+template <class Items, class Make>
+std::vector<XMLBuilderPtr> BuildersOf(const Items& items, Make make)
+{
+    std::vector<XMLBuilderPtr> builders;
+    for (const auto& item : items) {
+        builders.push_back(make(item));
+    }
+    return builders;
+}
+
 /** An empty element. */
 XMLBuilderPtr ElementBuilder(std::string prefix, std::string localName);
 XMLBuilderPtr ElementBuilder(std::string prefix, std::string localName, AttributeMap attributes);
@@ -73,13 +92,17 @@ XMLBuilderPtr TextElementBuilder(
 
 /**
  * The assertion element of `token`, parsed once from its XML and otherwise untouched, so that its
- * signature still verifies. Every build hands out the same element.
+ * signature still verifies. Every build hands out the same element; among the children of a
+ * composite it stands once, and every further build of that composite inserts a copy.
  *
  * @throws Quillon::Xml::XMLParseException  the token's XML is not well-formed.
  */
 XMLBuilderPtr InsertSamlTokenBuilder(const SamlToken& token);
 
-/** Builds `child` and makes it the last child of `parent`. */
+/**
+ * Builds `child` and makes it the last child of `parent`. An element that stands in a tree already
+ * stays there, and a copy of it is appended.
+ */
 void BuildAndAppendChildTo(Quillon::Xml::ElementNode* parent, const XMLBaseBuilder& child);
 
 /** Sets the attribute that `attribute` names. */

@@ -5,8 +5,6 @@
 #include "ssoClient/message/xmlSecurityBuilders.h"
 #include "ssoClient/wire/wireNames.h"
 
-#include <boost/smart_ptr/make_shared.hpp>
-
 #include <limits>
 
 using Quillon::System::DateTime;
@@ -15,7 +13,11 @@ namespace SsoClient {
 
 namespace {
 
+// What a violated invariant is reported under. Operators search logs for these places, so they stay
+// as they are, wherever the checks themselves move.
 constexpr char Unit[] = "lib/ssoClient/xmlRequestBuilders";
+constexpr int UnknownConfirmationLine = 379;
+constexpr int RenewedTokenLine = 513;
 
 const char* ToText(bool value) noexcept
 {
@@ -30,7 +32,7 @@ const char* GetKeyType(SamlToken::ConfirmationType confirmation)
     case SamlToken::CONFIRM_HOLDER_OF_KEY:
         return Wire::PublicKeyType;
     }
-    Quillon::PanicVerify("false", Unit, 379);
+    Quillon::PanicVerify("false", Unit, UnknownConfirmationLine);
 }
 
 // A lifetime that no date can hold ends at the last count there is, which is refused as a date,
@@ -53,22 +55,13 @@ DateTime AddSecondsToDate(const DateTime& time, long long seconds)
     }
 }
 
-boost::shared_ptr<XMLCompositeBuilder> CreateRequestSecurityToken(
-    const char* tokenType, const char* requestType)
+// What every request begins with.
+XMLBuilderPtr CreateRequestSecurityToken(const char* tokenType, const char* requestType)
 {
-    auto request = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("wst", "RequestSecurityToken", {{"xmlns:wst", Wire::WsTrustNamespace}}));
-    request->Add(TextElementBuilder("wst", "TokenType", tokenType))
-        .Add(TextElementBuilder("wst", "RequestType", requestType));
-    return request;
-}
-
-// An element that holds the assertion of `token`.
-XMLBuilderPtr CreateTarget(const char* localName, const SamlToken& token)
-{
-    auto target = boost::make_shared<XMLCompositeBuilder>(ElementBuilder("wst", localName));
-    target->Add(InsertSamlTokenBuilder(token));
-    return target;
+    return Composite(
+        ElementBuilder("wst", "RequestSecurityToken", {{"xmlns:wst", Wire::WsTrustNamespace}}),
+        {TextElementBuilder("wst", "TokenType", tokenType),
+         TextElementBuilder("wst", "RequestType", requestType)});
 }
 
 } // namespace
@@ -76,12 +69,9 @@ XMLBuilderPtr CreateTarget(const char* localName, const SamlToken& token)
 XMLBuilderPtr WssuLifetimeBuilder(long long lifetimeSec)
 {
     const DateTime now = Quillon::System::GetUtcDateTime();
-    auto lifetime = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("wst", "Lifetime", {{"xmlns:wsu", Wire::WsuNamespace}}));
-    lifetime->Add(TextElementBuilder("wsu", "Created", DateTimeFormatter(now)))
-        .Add(TextElementBuilder(
-            "wsu", "Expires", DateTimeFormatter(AddSecondsToDate(now, lifetimeSec))));
-    return lifetime;
+    return Composite(
+        ElementBuilder("wst", "Lifetime", {{"xmlns:wsu", Wire::WsuNamespace}}),
+        WssuCreatedAndExpiresBuilders(now, AddSecondsToDate(now, lifetimeSec)));
 }
 
 XMLBuilderPtr WstRenewingBuilder(bool allow)
@@ -91,90 +81,72 @@ XMLBuilderPtr WstRenewingBuilder(bool allow)
 
 XMLBuilderPtr WstDelegateToBuilder(const std::string& userName)
 {
-    auto delegateTo = boost::make_shared<XMLCompositeBuilder>(ElementBuilder("wst", "DelegateTo"));
-    delegateTo->Add(WsseUsernameTokenBuilder(userName));
-    return delegateTo;
+    return Composite(ElementBuilder("wst", "DelegateTo"), {WsseUsernameTokenBuilder(userName)});
 }
 
 XMLBuilderPtr WstParticipantsBuilders(const std::set<std::string>& participants)
 {
-    auto builder = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("wst", "Participants", {{"xmlns:wsa", Wire::WsAddressingNamespace}}));
-    for (const std::string& participant : participants) {
-        builder->Add(WstParticipantBuilder(participant));
-    }
-    return builder;
+    return Composite(
+        ElementBuilder("wst", "Participants", {{"xmlns:wsa", Wire::WsAddressingNamespace}}),
+        BuildersOf(participants, WstParticipantBuilder));
 }
 
 XMLBuilderPtr WstParticipantBuilder(const std::string& participant)
 {
-    auto builder = boost::make_shared<XMLCompositeBuilder>(ElementBuilder("wst", "Participant"));
-    builder->Add(WsaEndpointAddressReferenceBuilder(participant));
-    return builder;
+    return Composite(
+        ElementBuilder("wst", "Participant"), {WsaEndpointAddressReferenceBuilder(participant)});
 }
 
 XMLBuilderPtr WsaEndpointAddressReferenceBuilder(const std::string& address)
 {
-    auto reference =
-        boost::make_shared<XMLCompositeBuilder>(ElementBuilder("wsa", "EndpointReference"));
-    reference->Add(TextElementBuilder("wsa", "Address", address));
-    return reference;
+    return Composite(
+        ElementBuilder("wsa", "EndpointReference"),
+        {TextElementBuilder("wsa", "Address", address)});
 }
 
 XMLBuilderPtr RsaAdviceSetBuilder(const std::vector<Advice>& advice)
 {
-    auto adviceSet = boost::make_shared<XMLCompositeBuilder>(ElementBuilder(
-        "rsa-advice",
-        "AdviceSet",
-        {{"xmlns:rsa-advice", Wire::RsaAdviceNamespace},
-         {"xmlns:saml", Wire::SamlNamespace},
-         {"xmlns:xs", Wire::XsNamespace},
-         {"xmlns:xsi", Wire::XsiNamespace}}));
-    for (const Advice& item : advice) {
-        adviceSet->Add(RsaAdviceBuilder(item));
-    }
-    return adviceSet;
+    return Composite(
+        ElementBuilder(
+            "rsa-advice",
+            "AdviceSet",
+            {{"xmlns:rsa-advice", Wire::RsaAdviceNamespace},
+             {"xmlns:saml", Wire::SamlNamespace},
+             {"xmlns:xs", Wire::XsNamespace},
+             {"xmlns:xsi", Wire::XsiNamespace}}),
+        BuildersOf(advice, RsaAdviceBuilder));
 }
 
 XMLBuilderPtr RsaAdviceBuilder(const Advice& advice)
 {
-    auto builder = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("rsa-advice", "Advice", {{"AdviceSource", advice.source}}));
-    for (const AdviceAttribute& attribute : advice.attributes) {
-        builder->Add(RsaAttributeBuilder(attribute));
-    }
-    return builder;
+    return Composite(
+        ElementBuilder("rsa-advice", "Advice", {{"AdviceSource", advice.source}}),
+        BuildersOf(advice.attributes, RsaAttributeBuilder));
 }
 
 XMLBuilderPtr RsaAttributeBuilder(const AdviceAttribute& attribute)
 {
-    auto builder = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("rsa-advice", "Attribute", {{"Name", attribute.name}}));
-    for (const std::string& value : attribute.values) {
-        builder->Add(
-            TextElementBuilder("rsa-advice", "AttributeValue", {{"xsi:type", "xs:string"}}, value));
-    }
-    return builder;
+    return Composite(
+        ElementBuilder("rsa-advice", "Attribute", {{"Name", attribute.name}}),
+        BuildersOf(attribute.values, [](const std::string& value) {
+            return TextElementBuilder(
+                "rsa-advice", "AttributeValue", {{"xsi:type", "xs:string"}}, value);
+        }));
 }
 
 boost::shared_ptr<XMLCompositeBuilder> CommonAcquireSecurityTokenBuilder(
     SamlToken::ConfirmationType confirmation, const TokenSpec& spec)
 {
-    auto request = CreateRequestSecurityToken(Wire::SamlNamespace, Wire::IssueRequestType);
-    request->Add(TextElementBuilder("wst", "KeyType", GetKeyType(confirmation)))
-        .Add(WssuLifetimeBuilder(spec.tokenLifetimeSec))
-        .Add(WstRenewingBuilder(spec.renewable))
-        .Add(TextElementBuilder("wst", "Delegatable", ToText(spec.delegable)));
-    if (spec.delegateTo) {
-        request->Add(WstDelegateToBuilder(*spec.delegateTo));
-    }
-    if (!spec.audienceRestriction.empty()) {
-        request->Add(WstParticipantsBuilders(spec.audienceRestriction));
-    }
-    if (!spec.advice.empty()) {
-        request->Add(RsaAdviceSetBuilder(spec.advice));
-    }
-    return request;
+    return Composite(
+        CreateRequestSecurityToken(Wire::SamlNamespace, Wire::IssueRequestType),
+        {TextElementBuilder("wst", "KeyType", GetKeyType(confirmation)),
+         WssuLifetimeBuilder(spec.tokenLifetimeSec),
+         WstRenewingBuilder(spec.renewable),
+         TextElementBuilder("wst", "Delegatable", ToText(spec.delegable)),
+         spec.delegateTo ? WstDelegateToBuilder(*spec.delegateTo) : nullptr,
+         spec.audienceRestriction.empty() ? nullptr
+                                          : WstParticipantsBuilders(spec.audienceRestriction),
+         spec.advice.empty() ? nullptr : RsaAdviceSetBuilder(spec.advice)});
 }
 
 XMLBuilderPtr AcquireSecurityTokenBuilder(
@@ -197,18 +169,21 @@ XMLBuilderPtr RenewSecurityTokenBuilder(const SamlToken& token, long long lifeti
 {
     if (token.GetConfirmationMethod() != SamlToken::CONFIRM_HOLDER_OF_KEY) {
         Quillon::PanicVerify(
-            "token.GetConfirmationMethod() == SamlToken::CONFIRM_HOLDER_OF_KEY", Unit, 513);
+            "token.GetConfirmationMethod() == SamlToken::CONFIRM_HOLDER_OF_KEY",
+            Unit,
+            RenewedTokenLine);
     }
-    auto request = CreateRequestSecurityToken(Wire::SamlNamespace, Wire::RenewRequestType);
-    request->Add(WssuLifetimeBuilder(lifetimeSec)).Add(CreateTarget("RenewTarget", token));
-    return request;
+    return Composite(
+        CreateRequestSecurityToken(Wire::SamlNamespace, Wire::RenewRequestType),
+        {WssuLifetimeBuilder(lifetimeSec),
+         Composite(ElementBuilder("wst", "RenewTarget"), {InsertSamlTokenBuilder(token)})});
 }
 
 XMLBuilderPtr ValidateSecurityTokenBuilder(const SamlToken& token)
 {
-    auto request = CreateRequestSecurityToken(Wire::StatusTokenType, Wire::ValidateRequestType);
-    request->Add(CreateTarget("ValidateTarget", token));
-    return request;
+    return Composite(
+        CreateRequestSecurityToken(Wire::StatusTokenType, Wire::ValidateRequestType),
+        {Composite(ElementBuilder("wst", "ValidateTarget"), {InsertSamlTokenBuilder(token)})});
 }
 
 } // namespace SsoClient

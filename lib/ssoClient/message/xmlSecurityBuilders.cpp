@@ -4,8 +4,6 @@
 #include "quillon/system/Clock.h"
 #include "ssoClient/wire/wireNames.h"
 
-#include <boost/smart_ptr/make_shared.hpp>
-
 #include <cstdint>
 
 using Quillon::System::DateTime;
@@ -55,40 +53,41 @@ DateTime AddMinutesToDate(const DateTime& time, int minutes)
     return Quillon::System::DateTimeFromUtc(time.GetUtcTime() + microseconds, false);
 }
 
+std::vector<XMLBuilderPtr> WssuCreatedAndExpiresBuilders(
+    const DateTime& created, const DateTime& expires)
+{
+    return {
+        TextElementBuilder("wsu", "Created", DateTimeFormatter(created)),
+        TextElementBuilder("wsu", "Expires", DateTimeFormatter(expires))};
+}
+
 XMLBuilderPtr WssuTimestampBuilder(int validityMinutes)
 {
     const DateTime now = Quillon::System::GetUtcDateTime();
-    auto timestamp = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("wsu", "Timestamp", {{"xmlns:wsu", Wire::WsuNamespace}}));
-    timestamp->Add(TextElementBuilder("wsu", "Created", DateTimeFormatter(now)))
-        .Add(TextElementBuilder(
-            "wsu", "Expires", DateTimeFormatter(AddMinutesToDate(now, validityMinutes))));
-    return timestamp;
+    return Composite(
+        ElementBuilder("wsu", "Timestamp", {{"xmlns:wsu", Wire::WsuNamespace}}),
+        WssuCreatedAndExpiresBuilders(now, AddMinutesToDate(now, validityMinutes)));
 }
 
 XMLBuilderPtr WsSecurityHeaderBuilder(int validityMinutes)
 {
-    auto security = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("wsse", "Security", {{"xmlns:wsse", Wire::WsseNamespace}}));
-    security->Add(WssuTimestampBuilder(validityMinutes));
-    return security;
+    return Composite(
+        ElementBuilder("wsse", "Security", {{"xmlns:wsse", Wire::WsseNamespace}}),
+        {WssuTimestampBuilder(validityMinutes)});
 }
 
 XMLBuilderPtr WsseUsernameTokenBuilder(const std::string& userName)
 {
-    auto usernameToken = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("wsse", "UsernameToken", {{"xmlns:wsse", Wire::WsseNamespace}}));
-    usernameToken->Add(TextElementBuilder("wsse", "Username", userName));
-    return usernameToken;
+    return Composite(
+        ElementBuilder("wsse", "UsernameToken", {{"xmlns:wsse", Wire::WsseNamespace}}),
+        {TextElementBuilder("wsse", "Username", userName)});
 }
 
 XMLBuilderPtr WsseUsernameTokenBuilder(const std::string& userName, const std::string& password)
 {
-    auto usernameToken =
-        boost::make_shared<XMLCompositeBuilder>(WsseUsernameTokenBuilder(userName));
-    usernameToken->Add(
-        TextElementBuilder("wsse", "Password", {{"Type", Wire::PasswordTextType}}, password));
-    return usernameToken;
+    return Composite(
+        WsseUsernameTokenBuilder(userName),
+        {TextElementBuilder("wsse", "Password", {{"Type", Wire::PasswordTextType}}, password)});
 }
 
 XMLBuilderPtr WsseX509v3BinarySecTokenBuilder(
@@ -106,24 +105,23 @@ XMLBuilderPtr WsseX509v3BinarySecTokenBuilder(
 
 XMLBuilderPtr WsseX509v3BSTReferenceBuilder(const std::string& id)
 {
-    auto tokenReference = boost::make_shared<XMLCompositeBuilder>(
-        ElementBuilder("wsse", "SecurityTokenReference", {{"xmlns:wsse", Wire::WsseNamespace}}));
-    tokenReference->Add(ElementBuilder(
-        "wsse", "Reference", {{"URI", "#" + id}, {"ValueType", Wire::X509v3ValueType}}));
-    return tokenReference;
+    return Composite(
+        ElementBuilder("wsse", "SecurityTokenReference", {{"xmlns:wsse", Wire::WsseNamespace}}),
+        {ElementBuilder(
+            "wsse", "Reference", {{"URI", "#" + id}, {"ValueType", Wire::X509v3ValueType}})});
 }
 
 XMLBuilderPtr WsseSamlKeyIdReferenceBuilder(const std::string& assertionId)
 {
-    auto tokenReference = boost::make_shared<XMLCompositeBuilder>(ElementBuilder(
-        "wsse",
-        "SecurityTokenReference",
-        {{"wsse11:TokenType", Wire::Saml20TokenType},
-         {"xmlns:wsse", Wire::WsseNamespace},
-         {"xmlns:wsse11", Wire::Wsse11Namespace}}));
-    tokenReference->Add(TextElementBuilder(
-        "wsse", "KeyIdentifier", {{"ValueType", Wire::SamlIdValueType}}, assertionId));
-    return tokenReference;
+    return Composite(
+        ElementBuilder(
+            "wsse",
+            "SecurityTokenReference",
+            {{"wsse11:TokenType", Wire::Saml20TokenType},
+             {"xmlns:wsse", Wire::WsseNamespace},
+             {"xmlns:wsse11", Wire::Wsse11Namespace}}),
+        {TextElementBuilder(
+            "wsse", "KeyIdentifier", {{"ValueType", Wire::SamlIdValueType}}, assertionId)});
 }
 
 } // namespace SsoClient

@@ -5,6 +5,7 @@
 #include "ssoClient/message/xmlCommonBuilders.h"
 
 #include <string>
+#include <vector>
 
 /**
  * The elements of a WS-Security header. Each declares the namespaces that it uses, except where
@@ -20,6 +21,10 @@ std::string DateTimeFormatter(const Quillon::System::DateTime& time);
  * exact from -35 to 35 minutes and wraps beyond.
  */
 Quillon::System::DateTime AddMinutesToDate(const Quillon::System::DateTime& time, int minutes);
+
+/** `wsu:Created` and `wsu:Expires`, for an element that declares `wsu`. */
+std::vector<XMLBuilderPtr> WssuCreatedAndExpiresBuilders(
+    const Quillon::System::DateTime& created, const Quillon::System::DateTime& expires);
 
 /** `wsu:Timestamp` from the moment of this call, valid for `validityMinutes`. */
 XMLBuilderPtr WssuTimestampBuilder(int validityMinutes);

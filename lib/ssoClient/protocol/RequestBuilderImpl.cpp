@@ -60,9 +60,7 @@ XMLBuilderPtr CreateHeader()
 
 XMLBuilderPtr CreateHeader(XMLBuilderPtr credentials)
 {
-    auto header = boost::make_shared<XMLCompositeBuilder>(CreateHeader());
-    header->Add(std::move(credentials));
-    return header;
+    return Composite(CreateHeader(), {std::move(credentials)});
 }
 
 std::string SerializeToXML(const XMLBaseBuilder& builder)

@@ -6,6 +6,11 @@
 #include <boost/smart_ptr/make_shared.hpp>
 #include <gmock/gmock.h>
 
+#include <atomic>
+#include <malloc.h>
+#include <thread>
+#include <vector>
+
 using namespace SsoClient;
 using Quillon::Ref;
 using Quillon::Xml::ElementNode;
@@ -71,6 +76,44 @@ TEST(TextElementBuilder, WithEmptyTextGivesOneEmptyTextNode)
     EXPECT_EQ(node->GetNextSibling(), nullptr);
 }
 
+TEST(TextElementBuilder, RefusesTextThatXmlCannotHoldAndSaysWhere)
+{
+    const XMLBuilderPtr builder = TextElementBuilder("wsse", "Password", "p\xFCss secret");
+    try {
+        Build(*builder);
+        FAIL() << "built";
+    } catch (const Quillon::InvalidArgumentException& error) {
+        EXPECT_STREQ(
+            error.what(),
+            "Invalid argument : The text of element 'wsse:Password' is not UTF-8 at octet 1");
+    }
+}
+
+TEST(ElementBuilder, RefusesValuesThatXmlCannotHoldAndSaysWhere)
+{
+    const XMLBuilderPtr builder = ElementBuilder("p", "e", {{"Name", std::string("ab\0c", 4)}});
+    try {
+        Build(*builder);
+        FAIL() << "built";
+    } catch (const Quillon::InvalidArgumentException& error) {
+        EXPECT_STREQ(
+            error.what(),
+            "Invalid argument : The value of attribute 'Name' "
+            "holds a character that XML does not allow at octet 2");
+    }
+}
+
+TEST(TextElementBuilder, KeepsCarriageReturnsOfTextAndValues)
+{
+    const std::string text = ToText(TextElementBuilder("p", "e", {{"a", "1\r\n2\r"}}, "x\r\ny\r"));
+    EXPECT_EQ(text, "<p:e a=\"1&#xD;&#xA;2&#xD;\">x&#xD;\ny&#xD;</p:e>");
+    Ref<Quillon::Xml::DocumentHandler> handler = Quillon::Xml::CreateXMLDocumentHandler();
+    Quillon::Xml::CreateXMLParser(handler.get())->Parse(std::string_view(text));
+    const ElementNode* const parsed = handler->GetDocument()->GetRootElement();
+    EXPECT_EQ(parsed->FindAttribute("a")->value, "1\r\n2\r");
+    EXPECT_EQ(Quillon::Xml::AsText(parsed->GetFirstChild())->GetText(), "x\r\ny\r");
+}
+
 TEST(XMLCompositeBuilder, WithoutChildrenGivesTheRootElement)
 {
     EXPECT_EQ(ToText(boost::make_shared<XMLCompositeBuilder>(ElementBuilder("p", "e"))), "<p:e/>");
@@ -122,6 +165,33 @@ TEST(XMLCompositeBuilderDeathTest, StopsTheProcessWithoutRoot)
             HasSubstr("168")));
 }
 
+TEST(Composite, HoldsItsChildrenInOrderAndPassesOverNull)
+{
+    EXPECT_EQ(
+        ToText(Composite(
+            ElementBuilder("p", "e"),
+            {nullptr, ElementBuilder("p", "b"), nullptr, ElementBuilder("p", "a")})),
+        "<p:e><p:b/><p:a/></p:e>");
+    EXPECT_EQ(ToText(Composite(ElementBuilder("p", "e"), {})), "<p:e/>");
+}
+
+TEST(Composite, CanBeAddedTo)
+{
+    const auto composite = Composite(ElementBuilder("p", "e"), {ElementBuilder("p", "a")});
+    composite->Add(ElementBuilder("p", "b"));
+    EXPECT_EQ(ToText(composite), "<p:e><p:a/><p:b/></p:e>");
+}
+
+TEST(BuildersOf, KeepsTheOrder)
+{
+    const std::vector<std::string> names{"b", "a"};
+    EXPECT_EQ(
+        ToText(Composite(
+            ElementBuilder("p", "e"),
+            BuildersOf(names, [](const std::string& name) { return ElementBuilder("p", name); }))),
+        "<p:e><p:b/><p:a/></p:e>");
+}
+
 TEST(BuildAndAppendChildTo, AppendsAfterTheLastChild)
 {
     const auto composite = boost::make_shared<XMLCompositeBuilder>(ElementBuilder("p", "e"));
@@ -170,6 +240,121 @@ TEST(InsertSamlTokenBuilder, KeepsItsElementAliveByItself)
     const Ref<ElementNode> element = Build(*builder);
     builder.reset();
     EXPECT_EQ(ToText(*element), "<A>text</A>");
+}
+
+namespace {
+
+constexpr char TokenText[] =
+    "<a:A b=\"2\" xmlns:a=\"urn:a\" a=\"&quot;&#xD;\"> <a:B>x&lt;&#xD;</a:B>\n"
+    "<!-- in --><?p i?><c/></a:A>";
+
+XMLBuilderPtr TokenBuilder()
+{
+    FakeSamlToken token;
+    token.xml = TokenText;
+    return InsertSamlTokenBuilder(token);
+}
+
+XMLBuilderPtr Around(XMLBuilderPtr child)
+{
+    return Composite(ElementBuilder("p", "e"), {ElementBuilder("p", "f"), std::move(child)});
+}
+
+const std::string TokenAround = std::string("<p:e><p:f/>") + TokenText + "</p:e>";
+
+} // namespace
+
+TEST(InsertSamlTokenBuilder, StandsInEveryBuildOfAComposite)
+{
+    const XMLBuilderPtr composite = Around(TokenBuilder());
+    const Ref<ElementNode> first = Build(*composite);
+    const Ref<ElementNode> second = Build(*composite);
+    const Ref<ElementNode> third = Build(*composite);
+    for (const Ref<ElementNode>& built : {first, second, third}) {
+        EXPECT_EQ(ToText(*built), TokenAround);
+    }
+    EXPECT_NE(first->FindChildElement("A"), second->FindChildElement("A"));
+    EXPECT_NE(second->FindChildElement("A"), third->FindChildElement("A"));
+}
+
+// Most builders are built once, and a copy costs as much as the parse before.
+TEST(InsertSamlTokenBuilder, IsNotCopiedForTheFirstBuild)
+{
+    const XMLBuilderPtr token = TokenBuilder();
+    const Ref<ElementNode> built = Build(*Around(token));
+    EXPECT_EQ(built->FindChildElement("A"), Build(*token));
+}
+
+TEST(InsertSamlTokenBuilder, StandsTwiceInOneComposite)
+{
+    const XMLBuilderPtr token = TokenBuilder();
+    EXPECT_EQ(
+        ToText(Composite(ElementBuilder("p", "e"), {token, token})),
+        std::string("<p:e>") + TokenText + TokenText + "</p:e>");
+}
+
+TEST(InsertSamlTokenBuilder, LeavesTheTreeAloneThatItWasPutInto)
+{
+    const XMLBuilderPtr token = TokenBuilder();
+    Ref<ElementNode> element = Build(*token);
+    const Ref<ElementNode> owner = Build(*ElementBuilder("p", "owner"));
+    owner->AppendChild(element.get());
+    EXPECT_EQ(ToText(Around(token)), TokenAround);
+    EXPECT_EQ(element->GetParent(), owner.get());
+}
+
+TEST(InsertSamlTokenBuilder, AsRootOfAChildStandsInEveryBuild)
+{
+    const XMLBuilderPtr composite = Around(Composite(TokenBuilder(), {}));
+    const Ref<ElementNode> first = Build(*composite);
+    const Ref<ElementNode> second = Build(*composite);
+    EXPECT_EQ(ToText(*first), TokenAround);
+    EXPECT_EQ(ToText(*second), TokenAround);
+}
+
+TEST(InsertSamlTokenBuilder, IsBuiltByManyThreadsAtOnce)
+{
+    constexpr int ThreadCount = 4;
+    constexpr int BuildCount = 50;
+    for (int round = 0; round < 20; ++round) {
+        const XMLBuilderPtr composite = Around(Around(TokenBuilder()));
+        const std::string expected = "<p:e><p:f/>" + TokenAround + "</p:e>";
+        std::atomic<int> waiting{ThreadCount};
+        std::atomic<int> rightOnes{0};
+        std::vector<std::thread> threads;
+        for (int i = 0; i < ThreadCount; ++i) {
+            threads.emplace_back([&] {
+                --waiting;
+                while (waiting != 0) {
+                    std::this_thread::yield();
+                }
+                for (int build = 0; build < BuildCount; ++build) {
+                    rightOnes += ToText(composite) == expected ? 1 : 0;
+                }
+            });
+        }
+        for (std::thread& thread : threads) {
+            thread.join();
+        }
+        ASSERT_EQ(rightOnes, ThreadCount * BuildCount);
+    }
+}
+
+// Every tree that a build was part of used to stay with the token's.
+TEST(InsertSamlTokenBuilder, KeepsNoMemoryForABuild)
+{
+    FakeSamlToken token;
+    token.xml = "<A>" + std::string(100'000, 'x') + "</A>";
+    const XMLBuilderPtr composite = Around(InsertSamlTokenBuilder(token));
+    const auto buildOften = [&composite] {
+        for (int i = 0; i < 50; ++i) {
+            Build(*composite);
+        }
+        return ::mallinfo2().uordblks;
+    };
+    const std::size_t before = buildOften();
+    const std::size_t after = buildOften();
+    EXPECT_LT(after, before + token.xml.size());
 }
 
 TEST(InsertSamlTokenBuilder, RefusesXmlThatIsNotWellFormed)

@@ -3,6 +3,7 @@
 #include "builderText.h"
 #include "support/FakeSamlToken.h"
 #include "support/FixedClock.h"
+#include "support/RunningClock.h"
 
 #include <gmock/gmock.h>
 
@@ -90,6 +91,12 @@ TEST(WssuLifetimeBuilder, RefusesWhatNoDateCanHold)
     // Wrapped to 64 bits, these would be 448384 microseconds.
     EXPECT_THROW(WssuLifetimeBuilder(18'446'744'073'710), Quillon::InvalidArgumentException);
     EXPECT_THROW(WssuLifetimeBuilder(-Max), Quillon::InvalidArgumentException);
+}
+
+TEST(WssuLifetimeBuilder, ReadsTheClockOnce)
+{
+    const RunningClock clock(Now);
+    EXPECT_EQ(ToText(WssuLifetimeBuilder(300)), Lifetime300);
 }
 
 TEST(WstRenewingBuilder, NeverAsksForRenewalAfterExpiry)
@@ -254,6 +261,21 @@ TEST(AcquireSecurityTokenBuilder, OfDelegatedHolderOfKeyHasNoUseKey)
             "wst:Renewing",
             "wst:Delegatable",
             "wst:DelegateTo"));
+}
+
+// Whether there is a delegate decides, not whether it has a name.
+TEST(AcquireSecurityTokenBuilder, OfEmptyDelegateIsDelegated)
+{
+    TokenSpec spec = MinimalSpec();
+    spec.delegateTo = "";
+    const auto request =
+        Build(*AcquireSecurityTokenBuilder(SamlToken::CONFIRM_HOLDER_OF_KEY, spec));
+    ASSERT_NE(request->FindChildElement("DelegateTo"), nullptr);
+    EXPECT_EQ(
+        ToText(*request->FindChildElement("DelegateTo")),
+        "<wst:DelegateTo><wsse:UsernameToken xmlns:wsse=\"" WSSE "\">"
+        "<wsse:Username></wsse:Username></wsse:UsernameToken></wst:DelegateTo>");
+    EXPECT_EQ(request->FindChildElement("UseKey"), nullptr);
 }
 
 TEST(AcquireSecurityTokenBuilder, OfBearerHasNoUseKey)

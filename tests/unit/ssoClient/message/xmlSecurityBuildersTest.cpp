@@ -2,6 +2,7 @@
 
 #include "builderText.h"
 #include "support/FixedClock.h"
+#include "support/RunningClock.h"
 
 #include <gtest/gtest.h>
 
@@ -92,6 +93,14 @@ TEST(WssuTimestampBuilder, KeepsTheTimeOfItsCreation)
     }
     const FixedClock later("2012-01-01T00:00:00Z");
     EXPECT_NE(ToText(builder).find("<wsu:Created>2011-07-05T09:03:07.042Z<"), std::string::npos);
+}
+
+TEST(WssuTimestampBuilder, ReadsTheClockOnce)
+{
+    const RunningClock clock(Now);
+    const std::string text = ToText(WssuTimestampBuilder(10));
+    EXPECT_NE(text.find("<wsu:Created>2011-07-05T09:03:07.042Z<"), std::string::npos);
+    EXPECT_NE(text.find("<wsu:Expires>2011-07-05T09:13:07.042Z<"), std::string::npos);
 }
 
 TEST(WsSecurityHeaderBuilder, HoldsTheTimestamp)

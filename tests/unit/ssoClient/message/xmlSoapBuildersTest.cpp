@@ -6,10 +6,10 @@
 #include "support/TestData.h"
 #include "support/Xmlsec1.h"
 
-#include <boost/smart_ptr/make_shared.hpp>
 #include <gmock/gmock.h>
 
 #include <regex>
+#include <set>
 
 using namespace SsoClient;
 using Quillon::Ref;
@@ -128,14 +128,21 @@ TEST(CreateWssuId, GivesNewUuidToElementWithoutId)
     EXPECT_EQ(CreateWssuId(element.get()), id);
 }
 
-// [XML Schema Part 2, 3.3.8]: an xs:ID is a name. Of plain UUIDs, ten in sixteen are none.
+// [XML Schema Part 2, 3.3.8]: an xs:ID is a name. Of plain UUIDs, ten in sixteen are none. The rest
+// of them stays random, its version and variant marks included.
 TEST(CreateWssuId, GivesIdsThatAreNames)
 {
+    std::set<std::string> ids;
     for (int i = 0; i < 100; ++i) {
         Ref<ElementNode> element;
         CreateElementNode("e", "Element", element);
-        EXPECT_THAT(CreateWssuId(element.get()), testing::MatchesRegex("[a-f].{35}"));
+        const std::string id = CreateWssuId(element.get());
+        EXPECT_TRUE(std::regex_match(
+            id, std::regex("a[0-9a-f]{7}-[0-9a-f]{4}-4[0-9a-f]{3}-[89ab][0-9a-f]{3}-[0-9a-f]{12}")))
+            << id;
+        ids.insert(id);
     }
+    EXPECT_EQ(ids.size(), 100U);
 }
 
 TEST(CreateWssuId, KeepsIdUnderAnyPrefix)
@@ -229,6 +236,13 @@ TEST(XMLSignedSoapBuilderDeathTest, StopsTheProcessWithoutHeader)
             HasSubstr("339")));
 }
 
+// Only the header is needed to make one; the key only when it is built.
+TEST(XMLSignedSoapBuilder, ChecksNothingElseWhenItIsMade)
+{
+    const XMLSignedSoapBuilder builder(WsSecurityHeaderBuilder(10), nullptr, nullptr, nullptr);
+    EXPECT_THROW(Build(builder), Quillon::InvalidArgumentException);
+}
+
 TEST(SignSoapMessage, KeepsIdsThatAreThere)
 {
     const auto key = GetTestKey("client");
@@ -241,6 +255,57 @@ TEST(SignSoapMessage, KeepsIdsThatAreThere)
     EXPECT_EQ(GetAttribute(body, "wsu:Id"), "theBody");
     EXPECT_EQ(GetReferenceUris(*envelope).front(), "#theBody");
     EXPECT_TRUE(Xmlsec1Verifies(ToText(*envelope), "client", RequestSignature));
+}
+
+TEST(SignSoapMessage, KeepsTheIdOfATimestampThatHasOne)
+{
+    const auto key = GetTestKey("client");
+    const XMLBuilderPtr timestamp = ElementBuilder(
+        "u", "Timestamp", {{"xmlns:u", WSU}, {"u:Id", "theTimestamp"}, {"Id", "another"}});
+    const XMLBuilderPtr security =
+        Composite(ElementBuilder("wsse", "Security", {{"xmlns:wsse", WSSE}}), {timestamp});
+    const Ref<ElementNode> envelope = Build(*SoapBuilder(security, nullptr));
+    SignSoapMessage(key.get(), nullptr, envelope.get());
+    const ElementNode* const signedOne = GetSecurity(*envelope)->FindChildElement("Timestamp");
+    EXPECT_EQ(signedOne->GetAttributes().size(), 3U);
+    EXPECT_EQ(GetReferenceUris(*envelope).back(), "#theTimestamp");
+    EXPECT_TRUE(Xmlsec1Verifies(ToText(*envelope), "client", RequestSignature));
+}
+
+TEST(SignSoapMessage, SignsTheTimestampAndTheBodyOfTheRightNamespaces)
+{
+    const auto key = GetTestKey("client");
+    const Ref<ElementNode> envelope = Build(*Composite(
+        ElementBuilder("s", "Envelope", {{"xmlns:s", SOAP}, {"xmlns:x", "urn:x"}}),
+        {ElementBuilder("x", "Header"),
+         ElementBuilder("x", "Body", {{"Id", "wrongBody"}}),
+         Composite(
+             ElementBuilder("s", "Header"),
+             {ElementBuilder("x", "Security"),
+              Composite(
+                  ElementBuilder("w", "Security", {{"xmlns:w", WSSE}, {"xmlns:u", WSU}}),
+                  {ElementBuilder("x", "Timestamp", {{"u:Id", "wrongTimestamp"}}),
+                   ElementBuilder("u", "Timestamp", {{"u:Id", "theTimestamp"}})})}),
+         ElementBuilder("s", "Body", {{"xmlns:u", WSU}, {"u:Id", "theBody"}})}));
+    SignSoapMessage(key.get(), nullptr, envelope.get());
+    const ElementNode* const header = envelope->FindChildElement("Header", SOAP);
+    const ElementNode* const security = header->FindChildElement("Security", WSSE);
+    EXPECT_THAT(
+        GetChildNames(*security), ElementsAre("x:Timestamp", "u:Timestamp", "ds:Signature"));
+    const std::string text = ToText(*security->FindChildElement("Signature"));
+    EXPECT_LT(text.find("URI=\"#theBody\""), text.find("URI=\"#theTimestamp\""));
+    EXPECT_NE(text.find("URI=\"#theTimestamp\""), std::string::npos);
+    EXPECT_EQ(text.find("wrong"), std::string::npos);
+    EXPECT_TRUE(Xmlsec1Verifies(ToText(*envelope), "client", RequestSignature));
+}
+
+// Without a key that is asked for, a message would go out unsigned.
+TEST(SignSoapMessage, RefusesToSignWithoutAKey)
+{
+    const Ref<ElementNode> envelope = Build(*SoapBuilder(WsSecurityHeaderBuilder(10), nullptr));
+    EXPECT_THROW(
+        SignSoapMessage(nullptr, nullptr, envelope.get()), Quillon::InvalidArgumentException);
+    EXPECT_EQ(GetSignature(*envelope), nullptr);
 }
 
 TEST(SignSoapMessage, WithoutKeyInfoWritesNone)
@@ -268,13 +333,24 @@ TEST(SignSoapMessageDeathTest, StopsTheProcessOnMissingPart)
                     HasSubstr(line)));
         };
     const AttributeMap soap{{"xmlns:s", SOAP}};
-    auto withoutBody = boost::make_shared<XMLCompositeBuilder>(ElementBuilder("s", "E", soap));
-    withoutBody->Add(ElementBuilder("s", "Header")).Add(ElementBuilder("x", "Body"));
-    expectDeath(withoutBody, "soapBody != __null", "169");
-
-    auto withoutHeader = boost::make_shared<XMLCompositeBuilder>(ElementBuilder("s", "E", soap));
-    withoutHeader->Add(ElementBuilder("s", "Body")).Add(ElementBuilder("x", "Header"));
-    expectDeath(withoutHeader, "soapHeader != __null", "173");
+    expectDeath(
+        Composite(
+            ElementBuilder("s", "E", soap),
+            {ElementBuilder("s", "Header"), ElementBuilder("x", "Body")}),
+        "soapBody != __null",
+        "169");
+    expectDeath(
+        Composite(
+            ElementBuilder("s", "E", soap),
+            {ElementBuilder("s", "Body"), ElementBuilder("x", "Header")}),
+        "soapHeader != __null",
+        "173");
+    // Of several that are missing, the first in this order is reported.
+    expectDeath(ElementBuilder("s", "E", soap), "soapBody != __null", "169");
+    expectDeath(
+        Composite(ElementBuilder("s", "E", soap), {ElementBuilder("s", "Body")}),
+        "soapHeader != __null",
+        "173");
 
     expectDeath(SoapBuilder(nullptr, nullptr), "wsseSecurity != __null", "177");
     expectDeath(
