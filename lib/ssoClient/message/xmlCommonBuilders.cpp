@@ -3,6 +3,7 @@
 #include "quillon/PanicVerify.h"
 #include "quillon/Wiped.h"
 #include "quillon/xml/Parser.h"
+#include "ssoClient/wire/assertionPlaces.h"
 #include "ssoClient/wire/xmlReading.h"
 
 #include <boost/smart_ptr/make_shared.hpp>
@@ -16,11 +17,6 @@ using Quillon::Xml::ElementNode;
 namespace SsoClient {
 
 namespace {
-
-// What a violated invariant is reported under. Operators search logs for these places, so they stay
-// as they are, wherever the checks themselves move.
-constexpr char Unit[] = "lib/ssoClient/xmlCommonBuilders";
-constexpr int RootBuilderLine = 168;
 
 void CreateElement(
     const std::string& prefix,
@@ -129,7 +125,10 @@ XMLCompositeBuilder::XMLCompositeBuilder(XMLBuilderPtr rootBuilder)
     : _rootBuilder(std::move(rootBuilder))
 {
     if (_rootBuilder == nullptr) {
-        Quillon::PanicVerify("rootBuilder != __null", Unit, RootBuilderLine);
+        Quillon::PanicVerify(
+            "rootBuilder != __null",
+            AssertionPlaces::XmlCommonBuilders,
+            AssertionPlaces::CompositeWithoutRoot);
     }
 }
 

@@ -3,6 +3,7 @@
 #include "quillon/PanicVerify.h"
 #include "quillon/system/Clock.h"
 #include "ssoClient/message/xmlSecurityBuilders.h"
+#include "ssoClient/wire/assertionPlaces.h"
 #include "ssoClient/wire/wireNames.h"
 
 #include <limits>
@@ -12,12 +13,6 @@ using Quillon::System::DateTime;
 namespace SsoClient {
 
 namespace {
-
-// What a violated invariant is reported under. Operators search logs for these places, so they stay
-// as they are, wherever the checks themselves move.
-constexpr char Unit[] = "lib/ssoClient/xmlRequestBuilders";
-constexpr int UnknownConfirmationLine = 379;
-constexpr int RenewedTokenLine = 513;
 
 const char* ToText(bool value) noexcept
 {
@@ -32,7 +27,8 @@ const char* GetKeyType(SamlToken::ConfirmationType confirmation)
     case SamlToken::CONFIRM_HOLDER_OF_KEY:
         return Wire::PublicKeyType;
     }
-    Quillon::PanicVerify("false", Unit, UnknownConfirmationLine);
+    Quillon::PanicVerify(
+        "false", AssertionPlaces::XmlRequestBuilders, AssertionPlaces::UnknownConfirmationType);
 }
 
 // A lifetime that no date can hold ends at the last count there is, which is refused as a date,
@@ -170,8 +166,8 @@ XMLBuilderPtr RenewSecurityTokenBuilder(const SamlToken& token, long long lifeti
     if (token.GetConfirmationMethod() != SamlToken::CONFIRM_HOLDER_OF_KEY) {
         Quillon::PanicVerify(
             "token.GetConfirmationMethod() == SamlToken::CONFIRM_HOLDER_OF_KEY",
-            Unit,
-            RenewedTokenLine);
+            AssertionPlaces::XmlRequestBuilders,
+            AssertionPlaces::RenewalOfBearerToken);
     }
     return Composite(
         CreateRequestSecurityToken(Wire::SamlNamespace, Wire::RenewRequestType),

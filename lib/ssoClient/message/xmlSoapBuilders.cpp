@@ -4,6 +4,7 @@
 #include "quillon/StringUtil.h"
 #include "quillon/xml/security/Identifiers.h"
 #include "ssoClient/message/xmlSecurityBuilders.h"
+#include "ssoClient/wire/assertionPlaces.h"
 #include "ssoClient/wire/wireNames.h"
 
 #include <boost/smart_ptr/make_shared.hpp>
@@ -18,21 +19,12 @@ namespace SsoClient {
 
 namespace {
 
-// What a violated invariant is reported under. Operators search logs for these places, so they stay
-// as they are, wherever the checks themselves move.
-constexpr char Unit[] = "lib/ssoClient/xmlSoapBuilders";
-constexpr int SoapBodyLine = 169;
-constexpr int SoapHeaderLine = 173;
-constexpr int WsseSecurityLine = 177;
-constexpr int SignedHeaderBuilderLine = 339;
-constexpr int CertRefHeaderBuilderLine = 376;
-
 constexpr char CertificateId[] = "holderOfKeyCertificate";
 
 void RequireHeaderBuilder(const XMLBuilderPtr& headerBuilder, int line)
 {
     if (headerBuilder == nullptr) {
-        Quillon::PanicVerify("headerBuilder != __null", Unit, line);
+        Quillon::PanicVerify("headerBuilder != __null", AssertionPlaces::XmlSoapBuilders, line);
     }
 }
 
@@ -45,7 +37,7 @@ ElementNode* RequireChild(
 {
     ElementNode* const child = parent->FindChildElement(localName, namespaceUri);
     if (child == nullptr) {
-        Quillon::PanicVerify(expression, Unit, line);
+        Quillon::PanicVerify(expression, AssertionPlaces::XmlSoapBuilders, line);
     }
     return child;
 }
@@ -84,7 +76,7 @@ XMLSignedSoapBuilder::XMLSignedSoapBuilder(
     , _key(key)
     , _keyInfoBuilder(std::move(keyInfoBuilder))
 {
-    RequireHeaderBuilder(_headerBuilder, SignedHeaderBuilderLine);
+    RequireHeaderBuilder(_headerBuilder, AssertionPlaces::SignedEnvelopeWithoutHeader);
 }
 
 void XMLSignedSoapBuilder::build(Ref<ElementNode>& out) const
@@ -112,7 +104,7 @@ boost::shared_ptr<const XMLSignedSoapBuilder> CertRefSignedSoapBuilder(
     const Quillon::Crypto::PrivateKey* key,
     const Quillon::Crypto::Certificate* certificate)
 {
-    RequireHeaderBuilder(headerBuilder, CertRefHeaderBuilderLine);
+    RequireHeaderBuilder(headerBuilder, AssertionPlaces::CertRefSignedEnvelopeWithoutHeader);
     return boost::make_shared<XMLSignedSoapBuilder>(
         Composite(
             std::move(headerBuilder),
@@ -127,12 +119,24 @@ void SignSoapMessage(
     const XMLBuilderPtr& keyInfoBuilder,
     ElementNode* envelope)
 {
-    ElementNode* const soapBody =
-        RequireChild(envelope, "Body", Wire::SoapNamespace, "soapBody != __null", SoapBodyLine);
+    ElementNode* const soapBody = RequireChild(
+        envelope,
+        "Body",
+        Wire::SoapNamespace,
+        "soapBody != __null",
+        AssertionPlaces::EnvelopeWithoutBody);
     ElementNode* const soapHeader = RequireChild(
-        envelope, "Header", Wire::SoapNamespace, "soapHeader != __null", SoapHeaderLine);
+        envelope,
+        "Header",
+        Wire::SoapNamespace,
+        "soapHeader != __null",
+        AssertionPlaces::EnvelopeWithoutHeader);
     ElementNode* const wsseSecurity = RequireChild(
-        soapHeader, "Security", Wire::WsseNamespace, "wsseSecurity != __null", WsseSecurityLine);
+        soapHeader,
+        "Security",
+        Wire::WsseNamespace,
+        "wsseSecurity != __null",
+        AssertionPlaces::HeaderWithoutSecurity);
     // Every security header that is signed was made with a timestamp.
     ElementNode* const timestamp = wsseSecurity->FindChildElement("Timestamp", Wire::WsuNamespace);
 

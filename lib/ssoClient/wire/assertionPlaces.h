@@ -18,4 +18,18 @@ inline constexpr int NullArgumentOfAsyncOperation = 488;
 inline constexpr int EmptyFirstLeg = 762;
 inline constexpr int EmptyFurtherLeg = 794;
 
+inline constexpr char XmlCommonBuilders[] = "lib/ssoClient/xmlCommonBuilders";
+inline constexpr int CompositeWithoutRoot = 168;
+
+inline constexpr char XmlRequestBuilders[] = "lib/ssoClient/xmlRequestBuilders";
+inline constexpr int UnknownConfirmationType = 379;
+inline constexpr int RenewalOfBearerToken = 513;
+
+inline constexpr char XmlSoapBuilders[] = "lib/ssoClient/xmlSoapBuilders";
+inline constexpr int EnvelopeWithoutBody = 169;
+inline constexpr int EnvelopeWithoutHeader = 173;
+inline constexpr int HeaderWithoutSecurity = 177;
+inline constexpr int SignedEnvelopeWithoutHeader = 339;
+inline constexpr int CertRefSignedEnvelopeWithoutHeader = 376;
+
 } // namespace SsoClient::AssertionPlaces
