@@ -81,9 +81,9 @@ Node* Node::GetFirstChild() const noexcept
 void TextNode::SetText(std::string_view text)
 {
     if (const auto fault = FindCharacterFault(text)) {
-        const std::string element =
-            _parent == nullptr ? "" : " of element " + Quote(_parent->GetName());
-        throw InvalidArgumentException("The text" + element + " " + *fault);
+        throw InvalidArgumentException(
+            (_parent == nullptr ? "The text" : "The text of element " + Quote(_parent->GetName()))
+            + " " + *fault);
     }
     _text = _arena->CopyText(text);
 }

@@ -84,7 +84,7 @@ void TreeBuilder::StartElement(const TagEvent& tag)
         throw XMLParseException("The document ends inside a tag");
     }
     if (!IsInSource(std::string_view(tag.tagEnd, 1))) {
-        throw XMLParseException("The parser does not read the text in place");
+        ThrowUnlikeTheParser();
     }
     // A tag holds no `<` but its first, so the one before the end is its start [XML 3.1].
     const std::size_t length = static_cast<std::size_t>(tag.tagEnd - _source.data());

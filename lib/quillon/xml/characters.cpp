@@ -97,11 +97,6 @@ bool IsNoCharacter(std::string_view text, std::size_t position) noexcept
     return sequence == "\xEF\xBF\xBE" || sequence == "\xEF\xBF\xBF";
 }
 
-std::string Describe(const char* what, std::size_t position)
-{
-    return what + std::string(" at octet ") + std::to_string(position);
-}
-
 } // namespace
 
 std::size_t FindNotUtf8(std::string_view text) noexcept
@@ -133,11 +128,11 @@ std::optional<std::string> FindCharacterFault(std::string_view text)
         const unsigned char byte = ByteAt(text, position);
         const bool isAscii = byte < 0x80U;
         if (isAscii ? IsControl(byte) : IsNoCharacter(text, position)) {
-            return Describe("holds a character that XML does not allow", position);
+            return "holds a character that XML does not allow at octet " + std::to_string(position);
         }
         const unsigned length = isAscii ? 1 : GetSequenceLength(text, position);
         if (length == 0) {
-            return Describe("is not UTF-8", position);
+            return "is not UTF-8 at octet " + std::to_string(position);
         }
         position += length;
     }
