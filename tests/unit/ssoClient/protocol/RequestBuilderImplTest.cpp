@@ -240,20 +240,6 @@ TEST(BuildExchangeTokenRequest, RefusesTokenIdThatXmlCannotHold)
     EXPECT_EQ(request.body, "");
 }
 
-TEST(BuildUserPassTokenRequest, KeepsCarriageReturns)
-{
-    TokenSpec spec = SpecWithLifetime(300);
-    spec.audienceRestriction = {"a\rb"};
-    spec.advice = {{"s\r", {{"n", {"v\r\n"}}}}};
-    Request request;
-    RequestBuilderImpl(boost::none).BuildUserPassTokenRequest("u\r", "p\r\n", spec, request);
-    EXPECT_THAT(request.body, HasSubstr("<wsse:Username>u&#xD;</wsse:Username>"));
-    EXPECT_THAT(request.body, HasSubstr(">p&#xD;\n</wsse:Password>"));
-    EXPECT_THAT(request.body, HasSubstr("<wsa:Address>a&#xD;b</wsa:Address>"));
-    EXPECT_THAT(request.body, HasSubstr("AdviceSource=\"s&#xD;\""));
-    EXPECT_THAT(request.body, HasSubstr(">v&#xD;\n</rsa-advice:AttributeValue>"));
-}
-
 TEST(BuildUserPassTokenRequest, WithIdentityAndBearerConfirmationIsUnsignedBearer)
 {
     TokenSpec spec = SpecWithLifetime(300);
