@@ -16,18 +16,20 @@ struct AcquireCertificateOptions
     OutputOptions output;
 };
 
-ExitCode AcquireCertificate(const AcquireCertificateOptions& options)
+ExitCode AcquireCertificate(
+    const AcquireCertificateOptions& options, const Presentation& presentation)
 {
     const auto service = options.service.CreateService(
         ReadCertificates(options.service.trustFiles), options.identity.Read());
-    TokenOutput output(options.output);
-    output.Show(service->AcquireTokenByCertificate(options.token.spec));
+    TokenOutput output(options.output, presentation);
+    output.Show(options.service.Await(
+        presentation, [&] { return service->AcquireTokenByCertificate(options.token.spec); }));
     return ExitCode::DONE;
 }
 
 } // namespace
 
-void AddAcquireCertificateCommand(const Command& parent, Action& action)
+void AddAcquireCertificateCommand(const Command& parent, Invocation& invocation)
 {
     const Command command = parent.AddCommand(
         "certificate", "Acquire a holder-of-key token with one's own key and certificate");
@@ -36,7 +38,10 @@ void AddAcquireCertificateCommand(const Command& parent, Action& action)
     options->identity.AddRequiredTo(command);
     options->token.AddTo(command);
     options->output.AddOutTo(command);
-    options->output.AddJsonTo(command);
-    command.WhenNamed(
-        [options, &action] { action = [options] { return AcquireCertificate(*options); }; });
+    invocation.presentation.AddTo(command);
+    command.WhenNamed([options, &invocation] {
+        invocation.action = [options, &invocation] {
+            return AcquireCertificate(*options, invocation.presentation);
+        };
+    });
 }

@@ -20,15 +20,16 @@ struct AcquireGssOptions
     OutputOptions output;
 };
 
-ExitCode AcquireGss(const AcquireGssOptions& options)
+ExitCode AcquireGss(const AcquireGssOptions& options, const Presentation& presentation)
 {
     const auto service = options.service.CreateService(
         ReadCertificates(options.service.trustFiles), options.identity.Read());
     SsoClient::Gss::KerberosOptions kerberos = options.kerberos;
     kerberos.url = options.service.url;
     const auto handler = SsoClient::Gss::CreateKerberosNegotiationHandler(kerberos);
-    TokenOutput output(options.output);
-    output.Show(service->AcquireTokenByGSS(options.token.spec, *handler));
+    TokenOutput output(options.output, presentation);
+    output.Show(options.service.Await(
+        presentation, [&] { return service->AcquireTokenByGSS(options.token.spec, *handler); }));
     return ExitCode::DONE;
 }
 
@@ -67,7 +68,7 @@ void AddKerberosTo(const Command& command, SsoClient::Gss::KerberosOptions& opti
 
 } // namespace
 
-void AddAcquireGssCommand(const Command& parent, Action& action)
+void AddAcquireGssCommand(const Command& parent, Invocation& invocation)
 {
     const Command command =
         parent.AddCommand("gss", "Acquire a token with a Kerberos ticket, by SPNEGO");
@@ -78,6 +79,10 @@ void AddAcquireGssCommand(const Command& parent, Action& action)
     options->token.AddTo(command);
     options->token.AddBearerTo(command);
     options->output.AddOutTo(command);
-    options->output.AddJsonTo(command);
-    command.WhenNamed([options, &action] { action = [options] { return AcquireGss(*options); }; });
+    invocation.presentation.AddTo(command);
+    command.WhenNamed([options, &invocation] {
+        invocation.action = [options, &invocation] {
+            return AcquireGss(*options, invocation.presentation);
+        };
+    });
 }

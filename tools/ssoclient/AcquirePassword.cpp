@@ -20,20 +20,22 @@ struct AcquirePasswordOptions
     std::string passwordFile;
 };
 
-ExitCode AcquirePassword(const AcquirePasswordOptions& options)
+ExitCode AcquirePassword(const AcquirePasswordOptions& options, const Presentation& presentation)
 {
     const auto service = options.service.CreateService(
         ReadCertificates(options.service.trustFiles), options.identity.Read());
-    TokenOutput output(options.output);
+    TokenOutput output(options.output, presentation);
     Quillon::Wiped password;
     GetPassword(options.passwordFile, password);
-    output.Show(service->AcquireToken(options.user, password.Get(), options.token.spec));
+    output.Show(options.service.Await(presentation, [&] {
+        return service->AcquireToken(options.user, password.Get(), options.token.spec);
+    }));
     return ExitCode::DONE;
 }
 
 } // namespace
 
-void AddAcquirePasswordCommand(const Command& parent, Action& action)
+void AddAcquirePasswordCommand(const Command& parent, Invocation& invocation)
 {
     const Command command =
         parent.AddCommand("password", "Acquire a token with a user name and a password");
@@ -54,7 +56,10 @@ void AddAcquirePasswordCommand(const Command& parent, Action& action)
     options->token.AddTo(command);
     options->token.AddBearerTo(command);
     options->output.AddOutTo(command);
-    options->output.AddJsonTo(command);
-    command.WhenNamed(
-        [options, &action] { action = [options] { return AcquirePassword(*options); }; });
+    invocation.presentation.AddTo(command);
+    command.WhenNamed([options, &invocation] {
+        invocation.action = [options, &invocation] {
+            return AcquirePassword(*options, invocation.presentation);
+        };
+    });
 }

@@ -18,19 +18,21 @@ struct AcquireTokenOptions
     std::string tokenFile;
 };
 
-ExitCode AcquireToken(const AcquireTokenOptions& options)
+ExitCode AcquireToken(const AcquireTokenOptions& options, const Presentation& presentation)
 {
     const CertificateList trusted = ReadCertificates(options.service.trustFiles);
     const auto service = options.service.CreateService(trusted, options.identity.Read());
-    TokenOutput output(options.output);
+    TokenOutput output(options.output, presentation);
     const auto presented = ReadToken(options.tokenFile, trusted);
-    output.Show(service->AcquireTokenByToken(*presented, options.token.spec));
+    output.Show(options.service.Await(presentation, [&] {
+        return service->AcquireTokenByToken(*presented, options.token.spec);
+    }));
     return ExitCode::DONE;
 }
 
 } // namespace
 
-void AddAcquireTokenCommand(const Command& parent, Action& action)
+void AddAcquireTokenCommand(const Command& parent, Invocation& invocation)
 {
     const Command command = parent.AddCommand(
         "token", "Acquire a token by presenting another, for delegation or other properties");
@@ -41,7 +43,10 @@ void AddAcquireTokenCommand(const Command& parent, Action& action)
     options->token.AddTo(command);
     options->token.AddBearerTo(command);
     options->output.AddOutTo(command);
-    options->output.AddJsonTo(command);
-    command.WhenNamed(
-        [options, &action] { action = [options] { return AcquireToken(*options); }; });
+    invocation.presentation.AddTo(command);
+    command.WhenNamed([options, &invocation] {
+        invocation.action = [options, &invocation] {
+            return AcquireToken(*options, invocation.presentation);
+        };
+    });
 }

@@ -65,7 +65,7 @@ std::string CheckName(const std::string& value)
     if (!IsUtf8(value)) {
         return "is not UTF-8";
     }
-    return ToOneLine(value) == value ? "" : "must not hold control characters";
+    return HasControls(value) ? "must not hold control characters" : "";
 }
 
 std::string CheckLifetime(const std::string& value)

@@ -2,20 +2,26 @@
 
 #include "CommandLine.h"
 #include "ExitCode.h"
+#include "Presentation.h"
 
 #include <functional>
 
-/** What a command does once its arguments are known to be well-formed. */
-using Action = std::function<ExitCode()>;
+/** What the command line asks for. */
+struct Invocation
+{
+    /** What the command does once its arguments are known to be well-formed. */
+    std::function<ExitCode()> action;
+    Presentation presentation;
+};
 
 /**
  * Each adds one command to `parent`; when the command line names it, parsing puts what it does
- * into `action`.
+ * into the action of `invocation`, and how it speaks into the presentation.
  */
-void AddAcquirePasswordCommand(const Command& parent, Action& action);
-void AddAcquireCertificateCommand(const Command& parent, Action& action);
-void AddAcquireTokenCommand(const Command& parent, Action& action);
-void AddAcquireGssCommand(const Command& parent, Action& action);
-void AddRenewCommand(const Command& parent, Action& action);
-void AddValidateCommand(const Command& parent, Action& action);
-void AddInspectCommand(const Command& parent, Action& action);
+void AddAcquirePasswordCommand(const Command& parent, Invocation& invocation);
+void AddAcquireCertificateCommand(const Command& parent, Invocation& invocation);
+void AddAcquireTokenCommand(const Command& parent, Invocation& invocation);
+void AddAcquireGssCommand(const Command& parent, Invocation& invocation);
+void AddRenewCommand(const Command& parent, Invocation& invocation);
+void AddValidateCommand(const Command& parent, Invocation& invocation);
+void AddInspectCommand(const Command& parent, Invocation& invocation);

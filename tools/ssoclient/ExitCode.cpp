@@ -1,13 +1,11 @@
 #include "ExitCode.h"
 
-#include "OneLine.h"
-
 #include "quillon/http/HttpException.h"
 #include "ssoClient/Exceptions.h"
 #include "ssoClientGss/Exceptions.h"
 
 #include <cerrno>
-#include <iostream>
+#include <string_view>
 #include <system_error>
 
 namespace {
@@ -16,6 +14,18 @@ template <class... Classes>
 bool IsOneOf(const std::exception& error)
 {
     return ((dynamic_cast<const Classes*>(&error) != nullptr) || ...);
+}
+
+/**
+ * The user's own token is meant. One that the service has just sent is an `SsoException`: another
+ * attempt would not mend it.
+ */
+bool IsOutOfValidity(const std::exception& error)
+{
+    const std::string_view text = error.what();
+    return IsOneOf<SsoClient::ParseException>(error)
+           && (text.rfind("The token has expired at: ", 0) == 0
+               || text.rfind("Token start date is in the future: ", 0) == 0);
 }
 
 } // namespace
@@ -38,10 +48,5 @@ ExitCode GetExitCode(const std::exception& error)
     if (IsOneOf<SsoClient::CommunicationException, Quillon::Http::HttpException>(error)) {
         return ExitCode::COMMUNICATION;
     }
-    return ExitCode::REFUSED;
-}
-
-void ReportFailure(const std::string& className, const std::string& message)
-{
-    std::cerr << ToOneLine("ssoclient: " + className + ": " + message) + "\n" << std::flush;
+    return IsOutOfValidity(error) ? ExitCode::OUT_OF_VALIDITY : ExitCode::REFUSED;
 }

@@ -12,7 +12,8 @@ enum class ExitCode : int
     REFUSED = 1, ///< the token or the service's answer is not acceptable, or the service refuses
     USAGE = 2,   ///< the command line, an argument, or a file that cannot be used
     BAD_CREDENTIALS = 3, ///< the service or Kerberos does not take them
-    COMMUNICATION = 4
+    COMMUNICATION = 4,
+    OUT_OF_VALIDITY = 5 ///< the token has expired, or is not valid yet
 };
 
 /** The command line or a file that it names cannot be used. */
@@ -27,6 +28,3 @@ public:
 
 /** The exit code that tells a script what kind of failure `error` is. */
 ExitCode GetExitCode(const std::exception& error);
-
-/** Writes the one line `ssoclient: CLASS: MESSAGE` to standard error. */
-void ReportFailure(const std::string& className, const std::string& message);

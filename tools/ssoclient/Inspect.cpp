@@ -12,15 +12,14 @@ namespace {
 
 struct InspectOptions
 {
-    OutputOptions output;
     std::string file;
     std::vector<std::string> trustFiles;
     long long clockToleranceSec = SsoClient::DefaultClockToleranceSec;
 };
 
-ExitCode Inspect(const InspectOptions& options)
+ExitCode Inspect(const InspectOptions& options, const Presentation& presentation)
 {
-    TokenOutput output(options.output);
+    TokenOutput output({}, presentation);
     const CertificateList trusted = ReadCertificates(options.trustFiles);
     output.Show(
         SsoClient::CreateSamlToken(ReadFile(options.file), trusted, options.clockToleranceSec));
@@ -29,7 +28,7 @@ ExitCode Inspect(const InspectOptions& options)
 
 } // namespace
 
-void AddInspectCommand(const Command& parent, Action& action)
+void AddInspectCommand(const Command& parent, Invocation& invocation)
 {
     const Command command = parent.AddCommand("inspect", "Verify a token file and describe it");
     const auto options = std::make_shared<InspectOptions>();
@@ -46,6 +45,10 @@ void AddInspectCommand(const Command& parent, Action& action)
         .Between(0, MaxSeconds)
         .ShowDefault()
         .ValueName("SEC");
-    options->output.AddJsonTo(command);
-    command.WhenNamed([options, &action] { action = [options] { return Inspect(*options); }; });
+    invocation.presentation.AddTo(command);
+    command.WhenNamed([options, &invocation] {
+        invocation.action = [options, &invocation] {
+            return Inspect(*options, invocation.presentation);
+        };
+    });
 }

@@ -1,10 +1,23 @@
 #pragma once
 
+#include <cstddef>
 #include <string>
 #include <string_view>
 
+// Names and fault texts come from others and shall neither break a line nor steer a terminal.
+
+/** Whether `text` holds a control character or a separator of lines (C0, C1, U+2028, U+2029). */
+bool HasControls(std::string_view text);
+
 /**
- * `text` with every control character and line separator replaced by a blank: names and fault
- * texts come from others and shall neither break a line nor steer a terminal.
+ * `text` as one line that shows what it holds: every control character, line separator,
+ * bidirectional control and octet that is not UTF-8 is written as `\xNN` or `\uNNNN`, and a
+ * backslash as two, so that no two texts look alike.
  */
 std::string ToOneLine(std::string_view text);
+
+/** As `ToOneLine`, for a text that has been through such a function: backslashes stay. */
+std::string EscapeFurther(std::string_view text);
+
+/** At most `maxBytes` of `text`, and how long it is if that is not all of it. */
+std::string Shorten(const std::string& text, std::size_t maxBytes);

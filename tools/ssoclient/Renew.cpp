@@ -18,19 +18,20 @@ struct RenewOptions
     long long lifetimeSec = 0;
 };
 
-ExitCode Renew(const RenewOptions& options)
+ExitCode Renew(const RenewOptions& options, const Presentation& presentation)
 {
     const CertificateList trusted = ReadCertificates(options.service.trustFiles);
     const auto service = options.service.CreateService(trusted, options.identity.Read());
-    TokenOutput output(options.output);
+    TokenOutput output(options.output, presentation);
     const auto presented = ReadToken(options.tokenFile, trusted);
-    output.Show(service->RenewToken(*presented, options.lifetimeSec));
+    output.Show(options.service.Await(
+        presentation, [&] { return service->RenewToken(*presented, options.lifetimeSec); }));
     return ExitCode::DONE;
 }
 
 } // namespace
 
-void AddRenewCommand(const Command& parent, Action& action)
+void AddRenewCommand(const Command& parent, Invocation& invocation)
 {
     const Command command = parent.AddCommand("renew", "Renew a holder-of-key token");
     const auto options = std::make_shared<RenewOptions>();
@@ -44,6 +45,10 @@ void AddRenewCommand(const Command& parent, Action& action)
         .ValueName("SEC");
     options->identity.AddRequiredTo(command);
     options->output.AddOutTo(command);
-    options->output.AddJsonTo(command);
-    command.WhenNamed([options, &action] { action = [options] { return Renew(*options); }; });
+    invocation.presentation.AddTo(command);
+    command.WhenNamed([options, &invocation] {
+        invocation.action = [options, &invocation] {
+            return Renew(*options, invocation.presentation);
+        };
+    });
 }

@@ -2,12 +2,53 @@
 
 #include "Arguments.h"
 #include "ExitCode.h"
+#include "OneLine.h"
 
 #include "quillon/MessageFormatter.h"
+#include "quillon/StringUtil.h"
 #include "quillon/http/HttpURL.h"
 #include "quillon/service/Logger.h"
 
+#include <cstdio>
+
+#include <arpa/inet.h>
+#include <netinet/in.h>
+
 namespace {
+
+struct Server
+{
+    bool isHttps = false;
+    std::string host;
+    int port = 0;
+};
+
+Server ParseServer(const std::string& url)
+{
+    Server server;
+    std::string path;
+    Quillon::Http::ParseHttpURL(url, server.isHttps, server.host, server.port, path);
+    return server;
+}
+
+/** Whether what is sent to `host` does not leave the machine [RFC 6761 6.3, RFC 1122 3.2.1.3]. */
+bool IsLoopback(const std::string& host)
+{
+    in_addr v4 = {};
+    in6_addr v6 = {};
+    return Quillon::StringUtil::ToLower(host) == "localhost"
+           || (::inet_pton(AF_INET, host.c_str(), &v4) == 1 && (ntohl(v4.s_addr) >> 24) == 127)
+           || (::inet_pton(AF_INET6, host.c_str(), &v6) == 1 && IN6_IS_ADDR_LOOPBACK(&v6));
+}
+
+/** Passwords and tokens go through `http` in the clear. */
+void RequireSecureOrWanted(const Server& server, bool insecureHttp)
+{
+    if (!server.isHttps && !insecureHttp && !IsLoopback(server.host)) {
+        throw UsageError("--url: http: would send everything in the clear; use https:, or say "
+                         "--insecure-http");
+    }
+}
 
 /**
  * With authorities of its own the connection trusts those alone, otherwise the system's; a plain
@@ -15,12 +56,9 @@ namespace {
  */
 Quillon::Ref<Quillon::Ssl::SSLContext> CreateContext(const ServiceOptions& service)
 {
-    bool isHttps = false;
-    std::string host;
-    int port = 0;
-    std::string path;
-    Quillon::Http::ParseHttpURL(service.url, isHttps, host, port, path);
-    if (!isHttps) {
+    const Server server = ParseServer(service.url);
+    RequireSecureOrWanted(server, service.insecureHttp);
+    if (!server.isHttps) {
         return {};
     }
     Quillon::Ssl::SSLContextOptions options;
@@ -33,13 +71,19 @@ Quillon::Ref<Quillon::Ssl::SSLContext> CreateContext(const ServiceOptions& servi
     }
 }
 
-/** The library's logger writes to standard error unless it is given another sink. */
+/** Lines of the library, which hold what the service said, for a terminal. */
+void WriteTraceLine(const std::string& logger, int level, const std::string& text)
+{
+    const std::string line =
+        logger + "[" + std::to_string(level) + "]: " + EscapeFurther(text) + "\n";
+    std::fwrite(line.data(), 1, line.size(), stderr);
+}
+
 void EnableTraceLines()
 {
-    Quillon::Service::GetApp()
-        ->GetLogFacility()
-        .GetLogger("SsoClient")
-        ->SetLevel(Quillon::Service::LOG_LEVEL_TRACE);
+    auto& logs = Quillon::Service::GetApp()->GetLogFacility();
+    logs.SetSink(&WriteTraceLine);
+    logs.GetLogger("SsoClient")->SetLevel(Quillon::Service::LOG_LEVEL_TRACE);
 }
 
 } // namespace
@@ -65,6 +109,8 @@ void ServiceOptions::AddTo(const Command& command)
             "key (default: the host name of the URL)")
         .Check(CheckNotEmpty)
         .ValueName("TEXT");
+    command.AddFlag(
+        "--insecure-http", insecureHttp, "Let an http: URL lead to another machine, in the clear");
     command.AddFlag("--verbose", verbose, "Write the library's trace lines to standard error");
 }
 
@@ -85,4 +131,15 @@ boost::shared_ptr<SsoClient::SecurityTokenService> ServiceOptions::CreateService
     config.holderOfKeyConfig = identity;
     config.sslContext = context.get();
     return SsoClient::CreateSecurityTokenService(config);
+}
+
+std::string ServiceOptions::GetServer() const
+{
+    const Server server = ParseServer(url);
+    const bool isV6 = server.host.find(':') != std::string::npos;
+    return Quillon::MessageFormatter::ASPrint(
+        "%1://%2:%3",
+        server.isHttps ? "https" : "http",
+        isV6 ? "[" + server.host + "]" : server.host,
+        server.port);
 }

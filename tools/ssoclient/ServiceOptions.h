@@ -2,6 +2,7 @@
 
 #include "CommandLine.h"
 #include "Trust.h"
+#include "WaitNotice.h"
 
 #include "quillon/ssl/SSLContext.h"
 #include "ssoClient/SecurityTokenService.h"
@@ -16,6 +17,7 @@ struct ServiceOptions
     std::vector<std::string> trustFiles;
     std::vector<std::string> authorityFiles;
     std::string peer;
+    bool insecureHttp = false;
     bool verbose = false;
 
     void AddTo(const Command& command);
@@ -29,4 +31,16 @@ struct ServiceOptions
     boost::shared_ptr<SsoClient::SecurityTokenService> CreateService(
         const CertificateList& trusted,
         const boost::optional<SsoClient::HolderOfKeyConfig>& identity = boost::none) const;
+
+    /** What `call` returns, which asks the service. Says at a terminal when that takes long. */
+    template <class Call>
+    auto Await(const Presentation& presentation, Call call) const
+    {
+        const WaitNotice notice(presentation, GetServer());
+        return call();
+    }
+
+private:
+    /** The URL without its path. */
+    std::string GetServer() const;
 };

@@ -2,6 +2,7 @@
 
 #include "Arguments.h"
 #include "ExitCode.h"
+#include "Issuer.h"
 #include "OneLine.h"
 #include "Terminal.h"
 
@@ -28,6 +29,15 @@ Json ToJson(const SsoClient::Delegate& delegate)
     return json;
 }
 
+Json ToJson(const SsoClient::Advice& advice)
+{
+    Json json = {{"source", advice.source}, {"attributes", Json::array()}};
+    for (const SsoClient::AdviceAttribute& attribute : advice.attributes) {
+        json["attributes"].push_back({{"name", attribute.name}, {"values", attribute.values}});
+    }
+    return json;
+}
+
 template <class Item>
 Json ToJson(const std::vector<Item>& items)
 {
@@ -38,28 +48,48 @@ Json ToJson(const std::vector<Item>& items)
     return list;
 }
 
+Json ToJson(const Quillon::Crypto::Certificate* certificate)
+{
+    if (certificate == nullptr) {
+        return {};
+    }
+    return {{"subject", certificate->GetSubjectName()}, {"sha256", certificate->GetFingerprint()}};
+}
+
+template <class Fact>
+Json Collect(const SsoClient::SamlToken& token, void (SsoClient::SamlToken::*get)(Fact&) const)
+{
+    Fact fact;
+    (token.*get)(fact);
+    return ToJson(fact);
+}
+
 /**
- * What the redacted description says, under the same names; nothing more. It is all ASCII, because
- * a name may hold what would steer a terminal.
+ * What the redacted description says, under the same names, and what a caller must check before it
+ * relies on the token. It is all ASCII, because a name may hold what would steer a terminal.
  */
 std::string CreateJsonDescription(const SsoClient::SamlToken& token)
 {
-    std::vector<SsoClient::PrincipalId> groups;
-    token.GetGroups(groups);
-    std::vector<SsoClient::Delegate> delegationChain;
-    token.GetDelegationChain(delegationChain);
-    const bool isBearer = token.GetConfirmationMethod() == SsoClient::SamlToken::CONFIRM_BEARER;
+    using SsoClient::SamlToken;
+    std::set<std::string> audience;
+    token.GetAudience(audience);
+    const bool isBearer = token.GetConfirmationMethod() == SamlToken::CONFIRM_BEARER;
 
     Json json;
     json["subject"] = ToJson(token.GetSubject());
-    json["groups"] = ToJson(groups);
-    json["delegationChain"] = ToJson(delegationChain);
+    json["groups"] = Collect(token, &SamlToken::GetGroups);
+    json["delegationChain"] = Collect(token, &SamlToken::GetDelegationChain);
     json["startTime"] = token.GetStartDate().ToString();
     json["expirationTime"] = token.GetEndDate().ToString();
     json["renewable"] = token.IsRenewable();
     json["delegable"] = token.IsDelegable();
     json["isSolution"] = token.IsSolution();
     json["confirmationType"] = isBearer ? "bearer" : "holder-of-key";
+    json["id"] = token.GetId();
+    json["issuer"] = FindIssuer(token);
+    json["audience"] = audience;
+    json["advice"] = Collect(token, &SamlToken::GetAdvice);
+    json["confirmationCertificate"] = ToJson(token.GetConfirmationCertificate());
     return json.dump(2, ' ', true);
 }
 
@@ -71,11 +101,6 @@ void Print(const std::string& text)
 }
 
 } // namespace
-
-void OutputOptions::AddJsonTo(const Command& command)
-{
-    command.AddFlag("--json", json, "Print the token's facts as JSON");
-}
 
 void OutputOptions::AddOutTo(const Command& command)
 {
@@ -90,8 +115,9 @@ void OutputOptions::AddOutTo(const Command& command)
         .ValueName("FILE");
 }
 
-TokenOutput::TokenOutput(const OutputOptions& options)
+TokenOutput::TokenOutput(const OutputOptions& options, const Presentation& presentation)
     : _options(options)
+    , _presentation(presentation)
 {
     if (!options.outFile.empty() && !ToStandardOutput()) {
         _file.emplace(options.outFile);
@@ -113,24 +139,34 @@ void TokenOutput::Show(const boost::shared_ptr<const SsoClient::SamlToken>& toke
     } else if (ToStandardOutput()) {
         Print(token->ToXml());
     }
-    Describe(*token);
-    if (_options.obtains && _options.outFile.empty() && IsTerminal()) {
+    if (!_presentation.quiet) {
+        Describe(*token);
+    }
+    if (_options.obtains && _options.outFile.empty() && _presentation.HasReader()) {
         Notice("the token is not kept: use --out FILE to keep it");
     }
 }
 
 void TokenOutput::Describe(const SsoClient::SamlToken& token) const
 {
-    const std::string line = _options.json ? CreateJsonDescription(token)
-                                           : ToOneLine(SsoClient::CreateRedactedDescription(token));
+    const std::string line = _presentation.json
+                                 ? CreateJsonDescription(token)
+                                 : ToOneLine(SsoClient::CreateRedactedDescription(token));
     if (ToStandardOutput()) {
         std::cerr << line + "\n" << std::flush;
     } else {
-        PrintLine(line);
+        Print(line + "\n");
     }
 }
 
-void PrintLine(const std::string& line)
+void ShowValidity(bool isValid, const Presentation& presentation)
 {
-    Print(line + "\n");
+    if (presentation.quiet) {
+        return;
+    }
+    if (presentation.json) {
+        Print(Json{{"valid", isValid}}.dump() + "\n");
+    } else {
+        Print(isValid ? "valid\n" : "invalid\n");
+    }
 }

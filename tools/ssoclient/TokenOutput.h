@@ -2,6 +2,7 @@
 
 #include "CommandLine.h"
 #include "Files.h"
+#include "Presentation.h"
 
 #include "ssoClient/SamlToken.h"
 
@@ -10,22 +11,21 @@
 #include <optional>
 #include <string>
 
-/** How a command shows a token: `--json`, and `--out` where the command obtains one. */
+/** Where a command that obtains a token puts it. */
 struct OutputOptions
 {
-    bool json = false;
     bool obtains = false; ///< whether the command obtains a token, which it may keep
     std::string outFile;  ///< `-` is standard output
 
-    void AddJsonTo(const Command& command);
     void AddOutTo(const Command& command);
 };
 
-/** Shows tokens as the options say. Made before a token is asked for: see `OutputFile`. */
+/** Shows tokens as the options and the presentation say. Made before a token is asked for: see
+ * `OutputFile`. */
 class TokenOutput
 {
 public:
-    explicit TokenOutput(const OutputOptions& options);
+    TokenOutput(const OutputOptions& options, const Presentation& presentation);
 
     /**
      * Writes the assertion to where `--out` says, and then the redacted description or the facts as
@@ -41,8 +41,9 @@ private:
     void Describe(const SsoClient::SamlToken& token) const;
 
     OutputOptions _options;
+    Presentation _presentation;
     std::optional<OutputFile> _file;
 };
 
-/** Writes `line` and a line break to standard output. @throws UsageError  it cannot be written. */
-void PrintLine(const std::string& line);
+/** Says whether the service stands by a token. @throws UsageError  it cannot be written. */
+void ShowValidity(bool isValid, const Presentation& presentation);

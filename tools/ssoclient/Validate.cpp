@@ -13,23 +13,30 @@ struct ValidateOptions
     std::string tokenFile;
 };
 
-ExitCode Validate(const ValidateOptions& options)
+ExitCode Validate(const ValidateOptions& options, const Presentation& presentation)
 {
     const CertificateList trusted = ReadCertificates(options.service.trustFiles);
     const auto service = options.service.CreateService(trusted);
-    const bool isValid = service->ValidateSubject(*ReadToken(options.tokenFile, trusted));
-    PrintLine(isValid ? "valid" : "invalid");
+    const auto token = ReadToken(options.tokenFile, trusted);
+    const bool isValid =
+        options.service.Await(presentation, [&] { return service->ValidateSubject(*token); });
+    ShowValidity(isValid, presentation);
     return isValid ? ExitCode::DONE : ExitCode::REFUSED;
 }
 
 } // namespace
 
-void AddValidateCommand(const Command& parent, Action& action)
+void AddValidateCommand(const Command& parent, Invocation& invocation)
 {
     const Command command =
         parent.AddCommand("validate", "Ask the service whether a token's subject is valid");
     const auto options = std::make_shared<ValidateOptions>();
     options->service.AddTo(command);
     AddTokenTo(command, options->tokenFile);
-    command.WhenNamed([options, &action] { action = [options] { return Validate(*options); }; });
+    invocation.presentation.AddTo(command);
+    command.WhenNamed([options, &invocation] {
+        invocation.action = [options, &invocation] {
+            return Validate(*options, invocation.presentation);
+        };
+    });
 }

@@ -1,42 +1,48 @@
 #include "Commands.h"
+#include "Failure.h"
 #include "Terminal.h"
 
+#include <algorithm>
 #include <iostream>
 
 namespace {
 
-void AddCommands(const Command& program, Action& action)
+void AddCommands(const Command& program, Invocation& invocation)
 {
     const Command acquire = program.AddCommand("acquire", "Acquire a token from a token service");
-    AddAcquirePasswordCommand(acquire, action);
-    AddAcquireCertificateCommand(acquire, action);
-    AddAcquireTokenCommand(acquire, action);
-    AddAcquireGssCommand(acquire, action);
-    AddRenewCommand(program, action);
-    AddValidateCommand(program, action);
-    AddInspectCommand(program, action);
+    AddAcquirePasswordCommand(acquire, invocation);
+    AddAcquireCertificateCommand(acquire, invocation);
+    AddAcquireTokenCommand(acquire, invocation);
+    AddAcquireGssCommand(acquire, invocation);
+    AddRenewCommand(program, invocation);
+    AddValidateCommand(program, invocation);
+    AddInspectCommand(program, invocation);
 }
 
-ExitCode Run(const std::vector<std::string>& arguments)
+ExitCode Run(const std::vector<std::string>& arguments, Invocation& invocation)
 {
     const CommandLine commandLine(
         "ssoclient", SSOCLIENT_VERSION, "Obtains, renews, validates and verifies SAML 2.0 tokens.");
-    Action action;
-    AddCommands(commandLine.GetRoot(), action);
+    AddCommands(commandLine.GetRoot(), invocation);
     if (arguments.empty() && IsTerminal()) {
         std::cerr << commandLine.GetHelp();
     }
-    return commandLine.Parse(arguments) ? action() : ExitCode::DONE;
+    return commandLine.Parse(arguments) ? invocation.action() : ExitCode::DONE;
 }
 
 } // namespace
 
 int main(int argc, char** argv)
 {
+    const std::vector<std::string> arguments(argv + 1, argv + argc);
+    Invocation invocation;
     try {
-        return static_cast<int>(Run({argv + 1, argv + argc}));
+        return static_cast<int>(Run(arguments, invocation));
     } catch (const std::exception& error) {
-        ReportFailure(Quillon::GetClassName(error), error.what());
+        // A command line that is not understood may not have got as far as to set this.
+        invocation.presentation.json |=
+            std::find(arguments.begin(), arguments.end(), "--json") != arguments.end();
+        ReportFailure(error, invocation.presentation);
         return static_cast<int>(GetExitCode(error));
     }
 }

@@ -16,7 +16,8 @@ class Acquire(ServiceTest):
         facts = self.facts(self.acquire("--json"))
         self.assertEqual(
             ["subject", "groups", "delegationChain", "startTime", "expirationTime", "renewable",
-             "delegable", "isSolution", "confirmationType"], list(facts))
+             "delegable", "isSolution", "confirmationType", "id", "issuer", "audience", "advice",
+             "confirmationCertificate"], list(facts))
         self.assertEqual({"name": "alice", "domain": "example.test"}, facts["subject"])
         self.assertIn("Administrators", [group["name"] for group in facts["groups"]])
         self.assertEqual("bearer", facts["confirmationType"])

@@ -1,11 +1,16 @@
 """`ssoclient inspect` on the test tokens, which independent tools made and signed."""
 
 import datetime
+import hashlib
 import json
 import re
+import ssl
+import subprocess
 import unittest
 
-from programs import DATA, DONE, REFUSED, ProgramTest, ssoclient
+import lxml.etree
+
+from programs import DATA, DONE, OUT_OF_VALIDITY, REFUSED, ProgramTest, ssoclient
 
 TOKENS = DATA / "tokens"
 # The tokens are of other years; this tolerance takes the clock out of the test.
@@ -38,7 +43,27 @@ def principal(pair):
     return {"name": pair[0], "domain": pair[1]}
 
 
-def json_of(facts):
+def fingerprint(name):
+    der = ssl.PEM_cert_to_DER_cert((DATA / "keys" / f"{name}-cert.pem").read_text("ascii"))
+    return hashlib.sha256(der).hexdigest()
+
+
+def certificate(name):
+    if name is None:
+        return None
+    subject = subprocess.run(
+        ["openssl", "x509", "-in", DATA / "keys" / f"{name}-cert.pem", "-noout", "-subject",
+         "-nameopt", "RFC2253"], capture_output=True, text=True, check=True).stdout
+    return {"subject": subject.removeprefix("subject=").strip(), "sha256": fingerprint(name)}
+
+
+def issuer(file):
+    namespace = "{urn:oasis:names:tc:SAML:2.0:assertion}"
+    element = lxml.etree.parse(str(file)).getroot().find(f"{namespace}Issuer")
+    return "" if element is None else "".join(element.xpath("text()"))
+
+
+def json_of(facts, file):
     return {
         "subject": principal(facts["subject"]),
         "groups": [principal(group) for group in facts["groups"]],
@@ -51,6 +76,15 @@ def json_of(facts):
         "delegable": facts["delegable"],
         "isSolution": facts["solution"],
         "confirmationType": facts["confirmation"],
+        "id": facts["id"],
+        "issuer": issuer(file),
+        "audience": facts["audience"],
+        "advice": [
+            {"source": advice["source"],
+             "attributes": [{"name": name, "values": values}
+                            for name, values in advice["attributes"]]}
+            for advice in facts["advice"]],
+        "confirmationCertificate": certificate(facts.get("certificate")),
     }
 
 
@@ -60,7 +94,7 @@ class AcceptedTokens(ProgramTest):
             with self.subTest(token=entry["file"]):
                 result = ssoclient("inspect", entry["file"], *trust(entry), *ANY_TIME, "--json")
                 self.assertEqual((DONE, ""), (result.code, result.err))
-                self.assertEqual(json_of(entry["facts"]), json.loads(result.out))
+                self.assertEqual(json_of(entry["facts"], entry["file"]), json.loads(result.out))
 
 
 class RefusedTokens(ProgramTest):
@@ -78,9 +112,10 @@ class RefusedTokens(ProgramTest):
         if refusal["class"] == "Quillon::Exception":  # any class of the foundation's
             return re.match(r"ssoclient: \w+Exception: ", line) is not None
         start = f"ssoclient: {refusal['class'].rpartition('::')[2]}: "
+        text = refusal.get("message", refusal.get("prefix", "")).replace("\\", "\\\\")
         if "message" in refusal:
-            return line == f"{start}{refusal['message']}\n"
-        return line.startswith(start + refusal.get("prefix", ""))
+            return line == f"{start}{text}\n"
+        return line.startswith(start + text)
 
 
 class Inspect(ProgramTest):
@@ -121,8 +156,8 @@ class Inspect(ProgramTest):
 
     def test_the_clock_counts_unless_it_is_told_otherwise(self):
         token = TOKENS / "accepted" / "clock-start-equals-now.xml"
-        self.assert_fails(ssoclient("inspect", token, *self.TRUST), REFUSED, "ParseException",
-                          "The token has expired at: 2026-06-15T13:00:00.000Z")
+        self.assert_fails(ssoclient("inspect", token, *self.TRUST), OUT_OF_VALIDITY,
+                          "ParseException", "The token has expired at: 2026-06-15T13:00:00.000Z")
         result = ssoclient("inspect", token, *self.TRUST, *ANY_TIME)
         self.assertEqual((DONE, ""), (result.code, result.err))
 

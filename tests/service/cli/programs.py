@@ -11,7 +11,7 @@ import unittest
 SSOCLIENT = os.environ["SSOCLIENT"]
 DATA = pathlib.Path(os.environ["TEST_DATA_DIR"])
 
-DONE, REFUSED, USAGE, BAD_CREDENTIALS, COMMUNICATION = range(5)
+DONE, REFUSED, USAGE, BAD_CREDENTIALS, COMMUNICATION, OUT_OF_VALIDITY = range(6)
 
 # Of a token that Alice acquires with her password.
 DESCRIPTION = (

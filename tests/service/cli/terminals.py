@@ -21,13 +21,15 @@ class TerminalTest(ServiceTest):
 
     def start_with_terminal_error(self, *arguments, **others):
         """Starts the program with the terminal as its standard error."""
-        return self.start(*arguments, stderr=self.far_end, **others)
+        return self.start(*arguments, stderr=self.far_end, takes_terminal=False, **others)
 
-    def start(self, *arguments, launcher=(), stdin=subprocess.DEVNULL, stderr=subprocess.PIPE):
+    def start(self, *arguments, launcher=(), stdin=subprocess.DEVNULL, stderr=subprocess.PIPE,
+              takes_terminal=True):
         """Starts the program with the terminal as its controlling one, not as its output."""
         def take_terminal():
             os.setsid()
-            fcntl.ioctl(self.far_end, termios.TIOCSCTTY, 0)
+            if takes_terminal:
+                fcntl.ioctl(self.far_end, termios.TIOCSCTTY, 0)
 
         process = subprocess.Popen(
             [*launcher, SSOCLIENT, *map(str, arguments)], stdin=stdin,

@@ -1,0 +1,36 @@
+#include "WaitNotice.h"
+
+#include "Terminal.h"
+
+#include <chrono>
+
+namespace {
+
+constexpr std::chrono::seconds Patience(5);
+
+} // namespace
+
+WaitNotice::WaitNotice(const Presentation& presentation, const std::string& server)
+{
+    if (!presentation.HasReader()) {
+        return;
+    }
+    _thread = std::thread([this, server] {
+        std::unique_lock<std::mutex> lock(_mutex);
+        if (!_ended.wait_for(lock, Patience, [this] { return _isOver; })) {
+            Notice("waiting for " + server + ", for up to 240 seconds an exchange");
+        }
+    });
+}
+
+WaitNotice::~WaitNotice()
+{
+    {
+        const std::lock_guard<std::mutex> lock(_mutex);
+        _isOver = true;
+    }
+    _ended.notify_one();
+    if (_thread.joinable()) {
+        _thread.join();
+    }
+}
