@@ -39,6 +39,9 @@ void AddAcquireCertificateCommand(const Command& parent, Invocation& invocation)
     options->token.AddTo(command);
     options->output.AddOutTo(command);
     invocation.presentation.AddTo(command);
+    command.ShowExample(
+        "ssoclient acquire certificate --url https://sts.example.com/sts \\\n      --trust sts.pem "
+        "--key service.key --cert service.pem \\\n      --renewable --out token.xml");
     command.WhenNamed([options, &invocation] {
         invocation.action = [options, &invocation] {
             return AcquireCertificate(*options, invocation.presentation);

@@ -80,6 +80,8 @@ void AddAcquireGssCommand(const Command& parent, Invocation& invocation)
     options->token.AddBearerTo(command);
     options->output.AddOutTo(command);
     invocation.presentation.AddTo(command);
+    command.ShowExample("ssoclient acquire gss --url https://sts.example.com/sts \\\n      --trust "
+                        "sts.pem --out token.xml");
     command.WhenNamed([options, &invocation] {
         invocation.action = [options, &invocation] {
             return AcquireGss(*options, invocation.presentation);

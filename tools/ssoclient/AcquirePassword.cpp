@@ -57,6 +57,8 @@ void AddAcquirePasswordCommand(const Command& parent, Invocation& invocation)
     options->token.AddBearerTo(command);
     options->output.AddOutTo(command);
     invocation.presentation.AddTo(command);
+    command.ShowExample("ssoclient acquire password --url https://sts.example.com/sts \\\n      "
+                        "--trust sts.pem --user alice@example.com --out token.xml");
     command.WhenNamed([options, &invocation] {
         invocation.action = [options, &invocation] {
             return AcquirePassword(*options, invocation.presentation);

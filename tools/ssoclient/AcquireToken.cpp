@@ -44,6 +44,9 @@ void AddAcquireTokenCommand(const Command& parent, Invocation& invocation)
     options->token.AddBearerTo(command);
     options->output.AddOutTo(command);
     invocation.presentation.AddTo(command);
+    command.ShowExample(
+        "ssoclient acquire token --url https://sts.example.com/sts \\\n      --trust sts.pem --key "
+        "service.key --cert service.pem \\\n      --token users.xml --out token.xml");
     command.WhenNamed([options, &invocation] {
         invocation.action = [options, &invocation] {
             return AcquireToken(*options, invocation.presentation);

@@ -1,6 +1,7 @@
 #include "CommandLine.h"
 
 #include "ExitCode.h"
+#include "HelpFormat.h"
 #include "Neighbour.h"
 
 #include <CLI/App.hpp>
@@ -221,6 +222,31 @@ std::string CheckSeconds(const std::string& value)
                : "`" + value + "' is not a number of seconds" + ExplainUnit(value);
 }
 
+/** The parser's help, wrapped to the terminal, with the exit codes at the end. */
+class HelpFormatter : public CLI::Formatter
+{
+public:
+    std::string make_description(const CLI::App* app) const override
+    {
+        return Wrap(CLI::Formatter::make_description(app), 0);
+    }
+    std::string make_option(const CLI::Option* option, bool isPositional) const override
+    {
+        return FormatEntry(
+            make_option_name(option, isPositional) + make_option_opts(option),
+            make_option_desc(option));
+    }
+    std::string make_subcommand(const CLI::App* command) const override
+    {
+        return FormatEntry(command->get_name(), command->get_description());
+    }
+    std::string make_footer(const CLI::App* app) const override
+    {
+        return "\n" + app->get_footer() + (app->get_footer().empty() ? "" : "\n\n")
+               + Wrap("Exit codes: " + DescribeExitCodes(), 0);
+    }
+};
+
 } // namespace
 
 Option Option::Required() const
@@ -270,7 +296,29 @@ Command Command::AddCommand(const std::string& name, const std::string& descript
     // None is an error too, which the program tells: the parser would tell it of an unknown one as
     // well, without naming the word.
     _app->require_subcommand(0, 1);
-    return Command(*_app->add_subcommand(name, description));
+    CLI::App* command = _app->add_subcommand(name, description);
+    command->set_version_flag("--version", _app->version());
+    return Command(*command);
+}
+
+Command Command::InGroup(const std::string& heading) const
+{
+    Command same(*_app);
+    same._group = heading;
+    return same;
+}
+
+void Command::ShowExample(const std::string& call) const
+{
+    _app->footer("Example:\n  " + call);
+}
+
+CLI::Option* Command::Place(CLI::Option* option) const
+{
+    if (!_group.empty()) {
+        option->group(_group);
+    }
+    return option;
 }
 
 void Command::WhenNamed(const std::function<void()>& action) const
@@ -281,7 +329,7 @@ void Command::WhenNamed(const std::function<void()>& action) const
 Option Command::AddOption(
     const std::string& name, std::string& value, const std::string& description) const
 {
-    return Option(*_app->add_option(name, value, description));
+    return Option(*Place(_app->add_option(name, value, description)));
 }
 
 Option Command::AddOption(
@@ -289,44 +337,44 @@ Option Command::AddOption(
     std::optional<std::string>& value,
     const std::string& description) const
 {
-    return Option(*_app->add_option(name, value, description));
+    return Option(*Place(_app->add_option(name, value, description)));
 }
 
 Option Command::AddOption(
     const std::string& name, std::vector<std::string>& value, const std::string& description) const
 {
-    return Option(*_app->add_option(name, value, description));
+    return Option(*Place(_app->add_option(name, value, description)));
 }
 
 Option Command::AddOption(
     const std::string& name, std::set<std::string>& value, const std::string& description) const
 {
-    return Option(*_app->add_option(name, value, description));
+    return Option(*Place(_app->add_option(name, value, description)));
 }
 
 Option Command::AddOption(
     const std::string& name, long long& value, const std::string& description) const
 {
-    return Option(*_app->add_option(name, value, description)->check(CheckSeconds));
+    return Option(*Place(_app->add_option(name, value, description)->check(CheckSeconds)));
 }
 
 Option Command::AddOption(
     const std::string& name, const TextSink& sink, const std::string& description) const
 {
-    return Option(*_app->add_option_function<std::string>(name, sink, description));
+    return Option(*Place(_app->add_option_function<std::string>(name, sink, description)));
 }
 
 Option Command::AddPairOption(
     const std::string& name, const PairsSink& sink, const std::string& description) const
 {
     // Each pair needs the name before it, so that a third word is not taken for another pair.
-    return Option(*_app->add_option_function<std::vector<Pair>>(name, sink, description)
-                       ->allow_extra_args(false));
+    return Option(*Place(_app->add_option_function<std::vector<Pair>>(name, sink, description)
+                             ->allow_extra_args(false)));
 }
 
 void Command::AddFlag(const std::string& name, bool& value, const std::string& description) const
 {
-    _app->add_flag(name, value, description)->disable_flag_override();
+    Place(_app->add_flag(name, value, description)->disable_flag_override());
 }
 
 void Command::AddFlag(
@@ -334,7 +382,7 @@ void Command::AddFlag(
     const std::function<void()>& action,
     const std::string& description) const
 {
-    _app->add_flag_callback(name, action, description)->disable_flag_override();
+    Place(_app->add_flag_callback(name, action, description)->disable_flag_override());
 }
 
 CommandLine::CommandLine(
@@ -342,6 +390,7 @@ CommandLine::CommandLine(
     : _app(std::make_unique<CLI::App>(description, program))
 {
     _app->set_version_flag("--version", program + " " + version);
+    _app->formatter(std::make_shared<HelpFormatter>());
 }
 
 CommandLine::~CommandLine() = default;

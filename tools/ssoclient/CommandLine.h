@@ -53,6 +53,12 @@ public:
 
     Command AddCommand(const std::string& name, const std::string& description) const;
 
+    /** The same command; the help shows what is added through it under this heading. */
+    Command InGroup(const std::string& heading) const;
+
+    /** The help ends with this call of the command. */
+    void ShowExample(const std::string& call) const;
+
     /** Parsing calls `action` if the command line names this command. */
     void WhenNamed(const std::function<void()>& action) const;
 
@@ -89,7 +95,10 @@ public:
         const std::string& description) const;
 
 private:
+    CLI::Option* Place(CLI::Option* option) const;
+
     CLI::App* _app;
+    std::string _group;
 };
 
 /** The command line of a program. */

@@ -30,6 +30,14 @@ bool IsOutOfValidity(const std::exception& error)
 
 } // namespace
 
+std::string DescribeExitCodes()
+{
+    return "0 done; 1 the token is refused or invalid, or the service refuses; 2 usage, or a file "
+           "that cannot be used; 3 bad credentials, or Kerberos fails; 4 communication; 5 the "
+           "token "
+           "has expired or is not valid yet.";
+}
+
 void ThrowSystemError(const std::string& what)
 {
     throw UsageError(what + ": " + std::system_category().message(errno));

@@ -16,6 +16,9 @@ enum class ExitCode : int
     OUT_OF_VALIDITY = 5 ///< the token has expired, or is not valid yet
 };
 
+/** All of them with what they mean, for the help. */
+std::string DescribeExitCodes();
+
 /** The command line or a file that it names cannot be used. */
 class UsageError : public Quillon::ExceptionOf<UsageError, Quillon::Exception>
 {

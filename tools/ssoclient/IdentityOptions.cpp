@@ -124,8 +124,9 @@ struct AddedOptions
     Option certificate;
 };
 
-AddedOptions AddOptions(const Command& command, IdentityOptions& options)
+AddedOptions AddOptions(const Command& owner, IdentityOptions& options)
 {
+    const Command command = owner.InGroup("The caller's key");
     const AddedOptions added = {
         command
             .AddOption(

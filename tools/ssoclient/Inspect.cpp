@@ -1,10 +1,12 @@
 #include "Arguments.h"
 #include "Commands.h"
+#include "Explanation.h"
 #include "Files.h"
 #include "TokenOutput.h"
 #include "Trust.h"
 
 #include "ssoClient/CreateSamlToken.h"
+#include "ssoClient/Exceptions.h"
 
 #include <memory>
 
@@ -17,12 +19,32 @@ struct InspectOptions
     long long clockToleranceSec = SsoClient::DefaultClockToleranceSec;
 };
 
+/** The one of the trusted certificates that the token verifies with by itself. */
+Quillon::Ref<const Quillon::Crypto::Certificate> FindSigner(
+    const SsoClient::SamlToken& token, const CertificateList& trusted, long long clockToleranceSec)
+{
+    for (const auto& certificate : trusted) {
+        try {
+            SsoClient::CreateSamlToken(token.ToXml(), {certificate}, clockToleranceSec);
+            return certificate;
+        } catch (const SsoClient::InvalidSignatureException&) {
+            continue;
+        }
+    }
+    return {};
+}
+
 ExitCode Inspect(const InspectOptions& options, const Presentation& presentation)
 {
     TokenOutput output({}, presentation);
     const CertificateList trusted = ReadCertificates(options.trustFiles);
-    output.Show(
-        SsoClient::CreateSamlToken(ReadFile(options.file), trusted, options.clockToleranceSec));
+    const auto token =
+        SsoClient::CreateSamlToken(ReadFile(options.file), trusted, options.clockToleranceSec);
+    output.Show(token);
+    if (presentation.ShowsExplanations()) {
+        const auto signer = FindSigner(*token, trusted, options.clockToleranceSec);
+        output.Print(Explain(*token, signer.get()));
+    }
     return ExitCode::DONE;
 }
 
@@ -46,6 +68,7 @@ void AddInspectCommand(const Command& parent, Invocation& invocation)
         .ShowDefault()
         .ValueName("SEC");
     invocation.presentation.AddTo(command);
+    command.ShowExample("ssoclient inspect token.xml --trust sts.pem");
     command.WhenNamed([options, &invocation] {
         invocation.action = [options, &invocation] {
             return Inspect(*options, invocation.presentation);

@@ -18,4 +18,7 @@ struct Presentation
 
     /** Whether a failure is followed by a line on what can be done about it. */
     bool ShowsHints() const { return explain || HasReader(); }
+
+    /** Whether the description of a token is followed by lines that explain it. */
+    bool ShowsExplanations() const;
 };

@@ -46,6 +46,9 @@ void AddRenewCommand(const Command& parent, Invocation& invocation)
     options->identity.AddRequiredTo(command);
     options->output.AddOutTo(command);
     invocation.presentation.AddTo(command);
+    command.ShowExample("ssoclient renew --url https://sts.example.com/sts \\\n      --trust "
+                        "sts.pem --key service.key --cert service.pem \\\n      --token token.xml "
+                        "--lifetime 3600 --out renewed.xml");
     command.WhenNamed([options, &invocation] {
         invocation.action = [options, &invocation] {
             return Renew(*options, invocation.presentation);

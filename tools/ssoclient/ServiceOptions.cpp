@@ -88,8 +88,9 @@ void EnableTraceLines()
 
 } // namespace
 
-void ServiceOptions::AddTo(const Command& command)
+void ServiceOptions::AddTo(const Command& owner)
 {
+    const Command command = owner.InGroup("The service");
     command.AddOption("--url", url, "The token service, https://HOST[:PORT]/PATH")
         .Required()
         .ValueName("URL");

@@ -93,19 +93,12 @@ std::string CreateJsonDescription(const SsoClient::SamlToken& token)
     return json.dump(2, ' ', true);
 }
 
-void Print(const std::string& text)
-{
-    if (!(std::cout << text << std::flush)) {
-        throw UsageError("cannot write to standard output");
-    }
-}
-
 } // namespace
 
 void OutputOptions::AddOutTo(const Command& command)
 {
     obtains = true;
-    command
+    command.InGroup("What is printed")
         .AddOption(
             "--out",
             outFile,
@@ -121,6 +114,13 @@ TokenOutput::TokenOutput(const OutputOptions& options, const Presentation& prese
 {
     if (!options.outFile.empty() && !ToStandardOutput()) {
         _file.emplace(options.outFile);
+    }
+}
+
+void TokenOutput::Print(const std::string& text)
+{
+    if (!(std::cout << text << std::flush)) {
+        throw UsageError("cannot write to standard output");
     }
 }
 
@@ -165,8 +165,8 @@ void ShowValidity(bool isValid, const Presentation& presentation)
         return;
     }
     if (presentation.json) {
-        Print(Json{{"valid", isValid}}.dump() + "\n");
+        TokenOutput::Print(Json{{"valid", isValid}}.dump() + "\n");
     } else {
-        Print(isValid ? "valid\n" : "invalid\n");
+        TokenOutput::Print(isValid ? "valid\n" : "invalid\n");
     }
 }

@@ -36,6 +36,9 @@ public:
      */
     void Show(const boost::shared_ptr<const SsoClient::SamlToken>& token);
 
+    /** Writes `text` to standard output. @throws UsageError  it cannot be written. */
+    static void Print(const std::string& text);
+
 private:
     bool ToStandardOutput() const;
     void Describe(const SsoClient::SamlToken& token) const;

@@ -24,6 +24,8 @@ Entry& FindOrAdd(std::vector<Entry>& entries, std::string Entry::*key, const std
     return added;
 }
 
+constexpr char Group[] = "The token that is asked for";
+
 void AddAdvice(std::vector<SsoClient::Advice>& advice, const AdviceWords& words)
 {
     const auto& [source, attribute] = words;
@@ -38,8 +40,9 @@ void AddAdvice(std::vector<SsoClient::Advice>& advice, const AdviceWords& words)
 
 } // namespace
 
-void TokenSpecOptions::AddTo(const Command& command)
+void TokenSpecOptions::AddTo(const Command& owner)
 {
+    const Command command = owner.InGroup(Group);
     command.AddOption("--lifetime", spec.tokenLifetimeSec, "Lifetime of the token in seconds")
         .ShowDefault()
         .Check(CheckLifetime)
@@ -71,7 +74,7 @@ void TokenSpecOptions::AddTo(const Command& command)
 
 void TokenSpecOptions::AddBearerTo(const Command& command)
 {
-    command.AddFlag(
+    command.InGroup(Group).AddFlag(
         "--bearer",
         [this] { spec.confirmation = SsoClient::TokenSpec::CONFIRMATION_BEARER; },
         "Ask for a bearer token, although there is a key");

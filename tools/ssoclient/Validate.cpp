@@ -34,6 +34,8 @@ void AddValidateCommand(const Command& parent, Invocation& invocation)
     options->service.AddTo(command);
     AddTokenTo(command, options->tokenFile);
     invocation.presentation.AddTo(command);
+    command.ShowExample("ssoclient validate --url https://sts.example.com/sts \\\n      --trust "
+                        "sts.pem --token token.xml");
     command.WhenNamed([options, &invocation] {
         invocation.action = [options, &invocation] {
             return Validate(*options, invocation.presentation);

@@ -11,6 +11,7 @@ import unittest
 import lxml.etree
 
 from programs import DATA, DONE, OUT_OF_VALIDITY, REFUSED, ProgramTest, ssoclient
+from terminals import TerminalTest
 
 TOKENS = DATA / "tokens"
 # The tokens are of other years; this tolerance takes the clock out of the test.
@@ -165,6 +166,67 @@ class Inspect(ProgramTest):
         text = f"<a>{'x' * 30_000_000}</a>"
         result = ssoclient("inspect", "-", *self.TRUST, stdin=text)
         self.assert_fails_matching(result, REFUSED, "XMLParseException", ".+")
+
+
+class Explained(ProgramTest):
+    """Lines for a person follow the description."""
+
+    TRUST = ("--trust", DATA / "keys" / "foreign-cert.pem", DATA / "keys" / "sts-cert.pem")
+
+    def lines(self, file, *options):
+        described = ssoclient("inspect", file, *self.TRUST, *ANY_TIME)
+        result = ssoclient("inspect", file, *self.TRUST, *ANY_TIME, "--explain", *options)
+        self.assertEqual((DONE, ""), (result.code, result.err))
+        self.assertTrue(result.out.startswith(described.out))
+        return dict(re.split(r":\s+", line.strip(), maxsplit=1)
+                    for line in result.out.removeprefix(described.out).splitlines())
+
+    @staticmethod
+    def named(name):
+        return "{subject} (SHA-256 {sha256})".format(**certificate(name))
+
+    def test_token_with_everything(self):
+        lines = self.lines(TOKENS / "accepted" / "everything.xml")
+        self.assertEqual(
+            ["validity", "signed by", "issuer", "confirmation", "audience", "delegation"],
+            list(lines))
+        self.assertEqual(self.named("sts"), lines["signed by"])
+        self.assertEqual(issuer(TOKENS / "accepted" / "everything.xml"), lines["issuer"])
+        self.assertEqual(f"holder of the key of {self.named('client')}", lines["confirmation"])
+        self.assertEqual("https://a.example, https://b.example.com", lines["audience"])
+        self.assertEqual(
+            "user@example.com -> first@example.com (2026-01-01T01:00:00.000Z) -> "
+            "second@example.com (2026-01-01T02:00:00.000Z) -> "
+            "third@other.example (2026-01-01T03:00:00.000Z)", lines["delegation"])
+
+    def test_bearer_token(self):
+        lines = self.lines(TOKENS / "accepted" / "bearer.xml")
+        self.assertEqual("bearer: whoever has the token is its subject", lines["confirmation"])
+        self.assertEqual(("anyone", "none"), (lines["audience"], lines["delegation"]))
+
+    def test_token_that_has_expired_within_the_tolerance(self):
+        lines = self.lines(TOKENS / "accepted" / "clock-start-equals-now.xml")
+        self.assertRegex(lines["validity"],
+                         r"\Aended \d+ d \d+ h ago, which the clock tolerance allows\Z")
+
+    def test_only_if_they_are_asked_for(self):
+        file = TOKENS / "accepted" / "bearer.xml"
+        for options in (("--json",), ("--quiet",)):
+            with self.subTest(options=options):
+                self.assertEqual(
+                    ssoclient("inspect", file, *self.TRUST, *ANY_TIME, *options),
+                    ssoclient("inspect", file, *self.TRUST, *ANY_TIME, "--explain", *options))
+
+
+class ExplainedAtATerminal(TerminalTest):
+    def test_validity_that_is_left(self):
+        token = self.token_file(self.acquire)
+        process = self.start_with_terminal_output("inspect", token, "--trust", self.sts.trust)
+        self.assertEqual("", process.communicate(timeout=120)[1])
+        self.assertRegex(
+            self.read_what_is_there().decode(),
+            r"\ASamlToken \[.*\]\r\n  validity:     (5 min 0 s|4 min \d+ s) left, until \S+Z\r\n"
+            r"  signed by:    .+\r\n")
 
 
 if __name__ == "__main__":

@@ -1,11 +1,14 @@
 """Where `ssoclient` puts a token: `--out`, and what stands there already."""
 
+import fcntl
 import os
 import pathlib
 import resource
 import signal
 import socket
+import struct
 import subprocess
+import termios
 import unittest
 
 from programs import (DESCRIPTION, DONE, SSOCLIENT, USAGE, DevelopmentSts, Result, ServiceTest,
@@ -149,6 +152,27 @@ class NoArguments(TerminalTest):
         self.assertEqual(
             ssoclient("--help").out + ssoclient().err,
             self.read_what_is_there().decode().replace("\r\n", "\n"))
+
+
+class HelpAtATerminal(TerminalTest):
+    def widths(self, columns):
+        fcntl.ioctl(self.far_end, termios.TIOCSWINSZ, struct.pack("HHHH", 24, columns, 0, 0))
+        process = self.start_with_terminal_output("acquire", "password", "--help")
+        process.wait(timeout=120)
+        lines = self.read_what_is_there().decode().splitlines()
+        # An example is copied, not read, and stays as it is.
+        example = lines.index("Example:")
+        return [len(line) for line in lines[:example] + lines[lines.index("", example):]]
+
+    def test_fits(self):
+        for columns in (60, 80, 100):
+            with self.subTest(columns=columns):
+                self.assertLessEqual(max(self.widths(columns)), columns)
+                self.assertGreater(max(self.widths(columns)), columns - 15)
+
+    def test_has_bounds(self):
+        self.assertLessEqual(max(self.widths(300)), 120)
+        self.assertGreater(max(self.widths(10)), 30)
 
 
 class KeptOrNot(TerminalTest):

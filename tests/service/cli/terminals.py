@@ -23,8 +23,12 @@ class TerminalTest(ServiceTest):
         """Starts the program with the terminal as its standard error."""
         return self.start(*arguments, stderr=self.far_end, takes_terminal=False, **others)
 
-    def start(self, *arguments, launcher=(), stdin=subprocess.DEVNULL, stderr=subprocess.PIPE,
-              takes_terminal=True):
+    def start_with_terminal_output(self, *arguments, **others):
+        """Starts the program with the terminal as its standard output."""
+        return self.start(*arguments, stdout=self.far_end, takes_terminal=False, **others)
+
+    def start(self, *arguments, launcher=(), stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
+              stderr=subprocess.PIPE, takes_terminal=True):
         """Starts the program with the terminal as its controlling one, not as its output."""
         def take_terminal():
             os.setsid()
@@ -33,7 +37,7 @@ class TerminalTest(ServiceTest):
 
         process = subprocess.Popen(
             [*launcher, SSOCLIENT, *map(str, arguments)], stdin=stdin,
-            stdout=subprocess.PIPE, stderr=stderr, text=True, preexec_fn=take_terminal,
+            stdout=stdout, stderr=stderr, text=True, preexec_fn=take_terminal,
             pass_fds=[self.far_end])
         self.addCleanup(self.end, process)
         return process
@@ -43,9 +47,9 @@ class TerminalTest(ServiceTest):
         if process.poll() is None:
             process.kill()
         process.wait()
-        process.stdout.close()
-        if process.stderr is not None:
-            process.stderr.close()
+        for stream in (process.stdout, process.stderr):
+            if stream is not None:
+                stream.close()
 
     def read_until(self, text):
         """What the terminal shows, up to and including the text."""

@@ -1,6 +1,7 @@
 """What the command line says before anything is asked of a service."""
 
 import os
+import re
 import unittest
 
 from programs import DATA, REFUSED, USAGE, ProgramTest, ssoclient
@@ -39,6 +40,43 @@ class Help(unittest.TestCase):
                 ("inspect", ("FILE", "--trust", "--clock-tolerance", *self.SPEECH))):
             with self.subTest(command=command):
                 self.assert_prints(ssoclient(*command.split(), "--help"), *options)
+
+    COMMANDS = ("", "acquire", "acquire password", "acquire certificate", "acquire token",
+                "acquire gss", "renew", "validate", "inspect")
+
+    def test_fits_into_80_columns(self):
+        for command in self.COMMANDS:
+            with self.subTest(command=command):
+                lines = ssoclient(*command.split(), "--help").out.splitlines()
+                self.assertEqual([], [line for line in lines if len(line) > 80])
+
+    def test_ends_with_an_example_and_the_exit_codes(self):
+        for command in self.COMMANDS[2:]:
+            with self.subTest(command=command):
+                text = ssoclient(*command.split(), "--help").out
+                self.assertRegex(text, rf"\nExample:\n  ssoclient {command} --?[\s\S]+\n\n"
+                                 r"Exit codes: 0 done; [\s\S]+ 5 [^;]+\.\n\Z"
+                                 if command != "inspect" else r"\nExample:\n  ssoclient inspect ")
+
+    def test_examples_name_options_that_there_are(self):
+        for command in self.COMMANDS[2:]:
+            with self.subTest(command=command):
+                options, _, example = ssoclient(*command.split(), "--help").out.partition(
+                    "\nExample:\n")
+                named = set(re.findall(r"--[a-z-]+", example))
+                self.assertIn("--trust", named)
+                self.assertEqual(set(), named - set(re.findall(r"--[a-z-]+", options)))
+
+    def test_has_headings(self):
+        text = ssoclient("acquire", "password", "--help").out
+        headings = ["The service:", "The caller's key:", "The token that is asked for:",
+                    "What is printed:"]
+        self.assertEqual(headings, [line for line in text.splitlines() if line in headings])
+
+    def test_version_of_every_command(self):
+        for command in self.COMMANDS:
+            with self.subTest(command=command):
+                self.assertEqual(ssoclient("--version"), ssoclient(*command.split(), "--version"))
 
     def test_version(self):
         result = ssoclient("--version")

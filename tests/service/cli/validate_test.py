@@ -2,7 +2,7 @@
 
 import unittest
 
-from programs import COMMUNICATION, DATA, DONE, REFUSED, USAGE, ServiceTest, ssoclient
+from programs import COMMUNICATION, DATA, DONE, OUT_OF_VALIDITY, REFUSED, USAGE, ServiceTest, ssoclient
 
 
 class Validate(ServiceTest):
@@ -37,9 +37,14 @@ class Validate(ServiceTest):
                           "Failed to verify signature: token might have been tampered with.")
 
     def test_token_of_another_service_is_not_sent(self):
-        token = DATA / "tokens" / "accepted" / "clock-start-equals-now.xml"
+        token = DATA / "tokens" / "accepted" / "bearer.xml"
         self.assert_fails_matching(self.validate(token, service=self.nowhere), REFUSED,
-                                   r"\w+Exception", ".+")
+                                   "InvalidSignatureException", ".+")
+
+    def test_token_that_has_expired_is_not_sent(self):
+        token = DATA / "tokens" / "accepted" / "clock-start-equals-now.xml"
+        self.assert_fails(self.validate(token, service=self.nowhere), OUT_OF_VALIDITY,
+                          "ParseException", "The token has expired at: 2026-06-15T13:00:00.000Z")
 
     def test_missing_token_file(self):
         self.assert_fails(self.validate("/no/such/file", service=self.nowhere), USAGE,
