@@ -71,7 +71,7 @@ std::string CheckName(const std::string& value)
 std::string CheckLifetime(const std::string& value)
 {
     long long seconds = 0;
-    // What is no number is refused by the conversion that follows.
+    // What is no number has been refused before.
     if (ToNumber(value, seconds) && seconds > MaxSeconds) {
         return MessageFormatter::ASPrint("must be at most %1 seconds", MaxSeconds);
     }

@@ -76,25 +76,6 @@ std::string Escape(const Character& character)
     return text.data();
 }
 
-std::string EscapeControls(std::string_view text, std::string_view backslash)
-{
-    std::string line;
-    line.reserve(text.size());
-    for (std::size_t at = 0; at < text.size();) {
-        const Character character = Decode(text.substr(at));
-        if (!character.isUtf8 || IsControl(character.code)
-            || IsBidirectionalControl(character.code)) {
-            line += Escape(character);
-        } else if (character.code == '\\') {
-            line += backslash;
-        } else {
-            line += text.substr(at, character.bytes);
-        }
-        at += character.bytes;
-    }
-    return line;
-}
-
 } // namespace
 
 bool HasControls(std::string_view text)
@@ -111,12 +92,21 @@ bool HasControls(std::string_view text)
 
 std::string ToOneLine(std::string_view text)
 {
-    return EscapeControls(text, "\\\\");
-}
-
-std::string EscapeFurther(std::string_view text)
-{
-    return EscapeControls(text, "\\");
+    std::string line;
+    line.reserve(text.size());
+    for (std::size_t at = 0; at < text.size();) {
+        const Character character = Decode(text.substr(at));
+        if (!character.isUtf8 || IsControl(character.code)
+            || IsBidirectionalControl(character.code)) {
+            line += Escape(character);
+        } else if (character.code == '\\') {
+            line += "\\\\";
+        } else {
+            line += text.substr(at, character.bytes);
+        }
+        at += character.bytes;
+    }
+    return line;
 }
 
 std::string Shorten(const std::string& text, std::size_t maxBytes)

@@ -16,8 +16,5 @@ bool HasControls(std::string_view text);
  */
 std::string ToOneLine(std::string_view text);
 
-/** As `ToOneLine`, for a text that has been through such a function: backslashes stay. */
-std::string EscapeFurther(std::string_view text);
-
 /** At most `maxBytes` of `text`, and how long it is if that is not all of it. */
 std::string Shorten(const std::string& text, std::size_t maxBytes);

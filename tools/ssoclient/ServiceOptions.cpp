@@ -2,14 +2,11 @@
 
 #include "Arguments.h"
 #include "ExitCode.h"
-#include "OneLine.h"
 
 #include "quillon/MessageFormatter.h"
 #include "quillon/StringUtil.h"
 #include "quillon/http/HttpURL.h"
 #include "quillon/service/Logger.h"
-
-#include <cstdio>
 
 #include <arpa/inet.h>
 #include <netinet/in.h>
@@ -71,19 +68,13 @@ Quillon::Ref<Quillon::Ssl::SSLContext> CreateContext(const ServiceOptions& servi
     }
 }
 
-/** Lines of the library, which hold what the service said, for a terminal. */
-void WriteTraceLine(const std::string& logger, int level, const std::string& text)
-{
-    const std::string line =
-        logger + "[" + std::to_string(level) + "]: " + EscapeFurther(text) + "\n";
-    std::fwrite(line.data(), 1, line.size(), stderr);
-}
-
+/** The library's logger writes to standard error unless it is given another sink. */
 void EnableTraceLines()
 {
-    auto& logs = Quillon::Service::GetApp()->GetLogFacility();
-    logs.SetSink(&WriteTraceLine);
-    logs.GetLogger("SsoClient")->SetLevel(Quillon::Service::LOG_LEVEL_TRACE);
+    Quillon::Service::GetApp()
+        ->GetLogFacility()
+        .GetLogger("SsoClient")
+        ->SetLevel(Quillon::Service::LOG_LEVEL_TRACE);
 }
 
 } // namespace

@@ -72,12 +72,11 @@ class Arguments(ProgramTest):
 
 class TraceLines(ScriptedTest):
     def test_hold_no_controls(self):
-        # The library writes the first form out itself.
         self.service.say(fault(CODE))
         user = "a\u202eb"
         result = ssoclient("acquire", "password", "--url", self.service.url, "--trust", TRUST,
                            "--user", user, "--password-file", self.password, "--verbose")
-        self.assertIn(r"subject `a\u202eb'", result.err)
+        self.assertIn(r"subject `a\xe2\x80\xaeb'", result.err)
         self.assertNotIn("\u202e", result.err)
 
 
