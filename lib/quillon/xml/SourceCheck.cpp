@@ -30,7 +30,40 @@ void RequireUtf8(std::string_view source)
     }
 }
 
-/** The first octets of a document in UTF-16, UTF-32 or EBCDIC differ from these. */
+/**
+ * [XML F.1] The encoding that is told by a byte order mark, or by the zeros around the first `<`;
+ * empty if it is none with characters wider than an octet.
+ */
+std::string_view NameWideEncoding(std::string_view source) noexcept
+{
+    using namespace std::string_view_literals;
+    // UTF-32 first: its mark begins with that of UTF-16.
+    const std::string_view start = source.substr(0, 4);
+    for (const std::string_view wide :
+         {"\0\0\xFE\xFF"sv, "\xFF\xFE\0\0"sv, "\0\0\0<"sv, "<\0\0\0"sv}) {
+        if (start == wide) {
+            return "UTF-32";
+        }
+    }
+    const std::string_view mark = source.substr(0, 2);
+    const bool isMarked = mark == "\xFE\xFF"sv || mark == "\xFF\xFE"sv;
+    const bool alternates =
+        start.size() == 4
+        && ((mark == "\0<"sv && start[2] == '\0') || (mark == "<\0"sv && start[3] == '\0'));
+    return isMarked || alternates ? "UTF-16" : "";
+}
+
+/** Says what the text is, where the first octet that does not fit would puzzle the reader. */
+void RefuseWideCharacters(std::string_view source)
+{
+    const std::string_view encoding = NameWideEncoding(source);
+    if (!encoding.empty()) {
+        throw XMLParseException(
+            "The document is in " + std::string(encoding) + "; only UTF-8 is read");
+    }
+}
+
+/** The first octets of a document in EBCDIC, or of something else, differ from these. */
 void RequireAsciiStart(std::string_view source)
 {
     const std::size_t start =
@@ -133,6 +166,7 @@ void CheckSource(std::string_view source)
             "The document has more than " + std::to_string(ParserLimits::MaxDocumentBytes)
             + " octets");
     }
+    RefuseWideCharacters(source);
     RequireAsciiStart(source);
     const std::size_t nul = source.find('\0');
     if (nul != std::string_view::npos) {

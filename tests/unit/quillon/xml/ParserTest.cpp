@@ -171,10 +171,38 @@ TEST(Parse, RefusesOtherEncodings)
     EXPECT_THAT(
         GetParseError("<?xml version='1.0' encoding='UTF-16'?><r/>"),
         testing::Not(testing::HasSubstr("accepted")));
-    EXPECT_EQ(
-        GetParseError(std::string_view("\xFF\xFE<\0r\0/\0>\0", 10)),
-        "Start tag expected, '<' not found at octet 0");
-    EXPECT_EQ(GetParseError(std::string_view("<\0r\0/\0>\0", 8)), "NUL character at octet 1");
+}
+
+TEST(Parse, SaysThatItReadsNoWideCharacters)
+{
+    using namespace std::string_view_literals;
+    for (const std::string_view text :
+         {"\xFF\xFE<\0r\0/\0>\0"sv,
+          "\xFE\xFF\0<\0r\0/\0>"sv,
+          "<\0r\0/\0>\0"sv,
+          "\0<\0r\0/\0>"sv,
+          "\xFF\xFE"sv}) {
+        EXPECT_EQ(GetParseError(text), "The document is in UTF-16; only UTF-8 is read");
+    }
+    for (const std::string_view text :
+         {"\xFF\xFE\0\0<\0\0\0"sv,
+          "\0\0\xFE\xFF\0\0\0<"sv,
+          "<\0\0\0r\0\0\0"sv,
+          "\0\0\0<\0\0\0r"sv}) {
+        EXPECT_EQ(GetParseError(text), "The document is in UTF-32; only UTF-8 is read");
+    }
+}
+
+TEST(Parse, TakesWhatIsDamagedForNoOtherEncoding)
+{
+    using namespace std::string_view_literals;
+    EXPECT_EQ(GetParseError("<r\0/>"sv), "NUL character at octet 2");
+    EXPECT_EQ(GetParseError("<r/>\0"sv), "NUL character at octet 4");
+    EXPECT_EQ(GetParseError("<\0r/>"sv), "NUL character at octet 1");
+    for (const std::string_view text :
+         {"\0<r/>"sv, "\0<"sv, "\0"sv, "\0\0<r/>"sv, "\xFF<r/>"sv, "\xFE"sv}) {
+        EXPECT_EQ(GetParseError(text), "Start tag expected, '<' not found at octet 0");
+    }
 }
 
 TEST(Parse, RefusesAnotherXmlVersion)
