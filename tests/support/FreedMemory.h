@@ -49,8 +49,14 @@ private:
     bool _found = false;
 };
 
+/** What the program calls before each allocation, if anything. It allocates nothing itself. */
+inline void (*beforeAllocation)() = nullptr;
+
 void* operator new(std::size_t size)
 {
+    if (beforeAllocation != nullptr) {
+        beforeAllocation();
+    }
     if (void* memory = std::malloc(size)) {
         return memory;
     }

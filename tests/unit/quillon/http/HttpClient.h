@@ -3,12 +3,20 @@
 #include "quillon/http/UserAgent.h"
 #include "support/TestServer.h"
 
+#include <chrono>
+#include <future>
 #include <string>
 
 namespace Testing {
 
 constexpr long long Generous = 60'000'000; ///< a time-out that no passing test reaches
 constexpr long long Short = 50'000;        ///< a time-out that a test waits for
+
+/** Whether what a test waits for comes within a time that only a lost event takes. */
+inline bool HasHappened(std::promise<void>& event)
+{
+    return event.get_future().wait_for(std::chrono::seconds(10)) == std::future_status::ready;
+}
 
 /** What a test wants to know of a reply. */
 struct Reply

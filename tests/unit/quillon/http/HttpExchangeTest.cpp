@@ -1,9 +1,12 @@
 #include "HttpClient.h"
+#include "support/ClientSocket.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <csignal>
 #include <cstdlib>
+#include <fcntl.h>
 #include <fstream>
 #include <future>
 
@@ -358,7 +361,7 @@ TEST(WaitForResponse, CallsTheExchangeOffWhenTheTimeIsOver)
     HttpClient client(server);
     const Ref<PendingRequestItem> pending = client.Start(HttpClient::MakeRequest());
     EXPECT_THROW(client.Wait(*pending, Short), TimeoutException);
-    closed.get_future().wait();
+    EXPECT_TRUE(HasHappened(closed)) << "the I/O thread was not woken up";
     try {
         client.Wait(*pending);
         FAIL() << "answered";
@@ -382,6 +385,22 @@ TEST(WaitForResponse, NamesLimitsInWholeSeconds)
             "There was no complete reply from " + Describe(server) + " within 0 seconds.",
             std::string(error.what()));
     }
+}
+
+TEST(UserAgent, WakesTheIdleIoThreadUp)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
+    HttpClient client(server);
+    client.Post();
+    // The I/O thread has nothing to do any more and waits for ever, but for a lost event.
+    std::promise<void> completed;
+    const Ref<PendingRequestItem> pending = client.Start(
+        HttpClient::MakeRequest(),
+        [&](const Quillon::Exception*, ClientResponse*, PendingRequestItem*) {
+            completed.set_value();
+        });
+    EXPECT_TRUE(HasHappened(completed)) << "the I/O thread was not woken up";
+    pending->Cancel();
 }
 
 TEST(UserAgent, KeepsItsConnectionBetweenExchanges)
@@ -427,7 +446,7 @@ TEST(UserAgent, ClosesItsConnectionWhenItGoes)
         closed.set_value();
     });
     HttpClient(server).Post();
-    closed.get_future().wait();
+    EXPECT_TRUE(HasHappened(closed)) << "the I/O thread was not woken up";
 }
 
 TEST(UserAgent, ConnectsAnewAfterTheServerClosed)
@@ -437,6 +456,53 @@ TEST(UserAgent, ConnectsAnewAfterTheServerClosed)
     EXPECT_EQ("pong", client.Post().body);
     EXPECT_EQ("pong", client.Post().body);
     EXPECT_EQ(2, server.GetConnectionCount());
+}
+
+TEST(UserAgent, KeepsItsConnectionFromProgramsThatTheHostStarts)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
+    HttpClient client(server);
+    client.Post();
+    const int descriptor = FindClientSocket(server.GetPort());
+    ASSERT_LE(0, descriptor);
+    EXPECT_EQ(FD_CLOEXEC, fcntl(descriptor, F_GETFD));
+}
+
+TEST(CreateTCPConnectionSpec, SaysWhetherIdleConnectionsAreProbed)
+{
+    for (const bool keepAlive : {false, true}) {
+        const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
+        Ref<ConnectionSpec> spec;
+        CreateTCPConnectionSpec("127.0.0.1", server.GetPort(), keepAlive, spec);
+        HttpClient client(spec);
+        client.Post();
+        EXPECT_EQ(keepAlive, IsProbed(FindClientSocket(server.GetPort())));
+    }
+}
+
+void HandlerOfTheHost(int /*signal*/) {}
+
+/** What the process does about SIGPIPE while a reply is read. */
+void (*handlerDuringTheExchange)(int) = nullptr;
+
+bool NoteHandler(int /*status*/) noexcept
+{
+    struct sigaction current
+    {};
+    sigaction(SIGPIPE, nullptr, &current);
+    handlerDuringTheExchange = current.sa_handler;
+    return true;
+}
+
+TEST(Post, LeavesTheSignalHandlersOfTheHostAlone)
+{
+    const auto usual = std::signal(SIGPIPE, &HandlerOfTheHost);
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
+    const Ref<ClientRequest> request = HttpClient::MakeRequest();
+    request->SetBodyStatuses(&NoteHandler);
+    EXPECT_EQ("pong", HttpClient(server).Post(request).body);
+    EXPECT_EQ(&HandlerOfTheHost, handlerDuringTheExchange);
+    std::signal(SIGPIPE, usual);
 }
 
 /** Sets a cookie with the first request of a connection, and answers with the cookies it got. */

@@ -8,11 +8,17 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <cerrno>
+#include <clocale>
 #include <csignal>
+#include <cstdint>
 #include <cstdlib>
+#include <cstring>
+#include <filesystem>
 #include <fstream>
 #include <future>
 #include <latch>
+#include <libintl.h>
 #include <sys/resource.h>
 #include <sys/wait.h>
 #include <vector>
@@ -381,6 +387,71 @@ std::string PostWithoutDescriptors(int port)
 TEST_F(ProcessTest, RecoversFromALackOfDescriptors)
 {
     EXPECT_EXIT(RunOutOfDescriptors(), testing::ExitedWithCode(0), "^$");
+}
+
+/** Writes a catalogue of one message [GNU gettext 10.3]. */
+void WriteCatalogue(
+    const std::filesystem::path& path, const std::string& original, const std::string& translation)
+{
+    constexpr std::uint32_t Magic = 0x950412de;
+    const auto originalSize = static_cast<std::uint32_t>(original.size());
+    const auto translationSize = static_cast<std::uint32_t>(translation.size());
+    constexpr std::uint32_t Texts = 11 * sizeof(std::uint32_t);
+    const std::uint32_t words[] = {
+        Magic,
+        0,  // the revision
+        1,  // how many messages there are
+        28, // where the table of the originals begins
+        36, // where that of the translations begins
+        0,  // no hash table
+        0,
+        originalSize,
+        Texts,
+        translationSize,
+        Texts + originalSize + 1};
+    std::filesystem::create_directories(path.parent_path());
+    std::ofstream file(path, std::ios::binary);
+    file.write(reinterpret_cast<const char*>(words), sizeof words);
+    file.write(original.c_str(), originalSize + 1);
+    file.write(translation.c_str(), translationSize + 1);
+}
+
+/** Makes the system speak a language that it knows one sentence of. @return whether it does. */
+bool SpeakAnotherLanguage(const std::filesystem::path& folder)
+{
+    WriteCatalogue(
+        folder / "xx/LC_MESSAGES/libc.mo", "Connection refused", "Xerbindung xerweigert");
+    std::filesystem::create_directory_symlink("/usr/lib/locale/C.utf8", folder / "xx_XX.utf8");
+    setenv("LOCPATH", folder.c_str(), 1);
+    unsetenv("LANGUAGE");
+    return std::setlocale(LC_ALL, "xx_XX.utf8") != nullptr
+           && bindtextdomain("libc", folder.c_str()) != nullptr
+           && strerror(ECONNREFUSED) == std::string("Xerbindung xerweigert");
+}
+
+/** @return 0 if the system's error is told in English although the host speaks otherwise. */
+int PostInAnotherLanguage()
+{
+    const std::filesystem::path folder = testing::TempDir() + "locale-" + std::to_string(getpid());
+    const bool speaks = SpeakAnotherLanguage(folder);
+    int port = 0;
+    {
+        const TestServer gone(AnswerAndClose(""));
+        port = gone.GetPort();
+    }
+    const std::string text = PostTo(port);
+    std::filesystem::remove_all(folder);
+    const std::string expected =
+        "Cannot connect to 127.0.0.1 port " + std::to_string(port) + ": Connection refused.";
+    return speaks && text == expected ? 0 : 1;
+}
+
+TEST_F(ProcessTest, TellsErrorsOfTheSystemInEnglish)
+{
+    if (!std::filesystem::exists("/usr/lib/locale/C.utf8")) {
+        GTEST_SKIP() << "there is no locale whose files could be had under another name";
+    }
+    EXPECT_EXIT(std::exit(PostInAnotherLanguage()), testing::ExitedWithCode(0), "^$");
 }
 
 /** @return 0 if an exchange succeeds and leaves nothing in the file for TLS keys. */

@@ -1,4 +1,5 @@
 #include "HttpClient.h"
+#include "support/ClientSocket.h"
 #include "support/TestTls.h"
 
 #include "quillon/ssl/SSLContext.h"
@@ -181,6 +182,19 @@ TEST_F(TlsTest, AcceptsACertificateThatIsTrustedItself)
 {
     const Ref<SSLContext> pinned = Trust(identity);
     EXPECT_EQ("pong", HttpClient(MakeSpec(pinned.get(), Host, "", server)).Post().body);
+}
+
+TEST_F(TlsTest, ProbesIdleConnectionsIfItsTcpDoes)
+{
+    for (const bool keepAlive : {false, true}) {
+        Ref<ConnectionSpec> tcp;
+        CreateTCPConnectionSpec("127.0.0.1", server.GetPort(), keepAlive, tcp);
+        Ref<ConnectionSpec> spec;
+        CreateSSLConnectionSpec(tcp.get(), context.get(), Host, "", spec);
+        HttpClient client(spec);
+        client.Post();
+        EXPECT_EQ(keepAlive, IsProbed(FindClientSocket(server.GetPort())));
+    }
 }
 
 TEST_F(TlsTest, RefusesATrustedCertificateOfAnotherName)

@@ -3,9 +3,12 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <cstdlib>
 #include <mutex>
 #include <stdexcept>
+#include <sys/wait.h>
 #include <thread>
+#include <unistd.h>
 #include <vector>
 
 using namespace Quillon;
@@ -201,4 +204,53 @@ TEST(Log, DeliversEachLineOnceFromManyThreads)
     }
     facility.SetSink(LogSink());
     EXPECT_EQ(ThreadCount * LineCount, delivered.load());
+}
+
+namespace {
+
+/** Whether a child that is forked now can log. */
+bool CanLogInChild()
+{
+    const pid_t child = fork();
+    if (child == 0) {
+        alarm(10); // a child that hangs ends here
+        GetLogger("forked")->Log(8, "line");
+        std::_Exit(0);
+    }
+    int status = 0;
+    waitpid(child, &status, 0);
+    return status == 0;
+}
+
+/** Forks so often while others log that one of them is inside the logger's lock. */
+[[noreturn]] void ForkWhileOthersLog()
+{
+    constexpr int ForkCount = 200;
+    GetApp()->GetLogFacility().SetSink([](const std::string&, int, const std::string&) {});
+    std::atomic<bool> goesOn{true};
+    std::vector<std::thread> threads;
+    for (int i = 0; i < 4; ++i) {
+        threads.emplace_back([&goesOn] {
+            while (goesOn) {
+                GetLogger("parent")->Log(8, "");
+            }
+        });
+    }
+    int good = 0;
+    while (good < ForkCount && CanLogInChild()) {
+        ++good;
+    }
+    goesOn = false;
+    for (std::thread& thread : threads) {
+        thread.join();
+    }
+    std::_Exit(good == ForkCount ? 0 : 1);
+}
+
+} // namespace
+
+TEST(Log, WorksInAChildThatWasForkedWhileOthersLogged)
+{
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(ForkWhileOthersLog(), testing::ExitedWithCode(0), "^$");
 }

@@ -2,6 +2,7 @@
 
 #include "quillon/http/HttpException.h"
 #include "ssoClient/Exceptions.h"
+#include "support/ClientSocket.h"
 #include "support/TestServer.h"
 #include "support/TestTls.h"
 
@@ -14,6 +15,7 @@
 #include <memory>
 #include <thread>
 #include <type_traits>
+#include <vector>
 
 using namespace SsoClient;
 using namespace Testing;
@@ -167,6 +169,41 @@ TEST(SendRequest, PostsTheBodyWithItsAction)
         request.head,
         HasSubstr("\r\nSOAPAction: "
                   "\"http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue\"\r\n"));
+}
+
+/** The names of the header fields, in their order. */
+std::vector<std::string> GetFieldNames(const std::string& head)
+{
+    std::vector<std::string> names;
+    std::size_t start = head.find("\r\n");
+    while (start != std::string::npos) {
+        start += 2;
+        names.push_back(head.substr(start, head.find(':', start) - start));
+        start = head.find("\r\n", start);
+    }
+    return names;
+}
+
+TEST(SendRequest, SendsNoFurtherHeader)
+{
+    std::promise<std::string> head;
+    const TestServer server([&](ServerConnection& connection) {
+        head.set_value(connection.ReadRequest()->head);
+        connection.Write(MakeReply("200 OK", "<reply/>"));
+    });
+    Send(*MakeClient(server).CreateSession());
+    EXPECT_EQ(
+        (std::vector<std::string>{
+            "Host", "User-Agent", "Accept", "Content-Type", "SOAPAction", "Content-Length"}),
+        GetFieldNames(head.get_future().get()));
+}
+
+TEST(SendRequest, HasIdleConnectionsNotProbed)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "<reply/>")));
+    const boost::shared_ptr<TransportSession> session = MakeClient(server).CreateSession();
+    Send(*session);
+    EXPECT_FALSE(IsProbed(FindClientSocket(server.GetPort())));
 }
 
 TEST(SendRequest, RefusesAnActionThatWouldAddAHeader)
@@ -486,7 +523,9 @@ TEST(HttpsClient, TalksTlsToTheExpectedPeerOnly)
     const std::string url = "https://127.0.0.1:" + std::to_string(server.GetPort()) + "/sts";
 
     const HttpsClient named(url, context.get(), "sts.test", Generous);
-    EXPECT_EQ("body", Send(*named.CreateSession()));
+    const boost::shared_ptr<TransportSession> session = named.CreateSession();
+    EXPECT_EQ("body", Send(*session));
+    EXPECT_FALSE(IsProbed(FindClientSocket(server.GetPort())));
     const HttpsClient unnamed(url, context.get(), "", Generous);
     EXPECT_THROW(Send(*unnamed.CreateSession()), Quillon::Http::HttpException);
     const HttpsClient misnamed(url, context.get(), "other.test", Generous);
