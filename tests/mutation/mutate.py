@@ -13,6 +13,7 @@ fail without it.
 """
 
 import argparse
+import collections
 import concurrent.futures
 import os
 import queue
@@ -25,27 +26,42 @@ import table
 
 BUILD = table.ROOT / "build" / "mutation"
 TEST_SECONDS = 120  # a test that takes longer has noticed by hanging
-CONFIGURATION = ["-G", "Ninja", "-DCMAKE_BUILD_TYPE=Debug", "-DCMAKE_CXX_FLAGS=-O0 -g0",
-                 "-DCMAKE_CXX_COMPILER_LAUNCHER=ccache", "-DSSOCLIENT_WERROR=OFF",
-                 "-DSSOCLIENT_BUILD_TESTS=ON", "-DSSOCLIENT_BUILD_BENCHMARKS=OFF"]
+CONFIGURATION = ["--preset", "release", "-DSSOCLIENT_BUILD_TESTS=ON",
+                 "-DSSOCLIENT_BUILD_BENCHMARKS=OFF", "-DCMAKE_LINK_DEPENDS_NO_SHARED=ON"]
+# A changed line is compiled quickly rather than well, and may leave something unused.
+FLAGS_OF_CHANGE = "-O0 -U_FORTIFY_SOURCE -w"
 
 
 class Worker:
     """A copy of the tree with a build of its own."""
 
     def __init__(self, number):
-        self.tree = BUILD / f"tree{number}"
-        self.build = BUILD / f"build{number}"
+        self.tree = BUILD / str(number)
+        self.build = self.tree / "build" / "release"
 
     def prepare(self, programs):
         self._copy_tree()
-        run(["cmake", "-S", self.tree, "-B", self.build, *CONFIGURATION], check=True)
-        run(["cmake", "--build", self.build, "--target", *sorted(programs)], check=True)
+        launcher = self.tree / "tests" / "mutation" / "compile.sh"
+        self._run(["cmake", *CONFIGURATION, f"-DCMAKE_CXX_COMPILER_LAUNCHER={launcher}"],
+                  check=True)
+        self._build(programs, check=True)
+
+    def _build(self, programs, **settings):
+        return self._run(["cmake", "--build", self.build, "--target", *sorted(programs)],
+                         **settings)
+
+    def _run(self, command, flags="", **settings):
+        """Paths are relative to the tree, so that the cache serves all workers alike."""
+        environment = {**os.environ, "CCACHE_BASEDIR": str(self.tree), "MUTATION_FLAGS": flags}
+        if flags:
+            environment["CCACHE_DEPEND"] = "1"  # a change is new: no preprocessing to look it up
+        return run(command, cwd=self.tree, env=environment, **settings)
 
     def _copy_tree(self):
         """Only what differs, so that a build of an earlier run stays good."""
-        names = subprocess.run(["git", "ls-files", "-z"], cwd=table.ROOT, check=True,
-                               capture_output=True, text=True).stdout.split("\0")
+        names = subprocess.run(["git", "ls-files", "-z", "--cached", "--others", "--exclude-standard"],
+                               cwd=table.ROOT, check=True, capture_output=True,
+                               text=True).stdout.split("\0")
         for name in filter(None, names):
             source, copy = table.ROOT / name, self.tree / name
             if not source.is_file():
@@ -56,7 +72,7 @@ class Worker:
                 shutil.copymode(source, copy)
 
     def compiles(self, program):
-        return run(["cmake", "--build", self.build, "--target", program]).returncode == 0
+        return self._build([program], flags=FLAGS_OF_CHANGE).returncode == 0
 
     def passes(self, change):
         program = next(path for path in self.build.rglob(change.program)
@@ -129,12 +145,16 @@ def try_all(workers, changes):
         finally:
             free.put(worker)
 
-    counts = {}
+    counts = collections.Counter()
+    wrong = []
     with concurrent.futures.ThreadPoolExecutor(len(workers)) as pool:
         for change, result in pool.map(try_one, changes):
             text, good = outcome(change, result)
-            counts[text] = counts.get(text, 0) + 1
-            print(f"{'' if good else '*** '}{text}: {change}", flush=True)
+            counts[text] += 1
+            print(f"{text}: {change}", flush=True)
+            if not good:
+                wrong.append(f"*** {text}: {change}")
+    print("", *wrong, sep="\n")
     return counts
 
 
