@@ -9,7 +9,7 @@ import unittest
 import jsonschema
 
 from programs import (BAD_CREDENTIALS, COMMUNICATION, DATA, DONE, OUT_OF_VALIDITY, REFUSED, USAGE,
-                      ProgramTest, ServiceTest, ssoclient)
+                      ServiceTest, ssoclient)
 
 TOKENS = DATA / "tokens"
 SCHEMA = json.loads((pathlib.Path(__file__).parents[3] / "tools" / "ssoclient" / "schema"

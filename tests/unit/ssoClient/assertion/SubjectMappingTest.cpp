@@ -110,6 +110,13 @@ TEST(SubjectMapping, SplitsAUpnInAllItsSpellings)
     }
 }
 
+TEST(SubjectMapping, SplitsAUpnAtTheLastSign)
+{
+    EXPECT_EQ(
+        SubjectOf("name-with-two-signs", WithRules({Rule(SubjectForm::UPN)})),
+        "{Name: alice@home; Domain:example.com}");
+}
+
 TEST(SubjectMapping, TakesAnEmailAddressForWhatItIs)
 {
     EXPECT_EQ(
@@ -379,6 +386,8 @@ TEST(MappedToken, FindsDelegatesByTheRulesOfTheSubject)
     ASSERT_EQ(chain.size(), 1U);
     EXPECT_EQ(chain.front().subject, PrincipalId("service", "example.com"));
     EXPECT_EQ(chain.front().delegationDate.ToString(), "2024-05-06T11:59:00.000Z");
+    EXPECT_EQ(
+        SubjectOf("delegate-without-instant", mapping), "A delegate has no DelegationInstant");
 }
 
 TEST(MappedToken, IsRenewableAndDelegableAsOftenAsRestrictionsSay)
