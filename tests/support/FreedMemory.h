@@ -66,6 +66,14 @@ void* operator new[](std::size_t size)
 {
     return ::operator new(size);
 }
+void* operator new(std::size_t size, const std::nothrow_t& /*tag*/) noexcept
+{
+    return std::malloc(size);
+}
+void* operator new[](std::size_t size, const std::nothrow_t& /*tag*/) noexcept
+{
+    return std::malloc(size);
+}
 void operator delete(void* memory) noexcept
 {
     FreedMemory::Free(memory);
