@@ -19,6 +19,7 @@
 #include <future>
 #include <latch>
 #include <libintl.h>
+#include <sys/prctl.h>
 #include <sys/resource.h>
 #include <sys/wait.h>
 #include <vector>
@@ -225,6 +226,7 @@ int ServeInChild(pid_t& server)
     }
     server = fork();
     if (server == 0) {
+        prctl(PR_SET_PDEATHSIG, SIGKILL); // or a test that crashes would wait for its server
         const TestServer testServer(AnswerAll(MakeReply("200 OK", "pong")));
         const int port = testServer.GetPort();
         if (write(channel[1], &port, sizeof port) != sizeof port) {
@@ -384,8 +386,18 @@ std::string PostWithoutDescriptors(int port)
     std::exit(isGood && recovers && recoversAgain ? 0 : 1);
 }
 
+// Where a sanitizer looks at an object's type it reads the memory through a pipe.
+#if defined(__has_feature)
+#if __has_feature(undefined_behavior_sanitizer)
+#define SANITIZER_NEEDS_DESCRIPTORS
+#endif
+#endif
+
 TEST_F(ProcessTest, RecoversFromALackOfDescriptors)
 {
+#ifdef SANITIZER_NEEDS_DESCRIPTORS
+    GTEST_SKIP() << "the sanitizer needs a descriptor itself";
+#endif
     EXPECT_EXIT(RunOutOfDescriptors(), testing::ExitedWithCode(0), "^$");
 }
 
