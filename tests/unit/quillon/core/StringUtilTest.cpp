@@ -73,6 +73,7 @@ TEST(ToUpper, MapsAscii)
     EXPECT_EQ("", ToUpper(""));
 }
 
+// [UNICODE 4.2]
 TEST(ToUpper, MapsTheLettersOfItsRanges)
 {
     EXPECT_EQ(CaseTables::UpperTo, ToUpper(CaseTables::UpperFrom));
@@ -116,6 +117,7 @@ TEST(ToLower, LeavesEverythingElse)
     EXPECT_EQ("\u212A", ToLower("\u212A"));
 }
 
+// [RFC 4122 4.4]
 TEST(GenerateUuid, HasTheFormOfVersion4)
 {
     for (int i = 0; i < 1000; ++i) {

@@ -16,6 +16,7 @@ Ref<const Certificate> LoadCertificate(const std::string& name)
     return ParsePemCertificates(ReadTestFile("keys/" + name + "-cert.pem")).front();
 }
 
+// [RFC 7468 2]
 TEST(ParsePemCertificates, ReadsAllAndPassesOverTheRest)
 {
     const std::string pem = "text before\n" + ReadTestFile("keys/sts-cert.pem")
@@ -101,6 +102,7 @@ Ref<const Certificate> MakeEndingIn(const std::string& year)
     return CreateCertificate(der.data(), der.size());
 }
 
+// [RFC 5280 4.1.2.5.2]
 TEST(Certificate, HasNoDateInTheYearZero)
 {
     EXPECT_EQ(MakeEndingIn("0001")->GetNotAfter().ToString().substr(0, 4), "0001");

@@ -77,6 +77,7 @@ bool VerifiesPss(
 
 } // namespace
 
+// [RFC 8017 8.1], [RFC 9231 2.3.10]
 TEST(VerifyPssDigest, TakesASaltAsLongAsTheDigest)
 {
     const std::string options = "-sigopt rsa_pss_saltlen:-1";
@@ -128,6 +129,7 @@ TEST(CreateRsaPublicKey, RefusesNumbersThatAreNoKey)
         "Not a public key of type RSA: a modulus of 2049 bytes and an exponent of 3");
 }
 
+// [SEC1 2.3.3], [XMLDSIG11 4.5.2.3]
 TEST(CreateEcPublicKey, MakesTheKeyOfThePoint)
 {
     const auto key = CreateEcPublicKey("P-256", PointOf("sts-p256", 65));
@@ -149,6 +151,7 @@ TEST(CreateEcPublicKey, RefusesPointsOffTheCurveAndOtherCurves)
     EXPECT_NE(GetCryptoError([&] { CreateEcPublicKey("P-256", point); }), "accepted");
 }
 
+// [RFC 5280 4.1.2.2]
 TEST(GetSerialNumber, IsInDecimalDigits)
 {
     // openssl x509 -noout -serial, turned into decimal digits by Python

@@ -37,6 +37,7 @@ Ref<const Certificate> LoadCertificate(const std::string& name)
     return ParsePemCertificates(ReadTestFile("keys/" + name + "-cert.pem")).front();
 }
 
+// [RFC 8017 8.2]
 TEST(SignDigest, MakesAnRsaSignatureThatOpenSslVerifies)
 {
     const TemporaryFolder folder;

@@ -101,6 +101,7 @@ TEST(CutReply, HasNoStatusIfItsHeadersAreNotComplete)
 class FinalInterimStatuses : public testing::TestWithParam<std::string>
 {};
 
+// [RFC 9110 15.2]
 TEST_P(FinalInterimStatuses, EndTheExchangeAtOnce)
 {
     const TestServer server(AnswerAndStay("HTTP/1.1 " + GetParam()));
@@ -127,6 +128,7 @@ INSTANTIATE_TEST_SUITE_P(
 class InterimStatuses : public testing::TestWithParam<std::string>
 {};
 
+// [RFC 9110 15.2]
 TEST_P(InterimStatuses, ArePassedOver)
 {
     const TestServer server(

@@ -20,6 +20,7 @@ std::string GetArgumentError(const Action& action)
     return "";
 }
 
+// [RFC 3986 3.3]
 TEST(CreateHttpRequest, RefusesPathsThatWouldChangeTheRequestLine)
 {
     for (const std::string path : {"", "x", "/a b", "/a\r\nX: y", "http://host/", "/a#b"}) {
@@ -54,6 +55,7 @@ TEST(SetHeader, RefusesValuesThatCouldStartAnotherLine)
     }
 }
 
+// [RFC 9110 5.6.2]
 TEST(SetHeader, RefusesNamesThatAreNoTokens)
 {
     const Ref<ClientRequest> request = Testing::HttpClient::MakeRequest();

@@ -184,6 +184,7 @@ TEST_F(TlsTest, AcceptsACertificateThatIsTrustedItself)
     EXPECT_EQ("pong", HttpClient(MakeSpec(pinned.get(), Host, "", server)).Post().body);
 }
 
+// [RFC 1122 4.2.3.6]
 TEST_F(TlsTest, ProbesIdleConnectionsIfItsTcpDoes)
 {
     for (const bool keepAlive : {false, true}) {
@@ -440,6 +441,7 @@ protected:
     }
 };
 
+// [RFC 8446 6.2]
 TEST_F(ClientCertificateTest, IsToldFromTheServers)
 {
     CertificateOptions clientOptions;
@@ -505,6 +507,7 @@ TEST_F(TlsTest, ReportsAReplyThatIsCutInItsHead)
 }
 
 // Whoever can cut the connection could otherwise choose where the reply ends.
+// [RFC 8446 6.1], [RFC 9112 9.8]
 TEST_F(TlsTest, RefusesAReplyWithoutLengthThatEndsWithoutNotice)
 {
     const std::string reply = "HTTP/1.1 200 OK\r\n\r\nbody";

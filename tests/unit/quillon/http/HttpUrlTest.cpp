@@ -21,6 +21,7 @@ struct GoodUrl
 class GoodUrls : public testing::TestWithParam<GoodUrl>
 {};
 
+// [RFC 9112 3.2.1]
 TEST_P(GoodUrls, AreTakenApart)
 {
     bool isHttps = !GetParam().isHttps;

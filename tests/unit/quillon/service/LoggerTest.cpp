@@ -130,6 +130,7 @@ TEST(Log, WritesOutWhatSteersATerminalOrTheReader)
         GetLogged("\u00a0\u2027\u202f\u2065\u206a\U0001f511"));
 }
 
+// [RFC 3629 3]
 TEST(Log, WritesOutWhatIsNotUtf8)
 {
     EXPECT_EQ("\\x9b", GetLogged("\x9b"));

@@ -48,6 +48,7 @@ TEST(DateTime, ReadsUtcTimes)
     EXPECT_EQ(-1 * Us, Parse("1969-12-31T23:59:59Z"));
 }
 
+// [SAML-CORE 1.3.3]
 TEST(DateTime, TakesATextWithoutOffsetAsUtc)
 {
     EXPECT_EQ(Parse("2012-01-31T12:00:00Z"), Parse("2012-01-31T12:00:00"));

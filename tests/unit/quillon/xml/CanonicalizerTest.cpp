@@ -42,6 +42,7 @@ std::string GetCanonicalizeError(const char* identifier, std::string_view text)
 }
 
 // [C14N 3.1], without the document type declaration.
+// [C14N 2.1]
 TEST(CanonicalizeExample, ProcessingInstructionsAndCommentsOutsideTheRoot)
 {
     EXPECT_EQ(
@@ -56,6 +57,7 @@ TEST(CanonicalizeExample, ProcessingInstructionsAndCommentsOutsideTheRoot)
 }
 
 // [C14N 3.2]
+// [C14N 2.3]
 TEST(CanonicalizeExample, WhitespaceInContent)
 {
     const char* const Text =
@@ -78,6 +80,7 @@ constexpr char StartAndEndTags[] =
     "            <e9 xmlns=\"\" xmlns:a=\"http://www.ietf.org\"/>\n"
     "         </e8>\n      </e7>\n   </e6>\n</doc>";
 
+// [C14N 2.2]
 TEST(CanonicalizeExample, StartAndEndTags)
 {
     EXPECT_EQ(
@@ -107,6 +110,7 @@ TEST(CanonicalizeExample, StartAndEndTagsExclusive)
 }
 
 // [C14N 3.4], without the attributes whose type a document type declaration gives.
+// [C14N 2.3]
 TEST(CanonicalizeExample, CharacterModifications)
 {
     EXPECT_EQ(
@@ -153,6 +157,7 @@ TEST(CanonicalizeExample, InclusiveFormDependsOnTheContext)
         "xml:space=\"retain\"><n3:stuff xmlns:n3=\"ftp://example.org\"></n3:stuff></n1:elem2>");
 }
 
+// [EXC-C14N 1.1]
 TEST(CanonicalizeExample, ExclusiveFormDoesNot)
 {
     const char* const Expected = "<n1:elem2 xmlns:n1=\"http://example.net\" xml:lang=\"en\">"
@@ -161,6 +166,7 @@ TEST(CanonicalizeExample, ExclusiveFormDoesNot)
     EXPECT_EQ(CanonicalizeNested(ExclusiveC14n, SecondContext, {"elem2"}), Expected);
 }
 
+// [EXC-C14N 2.1]
 TEST(Canonicalize, TreatsListedPrefixesAsTheInclusiveFormDoes)
 {
     EXPECT_EQ(
@@ -183,6 +189,7 @@ TEST(Canonicalize, EscapesNamespaceUris)
         "<r xmlns=\"http://a.example/?b=1&amp;c=2\"></r>");
 }
 
+// [C14N 2.3]
 TEST(Canonicalize, NeverRendersTheXmlPrefix)
 {
     EXPECT_EQ(
@@ -224,6 +231,7 @@ TEST(Canonicalize, RefusesUndeclaredPrefixes)
 }
 
 // [C14N 1.3]
+// [RFC 3986 3.1]
 TEST(Canonicalize, RefusesRelativeNamespaceUris)
 {
     for (const char* identifier : {InclusiveC14n, ExclusiveC14n}) {

@@ -140,6 +140,7 @@ TEST(SetText, SaysWhereTheFirstForbiddenCharacterIs)
     }
 }
 
+// [RFC 3629 4]
 TEST(SetText, SaysWhereItIsNotUtf8)
 {
     const std::vector<std::string> malformed{
@@ -239,6 +240,7 @@ TEST(DefineAttribute, MakesADeclarationThatIsLookedUp)
     EXPECT_FALSE(child->HasQName("parent", "urn:p"));
 }
 
+// [XML Names 3]
 TEST(LookupNamespace, FindsTheNearestDeclaration)
 {
     const Ref<Document> document = ParseText("<r xmlns='urn:d' xmlns:a='urn:1' xmlns:ab='urn:2'><m "

@@ -173,6 +173,7 @@ TEST(Parse, RefusesOtherEncodings)
         testing::Not(testing::HasSubstr("accepted")));
 }
 
+// [XML F.1]
 TEST(Parse, SaysThatItReadsNoWideCharacters)
 {
     using namespace std::string_view_literals;
@@ -258,6 +259,7 @@ TEST(Parse, RefusesOctetsThatAreNotUtf8)
         "accepted");
 }
 
+// [XML 3.1]
 TEST(Parse, SaysThatATagIsCut)
 {
     EXPECT_EQ(GetParseError("<a"), "The document ends inside a tag at line 1, column 3");
@@ -278,6 +280,7 @@ TEST(Parse, RefusesADocumentThatIsCutAnywhere)
     }
 }
 
+// [XML 2.8]
 TEST(Parse, RefusesEveryDoctype)
 {
     for (const char* doctype :

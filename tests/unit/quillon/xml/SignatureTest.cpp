@@ -237,6 +237,7 @@ std::string VerifyWithKeyInfo(const std::string& keyInfo, const std::string& tru
         [&] { signature->Verify(CreateTrustSetKeyResolver(GetTestCertificates(trusted)).get()); });
 }
 
+// [XMLDSIG 4.4]
 TEST(ReadKeyInfo, TakesWhatTheSchemaHas)
 {
     for (const std::string content :

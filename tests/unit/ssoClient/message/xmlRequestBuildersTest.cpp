@@ -128,6 +128,7 @@ TEST(WstParticipantBuilder, HoldsTheReference)
         "</wsa:EndpointReference></wst:Participant>");
 }
 
+// [WST13 9.5]
 TEST(WstParticipantsBuilders, WritesParticipantsInStringOrder)
 {
     EXPECT_EQ(
@@ -177,6 +178,7 @@ TEST(RsaAdviceSetBuilder, DeclaresItsNamespacesAndKeepsTheOrder)
         "</rsa-advice:AdviceSet>");
 }
 
+// [WST13 4.1]
 TEST(CommonAcquireSecurityTokenBuilder, OfMinimalSpecHasSixChildren)
 {
     const FixedClock clock(Now);
@@ -301,6 +303,7 @@ TEST(ExchangeSecurityTokenBuilder, OfHolderOfKeyHasNoUseKey)
         "<wst:KeyType>" WST "/PublicKey</wst:KeyType>");
 }
 
+// [WST13 5]
 TEST(RenewSecurityTokenBuilder, HoldsTheToken)
 {
     FakeSamlToken token;
@@ -337,6 +340,7 @@ TEST(RenewSecurityTokenBuilderDeathTest, StopsTheProcessOnBearerToken)
             HasSubstr("513")));
 }
 
+// [WST13 7]
 TEST(ValidateSecurityTokenBuilder, HoldsTheToken)
 {
     FakeSamlToken token;

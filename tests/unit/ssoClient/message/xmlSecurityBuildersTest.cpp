@@ -123,6 +123,7 @@ TEST(WsseUsernameTokenBuilder, WithoutPasswordHasTheNameOnly)
         "<wsse:Username>jdoe</wsse:Username></wsse:UsernameToken>");
 }
 
+// [UsernameToken Profile 1.0, 3.1]
 TEST(WsseUsernameTokenBuilder, WithPasswordHasNameThenPassword)
 {
     EXPECT_EQ(

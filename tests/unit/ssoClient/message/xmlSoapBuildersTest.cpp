@@ -153,6 +153,7 @@ TEST(CreateWssuId, KeepsIdUnderAnyPrefix)
     EXPECT_EQ(element->GetAttributes().size(), 2U);
 }
 
+// [SOAP Message Security 1.0, 8]
 TEST(XMLSignedSoapBuilder, SignsBodyThenTimestamp)
 {
     const FixedClock clock(Now);

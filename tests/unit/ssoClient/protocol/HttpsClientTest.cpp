@@ -153,6 +153,7 @@ TEST(HttpsClient, KeepsTheSslContext)
     EXPECT_THROW(Send(*client.CreateSession()), Quillon::Http::HttpException);
 }
 
+// [SOAP11 6.1.1]
 TEST(SendRequest, PostsTheBodyWithItsAction)
 {
     std::promise<ReceivedRequest> received;
@@ -297,6 +298,7 @@ INSTANTIATE_TEST_SUITE_P(
         "Content-Length: 100\r\n\r\nshort",
         "Transfer-Encoding: chunked\r\n\r\nno chunk"));
 
+// [SOAP11 6.2]
 TEST(SendRequest, JudgesTheBodyOfASoapFault)
 {
     const TestServer server(

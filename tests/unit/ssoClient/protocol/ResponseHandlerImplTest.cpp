@@ -127,6 +127,7 @@ TEST(HandleAcquireTokenResponse, RefusesEachMissingStep)
     }
 }
 
+// [WST13 4.3]
 TEST(HandleAcquireTokenResponse, RefusesResponseWithoutCollection)
 {
     EXPECT_EQ(
@@ -169,6 +170,7 @@ TEST(HandleRenewTokenResponse, GivesTheAssertionInCanonicalForm)
         "<Assertion xmlns:S=\"" SOAP "\" xmlns:w=\"" WST "\"></Assertion>");
 }
 
+// [WST13 5]
 TEST(HandleRenewTokenResponse, RefusesCollection)
 {
     EXPECT_EQ(
@@ -316,6 +318,7 @@ TEST(ProcessResponse, ReportsMissingBody)
     EXPECT_EQ(GetFailure(Validate, "<Envelope><Header><Body/></Header></Envelope>"), expected);
 }
 
+// [WST13 11]
 TEST(ProcessResponse, ReportsBadCredentials)
 {
     for (const std::string code :

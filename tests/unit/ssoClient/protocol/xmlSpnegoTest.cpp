@@ -53,6 +53,7 @@ std::string Replaced(std::string text, const std::string& from, const std::strin
 
 } // namespace
 
+// [WST13 8.4]
 TEST(WstSPNegoBinExchangeBuilder, WritesTheLegInBase64)
 {
     EXPECT_EQ(ToText(WstSPNegoBinExchangeBuilder(Hello)), EXCHANGE "aGVsbG8=</wst:BinaryExchange>");
@@ -110,6 +111,7 @@ TEST(XMLBodyBuilderInitialSPNego, NamesEveryBuildAnew)
     EXPECT_NE(GetContext(ToText(*Build(builder))), GetContext(ToText(*Build(builder))));
 }
 
+// [WST13 8]
 TEST(XMLBodyBuilderContinuedSPNego, SendsTheContextBackUnchanged)
 {
     EXPECT_EQ(

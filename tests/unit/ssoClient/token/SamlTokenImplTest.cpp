@@ -174,6 +174,7 @@ TEST_F(CheckTokenPropertiesTest, AMicrosecondIsLongEnough)
             Replace(Bearer(), StartAttribute, "NotBefore=\"2012-01-31T12:04:59.999999Z\"")));
 }
 
+// [SAML-CORE 2.5.1.2]
 TEST_F(CheckTokenPropertiesTest, TellsTheStartWithItsFraction)
 {
     const auto judge = [](const std::string& start) {

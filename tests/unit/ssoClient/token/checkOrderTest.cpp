@@ -188,6 +188,7 @@ TEST_F(CheckOrder, AttributesOfTheDelegationRestrictionComeBeforeItsDelegates)
                         "</saml:Condition>"));
 }
 
+// [SAML-CORE 2.5.1.6]
 TEST_F(CheckOrder, AttributesThenCountThenContentOfTheProxyRestriction)
 {
     const std::string count =

@@ -56,11 +56,13 @@ TEST_F(ReadStatements, DoesNotCheckTheAttributesOfTheClassReference)
             Bearer(), "<saml:AuthnContextClassRef>", "<saml:AuthnContextClassRef a=\"\">")));
 }
 
+// [SAML-CORE 2.7]
 TEST_F(ReadStatements, AcceptsSeveralAttributes)
 {
     EXPECT_EQ(ReachesSignature, JudgeAttributes(Attribute("n", {"v"}) + Attribute("m", {})));
 }
 
+// [SAML-CORE 2.7.3.1]
 TEST_F(ReadStatements, AttributesMayHaveAFriendlyName)
 {
     EXPECT_EQ(
@@ -69,6 +71,7 @@ TEST_F(ReadStatements, AttributesMayHaveAFriendlyName)
             R"(<saml:Attribute Name="n" NameFormat="f" FriendlyName="g"></saml:Attribute>)"));
 }
 
+// [SAML-CORE 2.6]
 TEST_F(ReadStatements, AcceptsAdviceOfSeveralSources)
 {
     const std::string advice =
