@@ -31,7 +31,8 @@ inline constexpr long long DefaultClockToleranceSec = 600;
  * @throws Quillon::Base64FormatException      the confirmation certificate is not Base64.
  * @throws Quillon::InvalidArgumentException   a trusted certificate is null.
  *
- * Thread safety: any number of threads, also with the same certificates. Cost: one parse, one
+ * Thread safety: any number of threads, also with the same certificates. In a forked child it works
+ * if the process had no thread but the forking one. Cost: one parse, one
  * hash and one public-key operation.
  */
 SSOCLIENT_API boost::shared_ptr<const SamlToken> CreateSamlToken(

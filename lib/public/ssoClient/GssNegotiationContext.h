@@ -24,7 +24,8 @@ struct NegotiationResult
  *
  * There is no virtual destructor: a context is only owned by the pointer of its factory.
  *
- * Thread safety: one thread at a time; different contexts are independent.
+ * Thread safety: one thread at a time; different contexts are independent. A forked child may
+ * use one only if the process had neither threads nor exchanges before.
  */
 class SSOCLIENT_API GssNegotiationContext
 {

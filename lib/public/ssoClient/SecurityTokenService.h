@@ -33,7 +33,11 @@ using ValidationCompletion =
  *   trusted certificate is null and the operation gives a token;
  * - `Quillon::InvalidStateException`, before anything is sent, if it needs the holder-of-key
  *   identity and the configuration has none or half of one;
- * - `CommunicationException`, or the transport's own exception, if the exchange fails;
+ * - `CommunicationException` if the service answers outside the protocol, for example with another
+ *   status;
+ * - `Quillon::Http::HttpException`, which is no `SsoException`, if the exchange fails: no
+ * connection, not the right server, no complete reply in time. It takes two clauses to catch what a
+ * service can do: `catch (const SsoException&)` and `catch (const Quillon::Http::HttpException&)`;
  * - `InvalidCredentialsException` if the service rejects the credentials;
  * - `InvalidSignatureException` if the token it sends does not verify;
  * - `SsoException` for any other fault or an answer that cannot be used; as a `ParseException` if
@@ -52,6 +56,9 @@ using ValidationCompletion =
  * not called for an exception that is no `Quillon::Exception`, such as `std::bad_alloc`, nor if the
  * process ends first. What the completion throws is logged. On the calling thread there is only
  * what the pool throws when it takes no work.
+ *
+ * A child that was forked after the process had its first exchange or another thread cannot use
+ * any form: fork first. What sends then throws a `Quillon::Http::HttpException` at once.
  *
  * There is no virtual destructor: a service is only owned by the pointer of its factory.
  *

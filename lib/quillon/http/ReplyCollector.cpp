@@ -14,6 +14,9 @@ constexpr int FirstFinalStatus = 200;
 /** Framing takes at most as much as the largest body, or a server could send it for ever. */
 constexpr std::size_t MaxWireBytes = 2 * ReplyLimits::MaxBodyBytes;
 
+/** How much of the server's own words a text repeats. */
+constexpr std::size_t MaxEchoedBytes = 200;
+
 /** Without optional white space [RFC 9110 5.6.3] and line end. */
 std::string_view Trim(std::string_view text) noexcept
 {
@@ -116,7 +119,8 @@ bool ReplyCollector::AddEncoding(std::string_view value, bool isWanted)
     if (isWanted || !WantsBody()) {
         return true;
     }
-    _problem = "is encoded as \"" + std::string(value) + "\", which nobody asked for";
+    _problem = "is encoded as \"" + std::string(value.substr(0, MaxEchoedBytes))
+               + "\", which nobody asked for";
     return false;
 }
 

@@ -3,7 +3,6 @@
 #include "quillon/Exceptions.h"
 #include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/client/LegDriver.h"
-#include "ssoClient/client/trustedCertificates.h"
 
 #include <boost/smart_ptr/make_shared.hpp>
 
@@ -28,9 +27,9 @@ GssNegotiationContextImpl::GssNegotiationContextImpl(
 
 NegotiationResult GssNegotiationContextImpl::NegotiateToken(const Leg& leg)
 {
-    RefuseNullCertificate(_trustedCertificates);
     SPNegoResponse response;
-    LegDriver(*_requestBuilder, *_responseHandler, LegDriver::EmptyLeg::IsSent)
+    LegDriver(
+        *_requestBuilder, *_responseHandler, _trustedCertificates, LegDriver::EmptyLeg::IsSent)
         .Exchange(*_session, leg, _spec, _contextId, response);
     _contextId = response.contextId;
     NegotiationResult result;

@@ -2,6 +2,7 @@
 
 #include "quillon/PanicVerify.h"
 #include "ssoClient/client/operation.h"
+#include "ssoClient/client/trustedCertificates.h"
 #include "ssoClient/wire/assertionPlaces.h"
 
 namespace SsoClient {
@@ -9,9 +10,11 @@ namespace SsoClient {
 LegDriver::LegDriver(
     const RequestBuilder& requestBuilder,
     const ResponseHandler& responseHandler,
+    const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates,
     EmptyLeg emptyLeg) noexcept
     : _requestBuilder(requestBuilder)
     , _responseHandler(responseHandler)
+    , _trustedCertificates(trustedCertificates)
     , _emptyLeg(emptyLeg)
 {}
 
@@ -63,6 +66,7 @@ void LegDriver::VerifyLeg(const Leg& leg, int place) const
 void LegDriver::Send(
     TransportSession& session, const Request& request, SPNegoResponse& response) const
 {
+    RefuseNullCertificate(_trustedCertificates);
     const Quillon::Ref<Quillon::Reader> reply = SsoClient::Send(session, request);
     _responseHandler.HandleSPNegoResponse(reply.get(), response);
 }

@@ -4,6 +4,7 @@
 #include "ssoClient/protocol/ResponseHandler.h"
 #include "ssoClient/protocol/Transport.h"
 
+#include <list>
 #include <string>
 
 namespace SsoClient {
@@ -27,6 +28,7 @@ public:
     LegDriver(
         const RequestBuilder& requestBuilder,
         const ResponseHandler& responseHandler,
+        const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates,
         EmptyLeg emptyLeg) noexcept;
 
     /**
@@ -59,6 +61,7 @@ private:
 
     const RequestBuilder& _requestBuilder;
     const ResponseHandler& _responseHandler;
+    const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& _trustedCertificates;
     EmptyLeg _emptyLeg;
 };
 

@@ -66,6 +66,7 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireToken(
         },
         [&](Request& request) {
             _requestBuilder->BuildUserPassTokenRequest(userName, password, spec, request);
+            RefuseNullCertificate(_trustedCertificates);
             LogTrace([] { return "SecurityTokenServiceImpl::AcquireToken sending request"; });
         },
         [&](Quillon::Reader* reply, std::string& tokenXml) {
@@ -81,9 +82,11 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByGSS(
         "AcquireTokenByGSS",
         [&] { return DescribeRequest(spec); },
         [&] {
-            RefuseNullCertificate(_trustedCertificates);
             const LegDriver legs(
-                *_requestBuilder, *_responseHandler, LegDriver::EmptyLeg::StopsTheProcess);
+                *_requestBuilder,
+                *_responseHandler,
+                _trustedCertificates,
+                LegDriver::EmptyLeg::StopsTheProcess);
             const boost::shared_ptr<TransportSession> session = _transport->CreateSession();
             return ToSamlToken(Negotiate(legs, *session, spec, handler));
         });

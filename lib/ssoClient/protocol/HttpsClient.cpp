@@ -3,6 +3,7 @@
 #include "quillon/PanicVerify.h"
 #include "quillon/http/HttpURL.h"
 #include "ssoClient/Exceptions.h"
+#include "ssoClient/wire/assertionPlaces.h"
 
 #include <boost/bind/bind.hpp>
 #include <boost/smart_ptr/make_shared.hpp>
@@ -119,7 +120,10 @@ void TranslateResponse(
         return;
     }
     if (response == nullptr) {
-        Quillon::PanicVerify("response != __null", "lib/ssoClient/HttpsClient", __LINE__);
+        Quillon::PanicVerify(
+            "response != __null",
+            AssertionPlaces::HttpsClient,
+            AssertionPlaces::NeitherErrorNorResponse);
     }
     const Http::HttpStatus& status = response->GetStatus();
     if (IsAcceptable(status.code)) {

@@ -6,6 +6,7 @@
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/protocol/responseReading.h"
 #include "ssoClient/protocol/xmlSpnego.h"
+#include "ssoClient/wire/assertionPlaces.h"
 #include "ssoClient/wire/wireNames.h"
 #include "ssoClient/wire/xmlReading.h"
 
@@ -19,8 +20,6 @@ using Quillon::Xml::QName;
 namespace SsoClient {
 
 namespace {
-
-constexpr char Unit[] = "lib/ssoClient/ResponseHandlerImpl";
 
 static_assert(
     Quillon::Http::ReplyLimits::MaxBodyBytes == Quillon::Xml::ParserLimits::MaxDocumentBytes,
@@ -95,7 +94,10 @@ auto ProcessResponseWith(Quillon::Reader* body, const Extractor& extractor)
     const Ref<Quillon::Xml::Document> document = ParseResponse(body);
     const ElementNode* const envelope = document->GetRootElement();
     if (envelope == nullptr) {
-        Quillon::PanicVerify("envelope != __null", Unit, __LINE__);
+        Quillon::PanicVerify(
+            "envelope != __null",
+            AssertionPlaces::ResponseHandlerImpl,
+            AssertionPlaces::DocumentWithoutRoot);
     }
     ThrowIfFault(*envelope);
     const ElementNode* const soapBody = envelope->FindChildElement("Body");

@@ -5,6 +5,7 @@
 #include "quillon/system/Clock.h"
 #include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/Exceptions.h"
+#include "ssoClient/wire/assertionPlaces.h"
 #include "ssoClient/wire/wireNames.h"
 #include "ssoClient/wire/xmlReading.h"
 
@@ -24,8 +25,6 @@ using Quillon::Xml::Node;
 namespace Security = Quillon::Xml::Security;
 
 namespace {
-
-constexpr char Unit[] = "lib/ssoClient/SamlTokenImpl";
 
 /** Inclusive Canonical XML 1.0; the trailing `#` belongs to the name this library uses for it. */
 constexpr char TokenTextCanonicalization[] = "http://www.w3.org/TR/2001/REC-xml-c14n-20010315#";
@@ -127,8 +126,8 @@ bool HasDividedText(const ElementNode& element)
 
 /**
  * The canonical form has no comments, so it joins a value to the blanks that a comment parts from
- * it in the tree: the token's facts would be others than those of its own text. The signature's
- * values are no facts, and are read as one text anyway.
+ * it in the tree: the token's facts would be others than those of its own text. The values of the
+ * signature are no facts, and blanks mean nothing in the Base64 of a certificate.
  */
 void RequireUndividedValues(const ElementNode& element)
 {
@@ -139,7 +138,8 @@ void RequireUndividedValues(const ElementNode& element)
     }
     for (Node* node = element.GetFirstChild(); node != nullptr; node = node->GetNextSibling()) {
         const ElementNode* child = AsElement(node);
-        if (child != nullptr && !ElementQNameIs(child, "Signature", Wire::DsNamespace)) {
+        if (child != nullptr && !ElementQNameIs(child, "Signature", Wire::DsNamespace)
+            && !ElementQNameIs(child, "X509Certificate", Wire::DsNamespace)) {
             RequireUndividedValues(*child);
         }
     }
@@ -193,7 +193,8 @@ void SamlTokenImpl::InitializeFromDom(
     ValidateSignature(*model.Signature, keyResolver);
     Populate(model);
     if (_subject == nullptr) {
-        Quillon::PanicVerify("_subject", Unit, __LINE__);
+        Quillon::PanicVerify(
+            "_subject", AssertionPlaces::SamlTokenImpl, AssertionPlaces::TokenWithoutSubject);
     }
 }
 
@@ -231,7 +232,7 @@ void SamlTokenImpl::Populate(SamlAssertionType& assertion)
 void SamlTokenImpl::PopulateTokenAttribute(AttributeType& attribute)
 {
     if (SamlAttributeIsGroupIdentity(attribute)) {
-        AppendGroups(std::move(attribute.AttributeValue));
+        AppendGroups(attribute.AttributeValue);
     } else if (SamlAttributeIsSolution(attribute)) {
         _isSolution = ParseIsSolutionAttribute(attribute);
     } else if (SamlAttributeIsGivenName(attribute)) {
@@ -241,11 +242,11 @@ void SamlTokenImpl::PopulateTokenAttribute(AttributeType& attribute)
     }
 }
 
-void SamlTokenImpl::AppendGroups(std::vector<std::string> values)
+void SamlTokenImpl::AppendGroups(const std::vector<std::string>& values)
 {
     _groups.reserve(_groups.size() + values.size());
-    for (std::string& value : values) {
-        _groups.push_back(ParseGroupIdentity(std::move(value)));
+    for (const std::string& value : values) {
+        _groups.push_back(ParseGroupIdentity(value));
     }
 }
 
@@ -272,17 +273,14 @@ PrincipalId ParseSamlNameId(const NameIDType& nameId)
     return {nameId.Value.substr(0, at), nameId.Value.substr(at + 1)};
 }
 
-PrincipalId ParseGroupIdentity(std::string value)
+PrincipalId ParseGroupIdentity(const std::string& value)
 {
     const std::size_t backslash = value.find('\\');
     if (!SplitsInTwo(value, backslash)) {
         throw ParseException(
             "Failed to parse Group Identity value: `" + value + "'; domain or group missing");
     }
-    // A token may have a thousand groups: the value's own memory becomes the name's.
-    std::string domain = value.substr(0, backslash);
-    value.erase(0, backslash + 1);
-    return {std::move(value), std::move(domain)};
+    return {value.substr(backslash + 1), value.substr(0, backslash)};
 }
 
 Delegate ParseToDelegate(const DelegateType& delegate)

@@ -60,7 +60,7 @@ private:
         long long clockToleranceSec);
     void Populate(SamlAssertionType& assertion);
     void PopulateTokenAttribute(AttributeType& attribute);
-    void AppendGroups(std::vector<std::string> values);
+    void AppendGroups(const std::vector<std::string>& values);
 
     std::string _xml;
     std::string _id;
@@ -87,7 +87,7 @@ SSOCLIENT_API void CheckTokenProperties(
 SSOCLIENT_API PrincipalId ParseSamlNameId(const NameIDType& nameId);
 
 /** Splits `DOMAIN\group` at the first backslash. */
-SSOCLIENT_API PrincipalId ParseGroupIdentity(std::string value);
+SSOCLIENT_API PrincipalId ParseGroupIdentity(const std::string& value);
 
 SSOCLIENT_API Delegate ParseToDelegate(const DelegateType& delegate);
 SSOCLIENT_API bool ParseIsSolutionAttribute(const AttributeType& attribute);

@@ -18,6 +18,18 @@ inline constexpr int NullArgumentOfAsyncOperation = 488;
 inline constexpr int EmptyFirstLeg = 762;
 inline constexpr int EmptyFurtherLeg = 794;
 
+inline constexpr char HttpsClient[] = "lib/ssoClient/HttpsClient";
+inline constexpr int NeitherErrorNorResponse = 116;
+
+inline constexpr char ResponseHandlerImpl[] = "lib/ssoClient/ResponseHandlerImpl";
+inline constexpr int DocumentWithoutRoot = 93;
+
+inline constexpr char SamlTokenImpl[] = "lib/ssoClient/SamlTokenImpl";
+inline constexpr int TokenWithoutSubject = 158;
+
+inline constexpr char XmlReading[] = "lib/ssoClient/xmlReading";
+inline constexpr int NoMissingAttribute = 65;
+
 inline constexpr char XmlCommonBuilders[] = "lib/ssoClient/xmlCommonBuilders";
 inline constexpr int CompositeWithoutRoot = 168;
 

@@ -5,6 +5,7 @@
 #include "quillon/xml/Parser.h"
 #include "quillon/xml/security/Canonicalizer.h"
 #include "ssoClient/Exceptions.h"
+#include "ssoClient/wire/assertionPlaces.h"
 #include "ssoClient/wire/wireNames.h"
 
 #include <algorithm>
@@ -23,7 +24,6 @@ using Quillon::Xml::TextNode;
 
 namespace {
 
-constexpr char Unit[] = "lib/ssoClient/xmlReading";
 constexpr std::string_view XmlWhiteSpace = "\t\n\r ";
 
 [[noreturn]] void ThrowMissingAttribute(const ElementNode* element, std::string_view name)
@@ -62,7 +62,10 @@ void ThrowFirstMissing(
         return !Contains(present, name);
     });
     if (missing == required.end()) {
-        Quillon::PanicVerify("missing != required.end()", Unit, __LINE__);
+        Quillon::PanicVerify(
+            "missing != required.end()",
+            AssertionPlaces::XmlReading,
+            AssertionPlaces::NoMissingAttribute);
     }
     const std::string& namespaceUri = missing->GetNamespaceUri();
     ThrowMissingAttribute(

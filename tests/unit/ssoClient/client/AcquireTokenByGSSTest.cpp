@@ -321,13 +321,15 @@ TEST_F(AcquireTokenByGSS, ToleratesTenMinutesAndNoMore)
     }
 }
 
-TEST_F(AcquireTokenByGSS, AsksForNoLegIfATrustedCertificateIsNull)
+TEST_F(AcquireTokenByGSS, SendsNoLegIfATrustedCertificateIsNull)
 {
     trusted.push_back(nullptr);
     ScriptedHandler handler({"one"});
     EXPECT_EQ(
         GetAcquireFailure(handler),
         "InvalidArgumentException: Invalid argument : A trusted certificate is null");
-    EXPECT_THAT(handler.asked, IsEmpty());
     EXPECT_THAT(transport->sent, IsEmpty());
+    spec.tokenLifetimeSec = 0;
+    ScriptedHandler other({"one"});
+    EXPECT_THAT(GetAcquireFailure(other), testing::HasSubstr("Token lifetime must be positive"));
 }

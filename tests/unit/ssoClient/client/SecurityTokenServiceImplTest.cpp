@@ -268,6 +268,19 @@ TEST_F(AcquireToken, SendsNoPasswordIfATrustedCertificateIsNull)
     EXPECT_THAT(GetFailureThrough(responseHandler), HasSubstr("Token lifetime must be positive"));
 }
 
+TEST_F(AcquireToken, DoesNotSayThatItSendsIfATrustedCertificateIsNull)
+{
+    trusted.push_back(nullptr);
+    const LogCapture log(64);
+    EXPECT_NE(GetFailureThrough(responseHandler), "");
+    EXPECT_THAT(
+        log.lines,
+        ElementsAre(
+            testing::ContainsRegex(FrameLine("START")),
+            RequestLine,
+            testing::ContainsRegex(FrameLine("END"))));
+}
+
 TEST_F(AcquireToken, LetsOtherExceptionsPass)
 {
     transport->reply = "<Assertion>";

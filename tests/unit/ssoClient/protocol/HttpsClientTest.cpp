@@ -593,7 +593,9 @@ TEST(TranslateResponse, StopsTheProcessWithoutErrorAndResponse)
     GTEST_FLAG_SET(death_test_style, "threadsafe");
     boost::shared_ptr<Exception> error;
     Ref<Reader> body;
-    EXPECT_DEATH(TranslateResponse(nullptr, nullptr, error, body), "response != ");
+    EXPECT_DEATH(
+        TranslateResponse(nullptr, nullptr, error, body),
+        "^PanicVerify failed: response != __null \\(lib/ssoClient/HttpsClient:116\\)\n$");
 }
 
 TEST(AsyncTranslateResponse, RaisesTheEmptyFunctionErrorForAnEmptyCallback)

@@ -57,7 +57,7 @@ HttpsClient::HttpsClient(
     long long timeout)
     : _timeout(timeout)
 {
-    given.push_back({url, sslContext, peer, timeout});
+    given.push_back({url, sslContext, peer, _timeout});
 }
 
 boost::shared_ptr<TransportSession> HttpsClient::CreateSession() const
