@@ -7,22 +7,9 @@
 #include "quillon/MessageFormatter.h"
 #include "quillon/xml/Node.h"
 
-#include <nlohmann/json.hpp>
-
 using Quillon::MessageFormatter;
 
 namespace {
-
-/** Writing JSON is strict about UTF-8. */
-bool IsUtf8(const std::string& text)
-{
-    try {
-        nlohmann::json(text).dump();
-        return true;
-    } catch (const nlohmann::json::type_error&) {
-        return false;
-    }
-}
 
 /** The library is asked, which decides it for every text that it writes. */
 bool CanStandInXml(const std::string& text)

@@ -78,6 +78,18 @@ std::string Escape(const Character& character)
 
 } // namespace
 
+bool IsUtf8(std::string_view text)
+{
+    while (!text.empty()) {
+        const Character character = Decode(text);
+        if (!character.isUtf8) {
+            return false;
+        }
+        text.remove_prefix(character.bytes);
+    }
+    return true;
+}
+
 bool HasControls(std::string_view text)
 {
     for (std::size_t at = 0; at < text.size();) {

@@ -6,6 +6,9 @@
 
 // Names and fault texts come from others and shall neither break a line nor steer a terminal.
 
+/** Keeps no copy, so that a password may be asked about. [RFC 3629 3] */
+bool IsUtf8(std::string_view text);
+
 /** Whether `text` holds a control character or a separator of lines (C0, C1, U+2028, U+2029). */
 bool HasControls(std::string_view text);
 

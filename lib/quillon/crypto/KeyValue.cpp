@@ -7,6 +7,7 @@
 #include <boost/smart_ptr/make_shared.hpp>
 
 #include <string>
+#include <utility>
 
 namespace Quillon::Crypto {
 
@@ -23,6 +24,16 @@ BignumOwner ToNumber(const std::vector<unsigned char>& bytes)
     return BignumOwner(BN_bin2bn(bytes.data(), static_cast<int>(bytes.size()), nullptr));
 }
 
+/** With some numbers, the point at infinity or the exponent 1, anybody can sign [SEC1 3.2.2]. */
+void RequireSoundKey(const char* type, EVP_PKEY* key)
+{
+    const KeyContextOwner context(EVP_PKEY_CTX_new_from_pkey(nullptr, key, nullptr));
+    if (!context || EVP_PKEY_public_check(context.get()) != 1) {
+        throw CryptoException(
+            std::string("Not a public key of type ") + type + ": " + GetOpenSslError());
+    }
+}
+
 boost::shared_ptr<const PublicKey> Build(const char* type, OSSL_PARAM_BLD* builder)
 {
     const Parameters parameters(OSSL_PARAM_BLD_to_param(builder));
@@ -33,7 +44,9 @@ boost::shared_ptr<const PublicKey> Build(const char* type, OSSL_PARAM_BLD* build
         throw CryptoException(
             std::string("Not a public key of type ") + type + ": " + GetOpenSslError());
     }
-    return boost::make_shared<PublicKeyImpl>(KeyOwner(key));
+    KeyOwner owned(key);
+    RequireSoundKey(type, owned.get());
+    return boost::make_shared<PublicKeyImpl>(std::move(owned));
 }
 
 } // namespace

@@ -41,13 +41,18 @@ bool AttachAlert(SSL_CTX* connection, const Ref<PeerAlert>& alert) noexcept
     return true;
 }
 
+/**
+ * Up to TLS 1.2 an alert may be a warning, after which the connection goes on: what it says must
+ * not stand for why we refuse the server. In TLS 1.3 every error is fatal [RFC 8446 6.2].
+ */
 void NoteAlert(const SSL* ssl, int alert)
 {
+    const bool isFatal = alert >> 8 == SSL3_AL_FATAL;
     const int code = alert & 0xFF;
     const Ref<PeerAlert> noted = GetAlert(ssl);
     if (code == SSL_AD_CLOSE_NOTIFY) {
         noted->isClosed = true;
-    } else if (code != SSL_AD_NO_RENEGOTIATION) {
+    } else if (isFatal) {
         noted->code = code;
     }
 }

@@ -3,6 +3,7 @@
 #include "CryptoSupport.h"
 #include "quillon/crypto/Certificate.h"
 
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 // Numbers, serial numbers and PSS signatures come from the `openssl` program.
@@ -127,6 +128,31 @@ TEST(CreateRsaPublicKey, RefusesNumbersThatAreNoKey)
         GetCryptoError(
             [] { CreateRsaPublicKey(std::vector<unsigned char>(2049, 0xff), Exponent); }),
         "Not a public key of type RSA: a modulus of 2049 bytes and an exponent of 3");
+}
+
+TEST(CreateRsaPublicKey, RefusesNumbersWithWhichAnybodyCanSign)
+{
+    std::vector<unsigned char> even = ModulusOf("sts");
+    even.back() &= 0xfeU;
+    for (const std::vector<unsigned char>& exponent :
+         {std::vector<unsigned char>{0}, std::vector<unsigned char>{1}}) {
+        EXPECT_THAT(
+            GetCryptoError([&] { CreateRsaPublicKey(ModulusOf("sts"), exponent); }),
+            testing::StartsWith("Not a public key of type RSA: "));
+    }
+    for (const std::vector<unsigned char>& modulus : {std::vector<unsigned char>{1}, even}) {
+        EXPECT_THAT(
+            GetCryptoError([&] { CreateRsaPublicKey(modulus, Exponent); }),
+            testing::StartsWith("Not a public key of type RSA: "));
+    }
+}
+
+// [SEC1 3.2.2]
+TEST(CreateEcPublicKey, RefusesThePointAtInfinity)
+{
+    EXPECT_THAT(
+        GetCryptoError([] { CreateEcPublicKey("P-256", {0}); }),
+        testing::StartsWith("Not a public key of type EC: "));
 }
 
 // [SEC1 2.3.3], [XMLDSIG11 4.5.2.3]

@@ -152,6 +152,39 @@ TEST_F(TlsTest, RefusesAnUntrustedAuthority)
     EXPECT_EQ(GetRefusal("unable to get local issuer certificate", Host), client.PostAndFail());
 }
 
+/** Makes the server warn that it does not know the name, and go on [RFC 6066 3]. */
+void MakeItWarn(SSL_CTX* server)
+{
+    SSL_CTX_set_max_proto_version(server, TLS1_2_VERSION);
+    SSL_CTX_set_tlsext_servername_callback(
+        server, +[](SSL*, int* alert, void*) {
+            *alert = SSL_AD_UNRECOGNIZED_NAME;
+            return SSL_TLSEXT_ERR_ALERT_WARNING;
+        });
+}
+
+TEST_F(TlsTest, TakesNoWarningForTheEnd)
+{
+    MakeItWarn(tls.GetContext());
+    EXPECT_EQ("pong", HttpClient(MakeSpec()).Post().body);
+}
+
+TEST_F(TlsTest, RefusesAnUntrustedAuthorityThatWarns)
+{
+    MakeItWarn(tls.GetContext());
+    const Ref<SSLContext> other = Trust(MakeAuthority());
+    HttpClient client(MakeSpec(other.get(), Host, "", server));
+    EXPECT_EQ(GetRefusal("unable to get local issuer certificate", Host), client.PostAndFail());
+}
+
+TEST_F(TlsTest, RefusesAnotherKeyThatWarns)
+{
+    MakeItWarn(tls.GetContext());
+    EXPECT_THAT(
+        HttpClient(MakeSpec(MakeAuthority().GetPin())).PostAndFail(),
+        testing::HasSubstr(" is not the pinned one, "));
+}
+
 TEST_F(TlsTest, KeepsTheTrustOfContextsApart)
 {
     const Identity otherAuthority = MakeAuthority();
