@@ -8,7 +8,7 @@ namespace SsoClient::GeneralReader {
 /** What judging an assertion finds. */
 struct Judgement
 {
-    std::size_t confirmation; ///< which of the confirmations is accepted
+    std::size_t confirmation = 0; ///< which of the confirmations is accepted
     Quillon::System::DateTime startDate;
     Quillon::System::DateTime endDate;
 };

@@ -253,6 +253,18 @@ void CheckRule(const SubjectRule& rule)
     }
 }
 
+void AppendTextValues(const AssertionAttribute& attribute, std::vector<std::string>& values)
+{
+    for (const AssertionAttributeValue& value : attribute.values) {
+        if (value.xml) {
+            throw ParseException("A value of attribute " + Quote(attribute.name) + " is no text");
+        }
+        if (!value.isNil) {
+            values.push_back(value.text);
+        }
+    }
+}
+
 } // namespace
 
 void CheckRules(const SubjectMapping& mapping)
@@ -310,16 +322,8 @@ std::vector<std::string> GetTextValues(const AssertionFacts& facts, const std::s
 {
     std::vector<std::string> values;
     for (const AssertionAttribute& attribute : facts.attributes) {
-        if (attribute.name != name) {
-            continue;
-        }
-        for (const AssertionAttributeValue& value : attribute.values) {
-            if (value.xml) {
-                throw ParseException("A value of attribute " + Quote(name) + " is no text");
-            }
-            if (!value.isNil) {
-                values.push_back(value.text);
-            }
+        if (attribute.name == name) {
+            AppendTextValues(attribute, values);
         }
     }
     return values;

@@ -15,7 +15,6 @@ using Quillon::Xml::AsElement;
 using Quillon::Xml::AsText;
 using Quillon::Xml::Attribute;
 using Quillon::Xml::Node;
-using Quillon::Xml::NodeType;
 using Quillon::Xml::QName;
 using Quillon::Xml::TextNode;
 

@@ -29,7 +29,7 @@ NegotiationResult GssNegotiationContextImpl::NegotiateToken(const Leg& leg)
 {
     SPNegoResponse response;
     LegDriver(
-        *_requestBuilder, *_responseHandler, _trustedCertificates, LegDriver::EmptyLeg::IsSent)
+        *_requestBuilder, *_responseHandler, _trustedCertificates, LegDriver::EmptyLeg::IS_SENT)
         .Exchange(*_session, leg, _spec, _contextId, response);
     _contextId = response.contextId;
     NegotiationResult result;

@@ -58,7 +58,7 @@ void LegDriver::ContinueSPNegotiation(
 
 void LegDriver::VerifyLeg(const Leg& leg, int place) const
 {
-    if (leg.empty() && _emptyLeg == EmptyLeg::StopsTheProcess) {
+    if (leg.empty() && _emptyLeg == EmptyLeg::STOPS_THE_PROCESS) {
         Quillon::PanicVerify("!leg.empty()", AssertionPlaces::SecurityTokenServiceImpl, place);
     }
 }

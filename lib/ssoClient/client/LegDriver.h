@@ -21,8 +21,8 @@ public:
     /** What it means that a leg is empty. */
     enum class EmptyLeg
     {
-        StopsTheProcess, ///< the program's own handler is wrong
-        IsSent           ///< it came from elsewhere, and it is the service that judges it
+        STOPS_THE_PROCESS, ///< the program's own handler is wrong
+        IS_SENT            ///< it came from elsewhere, and it is the service that judges it
     };
 
     LegDriver(

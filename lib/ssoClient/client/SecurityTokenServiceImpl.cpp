@@ -86,7 +86,7 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByGSS(
                 *_requestBuilder,
                 *_responseHandler,
                 _trustedCertificates,
-                LegDriver::EmptyLeg::StopsTheProcess);
+                LegDriver::EmptyLeg::STOPS_THE_PROCESS);
             const boost::shared_ptr<TransportSession> session = _transport->CreateSession();
             return ToSamlToken(Negotiate(legs, *session, spec, handler));
         });

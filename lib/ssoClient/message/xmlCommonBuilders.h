@@ -74,6 +74,7 @@ template <class Items, class Make>
 std::vector<XMLBuilderPtr> BuildersOf(const Items& items, Make make)
 {
     std::vector<XMLBuilderPtr> builders;
+    builders.reserve(items.size());
     for (const auto& item : items) {
         builders.push_back(make(item));
     }

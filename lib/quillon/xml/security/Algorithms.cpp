@@ -19,12 +19,12 @@ using Crypto::KeyType;
 
 // No HMAC: its "key" would be a public text. No SHA-1 and no MD5: collisions are affordable.
 constexpr std::array<SignatureAlgorithm, 6> SignatureAlgorithms{{
-    {RsaSha256, KeyType::RSA, HashAlgorithm::SHA256},
-    {RsaSha384, KeyType::RSA, HashAlgorithm::SHA384},
-    {RsaSha512, KeyType::RSA, HashAlgorithm::SHA512},
-    {EcdsaSha256, KeyType::EC, HashAlgorithm::SHA256},
-    {EcdsaSha384, KeyType::EC, HashAlgorithm::SHA384},
-    {EcdsaSha512, KeyType::EC, HashAlgorithm::SHA512},
+    {RsaSha256, KeyType::RSA, HashAlgorithm::SHA256, false},
+    {RsaSha384, KeyType::RSA, HashAlgorithm::SHA384, false},
+    {RsaSha512, KeyType::RSA, HashAlgorithm::SHA512, false},
+    {EcdsaSha256, KeyType::EC, HashAlgorithm::SHA256, false},
+    {EcdsaSha384, KeyType::EC, HashAlgorithm::SHA384, false},
+    {EcdsaSha512, KeyType::EC, HashAlgorithm::SHA512, false},
 }};
 
 constexpr std::array<SignatureAlgorithm, 3> PssAlgorithms{{

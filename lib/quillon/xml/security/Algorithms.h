@@ -14,7 +14,7 @@ struct SignatureAlgorithm
     const char* identifier;
     Crypto::KeyType keyType;
     Crypto::HashAlgorithm hash;
-    bool isPss = false;
+    bool isPss;
 };
 
 /** @throws XmlSecurityException  not in the profile. */

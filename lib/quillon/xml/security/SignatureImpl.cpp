@@ -61,7 +61,7 @@ CanonicalizationMethod CheckTransforms(const std::vector<AlgorithmUse>& transfor
                                      + " stands where enveloped-signature must");
     }
     RequireNoChild(transforms.front());
-    const CanonicalizationMethod method =
+    CanonicalizationMethod method =
         transforms.size() == 1 ? CanonicalizationMethod() : GetCanonicalization(transforms[1]);
     if (transforms.size() > 2) {
         throw XmlSecurityException(
