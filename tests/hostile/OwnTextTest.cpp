@@ -3,6 +3,7 @@
 #include "quillon/system/Clock.h"
 #include "quillon/xml/Parser.h"
 #include "ssoClient/CreateSamlToken.h"
+#include "support/FixedClock.h"
 
 #include <gtest/gtest.h>
 
@@ -14,29 +15,10 @@ namespace HostileTests {
 
 namespace {
 
-/** Stops the library's clock for the lifetime of the object. */
-class StoppedClock : public Quillon::System::Clock
-{
-public:
-    explicit StoppedClock(long long micros)
-        : _now(Quillon::System::DateTimeFromUtc(micros, false))
-        , _previous(Quillon::System::ReplaceClock(this))
-    {}
-    ~StoppedClock() { Quillon::System::ReplaceClock(_previous); }
-    StoppedClock(const StoppedClock&) = delete;
-    StoppedClock& operator=(const StoppedClock&) = delete;
-
-    Quillon::System::DateTime Now() const override { return _now; }
-
-private:
-    Quillon::System::DateTime _now;
-    const Quillon::System::Clock* _previous;
-};
-
 /** The text that a token made of the tree of `xml` gives of itself. */
 std::string GetOwnText(const std::string& xml, const Conditions& conditions)
 {
-    const StoppedClock clock(conditions.nowMicros);
+    const FixedClock clock(Quillon::System::DateTimeFromUtc(conditions.nowMicros, false));
     const auto handler = Quillon::Xml::CreateXMLDocumentHandler();
     Quillon::Xml::CreateXMLParser(handler.get())->Parse(xml);
     return SsoClient::CreateSamlTokenFromDom(

@@ -4,6 +4,7 @@
 #include "quillon/system/Clock.h"
 #include "quillon/xml/Parser.h"
 #include "ssoClient/CreateSamlToken.h"
+#include "support/FixedClock.h"
 
 #include <boost/core/demangle.hpp>
 
@@ -14,25 +15,6 @@
 namespace HostileTests {
 
 namespace {
-
-/** Stops the library's clock for the lifetime of the object. */
-class StoppedClock : public Quillon::System::Clock
-{
-public:
-    explicit StoppedClock(long long micros)
-        : _now(Quillon::System::DateTimeFromUtc(micros, false))
-        , _previous(Quillon::System::ReplaceClock(this))
-    {}
-    ~StoppedClock() { Quillon::System::ReplaceClock(_previous); }
-    StoppedClock(const StoppedClock&) = delete;
-    StoppedClock& operator=(const StoppedClock&) = delete;
-
-    Quillon::System::DateTime Now() const override { return _now; }
-
-private:
-    Quillon::System::DateTime _now;
-    const Quillon::System::Clock* _previous;
-};
 
 std::string QuoteId(const SsoClient::PrincipalId& id)
 {
@@ -84,7 +66,7 @@ void DescribeLists(const SsoClient::SamlToken& token, std::ostream& out)
 template <class GetFacts>
 Verdict GetVerdict(const Conditions& conditions, const GetFacts& getFacts)
 {
-    const StoppedClock clock(conditions.nowMicros);
+    const FixedClock clock(Quillon::System::DateTimeFromUtc(conditions.nowMicros, false));
     Verdict verdict;
     try {
         verdict.facts = getFacts();

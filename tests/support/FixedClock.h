@@ -9,6 +9,9 @@ class FixedClock final : public Quillon::System::Clock
 {
 public:
     explicit FixedClock(std::string_view now)
+        : FixedClock(Quillon::System::DateTime(now))
+    {}
+    explicit FixedClock(const Quillon::System::DateTime& now)
         : _now(now)
         , _before(Quillon::System::ReplaceClock(this))
     {}

@@ -440,6 +440,17 @@ TEST_F(CommentBesideABlank, IsRefusedInATree)
         judge("true<!-- --> "));
 }
 
+// Blanks mean nothing in Base64, so that both readings of a certificate are one.
+TEST_F(CommentBesideABlank, MayStandInACertificateOfATree)
+{
+    const std::string signedText =
+        StsKey().Sign(HolderOfKey(StsKey().GetCertificateBase64() + "\n"));
+    EXPECT_NO_THROW(CreateFromDom(Replace(
+        signedText,
+        "\n</ds:X509Certificate></ds:X509Data></ds:KeyInfo></saml:Subject",
+        "<!-- -->\n</ds:X509Certificate></ds:X509Data></ds:KeyInfo></saml:Subject")));
+}
+
 TEST_F(TokenFacts, AnIdHasNoWhiteSpace)
 {
     const auto judge = [](const std::string& id) {
