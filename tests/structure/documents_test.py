@@ -21,6 +21,15 @@ def texts_that_are_no_errors():
     return [line for line in lines if line and not line.startswith("#")]
 
 
+def error_tables():
+    """The tables of docs/errors.md about texts and codes: their columns and their rows."""
+    for table in re.findall(r"^\|.*\n\|[ |-]+\n(?:\|.*\n)+", read("docs/errors.md"), re.MULTILINE):
+        header, _, *rows = ([cell.strip() for cell in line.strip("|").split(" | ")]
+                            for line in table.splitlines())
+        if header[0] in ("Text", "Code"):
+            yield header, rows
+
+
 def help_of(*command):
     return subprocess.run([os.environ["SSOCLIENT"], *command, "--help"],
                           capture_output=True, text=True, check=True).stdout
@@ -39,10 +48,34 @@ class Documents(unittest.TestCase):
         self.assertIn("InvalidArgumentException", classes)
         self.assertEqual([], [name for name in classes if f"`{name}`" not in text])
 
+    def test_every_error_has_a_cause_and_a_remedy(self):
+        count = 0
+        for header, rows in error_tables():
+            self.assertEqual(["Cause", "Remedy"], header[-2:])
+            for row in rows:
+                count += 1
+                with self.subTest(row=row):
+                    self.assertEqual(len(header), len(row))
+                    self.assertTrue(all(row))
+        self.assertGreater(count, 250)
+
+    def test_every_fault_code_of_the_standards_is_described(self):
+        codes = {code for header, rows in error_tables() if header[0] == "Code" for row in rows
+                 for code in re.findall(r"`([\w:]+)`", row[0])}
+        trust = ("AuthenticationBadElements", "BadRequest", "ExpiredData", "FailedAuthentication",
+                 "InvalidRequest", "InvalidScope", "InvalidSecurityToken", "InvalidTimeRange",
+                 "RenewNeeded", "RequestFailed", "UnableToRenew")  # [WST13 11]
+        security = ("FailedAuthentication", "FailedCheck", "InvalidSecurity", "InvalidSecurityToken",
+                    "MessageExpired", "SecurityTokenUnavailable", "UnsupportedAlgorithm",
+                    "UnsupportedSecurityToken")  # [WSS 12]
+        soap = ("Client", "MustUnderstand", "Server", "VersionMismatch")  # [SOAP11 4.4.1]
+        expected = {f"{prefix}:{name}" for prefix, names in (
+            ("wst", trust), ("wsse", security), ("S", soap)) for name in names}
+        self.assertEqual(expected, codes - {"wsu:MessageExpired"})
+
     def test_every_text_of_an_error_stands_in_the_code(self):
-        text = read("docs/errors.md")
-        rows = re.findall(r"^\| `([^`]+)` \|", text[text.index("## Every operation"):],
-                          re.MULTILINE)
+        rows = [text for header, rows in error_tables() if header[0] == "Text" for row in rows
+                for text in re.findall(r"`([^`]+)`", row[0])]
         self.assertGreater(len(rows), 100)
         code = "\n".join(literal for path in sources.files("lib")
                          for literal in error_texts.literals(path))
