@@ -21,6 +21,7 @@ FLOORS = {
         "http": {"core", "system", "crypto", "service", "threads", "ssl"},
         "xml": {"core"},
         "xml/security": {"core", "crypto", "xml"},
+        "versions": {"core", "crypto", "http", "xml"},
     },
     "ssoClient": {
         "wire": set(),
@@ -48,7 +49,7 @@ PUBLIC_FLOORS = {
         "Exceptions.h": "core", "Export.h": "core", "Functor.h": "core", "MessageFormatter.h": "core",
         "PanicVerify.h": "core", "Reader.h": "core", "Ref.h": "core", "StringUtil.h": "core",
         "Wiped.h": "core",
-        "system/ThreadPool.h": "threads",
+        "LibraryVersions.h": "versions", "system/ThreadPool.h": "threads",
     },
     "ssoClient": {
         "Advice.h": "wire", "Delegate.h": "wire", "Exceptions.h": "wire", "Export.h": "wire",

@@ -1,4 +1,5 @@
 #include "devsts/http/Server.h"
+#include "devsts/http/Versions.h"
 
 #include <CLI/CLI.hpp>
 #include <csignal>
@@ -76,11 +77,12 @@ int Run(int argc, char** argv)
         "--keytab",
         options.keytab,
         "a Kerberos keytab with keys of this service; clients may then negotiate");
+    app.set_version_flag("--version", "ssoclient-devsts " + DevSts::DescribeVersions());
     app.add_flag("--http", options.plainHttp, "serve plain HTTP instead of HTTPS");
     try {
         app.parse(argc, argv);
     } catch (const CLI::Success& request) {
-        return app.exit(request); // prints the help
+        return app.exit(request); // prints the help or the version
     } catch (const CLI::ParseError& error) {
         throw UsageError(error.what());
     }

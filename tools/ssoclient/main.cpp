@@ -1,6 +1,7 @@
 #include "Commands.h"
 #include "Failure.h"
 #include "Terminal.h"
+#include "Versions.h"
 
 #include <algorithm>
 #include <iostream>
@@ -22,7 +23,9 @@ void AddCommands(const Command& program, Invocation& invocation)
 ExitCode Run(const std::vector<std::string>& arguments, Invocation& invocation)
 {
     const CommandLine commandLine(
-        "ssoclient", SSOCLIENT_VERSION, "Obtains, renews, validates and verifies SAML 2.0 tokens.");
+        "ssoclient",
+        DescribeVersions(),
+        "Obtains, renews, validates and verifies SAML 2.0 tokens.");
     AddCommands(commandLine.GetRoot(), invocation);
     if (arguments.empty() && IsTerminal()) {
         std::cerr << commandLine.GetHelp();

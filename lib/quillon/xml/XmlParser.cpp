@@ -1,6 +1,7 @@
 #include "quillon/xml/Parser.h"
 
 #include "core/Quote.h"
+#include "xml/ParserVersion.h"
 #include "xml/SourceCheck.h"
 #include "xml/TreeBuilder.h"
 
@@ -10,6 +11,7 @@
 #include <libxml/xmlerror.h>
 
 #include <algorithm>
+#include <cstdlib>
 #include <cstring>
 #include <exception>
 #include <memory>
@@ -362,6 +364,14 @@ Ref<DocumentHandler> CreateXMLDocumentHandler()
 Ref<Parser> CreateXMLParser(DocumentHandler* handler)
 {
     return Ref<Parser>(new ParserImpl(handler));
+}
+
+// libxml2 has it as one number: 20914 is 2.9.14.
+std::string GetParserVersion()
+{
+    const int number = std::atoi(xmlParserVersion);
+    return std::to_string(number / 10000) + "." + std::to_string(number / 100 % 100) + "."
+           + std::to_string(number % 100);
 }
 
 } // namespace Quillon::Xml

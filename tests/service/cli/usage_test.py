@@ -1,12 +1,33 @@
 """What the command line says before anything is asked of a service."""
 
+import ctypes
 import os
 import re
 import unittest
 
-from programs import DATA, REFUSED, USAGE, ProgramTest, ssoclient
+from programs import DATA, REFUSED, USAGE, ProgramTest, run, ssoclient
 
 STS_CERTIFICATE = DATA / "keys" / "sts-cert.pem"
+
+KERBEROS = run("pkg-config", "--modversion", "mit-krb5").out.strip()
+
+
+# What the libraries themselves say. Python may have an OpenSSL of its own, but not in this file.
+def loaded_openssl():
+    describe = ctypes.CDLL("libcrypto.so.3").OpenSSL_version
+    describe.restype = ctypes.c_char_p
+    return describe(6).decode()  # OPENSSL_VERSION_STRING
+
+
+def loaded_libcurl():
+    describe = ctypes.CDLL("libcurl.so.4").curl_version
+    describe.restype = ctypes.c_char_p
+    return re.match(r"libcurl/(\S+)", describe().decode())[1]
+
+
+def loaded_libxml2():
+    number = int(ctypes.c_char_p.in_dll(ctypes.CDLL("libxml2.so.2"), "xmlParserVersion").value)
+    return f"{number // 10000}.{number // 100 % 100}.{number % 100}"
 
 
 class Help(unittest.TestCase):
@@ -81,8 +102,18 @@ class Help(unittest.TestCase):
     def test_version(self):
         result = ssoclient("--version")
         self.assertEqual((0, ""), (result.code, result.err))
-        self.assertRegex(result.out, r"\Assoclient \d+\.\d+\.\d+\n\Z")
+        first, libraries = result.out.splitlines()
+        self.assertRegex(first, r"\Assoclient \d+\.\d+\.\d+\Z")
+        self.assertEqual(f"OpenSSL {loaded_openssl()}, libcurl {loaded_libcurl()}, libxml2 "
+                         f"{loaded_libxml2()}; built with MIT Kerberos {KERBEROS}", libraries)
         self.assertEqual(result, ssoclient("version"))
+
+    def test_version_of_the_development_sts(self):
+        first, libraries = run(os.environ["DEVSTS"], "--version").out.splitlines()
+        self.assertRegex(first, r"\Assoclient-devsts \d+\.\d+\.\d+\Z")
+        xmlsec1 = run("xmlsec1", "--version").out.split()[1]
+        self.assertEqual(f"OpenSSL {loaded_openssl()}, libxml2 {loaded_libxml2()}; built with "
+                         f"xmlsec1 {xmlsec1}, MIT Kerberos {KERBEROS}", libraries)
 
     def test_by_word(self):
         for command in ("", "acquire", "acquire password", "inspect"):

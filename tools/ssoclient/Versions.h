@@ -1,0 +1,6 @@
+#pragma once
+
+#include <string>
+
+/** The version of this program, and in a second line those of the libraries below. */
+std::string DescribeVersions();
