@@ -5,7 +5,7 @@ set(CMAKE_CXX_EXTENSIONS OFF)
 set(CMAKE_POSITION_INDEPENDENT_CODE ON)
 set(CMAKE_EXPORT_COMPILE_COMMANDS ON)
 
-if(NOT CMAKE_BUILD_TYPE)
+if(NOT CMAKE_BUILD_TYPE AND PROJECT_IS_TOP_LEVEL)
     set(CMAKE_BUILD_TYPE Release)
 endif()
 
@@ -17,7 +17,6 @@ if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU" AND CMAKE_CXX_COMPILER_VERSION VERSION_L
     add_compile_options(-Wno-restrict)
 endif()
 
-option(SSOCLIENT_WERROR "Treat compiler warnings as errors" ON)
 if(SSOCLIENT_WERROR)
     add_compile_options(-Werror)
 endif()
@@ -29,10 +28,20 @@ if(CMAKE_BUILD_TYPE STREQUAL "Release" OR CMAKE_BUILD_TYPE STREQUAL "RelWithDebI
 endif()
 add_link_options(-Wl,-z,relro,-z,now)
 
+# Shared unless BUILD_SHARED_LIBS says otherwise; without any word CMake itself would make them static.
+set(library_type SHARED)
+if(DEFINED BUILD_SHARED_LIBS AND NOT BUILD_SHARED_LIBS)
+    set(library_type STATIC)
+endif()
+
 # Keeps a library in the process once it is there: its threads may still run its code after a host
-# has unloaded the module that brought it.
+# has unloaded the module that brought it. A static library hands that on to what it is linked into.
 function(ssoclient_stay_loaded library)
-    target_link_options(${library} PRIVATE -Wl,-z,nodelete)
+    if(library_type STREQUAL SHARED)
+        target_link_options(${library} PRIVATE -Wl,-z,nodelete)
+    else()
+        target_link_options(${library} INTERFACE -Wl,-z,nodelete)
+    endif()
 endfunction()
 
 set(SSOCLIENT_SANITIZE "" CACHE STRING "Sanitizers to build with, for example address,undefined")

@@ -4,9 +4,16 @@ include(CMakePackageConfigHelpers)
 
 set(package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/SsoClient)
 
-set_target_properties(quillon ssoclient ssoclient_gss PROPERTIES INSTALL_RPATH "$ORIGIN")
-install(TARGETS quillon ssoclient ssoclient_gss EXPORT SsoClientTargets
-    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR})
+set(libraries quillon ssoclient)
+set(pc_files quillon ssoclient)
+if(SSOCLIENT_BUILD_GSS)
+    list(APPEND libraries ssoclient_gss)
+    list(APPEND pc_files ssoclient-gss)
+endif()
+set_target_properties(${libraries} PROPERTIES INSTALL_RPATH "$ORIGIN")
+install(TARGETS ${libraries} EXPORT SsoClientTargets
+    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
+    ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR})
 install(DIRECTORY lib/public/ DESTINATION ${CMAKE_INSTALL_INCLUDEDIR} FILES_MATCHING PATTERN *.h)
 
 file(RELATIVE_PATH bin_to_lib
@@ -17,6 +24,24 @@ foreach(tool ssoclient_tool ssoclient-devsts)
         install(TARGETS ${tool} RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
     endif()
 endforeach()
+
+# Whoever links a static library links what it is made with, too.
+if(library_type STREQUAL STATIC)
+    set(static_dependencies "find_dependency(OpenSSL 3.0)
+find_dependency(LibXml2)
+find_dependency(CURL 7.87)
+find_dependency(Threads)
+")
+    set(pc_requires "openssl >= 3.0, libxml-2.0, libcurl >= 7.87")
+    set(pc_libs " -pthread -Wl,-z,nodelete")
+    set(pc_cflags " -DQUILLON_STATIC")
+    if(SSOCLIENT_BUILD_GSS)
+        string(APPEND static_dependencies "find_dependency(PkgConfig)
+pkg_check_modules(SSOCLIENT_KRB5 REQUIRED IMPORTED_TARGET mit-krb5-gssapi>=1.11 mit-krb5>=1.11)
+")
+        set(pc_gss_requires ", mit-krb5-gssapi >= 1.11, mit-krb5 >= 1.11")
+    endif()
+endif()
 
 install(EXPORT SsoClientTargets NAMESPACE SsoClient:: DESTINATION ${package_dir})
 configure_package_config_file(cmake/SsoClientConfig.cmake.in SsoClientConfig.cmake
@@ -30,7 +55,7 @@ install(FILES
 # pkg-config finds the prefix from where its file lies.
 file(RELATIVE_PATH pc_to_prefix
     ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_PREFIX})
-foreach(package quillon ssoclient ssoclient-gss)
+foreach(package ${pc_files})
     configure_file(cmake/${package}.pc.in ${package}.pc @ONLY)
     install(FILES ${CMAKE_CURRENT_BINARY_DIR}/${package}.pc
         DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)

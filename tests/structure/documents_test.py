@@ -109,6 +109,18 @@ class Documents(unittest.TestCase):
                 with self.subTest(command=command, option=option):
                     self.assertIn(option, text)
 
+    def test_every_option_of_the_build_is_described(self):
+        text = read("docs/building.md")
+        options = {name for path in (sources.ROOT / "cmake").glob("*.cmake") for names in re.findall(
+            r"^\s*(?:option\((\w+)|set\((\w+) .*CACHE)", path.read_text("utf-8"), re.MULTILINE)
+            for name in names if name}
+        self.assertIn("SSOCLIENT_BUILD_GSS", options)
+        self.assertIn("SSOCLIENT_SANITIZE", options)
+        self.assertEqual([], [name for name in sorted(options)
+                              if not name.startswith("SSOCLIENT_") or f"| `{name}` |" not in text])
+        described = set(re.findall(r"^\| `(SSOCLIENT_\w+)` \|", text, re.MULTILINE))
+        self.assertEqual(options, described)
+
     def test_links_between_documents_lead_somewhere(self):
         documents = [*sources.ROOT.glob("*.md"), *(sources.ROOT / "docs").rglob("*.md")]
         self.assertGreater(len(documents), 5)
