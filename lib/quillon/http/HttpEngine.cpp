@@ -152,13 +152,10 @@ std::list<Connections>::iterator HttpEngine::AddConnections(Ref<const Connection
 
 void HttpEngine::RetireConnections(std::list<Connections>::iterator connections) noexcept
 {
-    if (HasForked()) {
-        return; // they are the parent's
-    }
     std::list<Connections> unused; // goes after the lock
     const System::ProcessLock lock(_mutex);
     if (!IsOwn(lock)) {
-        return;
+        return; // they are the parent's
     }
     const bool areOpen = connections->share != nullptr;
     std::list<Connections>& target = areOpen ? _retired : unused;

@@ -93,7 +93,6 @@ void Transfer::SetTarget()
     Set(CURLOPT_FOLLOWLOCATION, 0L);
     // An empty name means none, whatever the environment says.
     Set(CURLOPT_PROXY, "");
-    Set(CURLOPT_NOPROXY, "*");
     Set(CURLOPT_NETRC, static_cast<long>(CURL_NETRC_IGNORED));
     Set(CURLOPT_TCP_NODELAY, 1L);
     Set(CURLOPT_TCP_KEEPALIVE, _spec.keepAlive ? 1L : 0L);

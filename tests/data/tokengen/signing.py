@@ -41,7 +41,7 @@ def sign(text, key, digest_form=str, value_form=str, hmac_key=None, stand_in=Non
     a text and what takes its place in the end, for what libxml2 would not canonicalize.
     """
     if "#default" in text:
-        return _sign_by_xmlsec1(text, key)
+        return sign_by_xmlsec1(text, key)
     for _ in range(text.count("@DIGEST@")):
         digest = _reference_digest(_parse(text), stand_in)
         text = text.replace("@DIGEST@", digest_form(_base64(digest)), 1)
@@ -88,8 +88,8 @@ def _base64(data):
     return base64.b64encode(data).decode()
 
 
-def _sign_by_xmlsec1(text, key):
-    """lxml drops #default from a PrefixList, so xmlsec1 computes the two values then."""
+def sign_by_xmlsec1(text, key):
+    """For what lxml cannot canonicalize: a PrefixList with #default, and what stands beside a root."""
     pem = key.private_bytes(
         serialization.Encoding.PEM, serialization.PrivateFormat.PKCS8, serialization.NoEncryption())
     with tempfile.NamedTemporaryFile() as key_file, tempfile.NamedTemporaryFile() as template:

@@ -55,6 +55,33 @@ std::vector<unsigned char> SignPss(
     return {bytes.begin(), bytes.end()};
 }
 
+/** The 32 octets of a number that `openssl asn1parse` prints. */
+std::vector<unsigned char> NumberAfter(const std::string& printed, std::size_t& position)
+{
+    const std::string mark = "INTEGER           :";
+    const std::size_t begin = printed.find(mark, position) + mark.size();
+    position = printed.find('\n', begin);
+    const std::string digits = printed.substr(begin, position - begin);
+    return FromHex(std::string(64 - digits.size(), '0') + digits);
+}
+
+/** A signature of "text" on the curve P-256, as r and s of 32 octets each. */
+std::vector<unsigned char> SignEcdsa()
+{
+    const TemporaryFolder folder;
+    folder.WriteFile("text", "text");
+    RunOpenSsl(
+        "dgst -sha256 -sign " + TestFile("keys/sts-p256-key.pem") + " -out "
+        + folder.GetPath("signature") + " " + folder.GetPath("text"));
+    const std::string printed =
+        RunOpenSsl("asn1parse -inform DER -in " + folder.GetPath("signature"));
+    std::size_t position = 0;
+    std::vector<unsigned char> signature = NumberAfter(printed, position);
+    const std::vector<unsigned char> s = NumberAfter(printed, position);
+    signature.insert(signature.end(), s.begin(), s.end());
+    return signature;
+}
+
 /** The digest of "text" by `sha256sum` and its like. */
 std::vector<unsigned char> DigestOfText(HashAlgorithm algorithm)
 {
@@ -76,7 +103,34 @@ bool VerifiesPss(
         algorithm, DigestOfText(algorithm).data(), signature.data(), signature.size());
 }
 
+bool VerifiesEcdsa(const std::vector<unsigned char>& signature)
+{
+    return ReadCertificate("sts-p256")
+        ->GetPublicKey()
+        .VerifyDigest(
+            HashAlgorithm::SHA256,
+            DigestOfText(HashAlgorithm::SHA256).data(),
+            signature.data(),
+            signature.size());
+}
+
 } // namespace
+
+// [XMLDSIG11 6.4.3]
+TEST(VerifyDigest, TakesTwoNumbersOfTheOrdersLengthAndNothingAround)
+{
+    const std::vector<unsigned char> signature = SignEcdsa();
+    EXPECT_TRUE(VerifiesEcdsa(signature));
+    std::vector<unsigned char> longer = signature;
+    longer.push_back(0);
+    EXPECT_FALSE(VerifiesEcdsa(longer));
+    EXPECT_FALSE(VerifiesEcdsa({signature.begin(), signature.end() - 1}));
+    std::vector<unsigned char> padded = signature;
+    padded.insert(padded.begin(), 0);
+    padded.insert(padded.begin() + 33, 0);
+    EXPECT_FALSE(VerifiesEcdsa(padded));
+    EXPECT_FALSE(VerifiesEcdsa({}));
+}
 
 // [RFC 8017 8.1], [RFC 9231 2.3.10]
 TEST(VerifyPssDigest, TakesASaltAsLongAsTheDigest)

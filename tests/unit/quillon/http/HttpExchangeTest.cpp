@@ -9,6 +9,7 @@
 #include <fcntl.h>
 #include <fstream>
 #include <future>
+#include <poll.h>
 
 using namespace Quillon::Http;
 using namespace Testing;
@@ -449,11 +450,21 @@ TEST(UserAgent, ClosesItsConnectionWhenItGoes)
     EXPECT_TRUE(HasHappened(closed)) << "the I/O thread was not woken up";
 }
 
+/** Until the end of the connection has come. Before, a request may still be lost in it. */
+void WaitForEndOfConnection(int port)
+{
+    pollfd descriptor{FindClientSocket(port), POLLRDHUP, 0};
+    if (descriptor.fd >= 0) { // else the client has already closed it as well
+        EXPECT_EQ(1, poll(&descriptor, 1, static_cast<int>(Generous / 1000)));
+    }
+}
+
 TEST(UserAgent, ConnectsAnewAfterTheServerClosed)
 {
     const TestServer server(AnswerAndClose(MakeReply("200 OK", "pong")));
     HttpClient client(server);
     EXPECT_EQ("pong", client.Post().body);
+    WaitForEndOfConnection(server.GetPort());
     EXPECT_EQ("pong", client.Post().body);
     EXPECT_EQ(2, server.GetConnectionCount());
 }

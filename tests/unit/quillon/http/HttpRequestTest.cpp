@@ -83,6 +83,13 @@ TEST(CreateTCPConnectionSpec, RefusesMalformedHostsAndPorts)
     EXPECT_EQ("Invalid argument : \"a/b\" is not a host name or IP address.", GetArgumentError([&] {
                   CreateTCPConnectionSpec("a/b", 80, false, spec);
               }));
+    for (const std::string host : {"a.1", "1.2.3.256", "1.2.3.4.5", "0x7f", "a.0X"}) {
+        EXPECT_EQ(
+            "Invalid argument : \"" + host + "\" is not a host name or IP address.",
+            GetArgumentError([&] { CreateTCPConnectionSpec(host, 80, false, spec); }));
+    }
+    CreateTCPConnectionSpec("1.a", 80, false, spec);
+    CreateTCPConnectionSpec("a.0xg", 80, false, spec);
     EXPECT_EQ(
         "Invalid argument : The port 0 does not lie between 1 and 65535.",
         GetArgumentError([&] { CreateTCPConnectionSpec("a", 0, false, spec); }));

@@ -240,6 +240,12 @@ TEST(DefineAttribute, MakesADeclarationThatIsLookedUp)
     EXPECT_FALSE(child->HasQName("parent", "urn:p"));
 }
 
+TEST(HasQName, TakesAPrefixThatNobodyDeclaresForNoNamespaceAtAll)
+{
+    EXPECT_TRUE(MakeElement("", "child")->HasQName("child", ""));
+    EXPECT_FALSE(MakeElement("p", "child")->HasQName("child", ""));
+}
+
 // [XML Names 3]
 TEST(LookupNamespace, FindsTheNearestDeclaration)
 {

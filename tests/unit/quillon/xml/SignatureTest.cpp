@@ -143,13 +143,19 @@ Ref<Document> ReadSignedDocument(const std::string& name)
 }
 
 /** What comes of verifying the signature in `parent`: "genuine", "forged", or why it is refused. */
-std::string Verify(ElementNode* parent)
+std::string Verify(ElementNode* parent, const std::string& trusted = "sts")
 {
-    Ref<Signature> signature;
-    CreateSignatureFromDom(parent, parent->FindChildElement("Signature", DsNamespace), signature);
     bool isGenuine = false;
+    Ref<Signature> signature;
+    try {
+        CreateSignatureFromDom(
+            parent, parent->FindChildElement("Signature", DsNamespace), signature);
+    } catch (const SignatureSyntaxException& error) {
+        return error.what();
+    }
     const std::string error = GetSecurityError([&] {
-        isGenuine = signature->Verify(CreateTrustSetKeyResolver(GetTestCertificates("sts")).get());
+        isGenuine =
+            signature->Verify(CreateTrustSetKeyResolver(GetTestCertificates(trusted)).get());
     });
     if (error != "accepted") {
         return error;
@@ -176,6 +182,52 @@ TEST(VerifySignature, TakesAnEmptyReferenceForTheRootOnly)
     EXPECT_EQ(
         Verify(document->GetRootElement()->FindChildElement("p")),
         "The reference covers a whole document of which the signed element is a part");
+}
+
+// [XMLDSIG 4.3.3.3]
+TEST(VerifySignature, CoversTheInstructionsBesideTheRoot)
+{
+    EXPECT_EQ(VerifyInRoot("beside-instructions"), "genuine");
+    EXPECT_EQ(VerifyInRoot("beside-another-comment"), "genuine"); // comments are never signed
+    EXPECT_EQ(VerifyInRoot("beside-another-instruction"), "forged");
+    EXPECT_EQ(VerifyInRoot("beside-one-instruction"), "forged");
+}
+
+TEST(VerifySignature, TakesNoPartOfADigestForTheDigest)
+{
+    EXPECT_EQ(VerifyInRoot("digest-cut"), "forged");
+}
+
+TEST(VerifySignature, RefusesAParameterOfADigest)
+{
+    EXPECT_EQ(
+        VerifyInRoot("digest-method-with-a-child"),
+        "Algorithm 'http://www.w3.org/2001/04/xmlenc#sha256' does not take the parameter 'k'");
+}
+
+TEST(VerifySignature, TakesNoShortKeyThoughItIsTrusted)
+{
+    EXPECT_EQ(
+        Verify(ReadSignedDocument("weak")->GetRootElement(), "weak"),
+        "No trusted key fits signature algorithm "
+        "'http://www.w3.org/2001/04/xmldsig-more#rsa-sha256'; the first one tried is RSA-1024");
+}
+
+TEST(VerifySignature, TakesTheTransformsInTheirOrderOnly)
+{
+    EXPECT_EQ(
+        VerifyInRoot("transforms-swapped"),
+        "Transform 'http://www.w3.org/2001/10/xml-exc-c14n#' stands where enveloped-signature "
+        "must");
+}
+
+TEST(VerifySignature, RefusesWhatStandsBesideABase64Text)
+{
+    EXPECT_EQ(
+        VerifyInRoot("digest-before-a-comment"), "'DigestValue' must hold text and nothing else");
+    EXPECT_EQ(
+        VerifyInRoot("value-before-an-element"),
+        "'SignatureValue' must hold text and nothing else");
 }
 
 TEST(VerifySignature, TakesTheIdOfTheElementAroundTheSignatureOnly)

@@ -312,8 +312,10 @@ TEST_F(AcquireTokenByGSS, ReportsAnAssertionThatDoesNotVerify)
 TEST_F(AcquireTokenByGSS, ToleratesTenMinutesAndNoMore)
 {
     for (const auto& [time, failure] :
-         {std::pair("2026-12-31T00:09:59Z", "none"),
-          std::pair("2026-12-31T00:10:01Z", "SsoException: The token has expired at: ")}) {
+         {std::pair("2025-12-31T23:49:59Z", "SsoException: "),
+          std::pair("2025-12-31T23:50:00Z", "none"),
+          std::pair("2026-12-31T00:09:59Z", "none"),
+          std::pair("2026-12-31T00:10:00Z", "SsoException: The token has expired at: ")}) {
         const FixedClock now(time);
         transport->replies = {NegotiationReply("c1", "", GetSignedAssertion())};
         ScriptedHandler handler({"one"});

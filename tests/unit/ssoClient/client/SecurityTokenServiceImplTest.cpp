@@ -232,11 +232,11 @@ TEST_F(AcquireToken, ToleratesTenMinutesAndNoMore)
 {
     transport->reply = GetSignedAssertion();
     trusted = GetTestCertificates("sts");
-    for (const char* const good : {"2025-12-31T23:50:01Z", "2026-12-31T00:09:59Z"}) {
+    for (const char* const good : {"2025-12-31T23:50:00Z", "2026-12-31T00:09:59Z"}) {
         const FixedClock now(good);
         EXPECT_EQ(GetFailureThrough(responseHandler), "none") << good;
     }
-    for (const char* const bad : {"2025-12-31T23:49:59Z", "2026-12-31T00:10:01Z"}) {
+    for (const char* const bad : {"2025-12-31T23:49:59Z", "2026-12-31T00:10:00Z"}) {
         const FixedClock now(bad);
         EXPECT_THAT(GetFailureThrough(responseHandler), testing::StartsWith("SsoException: "))
             << bad;
