@@ -22,6 +22,11 @@ def _cut(digest):
     return base64.b64encode(base64.b64decode(digest)[:16]).decode()
 
 
+def _with_another_end(digest):
+    octets = base64.b64decode(digest)
+    return base64.b64encode(octets[:-1] + bytes([octets[-1] ^ 1])).decode()
+
+
 def _signed_texts():
     """Signed by `sts` but for the one of `weak`, which is named after it."""
     sts = keys.private_key("sts")
@@ -29,6 +34,7 @@ def _signed_texts():
     whole = f"<r>a{_signature('')}</r>"
     texts["weak"] = sign(whole, keys.private_key("weak"))
     texts["digest-cut"] = sign(whole, sts, digest_form=_cut)
+    texts["digest-with-another-end"] = sign(whole, sts, digest_form=_with_another_end)
     beside = sign_by_xmlsec1(f"<?before a?><!--not signed-->{whole}<?after b?>", sts)
     texts["beside-instructions"] = beside
     texts["beside-another-comment"] = replaced(beside, "not signed", "another")

@@ -14,8 +14,7 @@ bool VisiblyUtilizes(const ElementNode& element, std::string_view prefix) noexce
            || (!prefix.empty()
                && std::any_of(
                    attributes.begin(), attributes.end(), [prefix](const Attribute& attribute) {
-                       return !attribute.IsNamespaceDeclaration()
-                              && attribute.GetPrefix() == prefix;
+                       return attribute.GetPrefix() == prefix;
                    }));
 }
 

@@ -405,6 +405,26 @@ TEST(SendRequestAsync, CallsBackOnceAlthoughItsItemIsLetGo)
     EXPECT_EQ(1, calls);
 }
 
+TEST(SendRequestAsync, CallsBackOnceWithAFailure)
+{
+    const TestServer server(AnswerAll(MakeReply("404 Not Found", "")));
+    std::vector<std::string> told;
+    std::promise<void> callbackIsGone;
+    std::shared_ptr<void> guard(&told, [&](void*) { callbackIsGone.set_value(); });
+    Ref<ScheduledItem> pending;
+    MakeClient(server).CreateSession()->SendRequestAsync(
+        MakeRequest(),
+        [&told, guard](const Exception* error, Reader* reader) {
+            EXPECT_EQ(nullptr, reader);
+            told.emplace_back(error != nullptr ? error->what() : "nothing");
+        },
+        pending);
+    guard.reset();
+    pending.reset();
+    callbackIsGone.get_future().wait(); // nobody can call it any more
+    EXPECT_THAT(told, testing::ElementsAre(StartsWith("Server returned error: 404")));
+}
+
 /** The thread on which a request that this thread sends calls back. */
 std::thread::id GetCallbackThread(const TestServer& server)
 {

@@ -213,11 +213,16 @@ TEST(HandleValidateSubjectResponse, RefusesEachMissingStep)
 
 TEST(HandleValidateSubjectResponse, RefusesCodeThatDoesNotStartWithText)
 {
-    for (const std::string content : {"", "<x/>", "<!-- c -->" WST "/status/valid"}) {
-        EXPECT_THROW(
-            Validate(StatusReply("<wst:Code>" + content + "</wst:Code>")),
-            Quillon::TypeMismatchException)
-            << content;
+    for (const auto& [content, found] :
+         {std::pair("", "nothing"),
+          std::pair("<x/>", "element"),
+          std::pair("<!-- c -->" WST "/status/valid", "comment")}) {
+        try {
+            Validate(StatusReply("<wst:Code>" + std::string(content) + "</wst:Code>"));
+            ADD_FAILURE() << "accepted: " << content;
+        } catch (const Quillon::TypeMismatchException& error) {
+            EXPECT_EQ(error.what(), "Type mismatch: expected text, found " + std::string(found));
+        }
     }
 }
 

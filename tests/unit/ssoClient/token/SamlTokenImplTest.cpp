@@ -284,7 +284,8 @@ TEST_F(SamlTokenTest, GathersGroupsOfAllAttributes)
 TEST_F(SamlTokenTest, TakesTheLastNamesAndSolutionFlag)
 {
     const auto token = MakeToken(WithAttributes(
-        Attribute(Wire::GivenNameClaim, {"Ann", "Second"})
+        Attribute(Wire::GivenNameClaim, {"First"})
+        + Attribute(Wire::GivenNameClaim, {"Ann", "Second"})
         + Attribute(Wire::SurnameClaim, {"Smith"}) + Attribute(Wire::SurnameClaim, {"Miller"})
         + Attribute(Wire::IsSolutionAttribute, {"false"})
         + Attribute(Wire::IsSolutionAttribute, {"TRUE"})));
