@@ -49,7 +49,7 @@ public:
     EVP_PKEY* GetHandle() const noexcept { return _key.get(); }
 
 private:
-    /** r || s of a signature in DER form [XMLDSIG 6.4.3]. */
+    /** r || s of a signature in DER form [XMLDSIG11 6.4.3]. */
     std::vector<unsigned char> ToPlainEcdsa(const std::vector<unsigned char>& der) const
     {
         const unsigned char* in = der.data();

@@ -12,7 +12,7 @@ KeyType GetKeyType(const EVP_PKEY* key);
 /** For messages, for example `RSA-2048` or `EC prime256v1`. */
 std::string DescribeKey(const EVP_PKEY* key);
 
-/** Length of r and of s in an ECDSA signature by `key` [XMLDSIG 6.4.3]. */
+/** Length of r and of s in an ECDSA signature by `key` [XMLDSIG11 6.4.3]. */
 std::size_t GetEcdsaIntegerLength(const EVP_PKEY* key) noexcept;
 
 } // namespace Quillon::Crypto

@@ -38,7 +38,7 @@ RULES = {
         "Signature, digest and canonicalization are of the few that are accepted: no HMAC, no "
         "MD5, no SHA-1, no comments.", "XMLDSIG 6.1"),
     "algorithm-parameters": (
-        "No algorithm but exclusive canonicalization takes a parameter.", "XMLDSIG 4.3.2"),
+        "No algorithm but exclusive canonicalization takes a parameter.", "XMLDSIG 6.1"),
     "prefix-lists": (
         "Exclusive canonicalization has at most one prefix list, which is an empty element with "
         "nothing but its PrefixList of at most 64 prefixes; other algorithms have none.",

@@ -170,6 +170,7 @@ TEST_F(Negotiate, WithKeytabLeavesNoFile)
     EXPECT_EQ(files, GetFiles(kdc->GetFolder()));
 }
 
+// [RFC 4559 4.1]
 TEST_F(Negotiate, AddressesTheHostOfTheUrl)
 {
     KerberosOptions options = WithCacheOfAlice();
@@ -186,6 +187,7 @@ TEST_F(Negotiate, AddressesTheGivenServiceInEveryForm)
     }
 }
 
+// [RFC 4178 3.2]
 TEST_F(Negotiate, OffersKerberosOnlyWhateverElseTheHostHas)
 {
     ASSERT_EQ(1, CountMechanisms("{ 1 3 6 1 4 1 32473 1 }"));

@@ -55,7 +55,7 @@ public:
     /**
      * Verifies a signature over `digest`, which has the length of `algorithm`: PKCS #1 v1.5
      * [RFC 8017 8.2] for RSA; for EC the plain concatenation of r and s that XML Signature uses
-     * [XMLDSIG 6.4.3].
+     * [XMLDSIG11 6.4.3].
      *
      * @return whether it verifies; false also for a value of the wrong form.
      */

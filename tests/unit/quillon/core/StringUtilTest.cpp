@@ -151,7 +151,7 @@ TEST(GenerateUuid, GivesEachThreadOthers)
     EXPECT_EQ(2U * Count, first.size());
 }
 
-// [RFC 4648 10]
+// [RFC 4648 4, 10]
 TEST(Base64Encode, GivesTheTestVectors)
 {
     EXPECT_EQ("", Base64Encode(Bytes("")));
@@ -169,6 +169,7 @@ TEST(Base64Encode, UsesTheWholeAlphabet)
     EXPECT_EQ("++//AA==", Base64Encode(bytes, sizeof bytes));
 }
 
+// [RFC 4648 4]
 TEST(Base64Decode, GivesTheTestVectors)
 {
     EXPECT_EQ(Bytes(""), Decode(""));

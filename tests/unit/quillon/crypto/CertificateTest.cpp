@@ -68,6 +68,7 @@ TEST(CreateCertificate, RefusesEveryTruncationAndAnythingAfterTheEnd)
         "Not a certificate in DER form: 1 bytes follow it");
 }
 
+// [RFC 5280 4.1]
 TEST(Certificate, TellsWhatOpenSslTells)
 {
     const Ref<const Certificate> certificate = LoadCertificate("sts");

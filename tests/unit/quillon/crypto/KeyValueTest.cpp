@@ -220,6 +220,7 @@ TEST(CreateEcPublicKey, MakesTheKeyOfThePoint)
         ReadCertificate("sts-p521")->GetPublicKey().GetEncoded());
 }
 
+// [FIPS 186-4 D.1.2]
 TEST(CreateEcPublicKey, RefusesPointsOffTheCurveAndOtherCurves)
 {
     std::vector<unsigned char> point = PointOf("sts-p256", 65);

@@ -74,7 +74,7 @@ TEST(VerifyDigest, AcceptsItsOwnKeyAndNoOther)
     }
 }
 
-// [XMLDSIG 6.4.3]: r and s, each as long as the curve's order.
+// [XMLDSIG11 6.4.3]: r and s, each as long as the curve's order.
 /** The order of the group of P-256 [FIPS 186-4 D.1.2.3], most significant byte first. */
 constexpr std::array<unsigned char, 32> OrderOfP256{
     0xff, 0xff, 0xff, 0xff, 0x00, 0x00, 0x00, 0x00, 0xff, 0xff, 0xff, 0xff, 0xff, 0xff, 0xff, 0xff,

@@ -536,6 +536,7 @@ void ServeCookies(ServerConnection& connection)
     }
 }
 
+// [RFC 6265 5.4]
 TEST(CookieStore, SendsBackWhatItReceived)
 {
     const TestServer server(&ServeCookies);

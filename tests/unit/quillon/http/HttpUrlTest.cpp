@@ -22,6 +22,7 @@ class GoodUrls : public testing::TestWithParam<GoodUrl>
 {};
 
 // [RFC 9112 3.2.1]
+// [RFC 3986 3.2.2], [RFC 9110 4.2]
 TEST_P(GoodUrls, AreTakenApart)
 {
     bool isHttps = !GetParam().isHttps;
@@ -66,6 +67,7 @@ struct BadUrl
 class BadUrls : public testing::TestWithParam<BadUrl>
 {};
 
+// [RFC 1035 2.3.4]
 TEST_P(BadUrls, AreRefusedWithTheReason)
 {
     bool isHttps = true;

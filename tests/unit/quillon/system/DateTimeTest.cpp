@@ -40,6 +40,7 @@ TEST(DateTime, DefaultIsTheEpoch)
     EXPECT_EQ("1970-01-01T00:00:00.000Z", DateTime().ToString());
 }
 
+// [XML Schema Part 2, 3.2.7]
 TEST(DateTime, ReadsUtcTimes)
 {
     EXPECT_EQ(0, Parse("1970-01-01T00:00:00Z"));

@@ -240,6 +240,7 @@ TEST(DefineAttribute, MakesADeclarationThatIsLookedUp)
     EXPECT_FALSE(child->HasQName("parent", "urn:p"));
 }
 
+// [XML Names 2.1]
 TEST(HasQName, TakesAPrefixThatNobodyDeclaresForNoNamespaceAtAll)
 {
     EXPECT_TRUE(MakeElement("", "child")->HasQName("child", ""));

@@ -228,6 +228,7 @@ TEST(Parse, SaysNoMoreThanALineOfADocumentThatItRefuses)
     }
 }
 
+// [RFC 3629]
 TEST(Parse, RefusesOctetsThatAreNotUtf8)
 {
     const std::vector<std::string> malformed{

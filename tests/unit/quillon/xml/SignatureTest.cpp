@@ -168,6 +168,7 @@ std::string VerifyInRoot(const std::string& name)
     return Verify(ReadSignedDocument(name)->GetRootElement());
 }
 
+// [XMLDSIG 4.3]
 TEST(VerifySignature, RequiresAReference)
 {
     EXPECT_EQ(VerifyInRoot("whole"), "genuine");

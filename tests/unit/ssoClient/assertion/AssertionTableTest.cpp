@@ -45,6 +45,7 @@ class RefusedAssertion : public testing::TestWithParam<Row>
 
 } // namespace
 
+// [SAML-CORE 2]
 TEST_P(AcceptedAssertion, GivesItsFacts)
 {
     const Row& row = GetParam();

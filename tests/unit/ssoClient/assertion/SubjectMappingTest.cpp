@@ -117,6 +117,7 @@ TEST(SubjectMapping, SplitsAUpnAtTheLastSign)
         "{Name: alice@home; Domain:example.com}");
 }
 
+// [SAML-CORE 8.3.2]
 TEST(SubjectMapping, TakesAnEmailAddressForWhatItIs)
 {
     EXPECT_EQ(
@@ -132,6 +133,7 @@ TEST(SubjectMapping, TakesAnEmailAddressForWhatItIs)
         "No rule fits the subject: ");
 }
 
+// [SAML-CORE 8.3.4]
 TEST(SubjectMapping, SplitsAWindowsName)
 {
     EXPECT_EQ(
@@ -152,6 +154,7 @@ TEST(SubjectMapping, NeedsADomainForNamesWithoutOne)
         "{Name: alice; Domain:example.org}");
 }
 
+// [SAML-CORE 8.3.7]
 TEST(SubjectMapping, TakesQualifiersForAPartOfTheName)
 {
     SubjectRule rule = InDomain(Rule(SubjectForm::PERSISTENT), "cxf");
@@ -169,6 +172,7 @@ TEST(SubjectMapping, TakesQualifiersForAPartOfTheName)
         SubjectOf("cxf-bearer-rsa", WithRules({rule})).substr(0, 24), "No rule fits the subject");
 }
 
+// [SAML-CORE 8.3.8]
 TEST(SubjectMapping, NeverTakesATransientName)
 {
     std::vector<SubjectRule> rules;
@@ -192,6 +196,7 @@ TEST(SubjectMapping, NeverTakesATransientName)
         "SPNameQualifier 'https://app.example.com'");
 }
 
+// [RFC 4514], [SAML-CORE 8.3.3]
 TEST(SubjectMapping, TakesADistinguishedNameAsItIsWritten)
 {
     SubjectRule rule = InDomain(Rule(SubjectForm::X509_SUBJECT), "certificates");
@@ -322,6 +327,7 @@ TEST(GroupMapping, NeedsADomainForPlainNames)
         GroupsOf(InDefaultDomain(WithGroups("plain", GroupForm::PLAIN))), "Staff of example.org;");
 }
 
+// [RFC 4514 2.4]
 TEST(GroupMapping, KeepsTheWholeOfADistinguishedName)
 {
     EXPECT_EQ(

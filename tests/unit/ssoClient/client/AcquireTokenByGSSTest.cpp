@@ -106,6 +106,7 @@ TEST_F(AcquireTokenByGSS, UsesOneSessionAndReleasesIt)
     EXPECT_EQ(transport->sessionsAlive, 0);
 }
 
+// [RFC 2743 1.1.2]
 TEST_F(AcquireTokenByGSS, HandsAnEmptyLegOfTheServiceOn)
 {
     transport->replies = {

@@ -296,6 +296,7 @@ TEST(SendRequest, JudgesTheBodyOfASoapFault)
     EXPECT_THROW(Send(*MakeClient(server).CreateSession()), Quillon::Http::HttpException);
 }
 
+// [RFC 9112 4]
 TEST(SendRequest, KeepsTheBlankBeforeAMissingReasonPhrase)
 {
     const TestServer server(AnswerAll(MakeReply("404", "")));

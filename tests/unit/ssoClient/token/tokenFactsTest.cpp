@@ -451,6 +451,7 @@ TEST_F(CommentBesideABlank, MayStandInACertificateOfATree)
         "<!-- -->\n</ds:X509Certificate></ds:X509Data></ds:KeyInfo></saml:Subject")));
 }
 
+// [XML Schema 2, 4.3.6]
 TEST_F(TokenFacts, AnIdHasNoWhiteSpace)
 {
     const auto judge = [](const std::string& id) {
