@@ -56,7 +56,7 @@ PUBLIC_FLOORS = {
         "HolderOfKeyConfig.h": "wire", "Leg.h": "wire", "PrincipalId.h": "wire",
         "SamlToken.h": "wire", "TokenSpec.h": "wire",
         "Assertion.h": "assertion", "SubjectMapping.h": "assertion",
-        "CreateSamlToken.h": "token",
+        "CreateSamlToken.h": "token", "ExchangeOptions.h": "protocol",
         "Descriptions.h": "client", "GssNegotiationContext.h": "client",
         "NegotiationHandler.h": "client", "SecurityTokenService.h": "client",
         "SecurityTokenServiceConfig.h": "client",

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "quillon/Exceptions.h"
+#include "ssoClient/ExchangeOptions.h"
 #include "ssoClient/NegotiationHandler.h"
 #include "ssoClient/SamlToken.h"
 #include "ssoClient/SecurityTokenServiceConfig.h"
@@ -160,5 +161,13 @@ protected:
  */
 SSOCLIENT_API boost::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
     const SecurityTokenServiceConfig& config);
+
+/**
+ * The same with time-outs of the caller's own, and an observer of the exchanges.
+ *
+ * @throws Quillon::InvalidArgumentException  as above, or a time-out is not positive.
+ */
+SSOCLIENT_API boost::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
+    const SecurityTokenServiceConfig& config, const ExchangeOptions& options);
 
 } // namespace SsoClient

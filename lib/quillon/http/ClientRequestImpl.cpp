@@ -25,6 +25,14 @@ bool IsControl(unsigned char character) noexcept
     return (character < 0x20 && character != '\t') || character == 0x7F;
 }
 
+void RequirePositive(long long timeout)
+{
+    if (timeout <= 0) {
+        throw InvalidArgumentException(
+            "The time-out of " + std::to_string(timeout) + " microseconds is not positive.");
+    }
+}
+
 } // namespace
 
 bool HeaderNameLess::operator()(const std::string& a, const std::string& b) const
@@ -52,11 +60,14 @@ void ClientRequestImpl::SetHeader(const std::string& name, const std::string& va
 
 void ClientRequestImpl::SetTimeout(long long timeout)
 {
-    if (timeout <= 0) {
-        throw InvalidArgumentException(
-            "The time-out of " + std::to_string(timeout) + " microseconds is not positive.");
-    }
+    RequirePositive(timeout);
     _timeout = timeout;
+}
+
+void ClientRequestImpl::SetConnectTimeout(long long timeout)
+{
+    RequirePositive(timeout);
+    _connectTimeout = timeout;
 }
 
 void ClientRequestImpl::BodyWriter::Write(const char* bytes, std::size_t size)

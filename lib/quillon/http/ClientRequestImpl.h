@@ -3,6 +3,8 @@
 #include "quillon/Wiped.h"
 #include "quillon/http/ClientRequest.h"
 
+#include <algorithm>
+#include <limits>
 #include <map>
 #include <string>
 
@@ -23,6 +25,8 @@ public:
     Writer* GetBodyWriter() noexcept override { return _writer.get(); }
     void SetTimeout(long long timeout) override;
     void SetBodyStatuses(StatusTest wantsBody) noexcept override { _wantsBody = wantsBody; }
+    void SetConnectTimeout(long long timeout) override;
+    void SetObserver(const ExchangeObserver& observer) override { _observer = observer; }
 
     const std::string& GetPath() const noexcept { return _path; }
     const std::map<std::string, std::string, HeaderNameLess>& GetHeaders() const noexcept
@@ -32,6 +36,9 @@ public:
     const std::string& GetBody() const noexcept { return _writer->text.Get(); }
     long long GetTimeout() const noexcept { return _timeout; }
     StatusTest GetBodyStatuses() const noexcept { return _wantsBody; }
+    /** At most the time-out of the whole exchange. */
+    long long GetConnectTimeout() const noexcept { return std::min(_connectTimeout, _timeout); }
+    const ExchangeObserver& GetObserver() const noexcept { return _observer; }
 
 private:
     class BodyWriter final : public Writer
@@ -46,6 +53,8 @@ private:
     std::map<std::string, std::string, HeaderNameLess> _headers;
     const Ref<BodyWriter> _writer;
     long long _timeout;
+    long long _connectTimeout = std::numeric_limits<long long>::max();
+    ExchangeObserver _observer;
     StatusTest _wantsBody = nullptr;
 };
 

@@ -1,5 +1,6 @@
 #include "http/ConnectionSpecImpl.h"
 
+#include "crypto/Digest.h"
 #include "http/HostSyntax.h"
 
 #include "quillon/StringUtil.h"
@@ -103,6 +104,15 @@ void CreateSSLConnectionSpec(
         IsIpAddress(name));
     spec->pin = isPin ? peer : "";
     out = spec;
+}
+
+std::string GetPin(const Crypto::Certificate& certificate)
+{
+    const std::vector<unsigned char> key = certificate.GetPublicKey().GetEncoded();
+    Crypto::Digest digest(Crypto::HashAlgorithm::SHA256);
+    digest.Update(key.data(), key.size());
+    const Crypto::DigestValue value = digest.Finish();
+    return std::string(PinPrefix) + StringUtil::Base64Encode(value.bytes.data(), value.length);
 }
 
 } // namespace Quillon::Http

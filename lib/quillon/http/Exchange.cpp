@@ -134,4 +134,10 @@ TimeoutException MakeTimeoutException(const std::string& server, long long timeo
         "There was no complete reply from " + server + " within " + FormatSeconds(timeout) + ".");
 }
 
+TimeoutException MakeConnectTimeoutException(const std::string& server, long long timeout)
+{
+    return TimeoutException(
+        "There was no connection to " + server + " within " + FormatSeconds(timeout) + ".");
+}
+
 } // namespace Quillon::Http

@@ -78,4 +78,7 @@ private:
 /** The failure of an exchange whose reply was not complete in time. */
 TimeoutException MakeTimeoutException(const std::string& server, long long timeout);
 
+/** The failure of an exchange whose request could not be sent in time. */
+TimeoutException MakeConnectTimeoutException(const std::string& server, long long timeout);
+
 } // namespace Quillon::Http

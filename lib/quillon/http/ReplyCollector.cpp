@@ -81,6 +81,8 @@ bool ReplyCollector::AddStatusLine(std::string_view line)
     }
     _status.code = code;
     _status.reasonPhrase = Trim(line.substr(digits));
+    _location.clear();
+    _date.clear();
     _hasLength = false;
     _announcesEnd = false;
     _contentLength.reset();
@@ -92,6 +94,9 @@ bool ReplyCollector::AddField(std::string_view name, std::string_view value)
 {
     const std::string lowerName = StringUtil::ToLower(name);
     const std::string lowerValue = StringUtil::ToLower(value);
+    if (_isObserved) {
+        NoteField(lowerName, value);
+    }
     if (lowerName == "content-length") {
         _hasLength = true;
         return !WantsBody() || AddContentLength(value);
@@ -107,6 +112,15 @@ bool ReplyCollector::AddField(std::string_view name, std::string_view value)
         _announcesEnd = _announcesEnd || lowerValue == "close";
     }
     return true;
+}
+
+void ReplyCollector::NoteField(const std::string& lowerName, std::string_view value)
+{
+    if (lowerName == "location") {
+        _location = value;
+    } else if (lowerName == "date") {
+        _date = value;
+    }
 }
 
 bool ReplyCollector::WantsBody() const

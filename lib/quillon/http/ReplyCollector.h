@@ -16,9 +16,13 @@ namespace Quillon::Http {
 class ReplyCollector
 {
 public:
-    /** @param wantsBody  for which status codes the body counts; null: for all. */
-    explicit ReplyCollector(StatusTest wantsBody) noexcept
+    /**
+     * @param wantsBody    for which status codes the body counts; null: for all.
+     * @param isObserved  whether `Location` and `Date` are kept.
+     */
+    ReplyCollector(StatusTest wantsBody, bool isObserved) noexcept
         : _wantsBody(wantsBody)
+        , _isObserved(isObserved)
     {}
 
     /**
@@ -39,6 +43,10 @@ public:
 
     /** The latest status line. */
     const HttpStatus& GetStatus() const noexcept { return _status; }
+
+    /** The fields of these names in the latest head; empty if it has none. */
+    const std::string& GetLocation() const noexcept { return _location; }
+    const std::string& GetDate() const noexcept { return _date; }
 
     /** Whether the head of a final reply is complete. */
     bool HasHead() const noexcept { return _next == Next::BODY || _next == Next::NOTHING; }
@@ -72,12 +80,14 @@ private:
     bool AddStatusLine(std::string_view line);
     bool AddField(std::string_view name, std::string_view value);
     bool EndHead() noexcept;
+    void NoteField(const std::string& lowerName, std::string_view value);
     bool IsInterim() const noexcept;
     bool WantsBody() const;
     bool AddEncoding(std::string_view value, bool isWanted);
     bool AddContentLength(std::string_view value);
 
     const StatusTest _wantsBody;
+    const bool _isObserved;
     Next _next = Next::STATUS;
     std::size_t _headerBytes = 0;
     std::size_t _wireBytes = 0;
@@ -85,6 +95,8 @@ private:
     bool _announcesEnd = false; // of the connection
     std::optional<std::string> _contentLength;
     HttpStatus _status;
+    std::string _location;
+    std::string _date;
     std::string _body;
     std::string _problem;
 };

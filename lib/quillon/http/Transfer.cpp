@@ -1,6 +1,7 @@
 #include "http/Transfer.h"
 
 #include "http/ClientResponseImpl.h"
+#include "http/exchangeReading.h"
 #include "system/SystemError.h"
 
 #include <algorithm>
@@ -43,13 +44,14 @@ Transfer::Transfer(
     , _spec(_pool->GetSpec())
     , _cookies(std::move(cookies))
     , _exchange(std::move(exchange))
-    , _reply(_request->GetBodyStatuses())
-    , _alert(new Ssl::PeerAlert)
+    , _reply(_request->GetBodyStatuses(), !_request->GetObserver().empty())
+    , _record(new Ssl::PeerRecord)
     , _easy(curl_easy_init())
 {
     if (_easy == nullptr) {
         throw std::bad_alloc();
     }
+    _record->isObserved = !_request->GetObserver().empty();
     SetLimits();
     SetTarget();
     SetRequest();
@@ -73,9 +75,8 @@ void Transfer::Set(CURLoption option, T value)
 
 void Transfer::SetLimits()
 {
-    const long timeout = ToMilliseconds(_request->GetTimeout());
-    Set(CURLOPT_TIMEOUT_MS, timeout);
-    Set(CURLOPT_CONNECTTIMEOUT_MS, timeout);
+    Set(CURLOPT_TIMEOUT_MS, ToMilliseconds(_request->GetTimeout()));
+    Set(CURLOPT_CONNECTTIMEOUT_MS, ToMilliseconds(_request->GetConnectTimeout()));
     Set(CURLOPT_NOSIGNAL, 1L);
     // A transfer that ends early does not wait for its name look-up, and with it all the others.
     Set(CURLOPT_QUICK_EXIT, 1L);
@@ -229,18 +230,18 @@ int Transfer::OnProgress(void* self, curl_off_t, curl_off_t, curl_off_t, curl_of
 int Transfer::OnRequest(void* self, char* /*ip*/, char* /*localIp*/, int /*port*/, int /*local*/)
 {
     Transfer& transfer = *static_cast<Transfer*>(self);
-    transfer.FindAlert();
+    transfer.FindRecord();
     transfer._isRepeated = std::exchange(transfer._isSent, true);
     return transfer._isRepeated ? CURL_PREREQFUNC_ABORT : CURL_PREREQFUNC_OK;
 }
 
 /** A connection that was kept has the one of the transfer that opened it. */
-void Transfer::FindAlert()
+void Transfer::FindRecord()
 {
     curl_tlssessioninfo* info = nullptr;
     curl_easy_getinfo(_easy.get(), CURLINFO_TLS_SSL_PTR, &info);
     if (_spec.tls != nullptr && info != nullptr && info->internals != nullptr) {
-        _alert = Ssl::GetAlert(static_cast<const SSL*>(info->internals));
+        _record = Ssl::GetRecord(static_cast<const SSL*>(info->internals));
     }
 }
 
@@ -261,7 +262,7 @@ curl_socket_t Transfer::OnSocket(void* self, curlsocktype /*purpose*/, curl_sock
 CURLcode Transfer::OnSslContext(CURL* /*easy*/, void* context, void* self)
 {
     const Transfer& transfer = *static_cast<Transfer*>(self);
-    return transfer._spec.tls->Prepare(static_cast<SSL_CTX*>(context), transfer._alert)
+    return transfer._spec.tls->Prepare(static_cast<SSL_CTX*>(context), transfer._record)
                ? CURLE_OK
                : CURLE_SSL_CERTPROBLEM;
 }
@@ -271,16 +272,53 @@ Outcome Transfer::Finish(CURLcode result)
     if (_cookies != nullptr) {
         _cookies->Merge(_givenCookies, ReadCookies());
     }
+    Outcome outcome = Judge(result);
+    if (!_request->GetObserver().empty()) {
+        Tell(outcome);
+    }
+    return outcome;
+}
+
+void Transfer::Tell(const Outcome& outcome) const
+{
+    try {
+        _request->GetObserver()(CollectFacts(outcome));
+    } catch (...) { // NOLINT(bugprone-empty-catch): who only looks on changes nothing
+    }
+}
+
+ExchangeFacts Transfer::CollectFacts(const Outcome& outcome) const
+{
+    ExchangeFacts facts = ReadFacts(_easy.get());
+    facts.server = _exchange->GetServer();
+    facts.path = _request->GetPath();
+    facts.tlsVersion = _record->version;
+    facts.tlsCipher = _record->cipher;
+    facts.certificates = _record->certificates;
+    facts.status = _reply.GetStatus().code;
+    facts.location = _reply.GetLocation();
+    facts.date = ParseHttpDate(_reply.GetDate());
+    facts.failure = outcome.error != nullptr ? outcome.error->what() : "";
+    return facts;
+}
+
+Outcome Transfer::Judge(CURLcode result)
+{
     if (IsAnswered(result)) {
         return {nullptr, MakeClientResponse(_reply.GetStatus(), _reply.TakeBody())};
     }
     if (result == CURLE_OPERATION_TIMEDOUT) {
-        return {
-            std::make_shared<TimeoutException>(
-                MakeTimeoutException(_exchange->GetServer(), _request->GetTimeout())),
-            {}};
+        return {std::make_shared<TimeoutException>(DescribeTimeout()), {}};
     }
     return {std::make_shared<HttpException>(Describe(result)), {}};
+}
+
+TimeoutException Transfer::DescribeTimeout() const
+{
+    const long long connectTimeout = _request->GetConnectTimeout();
+    return !_isSent && connectTimeout < _request->GetTimeout()
+               ? MakeConnectTimeoutException(_exchange->GetServer(), connectTimeout)
+               : MakeTimeoutException(_exchange->GetServer(), _request->GetTimeout());
 }
 
 bool Transfer::IsAnswered(CURLcode result) const noexcept
@@ -302,7 +340,7 @@ bool Transfer::IsAnswered(CURLcode result) const noexcept
  */
 bool Transfer::IsCutOff() const noexcept
 {
-    return _spec.tls != nullptr && _reply.EndsWithConnection() && !_alert->isClosed;
+    return _spec.tls != nullptr && _reply.EndsWithConnection() && !_record->isClosed;
 }
 
 CookieLines Transfer::ReadCookies() const
@@ -329,8 +367,8 @@ std::string Transfer::DescribeTlsRefusal() const
 std::string Transfer::DescribeAlert(CURLcode result) const
 {
     const std::string& server = _exchange->GetServer();
-    const std::string words = Ssl::DescribeAlert(_alert->code) + ".";
-    if (!Ssl::IsAboutCertificate(_alert->code)) {
+    const std::string words = Ssl::DescribeAlert(_record->alert) + ".";
+    if (!Ssl::IsAboutCertificate(_record->alert)) {
         return result == CURLE_SSL_CONNECT_ERROR
                    ? "The TLS handshake with " + server + " failed: the server refuses it: " + words
                    : "The server " + server + " ended the TLS connection: " + words;
@@ -378,7 +416,7 @@ std::string Transfer::Describe(CURLcode result) const
     if (!_reply.GetProblem().empty()) {
         return "The reply of " + server + " " + _reply.GetProblem() + ".";
     }
-    if (_alert->code != 0) {
+    if (_record->alert != 0) {
         return DescribeAlert(result);
     }
     if (_isRepeated) {

@@ -28,7 +28,8 @@ public:
     /** Attaches what is shared with other transfers. On the I/O thread. */
     void Prepare();
 
-    /** Judges the result of the transfer. On the I/O thread. */
+    /** Judges the result of the transfer, and tells the observer of the request. On the I/O thread.
+     */
     Outcome Finish(CURLcode result);
 
     CURL* GetHandle() const noexcept { return _easy.get(); }
@@ -53,9 +54,13 @@ private:
     void SetCallbacks();
 
     bool Take(std::string_view headerLine);
-    void FindAlert();
+    void FindRecord();
     bool IsAnswered(CURLcode result) const noexcept;
     bool IsCutOff() const noexcept;
+    Outcome Judge(CURLcode result);
+    void Tell(const Outcome& outcome) const;
+    ExchangeFacts CollectFacts(const Outcome& outcome) const;
+    TimeoutException DescribeTimeout() const;
     CookieLines ReadCookies() const;
     std::string Describe(CURLcode result) const;
     std::string DescribeTlsRefusal() const;
@@ -73,9 +78,9 @@ private:
 
     CookieLines _givenCookies;
     ReplyCollector _reply;
-    Ref<Ssl::PeerAlert> _alert; // of the connection
-    bool _isSent = false;       // libcurl has begun to send the request
-    bool _isRepeated = false;   // libcurl has tried to send it again
+    Ref<Ssl::PeerRecord> _record; // of the connection
+    bool _isSent = false;         // libcurl has begun to send the request
+    bool _isRepeated = false;     // libcurl has tried to send it again
     int _socketError = 0;
     std::array<char, CURL_ERROR_SIZE> _errorText{};
     StringListOwner _headers;

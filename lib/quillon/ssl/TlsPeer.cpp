@@ -19,22 +19,23 @@ int GetPeerSlot()
     return slot;
 }
 
-void ReleaseAlert(void* /*owner*/, void* alert, CRYPTO_EX_DATA* /*data*/, int /*slot*/, long, void*)
+void ReleaseRecord(
+    void* /*owner*/, void* record, CRYPTO_EX_DATA* /*data*/, int /*slot*/, long, void*)
 {
-    delete static_cast<Ref<PeerAlert>*>(alert);
+    delete static_cast<Ref<PeerRecord>*>(record);
 }
 
-/** The slot of an `SSL_CTX` that owns a reference to its `PeerAlert`. */
-int GetAlertSlot()
+/** The slot of an `SSL_CTX` that owns a reference to its `PeerRecord`. */
+int GetRecordSlot()
 {
-    static const int slot = SSL_CTX_get_ex_new_index(0, nullptr, nullptr, nullptr, &ReleaseAlert);
+    static const int slot = SSL_CTX_get_ex_new_index(0, nullptr, nullptr, nullptr, &ReleaseRecord);
     return slot;
 }
 
-bool AttachAlert(SSL_CTX* connection, const Ref<PeerAlert>& alert) noexcept
+bool AttachRecord(SSL_CTX* connection, const Ref<PeerRecord>& record) noexcept
 {
-    std::unique_ptr<Ref<PeerAlert>> owned(new (std::nothrow) Ref<PeerAlert>(alert));
-    if (owned == nullptr || SSL_CTX_set_ex_data(connection, GetAlertSlot(), owned.get()) != 1) {
+    std::unique_ptr<Ref<PeerRecord>> owned(new (std::nothrow) Ref<PeerRecord>(record));
+    if (owned == nullptr || SSL_CTX_set_ex_data(connection, GetRecordSlot(), owned.get()) != 1) {
         return false;
     }
     static_cast<void>(owned.release()); // goes with the connection
@@ -49,12 +50,46 @@ void NoteAlert(const SSL* ssl, int alert)
 {
     const bool isFatal = alert >> 8 == SSL3_AL_FATAL;
     const int code = alert & 0xFF;
-    const Ref<PeerAlert> noted = GetAlert(ssl);
+    const Ref<PeerRecord> noted = GetRecord(ssl);
     if (code == SSL_AD_CLOSE_NOTIFY) {
         noted->isClosed = true;
     } else if (isFatal) {
-        noted->code = code;
+        noted->alert = code;
     }
+}
+
+/** What cannot be decoded is left out: it is for people to look at. */
+void NoteCertificates(const STACK_OF(X509) * shown, PeerRecord& record)
+{
+    for (int i = 0; i < sk_X509_num(shown); ++i) {
+        unsigned char* bytes = nullptr;
+        const int length = i2d_X509(sk_X509_value(shown, i), &bytes);
+        const Crypto::OpenSslMemory<unsigned char> owner(bytes);
+        try {
+            record.certificates.push_back(
+                Crypto::CreateCertificate(bytes, static_cast<std::size_t>(std::max(length, 0))));
+        } catch (const std::exception&) { // NOLINT(bugprone-empty-catch): see above
+        }
+    }
+}
+
+void NoteParameters(const SSL* ssl, PeerRecord& record)
+{
+    record.version = SSL_get_version(ssl);
+    record.cipher = SSL_get_cipher_name(ssl);
+}
+
+/** Looks on while OpenSSL verifies, and changes nothing: a chain that is refused is gone later. */
+int OnVerify(int isAccepted, X509_STORE_CTX* verification)
+{
+    const auto* const ssl = static_cast<const SSL*>(
+        X509_STORE_CTX_get_ex_data(verification, SSL_get_ex_data_X509_STORE_CTX_idx()));
+    const Ref<PeerRecord> record = GetRecord(ssl);
+    if (record->certificates.empty()) {
+        NoteParameters(ssl, *record);
+        NoteCertificates(X509_STORE_CTX_get0_untrusted(verification), *record);
+    }
+    return isAccepted;
 }
 
 /**
@@ -80,11 +115,11 @@ TlsPeer::TlsPeer(Ref<const SSLContextImpl> context, std::string name, bool nameI
     , _nameIsAddress(nameIsAddress)
 {}
 
-bool TlsPeer::Prepare(SSL_CTX* connection, const Ref<PeerAlert>& alert) noexcept
+bool TlsPeer::Prepare(SSL_CTX* connection, const Ref<PeerRecord>& record) noexcept
 {
     // libcurl set most of this already; it stands here so that the safety of a connection does
     // not hang on options of another layer.
-    SSL_CTX_set_verify(connection, SSL_VERIFY_PEER, nullptr);
+    SSL_CTX_set_verify(connection, SSL_VERIFY_PEER, record->isObserved ? &OnVerify : nullptr);
     RequireSecurityLevel(connection);
     // libcurl writes the keys of all connections to the file that SSLKEYLOGFILE names.
     SSL_CTX_set_keylog_callback(connection, nullptr);
@@ -95,7 +130,7 @@ bool TlsPeer::Prepare(SSL_CTX* connection, const Ref<PeerAlert>& alert) noexcept
     SSL_CTX_set_info_callback(connection, &TlsPeer::OnEvent);
     return SSL_CTX_set_min_proto_version(connection, TLS1_2_VERSION) == 1
            && SSL_CTX_set_ex_data(connection, GetPeerSlot(), this) == 1
-           && AttachAlert(connection, alert) && RequireName(connection)
+           && AttachRecord(connection, record) && RequireName(connection)
            && _context->Apply(connection);
 }
 
@@ -116,6 +151,9 @@ void TlsPeer::OnEvent(const SSL* ssl, int where, int result)
 {
     if ((where & SSL_CB_READ_ALERT) == SSL_CB_READ_ALERT) {
         NoteAlert(ssl, result);
+    }
+    if ((where & SSL_CB_HANDSHAKE_DONE) != 0 && GetRecord(ssl)->isObserved) {
+        NoteParameters(ssl, *GetRecord(ssl));
     }
     if ((where & SSL_CB_HANDSHAKE_START) != 0 && SSL_get_session(ssl) == nullptr) {
         OfferSession(ssl);
@@ -166,10 +204,10 @@ TlsPeer::SessionOwner TlsPeer::Take()
     return session;
 }
 
-Ref<PeerAlert> GetAlert(const SSL* connection)
+Ref<PeerRecord> GetRecord(const SSL* connection)
 {
-    const void* const slot = SSL_CTX_get_ex_data(SSL_get_SSL_CTX(connection), GetAlertSlot());
-    return *static_cast<const Ref<PeerAlert>*>(slot);
+    const void* const slot = SSL_CTX_get_ex_data(SSL_get_SSL_CTX(connection), GetRecordSlot());
+    return *static_cast<const Ref<PeerRecord>*>(slot);
 }
 
 std::string DescribeAlert(int code)

@@ -2,16 +2,22 @@
 
 #include "ssl/SSLContextImpl.h"
 
+#include <list>
 #include <string>
 #include <vector>
 
 namespace Quillon::Ssl {
 
-/** What the peer of one connection said about its end. Used on the I/O thread. */
-struct PeerAlert final : public RefCounted
+/** What became known of the peer of one connection. Used on the I/O thread. */
+struct PeerRecord final : public RefCounted
 {
-    int code = 0;          ///< of the alert with which the peer ended it, if not in order
+    int alert = 0;         ///< with which the peer ended the connection, if not in order
     bool isClosed = false; ///< whether the peer ended it in order [RFC 8446 6.1]
+
+    bool isObserved = false; ///< whether the rest is collected
+    std::string version;     ///< of TLS
+    std::string cipher;
+    std::list<Ref<const Crypto::Certificate>> certificates; ///< as shown, the peer's own first
 };
 
 /**
@@ -30,10 +36,10 @@ public:
     /**
      * Sets up `connection`, which must not outlive this object.
      *
-     * @param alert  learns of the alert with which the peer ends the connection.
+     * @param record  learns of the peer.
      * @return success.
      */
-    bool Prepare(SSL_CTX* connection, const Ref<PeerAlert>& alert) noexcept;
+    bool Prepare(SSL_CTX* connection, const Ref<PeerRecord>& record) noexcept;
 
     /** Whether the client has a certificate to show. */
     bool HasIdentity() const noexcept { return _context->HasIdentity(); }
@@ -58,7 +64,7 @@ private:
 };
 
 /** That of a connection that was prepared here. */
-Ref<PeerAlert> GetAlert(const SSL* connection);
+Ref<PeerRecord> GetRecord(const SSL* connection);
 
 /** OpenSSL's words for an alert. */
 std::string DescribeAlert(int code);

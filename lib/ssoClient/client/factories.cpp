@@ -17,11 +17,33 @@ constexpr long long ServiceTimeoutMicroseconds = 240'000'000;
 // Shorter than a service object's: somebody waits at the other end for the next leg.
 constexpr long long ContextTimeoutMicroseconds = 40'000'000;
 
+void RequirePositive(long long timeoutMicroseconds)
+{
+    if (timeoutMicroseconds <= 0) {
+        throw Quillon::InvalidArgumentException(
+            "The time-out of " + std::to_string(timeoutMicroseconds)
+            + " microseconds is not positive.");
+    }
+}
+
+/** @param limits  a time-out, or all options of the exchanges. */
+template <class Limits>
 boost::shared_ptr<HttpsClient> MakeTransport(
-    const SecurityTokenServiceConfig& config, long long timeoutMicroseconds)
+    const SecurityTokenServiceConfig& config, const Limits& limits)
 {
     return boost::make_shared<HttpsClient>(
-        config.url, config.sslContext, config.sslPeerParameter, timeoutMicroseconds);
+        config.url, config.sslContext, config.sslPeerParameter, limits);
+}
+
+template <class Limits>
+boost::shared_ptr<SecurityTokenService> MakeService(
+    const SecurityTokenServiceConfig& config, const Limits& limits)
+{
+    return boost::make_shared<SecurityTokenServiceImpl>(
+        boost::make_shared<RequestBuilderImpl>(config.holderOfKeyConfig),
+        MakeTransport(config, limits),
+        boost::make_shared<ResponseHandlerImpl>(),
+        config.trustedCertificates);
 }
 
 } // namespace
@@ -29,11 +51,15 @@ boost::shared_ptr<HttpsClient> MakeTransport(
 boost::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
     const SecurityTokenServiceConfig& config)
 {
-    return boost::make_shared<SecurityTokenServiceImpl>(
-        boost::make_shared<RequestBuilderImpl>(config.holderOfKeyConfig),
-        MakeTransport(config, ServiceTimeoutMicroseconds),
-        boost::make_shared<ResponseHandlerImpl>(),
-        config.trustedCertificates);
+    return MakeService(config, ServiceTimeoutMicroseconds);
+}
+
+boost::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
+    const SecurityTokenServiceConfig& config, const ExchangeOptions& options)
+{
+    RequirePositive(options.timeoutMicroseconds);
+    RequirePositive(options.connectTimeoutMicroseconds);
+    return MakeService(config, options);
 }
 
 boost::shared_ptr<InternalApi::GssNegotiationContext> InternalApi::CreateGssNegotiationContext(

@@ -3,6 +3,7 @@
 #include "quillon/PanicVerify.h"
 #include "quillon/http/HttpURL.h"
 #include "ssoClient/Exceptions.h"
+#include "ssoClient/protocol/exchangeLog.h"
 #include "ssoClient/wire/assertionPlaces.h"
 
 #include <boost/bind/bind.hpp>
@@ -23,8 +24,30 @@ bool IsAcceptable(int status) noexcept
     return status / 100 == 2 || status == SoapFaultStatus;
 }
 
+ExchangeOptions WithTimeout(long long timeout)
+{
+    ExchangeOptions options;
+    options.timeoutMicroseconds = timeout;
+    options.connectTimeoutMicroseconds = timeout;
+    return options;
+}
+
+/** The observer of the caller, and the log where it wants to know; empty if neither does. */
+Http::ExchangeObserver MakeObserver(const Http::ExchangeObserver& callers)
+{
+    if (!LogsExchanges()) {
+        return callers;
+    }
+    return [callers](const Http::ExchangeFacts& facts) {
+        LogExchange(facts);
+        if (!callers.empty()) {
+            callers(facts);
+        }
+    };
+}
+
 Quillon::Ref<Http::ClientRequest> ComposeRequest(
-    const Request& request, const std::string& path, long long timeout)
+    const Request& request, const std::string& path, const ExchangeOptions& options)
 {
     Quillon::Ref<Http::ClientRequest> httpRequest;
     Http::CreateHttpRequest(Http::HttpMethod::POST, path, httpRequest);
@@ -32,7 +55,9 @@ Quillon::Ref<Http::ClientRequest> ComposeRequest(
     // The action is a quoted string [SOAP11 6.1.1].
     httpRequest->SetHeader("SOAPAction", "\"" + request.soapAction + "\"");
     httpRequest->GetBodyWriter()->Write(request.body.data(), request.body.size());
-    httpRequest->SetTimeout(timeout);
+    httpRequest->SetTimeout(options.timeoutMicroseconds);
+    httpRequest->SetConnectTimeout(options.connectTimeoutMicroseconds);
+    httpRequest->SetObserver(MakeObserver(options.observer));
     httpRequest->SetBodyStatuses(&IsAcceptable);
     return httpRequest;
 }
@@ -44,8 +69,16 @@ HttpsClient::HttpsClient(
     Quillon::Ssl::SSLContext* sslContext,
     const std::string& peer,
     long long timeout)
+    : HttpsClient(url, sslContext, peer, WithTimeout(timeout))
+{}
+
+HttpsClient::HttpsClient(
+    const std::string& url,
+    Quillon::Ssl::SSLContext* sslContext,
+    const std::string& peer,
+    const ExchangeOptions& options)
     : _sslContext(sslContext)
-    , _timeout(timeout)
+    , _options(options)
 {
     bool isHttps = false;
     std::string host;
@@ -66,12 +99,17 @@ HttpsClient::HttpsClient(
 
 boost::shared_ptr<TransportSession> HttpsClient::CreateSession() const
 {
-    return boost::make_shared<HttpsSession>(_connectionSpec.get(), _path, _timeout);
+    return boost::make_shared<HttpsSession>(_connectionSpec.get(), _path, _options);
 }
 
 HttpsSession::HttpsSession(Http::ConnectionSpec* spec, const std::string& path, long long timeout)
+    : HttpsSession(spec, path, WithTimeout(timeout))
+{}
+
+HttpsSession::HttpsSession(
+    Http::ConnectionSpec* spec, const std::string& path, const ExchangeOptions& options)
     : _path(path)
-    , _timeout(timeout)
+    , _options(options)
 {
     Quillon::Ref<Http::CookieStore> cookies;
     Http::CreateCookieStore("", cookies);
@@ -84,7 +122,9 @@ void HttpsSession::SendRequest(const Request& request, Quillon::Ref<Quillon::Rea
     SendRequestAsync(request, boost::bind(&noop), pending);
     Quillon::Ref<Http::ClientResponse> httpResponse;
     _userAgent->WaitForResponse(
-        static_cast<Http::PendingRequestItem*>(pending.get()), _timeout, httpResponse);
+        static_cast<Http::PendingRequestItem*>(pending.get()),
+        _options.timeoutMicroseconds,
+        httpResponse);
     boost::shared_ptr<Quillon::Exception> error;
     TranslateResponse(nullptr, httpResponse.get(), error, response);
     if (error) {
@@ -103,7 +143,7 @@ void HttpsSession::SendRequestAsync(
         boost::placeholders::_1,
         boost::placeholders::_2,
         boost::placeholders::_3);
-    const Quillon::Ref<Http::ClientRequest> httpRequest = ComposeRequest(request, _path, _timeout);
+    const Quillon::Ref<Http::ClientRequest> httpRequest = ComposeRequest(request, _path, _options);
     Quillon::Ref<Http::PendingRequestItem> item;
     _userAgent->SendRequestAsync(httpRequest.get(), completion, item);
     pending = item;

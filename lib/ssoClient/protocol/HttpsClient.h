@@ -5,6 +5,7 @@
 #include "quillon/http/ConnectionSpec.h"
 #include "quillon/http/UserAgent.h"
 #include "quillon/ssl/SSLContext.h"
+#include "ssoClient/ExchangeOptions.h"
 
 #include <string>
 
@@ -29,13 +30,20 @@ public:
         const std::string& peer,
         long long timeout);
 
+    /** The same with all that can be said of the exchanges. */
+    HttpsClient(
+        const std::string& url,
+        Quillon::Ssl::SSLContext* sslContext,
+        const std::string& peer,
+        const ExchangeOptions& options);
+
     boost::shared_ptr<TransportSession> CreateSession() const override;
 
 private:
     Quillon::Ref<Quillon::Http::ConnectionSpec> _connectionSpec;
     Quillon::Ref<Quillon::Ssl::SSLContext> _sslContext;
     std::string _path;
-    long long _timeout;
+    ExchangeOptions _options;
 };
 
 /** A conversation with cookies and connections of its own. */
@@ -43,6 +51,10 @@ class HttpsSession final : public TransportSession
 {
 public:
     HttpsSession(Quillon::Http::ConnectionSpec* spec, const std::string& path, long long timeout);
+    HttpsSession(
+        Quillon::Http::ConnectionSpec* spec,
+        const std::string& path,
+        const ExchangeOptions& options);
 
     void SendRequest(const Request& request, Quillon::Ref<Quillon::Reader>& response) override;
     void SendRequestAsync(
@@ -53,7 +65,7 @@ public:
 private:
     Quillon::Ref<Quillon::Http::UserAgent> _userAgent;
     std::string _path;
-    long long _timeout;
+    ExchangeOptions _options;
 };
 
 /**

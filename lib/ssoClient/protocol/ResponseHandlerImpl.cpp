@@ -4,6 +4,7 @@
 #include "quillon/http/ClientResponse.h"
 #include "quillon/xml/Parser.h"
 #include "ssoClient/Exceptions.h"
+#include "ssoClient/protocol/exchangeLog.h"
 #include "ssoClient/protocol/responseReading.h"
 #include "ssoClient/protocol/xmlSpnego.h"
 #include "ssoClient/wire/assertionPlaces.h"
@@ -59,8 +60,9 @@ bool IsBadCredentials(const QName& code)
     if (code.GetLocalName().empty()) {
         throw SsoException("Invalid SOAP response: missing faultcode.");
     }
+    const std::string faultString = GetElementText(fault.FindChildElement("faultstring"));
+    LogFault(codeText, faultString);
     if (IsBadCredentials(code)) {
-        const std::string faultString = GetElementText(fault.FindChildElement("faultstring"));
         throw InvalidCredentialsException(
             "Authentication failed" + (faultString.empty() ? faultString : ": " + faultString));
     }

@@ -3,6 +3,7 @@
 #include "quillon/Exceptions.h"
 #include "quillon/Reader.h"
 #include "quillon/Ref.h"
+#include "quillon/http/ExchangeFacts.h"
 
 #include <string>
 
@@ -50,6 +51,18 @@ public:
      * or judged, and the connection is closed.
      */
     virtual void SetBodyStatuses(StatusTest wantsBody) noexcept = 0;
+
+    /**
+     * Limits what comes before the request is sent: the name look-up, the connection and the TLS
+     * handshake. A request starts without such a limit of its own.
+     *
+     * @param timeout  as for `SetTimeout`, which also holds.
+     * @throws InvalidArgumentException  `timeout` is not positive.
+     */
+    virtual void SetConnectTimeout(long long timeout) = 0;
+
+    /** Has the facts of the exchange collected and told. Nothing is collected without it. */
+    virtual void SetObserver(const ExchangeObserver& observer) = 0;
 };
 
 /**

@@ -47,4 +47,7 @@ QUILLON_API void CreateSSLConnectionSpec(
     const std::string& peer,
     Ref<ConnectionSpec>& out);
 
+/** `sha256//` and the digest that pins the key of `certificate`. @throws Crypto::CryptoException */
+QUILLON_API std::string GetPin(const Crypto::Certificate& certificate);
+
 } // namespace Quillon::Http

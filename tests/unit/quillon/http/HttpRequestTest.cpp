@@ -75,6 +75,9 @@ TEST(SetTimeout, RefusesWhatIsNotPositive)
     EXPECT_EQ(
         "Invalid argument : The time-out of -1 microseconds is not positive.",
         GetArgumentError([&] { request->SetTimeout(-1); }));
+    EXPECT_EQ(
+        "Invalid argument : The time-out of 0 microseconds is not positive.",
+        GetArgumentError([&] { request->SetConnectTimeout(0); }));
 }
 
 TEST(CreateTCPConnectionSpec, RefusesMalformedHostsAndPorts)

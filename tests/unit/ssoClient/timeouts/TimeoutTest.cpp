@@ -25,6 +25,7 @@ struct Given
     Quillon::Ssl::SSLContext* sslContext;
     std::string peer;
     long long timeout;
+    long long connectTimeout; ///< 0 if it was not given
 };
 std::vector<Given> given;
 std::vector<std::string> sent;
@@ -55,9 +56,18 @@ HttpsClient::HttpsClient(
     Quillon::Ssl::SSLContext* sslContext,
     const std::string& peer,
     long long timeout)
-    : _timeout(timeout)
 {
-    given.push_back({url, sslContext, peer, _timeout});
+    given.push_back({url, sslContext, peer, timeout, 0});
+}
+
+HttpsClient::HttpsClient(
+    const std::string& url,
+    Quillon::Ssl::SSLContext* sslContext,
+    const std::string& peer,
+    const ExchangeOptions& options)
+{
+    given.push_back(
+        {url, sslContext, peer, options.timeoutMicroseconds, options.connectTimeoutMicroseconds});
 }
 
 boost::shared_ptr<TransportSession> HttpsClient::CreateSession() const
@@ -121,6 +131,30 @@ TEST_F(CreateSecurityTokenServiceTest, GivesEachExchange240Seconds)
     CreateSecurityTokenService(config);
     ASSERT_EQ(given.size(), 1U);
     EXPECT_EQ(given[0].timeout, 240'000'000);
+}
+
+TEST_F(CreateSecurityTokenServiceTest, GivesEachExchangeTheLimitsOfItsOptions)
+{
+    ExchangeOptions options;
+    options.timeoutMicroseconds = 30'000'000;
+    options.connectTimeoutMicroseconds = 10'000'000;
+    CreateSecurityTokenService(config, options);
+    ASSERT_EQ(given.size(), 1U);
+    EXPECT_EQ(given[0].timeout, 30'000'000);
+    EXPECT_EQ(given[0].connectTimeout, 10'000'000);
+}
+
+TEST_F(CreateSecurityTokenServiceTest, RefusesLimitsThatAreNotPositive)
+{
+    for (long long ExchangeOptions::*limit :
+         {&ExchangeOptions::timeoutMicroseconds, &ExchangeOptions::connectTimeoutMicroseconds}) {
+        ExchangeOptions options;
+        options.*limit = 0;
+        EXPECT_EQ(
+            GetFailure([&] { CreateSecurityTokenService(config, options); }),
+            "InvalidArgumentException: Invalid argument : The time-out of 0 microseconds is not "
+            "positive.");
+    }
 }
 
 TEST_F(CreateGssNegotiationContextTest, GivesEachExchange40Seconds)
