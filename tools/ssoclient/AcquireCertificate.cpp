@@ -34,7 +34,7 @@ void AddAcquireCertificateCommand(const Command& parent, Invocation& invocation)
     const Command command = parent.AddCommand(
         "certificate", "Acquire a holder-of-key token with one's own key and certificate");
     const auto options = std::make_shared<AcquireCertificateOptions>();
-    options->service.AddTo(command);
+    options->service.AddTo(command, invocation.exchanges);
     options->identity.AddRequiredTo(command);
     options->token.AddTo(command);
     options->output.AddOutTo(command);

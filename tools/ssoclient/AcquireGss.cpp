@@ -73,7 +73,7 @@ void AddAcquireGssCommand(const Command& parent, Invocation& invocation)
     const Command command =
         parent.AddCommand("gss", "Acquire a token with a Kerberos ticket, by SPNEGO");
     const auto options = std::make_shared<AcquireGssOptions>();
-    options->service.AddTo(command);
+    options->service.AddTo(command, invocation.exchanges);
     AddKerberosTo(command, options->kerberos);
     options->identity.AddTo(command);
     options->token.AddTo(command);

@@ -40,7 +40,7 @@ void AddAcquirePasswordCommand(const Command& parent, Invocation& invocation)
     const Command command =
         parent.AddCommand("password", "Acquire a token with a user name and a password");
     const auto options = std::make_shared<AcquirePasswordOptions>();
-    options->service.AddTo(command);
+    options->service.AddTo(command, invocation.exchanges);
     command.AddOption("--user", options->user, "User name")
         .Required()
         .Check(CheckName)

@@ -37,7 +37,7 @@ void AddAcquireTokenCommand(const Command& parent, Invocation& invocation)
     const Command command = parent.AddCommand(
         "token", "Acquire a token by presenting another, for delegation or other properties");
     const auto options = std::make_shared<AcquireTokenOptions>();
-    options->service.AddTo(command);
+    options->service.AddTo(command, invocation.exchanges);
     AddTokenTo(command, options->tokenFile);
     options->identity.AddRequiredTo(command);
     options->token.AddTo(command);

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "CommandLine.h"
+#include "ExchangeRecord.h"
 #include "ExitCode.h"
 #include "Presentation.h"
 
@@ -12,6 +13,7 @@ struct Invocation
     /** What the command does once its arguments are known to be well-formed. */
     std::function<ExitCode()> action;
     Presentation presentation;
+    ExchangeRecord exchanges; ///< with the service
 };
 
 /**

@@ -1,42 +1,17 @@
 #include "Explanation.h"
 
+#include "Duration.h"
 #include "Issuer.h"
 #include "OneLine.h"
 
 #include "quillon/MessageFormatter.h"
 #include "quillon/system/Clock.h"
 
-#include <array>
-
 using Quillon::MessageFormatter;
 using Quillon::Crypto::Certificate;
 using SsoClient::SamlToken;
 
 namespace {
-
-struct Unit
-{
-    long long seconds;
-    const char* name;
-};
-constexpr std::array<Unit, 4> Units = {{{86400, "d"}, {3600, "h"}, {60, "min"}, {1, "s"}}};
-
-/** The two largest units of a duration, as in `4 min 58 s`. */
-std::string DescribeDuration(long long micros)
-{
-    constexpr long long MicrosPerSecond = 1'000'000;
-    long long seconds = micros / MicrosPerSecond;
-    std::string text;
-    for (std::size_t i = 0, shown = 0; i < Units.size() && shown < 2; ++i) {
-        const long long count = seconds / Units[i].seconds;
-        if (count > 0 || shown > 0) {
-            text += (shown > 0 ? " " : "") + std::to_string(count) + " " + Units[i].name;
-            seconds -= count * Units[i].seconds;
-            ++shown;
-        }
-    }
-    return text.empty() ? "0 s" : text;
-}
 
 /** A token outside its validity has been verified only if the clock tolerance allows it. */
 std::string DescribeValidity(const SamlToken& token)

@@ -36,12 +36,15 @@ std::string ToJson(const Failure& failure)
 
 } // namespace
 
-void ReportFailure(const std::exception& error, const Presentation& presentation)
+void ReportFailure(
+    const std::exception& error,
+    const std::optional<Quillon::Http::ExchangeFacts>& exchange,
+    const Presentation& presentation)
 {
     const Failure failure = {
         Quillon::GetClassName(error),
         Shorten(error.what(), MaxMessageBytes),
-        FindHint(error),
+        FindHint(error, exchange),
         GetExitCode(error)};
     if (presentation.json) {
         std::cerr << ToJson(failure) + "\n" << std::flush;

@@ -35,7 +35,7 @@ void AddRenewCommand(const Command& parent, Invocation& invocation)
 {
     const Command command = parent.AddCommand("renew", "Renew a holder-of-key token");
     const auto options = std::make_shared<RenewOptions>();
-    options->service.AddTo(command);
+    options->service.AddTo(command, invocation.exchanges);
     AddTokenTo(command, options->tokenFile);
     command
         .AddOption(

@@ -11,7 +11,15 @@
 #include <arpa/inet.h>
 #include <netinet/in.h>
 
+#include <algorithm>
+
 namespace {
+
+constexpr long long MicrosecondsPerSecond = 1'000'000;
+constexpr long long MaxTimeoutSec = 86'400;
+
+/** Who does not answer by then is not there, or cannot be reached. */
+constexpr long long MaxConnectSec = 10;
 
 struct Server
 {
@@ -68,19 +76,20 @@ Quillon::Ref<Quillon::Ssl::SSLContext> CreateContext(const ServiceOptions& servi
     }
 }
 
-/** The library's logger writes to standard error unless it is given another sink. */
+/** The library's loggers write to standard error unless they are given another sink. */
 void EnableTraceLines()
 {
-    Quillon::Service::GetApp()
-        ->GetLogFacility()
-        .GetLogger("SsoClient")
-        ->SetLevel(Quillon::Service::LOG_LEVEL_TRACE);
+    Quillon::Service::LogFacility& loggers = Quillon::Service::GetApp()->GetLogFacility();
+    for (const char* const name : {"SsoClient", "SsoClient.Exchange"}) {
+        loggers.GetLogger(name)->SetLevel(Quillon::Service::LOG_LEVEL_TRACE);
+    }
 }
 
 } // namespace
 
-void ServiceOptions::AddTo(const Command& owner)
+void ServiceOptions::AddTo(const Command& owner, ExchangeRecord& record)
 {
+    _record = &record;
     const Command command = owner.InGroup("The service");
     command.AddOption("--url", url, "The token service, https://HOST[:PORT]/PATH")
         .Required()
@@ -103,7 +112,18 @@ void ServiceOptions::AddTo(const Command& owner)
         .ValueName("TEXT");
     command.AddFlag(
         "--insecure-http", insecureHttp, "Let an http: URL lead to another machine, in the clear");
-    command.AddFlag("--verbose", verbose, "Write the library's trace lines to standard error");
+    command
+        .AddOption(
+            "--timeout",
+            timeoutSec,
+            "Limit of each exchange with the service in seconds; connecting has at most 10 of them")
+        .Between(1, MaxTimeoutSec)
+        .ValueName("SEC")
+        .ShowDefault();
+    command.AddFlag(
+        "--verbose",
+        verbose,
+        "Write what the library does, and what is exchanged with the service, to standard error");
 }
 
 boost::shared_ptr<SsoClient::SecurityTokenService> ServiceOptions::CreateService(
@@ -122,7 +142,21 @@ boost::shared_ptr<SsoClient::SecurityTokenService> ServiceOptions::CreateService
     config.sslPeerParameter = peer;
     config.holderOfKeyConfig = identity;
     config.sslContext = context.get();
-    return SsoClient::CreateSecurityTokenService(config);
+    return SsoClient::CreateSecurityTokenService(config, GetExchangeOptions());
+}
+
+SsoClient::ExchangeOptions ServiceOptions::GetExchangeOptions() const
+{
+    SsoClient::ExchangeOptions options;
+    options.timeoutMicroseconds = timeoutSec * MicrosecondsPerSecond;
+    options.connectTimeoutMicroseconds =
+        std::min(timeoutSec, MaxConnectSec) * MicrosecondsPerSecond;
+    if (_record != nullptr) {
+        options.observer = [record = _record](const Quillon::Http::ExchangeFacts& facts) {
+            record->Note(facts);
+        };
+    }
+    return options;
 }
 
 std::string ServiceOptions::GetServer() const

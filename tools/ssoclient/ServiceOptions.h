@@ -1,6 +1,7 @@
 #pragma once
 
 #include "CommandLine.h"
+#include "ExchangeRecord.h"
 #include "Trust.h"
 #include "WaitNotice.h"
 
@@ -18,9 +19,14 @@ struct ServiceOptions
     std::vector<std::string> authorityFiles;
     std::string peer;
     bool insecureHttp = false;
+    long long timeoutSec = 240; ///< of each exchange
     bool verbose = false;
 
-    void AddTo(const Command& command);
+    /** @param record  is told of the exchanges of the service. */
+    void AddTo(const Command& command, ExchangeRecord& record);
+
+    /** The limits of the exchanges. */
+    SsoClient::ExchangeOptions GetExchangeOptions() const;
 
     /**
      * Creates the service, and turns its trace lines on if that is asked for.
@@ -36,11 +42,13 @@ struct ServiceOptions
     template <class Call>
     auto Await(const Presentation& presentation, Call call) const
     {
-        const WaitNotice notice(presentation, GetServer());
+        const WaitNotice notice(presentation, GetServer(), timeoutSec);
         return call();
     }
 
 private:
     /** The URL without its path. */
     std::string GetServer() const;
+
+    ExchangeRecord* _record = nullptr;
 };

@@ -31,7 +31,7 @@ void AddValidateCommand(const Command& parent, Invocation& invocation)
     const Command command =
         parent.AddCommand("validate", "Ask the service whether a token's subject is valid");
     const auto options = std::make_shared<ValidateOptions>();
-    options->service.AddTo(command);
+    options->service.AddTo(command, invocation.exchanges);
     AddTokenTo(command, options->tokenFile);
     invocation.presentation.AddTo(command);
     command.ShowExample("ssoclient validate --url https://sts.example.com/sts \\\n      --trust "

@@ -11,7 +11,7 @@
 class WaitNotice
 {
 public:
-    WaitNotice(const Presentation& presentation, const std::string& server);
+    WaitNotice(const Presentation& presentation, const std::string& server, long long timeoutSec);
     WaitNotice(const WaitNotice&) = delete;
     WaitNotice& operator=(const WaitNotice&) = delete;
     ~WaitNotice();

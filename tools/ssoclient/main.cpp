@@ -45,7 +45,7 @@ int main(int argc, char** argv)
         // A command line that is not understood may not have got as far as to set this.
         invocation.presentation.json |=
             std::find(arguments.begin(), arguments.end(), "--json") != arguments.end();
-        ReportFailure(error, invocation.presentation);
+        ReportFailure(error, invocation.exchanges.GetLatest(), invocation.presentation);
         return static_cast<int>(GetExitCode(error));
     }
 }

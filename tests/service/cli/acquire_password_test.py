@@ -6,7 +6,7 @@ import stat
 import unittest
 
 from programs import (BAD_CREDENTIALS, COMMUNICATION, DATA, DESCRIPTION, DONE, REFUSED, USAGE,
-                      DevelopmentSts, ServiceTest, ssoclient)
+                      DevelopmentSts, ServiceTest, operation_lines, ssoclient)
 
 class Acquire(ServiceTest):
     def test_prints_the_redacted_description(self):
@@ -249,7 +249,7 @@ class Verbose(ServiceTest):
         result = self.acquire("--verbose", "--out", out)
         self.assertEqual(DONE, result.code)
         self.assertRegex(result.out, DESCRIPTION)
-        lines = result.err.splitlines()
+        lines = operation_lines(result.err)
         patterns = [
             r"opId=(\S+) START operation SecurityTokenServiceImpl::AcquireToken",
             r"Requested token for subject `alice@example\.test', spec `TokenSpec \[.*'",

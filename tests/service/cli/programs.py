@@ -4,6 +4,7 @@ import collections
 import json
 import os
 import pathlib
+import re
 import subprocess
 import tempfile
 import unittest
@@ -32,6 +33,20 @@ def run(*command, stdin="", environment=None):
 
 def ssoclient(*arguments, stdin="", environment=None):
     return run(SSOCLIENT, *arguments, stdin=stdin, environment=environment)
+
+
+EXCHANGE = (
+    r"\ASsoClient\.Exchange\[64\]: (POST /\S* to \S+ port \d+ \(\S+\): HTTP status \d+"
+    r"(, [A-Za-z ]+ after \d+ ms)+|TLSv1\.3 with \w+, certificate of .+, issued by .+, "
+    r"SHA-256 [0-9a-f]{64}|SOAP fault with code `.+', text `.*')\Z")
+
+
+def operation_lines(trace):
+    """The lines about operations; those in between must be about their exchanges."""
+    lines = trace.splitlines()
+    exchanges = [line for line in lines if line.startswith("SsoClient.Exchange[64]: ")]
+    assert exchanges and all(re.match(EXCHANGE, line) for line in exchanges), trace
+    return [line for line in lines if line not in exchanges]
 
 
 class ProgramTest(unittest.TestCase):

@@ -31,7 +31,8 @@ def loaded_libxml2():
 
 
 class Help(unittest.TestCase):
-    SERVICE = ("--url", "--trust", "--ca", "--peer", "--insecure-http", "--verbose")
+    SERVICE = ("--url", "--trust", "--ca", "--peer", "--insecure-http", "--timeout",
+               "--verbose")
     IDENTITY = ("--key", "--cert", "--key-passphrase-file")
     SPEC = ("--lifetime", "--renewable", "--delegable", "--delegate-to", "--audience", "--advice")
     SPEECH = ("--json", "--quiet", "--explain")
@@ -203,6 +204,12 @@ class UsageErrors(ProgramTest):
                 self.assert_misuse(
                     "inspect", f"--clock-tolerance: `{value}' is not a number of seconds{said}",
                     "x", "--trust", "y", "--clock-tolerance", value)
+
+    def test_timeout_that_is_none(self):
+        for value in ("0", "-1", "86401", "ten", ""):
+            with self.subTest(value=value):
+                self.assert_usage_error(".*--timeout.*", "validate", "--url", "https://h/",
+                                        "--trust", "t", "--token", "t", "--timeout", value)
 
     def test_missing_options(self):
         service = {"--url": "https://127.0.0.1:1/sts", "--trust": STS_CERTIFICATE}

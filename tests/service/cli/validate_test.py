@@ -2,7 +2,8 @@
 
 import unittest
 
-from programs import COMMUNICATION, DATA, DONE, OUT_OF_VALIDITY, REFUSED, USAGE, ServiceTest, ssoclient
+from programs import (COMMUNICATION, DATA, DONE, OUT_OF_VALIDITY, REFUSED, USAGE, ServiceTest,
+                      operation_lines, ssoclient)
 
 
 class Validate(ServiceTest):
@@ -63,7 +64,7 @@ class Validate(ServiceTest):
         token = self.token_file(self.acquire)
         result = self.validate(token, "--verbose")
         self.assertEqual(("valid\n", DONE), (result.out, result.code))
-        lines = result.err.splitlines()
+        lines = operation_lines(result.err)
         self.assertEqual(4, len(lines), result.err)
         self.assertRegex(lines[0], r"START operation SecurityTokenServiceImpl::ValidateSubject\Z")
         self.assertRegex(lines[1], r"Validating subject of token SamlToken \[.+\]\Z")
