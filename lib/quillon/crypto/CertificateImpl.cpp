@@ -1,8 +1,8 @@
 #include "quillon/crypto/Certificate.h"
 
 #include "crypto/Digest.h"
-#include "crypto/Handles.h"
 #include "crypto/PublicKeyImpl.h"
+#include "crypto/handles.h"
 
 #include <array>
 #include <cstdio>

@@ -1,6 +1,6 @@
 #include "crypto/Digest.h"
 
-#include "crypto/Handles.h"
+#include "crypto/handles.h"
 
 namespace Quillon::Crypto {
 

@@ -1,6 +1,6 @@
 #include "crypto/OpenSsl.h"
 
-#include "crypto/Handles.h"
+#include "crypto/handles.h"
 
 #include <system_error>
 

@@ -1,6 +1,6 @@
 #include "quillon/crypto/PrivateKey.h"
 
-#include "crypto/Handles.h"
+#include "crypto/handles.h"
 #include "crypto/keyFacts.h"
 #include "quillon/Wiped.h"
 

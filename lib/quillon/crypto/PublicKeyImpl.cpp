@@ -1,6 +1,6 @@
 #include "crypto/PublicKeyImpl.h"
 
-#include "crypto/Handles.h"
+#include "crypto/handles.h"
 #include "crypto/keyFacts.h"
 
 #include <vector>

@@ -1,6 +1,6 @@
 #include "http/ClientRequestImpl.h"
 
-#include "http/HostSyntax.h"
+#include "http/hostSyntax.h"
 
 #include "quillon/StringUtil.h"
 

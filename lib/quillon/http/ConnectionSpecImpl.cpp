@@ -1,7 +1,7 @@
 #include "http/ConnectionSpecImpl.h"
 
 #include "crypto/Digest.h"
-#include "http/HostSyntax.h"
+#include "http/hostSyntax.h"
 
 #include "quillon/StringUtil.h"
 

@@ -1,6 +1,6 @@
 #include "http/HttpEngine.h"
 
-#include "system/SystemError.h"
+#include "system/systemError.h"
 #include "threads/ProcessEnd.h"
 #include "threads/SignalBlock.h"
 

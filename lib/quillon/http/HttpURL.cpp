@@ -1,6 +1,6 @@
 #include "quillon/http/HttpURL.h"
 
-#include "http/HostSyntax.h"
+#include "http/hostSyntax.h"
 
 #include "quillon/StringUtil.h"
 

@@ -2,7 +2,7 @@
 
 #include "http/ClientResponseImpl.h"
 #include "http/exchangeReading.h"
-#include "system/SystemError.h"
+#include "system/systemError.h"
 
 #include <algorithm>
 #include <cerrno>

@@ -1,6 +1,6 @@
 #include "quillon/service/Logger.h"
 
-#include "service/LogText.h"
+#include "service/logText.h"
 #include "system/ProcessMutex.h"
 
 #include <atomic>

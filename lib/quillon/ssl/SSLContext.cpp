@@ -1,6 +1,6 @@
 #include "ssl/SSLContextImpl.h"
 
-#include "crypto/Handles.h"
+#include "crypto/handles.h"
 
 #include <utility>
 

@@ -1,6 +1,6 @@
 #include "threads/ElasticPool.h"
 
-#include "system/SystemError.h"
+#include "system/systemError.h"
 #include "threads/SignalBlock.h"
 
 #include "quillon/Exceptions.h"

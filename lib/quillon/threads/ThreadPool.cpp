@@ -1,6 +1,6 @@
 #include "quillon/system/ThreadPool.h"
 
-#include "crypto/Initialisation.h"
+#include "crypto/initialisation.h"
 #include "threads/ElasticPool.h"
 #include "threads/ProcessEnd.h"
 

@@ -2,7 +2,7 @@
 
 #include "crypto/OpenSsl.h"
 #include "http/Curl.h"
-#include "xml/ParserVersion.h"
+#include "xml/parserVersion.h"
 
 namespace Quillon {
 

@@ -1,6 +1,6 @@
 #include "quillon/xml/Node.h"
 
-#include "core/Quote.h"
+#include "core/quote.h"
 #include "quillon/Exceptions.h"
 #include "xml/Arena.h"
 #include "xml/characters.h"

@@ -1,6 +1,6 @@
 #include "quillon/xml/Parser.h"
 #include "xml/Escape.h"
-#include "xml/TreeWalk.h"
+#include "xml/treeWalk.h"
 
 namespace Quillon::Xml {
 

@@ -1,9 +1,9 @@
 #include "quillon/xml/Parser.h"
 
-#include "core/Quote.h"
-#include "xml/ParserVersion.h"
-#include "xml/SourceCheck.h"
+#include "core/quote.h"
 #include "xml/TreeBuilder.h"
+#include "xml/parserVersion.h"
+#include "xml/sourceCheck.h"
 
 #include <libxml/SAX2.h>
 #include <libxml/parser.h>

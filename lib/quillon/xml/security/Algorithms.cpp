@@ -1,6 +1,6 @@
 #include "xml/security/Algorithms.h"
 
-#include "core/Quote.h"
+#include "core/quote.h"
 #include "crypto/acceptedKeys.h"
 
 #include "quillon/xml/security/Exceptions.h"

@@ -1,11 +1,11 @@
-#include "core/Quote.h"
+#include "core/quote.h"
 #include "quillon/StringUtil.h"
 #include "quillon/xml/security/Identifiers.h"
 #include "quillon/xml/security/Signature.h"
 #include "xml/Arena.h"
 #include "xml/security/Algorithms.h"
-#include "xml/security/CanonicalDigest.h"
-#include "xml/security/SignatureTarget.h"
+#include "xml/security/canonicalDigest.h"
+#include "xml/security/signatureTarget.h"
 
 #include <list>
 

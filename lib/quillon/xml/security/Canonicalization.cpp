@@ -1,10 +1,10 @@
 #include "xml/security/Canonicalization.h"
-#include "core/Quote.h"
+#include "core/quote.h"
 
 #include "quillon/xml/security/Canonicalizer.h"
 #include "quillon/xml/security/Identifiers.h"
-#include "xml/TreeWalk.h"
 #include "xml/security/PrefixTable.h"
+#include "xml/treeWalk.h"
 
 #include <algorithm>
 #include <tuple>

@@ -1,11 +1,11 @@
-#include "core/Quote.h"
+#include "core/quote.h"
 #include "quillon/xml/security/Identifiers.h"
 #include "xml/security/Algorithms.h"
-#include "xml/security/CanonicalDigest.h"
 #include "xml/security/Canonicalization.h"
-#include "xml/security/NamespaceCoverage.h"
 #include "xml/security/SignatureModel.h"
-#include "xml/security/SignatureTarget.h"
+#include "xml/security/canonicalDigest.h"
+#include "xml/security/namespaceCoverage.h"
+#include "xml/security/signatureTarget.h"
 
 #include <algorithm>
 #include <cstring>

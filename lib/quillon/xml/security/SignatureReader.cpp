@@ -1,8 +1,8 @@
-#include "core/Quote.h"
+#include "core/quote.h"
 #include "quillon/StringUtil.h"
 #include "quillon/xml/security/Identifiers.h"
-#include "xml/TreeWalk.h"
 #include "xml/security/SignatureModel.h"
+#include "xml/treeWalk.h"
 
 #include <algorithm>
 #include <array>

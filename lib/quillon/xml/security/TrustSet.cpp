@@ -1,6 +1,6 @@
 #include "quillon/xml/security/Signature.h"
 
-#include "core/Quote.h"
+#include "core/quote.h"
 
 #include <algorithm>
 

@@ -1,4 +1,4 @@
-#include "xml/SourceCheck.h"
+#include "xml/sourceCheck.h"
 
 #include "quillon/xml/Parser.h"
 #include "xml/characters.h"

@@ -1,4 +1,4 @@
-#include "xml/security/NamespaceCoverage.h"
+#include "xml/security/namespaceCoverage.h"
 
 #include <algorithm>
 

@@ -1,9 +1,9 @@
-#include "xml/security/SignatureTarget.h"
-#include "core/Quote.h"
+#include "xml/security/signatureTarget.h"
+#include "core/quote.h"
 
 #include "quillon/xml/security/Exceptions.h"
 #include "xml/Arena.h"
-#include "xml/TreeWalk.h"
+#include "xml/treeWalk.h"
 
 #include <algorithm>
 #include <string_view>

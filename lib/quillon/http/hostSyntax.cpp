@@ -1,4 +1,4 @@
-#include "http/HostSyntax.h"
+#include "http/hostSyntax.h"
 
 #include "quillon/Exceptions.h"
 

@@ -1,4 +1,4 @@
-#include "xml/security/CanonicalDigest.h"
+#include "xml/security/canonicalDigest.h"
 
 namespace Quillon::Xml::Security {
 

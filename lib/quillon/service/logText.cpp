@@ -1,4 +1,4 @@
-#include "service/LogText.h"
+#include "service/logText.h"
 
 #include <algorithm>
 #include <string_view>

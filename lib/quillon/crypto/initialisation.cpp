@@ -1,4 +1,4 @@
-#include "crypto/Initialisation.h"
+#include "crypto/initialisation.h"
 
 #include "crypto/OpenSsl.h"
 
