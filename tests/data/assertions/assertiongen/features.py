@@ -46,6 +46,10 @@ def _types():
              assertion(**typed), declare={"s2": names.SAML},
              attributes_of_assertion=' xsi:type="s2:AssertionType"'),
          "does not cover what the prefix of the xsi:type 's2:AssertionType'")
+    _row("type-of-its-own", "the type that the element has anyway", section,
+         assertion(**typed),
+         assertion(declare=_XSI, attributes_of_assertion=' xsi:type="saml:AdviceType"'),
+         "The xsi:type of 'saml:Assertion' at 1,1 is")
     _row("type-by-a-listed-prefix", "a prefix of the InclusiveNamespaces list", section,
          assertion(declare={**_XSI, "s2": names.SAML}, sign={"prefix_list": "s2"},
                    attributes_of_assertion=' xsi:type="s2:AssertionType"'),
