@@ -27,3 +27,4 @@ void AddAcquireGssCommand(const Command& parent, Invocation& invocation);
 void AddRenewCommand(const Command& parent, Invocation& invocation);
 void AddValidateCommand(const Command& parent, Invocation& invocation);
 void AddInspectCommand(const Command& parent, Invocation& invocation);
+void AddDoctorCommand(const Command& parent, Invocation& invocation);

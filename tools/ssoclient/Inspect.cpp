@@ -58,7 +58,7 @@ void AddInspectCommand(const Command& parent, Invocation& invocation)
         .Required()
         .Check(CheckNotEmpty)
         .ValueName("");
-    AddTrustTo(command, options->trustFiles);
+    AddTrustTo(command, options->trustFiles).Required();
     command
         .AddOption(
             "--clock-tolerance",

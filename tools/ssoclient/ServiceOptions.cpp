@@ -21,13 +21,6 @@ constexpr long long MaxTimeoutSec = 86'400;
 /** Who does not answer by then is not there, or cannot be reached. */
 constexpr long long MaxConnectSec = 10;
 
-struct Server
-{
-    bool isHttps = false;
-    std::string host;
-    int port = 0;
-};
-
 Server ParseServer(const std::string& url)
 {
     Server server;
@@ -61,9 +54,7 @@ void RequireSecureOrWanted(const Server& server, bool insecureHttp)
  */
 Quillon::Ref<Quillon::Ssl::SSLContext> CreateContext(const ServiceOptions& service)
 {
-    const Server server = ParseServer(service.url);
-    RequireSecureOrWanted(server, service.insecureHttp);
-    if (!server.isHttps) {
+    if (!service.RequireServer().isHttps) {
         return {};
     }
     Quillon::Ssl::SSLContextOptions options;
@@ -87,14 +78,17 @@ void EnableTraceLines()
 
 } // namespace
 
-void ServiceOptions::AddTo(const Command& owner, ExchangeRecord& record)
+void ServiceOptions::AddTo(const Command& owner, ExchangeRecord& record, Trust trust)
 {
     _record = &record;
     const Command command = owner.InGroup("The service");
     command.AddOption("--url", url, "The token service, https://HOST[:PORT]/PATH")
         .Required()
         .ValueName("URL");
-    AddTrustTo(command, trustFiles);
+    const Option trustOption = AddTrustTo(command, trustFiles);
+    if (trust == Trust::REQUIRED) {
+        trustOption.Required();
+    }
     command
         .AddOption(
             "--ca",
@@ -157,6 +151,13 @@ SsoClient::ExchangeOptions ServiceOptions::GetExchangeOptions() const
         };
     }
     return options;
+}
+
+Server ServiceOptions::RequireServer() const
+{
+    const Server server = ParseServer(url);
+    RequireSecureOrWanted(server, insecureHttp);
+    return server;
 }
 
 std::string ServiceOptions::GetServer() const

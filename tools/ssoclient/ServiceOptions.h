@@ -11,6 +11,14 @@
 #include <string>
 #include <vector>
 
+/** Where a URL leads. */
+struct Server
+{
+    bool isHttps = false;
+    std::string host;
+    int port = 0;
+};
+
 /** The options of every command that talks to a token service. */
 struct ServiceOptions
 {
@@ -22,8 +30,17 @@ struct ServiceOptions
     long long timeoutSec = 240; ///< of each exchange
     bool verbose = false;
 
+    enum class Trust
+    {
+        REQUIRED,
+        OPTIONAL
+    };
+
     /** @param record  is told of the exchanges of the service. */
-    void AddTo(const Command& command, ExchangeRecord& record);
+    void AddTo(const Command& command, ExchangeRecord& record, Trust trust = Trust::REQUIRED);
+
+    /** @throws UsageError  passwords would go there in the clear, and nobody has allowed that. */
+    Server RequireServer() const;
 
     /** The limits of the exchanges. */
     SsoClient::ExchangeOptions GetExchangeOptions() const;

@@ -21,12 +21,11 @@ CertificateList ReadCertificateFile(const std::string& file)
 
 } // namespace
 
-void AddTrustTo(const Command& command, std::vector<std::string>& trustFiles)
+Option AddTrustTo(const Command& command, std::vector<std::string>& trustFiles)
 {
-    command
+    return command
         .AddOption(
             "--trust", trustFiles, "PEM files with the certificates that may have signed the token")
-        .Required()
         .Check(CheckNotEmpty)
         .ValueName("PEM");
 }

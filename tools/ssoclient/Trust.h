@@ -10,8 +10,8 @@
 
 using CertificateList = std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>;
 
-/** Adds the required `--trust PEM...`. */
-void AddTrustTo(const Command& command, std::vector<std::string>& trustFiles);
+/** Adds `--trust PEM...`. */
+Option AddTrustTo(const Command& command, std::vector<std::string>& trustFiles);
 
 /**
  * Reads all certificates of the PEM files.

@@ -18,6 +18,7 @@ void AddCommands(const Command& program, Invocation& invocation)
     AddRenewCommand(program, invocation);
     AddValidateCommand(program, invocation);
     AddInspectCommand(program, invocation);
+    AddDoctorCommand(program, invocation);
 }
 
 ExitCode Run(const std::vector<std::string>& arguments, Invocation& invocation)

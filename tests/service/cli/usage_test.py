@@ -64,7 +64,7 @@ class Help(unittest.TestCase):
                 self.assert_prints(ssoclient(*command.split(), "--help"), *options)
 
     COMMANDS = ("", "acquire", "acquire password", "acquire certificate", "acquire token",
-                "acquire gss", "renew", "validate", "inspect")
+                "acquire gss", "renew", "validate", "inspect", "doctor")
 
     def test_fits_into_80_columns(self):
         for command in self.COMMANDS:
@@ -137,7 +137,7 @@ class UsageErrors(ProgramTest):
         self.assert_misused(ssoclient(*command.split(), *arguments), command, message)
 
     def test_without_a_command(self):
-        self.assert_misuse("", "ssoclient needs a command: acquire, renew, validate, inspect")
+        self.assert_misuse("", "ssoclient needs a command: acquire, renew, validate, inspect, doctor")
         self.assert_misuse("acquire", "ssoclient acquire needs a command: password, certificate, "
                            "token, gss")
 
