@@ -26,10 +26,10 @@ def minutes_from_now(minutes):
     return time.strftime("%Y-%m-%dT%H:%M:%S.000Z")
 
 
-def write(time=SOME_TIME, key="client"):
+def write(time=SOME_TIME, key="client", dialect=()):
     """The text of every request by its name, written at a time by the holder of a key."""
     with tempfile.TemporaryDirectory() as folder:
-        subprocess.run([os.environ["INTEROP_REQUESTS"], folder, key, time], check=True)
+        subprocess.run([os.environ["INTEROP_REQUESTS"], folder, key, time, *dialect], check=True)
         texts = {path.stem: path.read_text("utf-8") for path in pathlib.Path(folder).iterdir()}
     assert sorted(texts) == sorted(SIGNED + UNSIGNED), sorted(texts)
     return texts

@@ -38,6 +38,11 @@ class Schemas(unittest.TestCase):
             with self.subTest(request=name):
                 self.assertEqual([], self.errors(text))
 
+    def test_requests_of_the_dialect_of_cxf_are_valid(self):
+        for name, text in messages.write(dialect=["cxf"]).items():
+            with self.subTest(request=name):
+                self.assertEqual([], self.errors(text))
+
     def test_every_namespace_but_that_of_the_advice_has_its_schema(self):
         used = {etree.QName(element).namespace for text in self.requests.values()
                 for element in etree.fromstring(text.encode()).iter()}

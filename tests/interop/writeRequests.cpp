@@ -1,5 +1,5 @@
 // Writes every kind of request that the library builds to a file of its own, for other programs
-// to judge: interop_requests FOLDER KEY TIME, where KEY names a key of the test data.
+// to judge: interop_requests FOLDER KEY TIME [DIALECT], where KEY names a key of the test data.
 
 #include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/protocol/RequestBuilderImpl.h"
@@ -10,6 +10,7 @@
 #include <fstream>
 #include <functional>
 #include <iostream>
+#include <map>
 
 using namespace SsoClient;
 
@@ -33,24 +34,41 @@ TokenSpec MakeDelegatingSpec()
 }
 
 /** A token spec with every field set. */
-TokenSpec MakeFullSpec()
+TokenSpec MakeFullSpec(AudienceForm form)
 {
     TokenSpec spec = MakeDelegatingSpec();
     spec.renewable = true;
     spec.delegable = true;
     spec.audienceRestriction = {"https://one.example.com", "https://two.example.com/a?b&c"};
+    if (form == AudienceForm::APPLIES_TO) {
+        spec.audienceRestriction.erase("https://one.example.com");
+    }
     spec.advice = {
         {"urn:source", {{"urn:name", {"value", "<&\">"}}, {"urn:empty", {}}}}, {"urn:nothing", {}}};
     return spec;
 }
 
+RequestForm MakeForm(const std::string& dialect)
+{
+    const std::map<std::string, ServiceDialect> dialects = {
+        {"default", ServiceDialect::Default()},
+        {"cxf", ServiceDialect::ApacheCxf()},
+        {"adfs13", ServiceDialect::AdFs13()},
+        {"adfs2005", ServiceDialect::AdFs2005()}};
+    RequestForm form;
+    form.dialect = dialects.at(dialect);
+    form.url = "https://sts.example.com/trust";
+    return form;
+}
+
 class RequestWriter
 {
 public:
-    RequestWriter(const std::string& folder, const std::string& key)
+    RequestWriter(const std::string& folder, const std::string& key, const RequestForm& form)
         : _folder(folder)
-        , _withoutKey(boost::none)
-        , _withKey(HolderOfKeyConfig{GetTestKey(key), GetTestCertificates(key).front()})
+        , _fullSpec(MakeFullSpec(form.dialect.audienceForm))
+        , _withoutKey(boost::none, form)
+        , _withKey(HolderOfKeyConfig{GetTestKey(key), GetTestCertificates(key).front()}, form)
     {}
 
     void WriteAll() const
@@ -70,7 +88,7 @@ private:
                 builder.BuildUserPassTokenRequest("jdoe", "s3cret", spec, request);
             };
         Write("password", [&](Request& out) { build(_withoutKey, TokenSpec(), out); });
-        Write("password-full", [&](Request& out) { build(_withoutKey, MakeFullSpec(), out); });
+        Write("password-full", [&](Request& out) { build(_withoutKey, _fullSpec, out); });
         Write("password-signed", [&](Request& out) { build(_withKey, TokenSpec(), out); });
         Write("password-delegating", [&](Request& out) {
             build(_withKey, MakeDelegatingSpec(), out);
@@ -83,7 +101,7 @@ private:
             _withKey.BuildCertificateTokenRequest(TokenSpec(), out);
         });
         Write("certificate-full", [&](Request& out) {
-            _withKey.BuildCertificateTokenRequest(MakeFullSpec(), out);
+            _withKey.BuildCertificateTokenRequest(_fullSpec, out);
         });
     }
 
@@ -93,7 +111,7 @@ private:
             _withKey.BuildExchangeTokenRequest(*_holderOfKey, TokenSpec(), out);
         });
         Write("exchange-full", [&](Request& out) {
-            _withKey.BuildExchangeTokenRequest(*_holderOfKey, MakeFullSpec(), out);
+            _withKey.BuildExchangeTokenRequest(*_holderOfKey, _fullSpec, out);
         });
         Write("exchange-bearer", [&](Request& out) {
             _withKey.BuildExchangeTokenRequest(*_bearer, TokenSpec(), out);
@@ -112,7 +130,7 @@ private:
     {
         const Leg leg{'l', 'e', 'g'};
         Write("negotiation-first", [&](Request& out) {
-            _withoutKey.BuildInitialSPNegoRequest(MakeFullSpec(), leg, out);
+            _withoutKey.BuildInitialSPNegoRequest(_fullSpec, leg, out);
         });
         Write("negotiation-first-signed", [&](Request& out) {
             _withKey.BuildInitialSPNegoRequest(TokenSpec(), leg, out);
@@ -132,6 +150,7 @@ private:
     }
 
     const std::string _folder;
+    const TokenSpec _fullSpec;
     const RequestBuilderImpl _withoutKey;
     const RequestBuilderImpl _withKey;
     const TokenPtr _holderOfKey = ReadToken("holder-of-key");
@@ -142,12 +161,13 @@ private:
 
 int main(int argc, char** argv)
 {
-    if (argc != 4) {
-        std::cerr << "usage: interop_requests FOLDER KEY TIME\n";
+    if (argc != 4 && argc != 5) {
+        std::cerr << "usage: interop_requests FOLDER KEY TIME [DIALECT]\n";
         return 2;
     }
     try {
-        const RequestWriter writer(argv[1], argv[2]);
+        const RequestForm form = argc == 5 ? MakeForm(argv[4]) : RequestForm();
+        const RequestWriter writer(argv[1], argv[2], form);
         const FixedClock clock(argv[3]);
         writer.WriteAll();
     } catch (const std::exception& error) {

@@ -24,6 +24,7 @@ inline bool Xmlsec1Verifies(
     const std::string command =
         "xmlsec1 --verify --pubkey-cert-pem '" TEST_DATA_DIR "/keys/" + certificateName
         + "-cert.pem' --id-attr:Id Body --id-attr:Id Timestamp --id-attr:ID Assertion"
+          " --id-attr:Id Action --id-attr:Id MessageID --id-attr:Id ReplyTo --id-attr:Id To"
           " --node-xpath '"
         + xpath + "' '" + file + "' >/dev/null 2>&1";
     const int status = std::system(command.c_str());

@@ -3,6 +3,9 @@
 #include "quillon/crypto/Certificate.h"
 #include "quillon/ssl/SSLContext.h"
 #include "ssoClient/HolderOfKeyConfig.h"
+#include "ssoClient/PasswordCredentials.h"
+#include "ssoClient/ServiceDialect.h"
+#include "ssoClient/SoapFault.h"
 
 #include <boost/optional.hpp>
 
@@ -35,6 +38,18 @@ struct SecurityTokenServiceConfig
      * Not owned here, kept by reference by the service; null only for an `http:` URL.
      */
     Quillon::Ssl::SSLContext* sslContext = nullptr;
+
+    /** How the service wants to be spoken to; absent for the one that the library was made for. */
+    boost::optional<ServiceDialect> dialect;
+
+    /**
+     * Who asks, where the operation does not say and the dialect wants to know: in renewals,
+     * validations, and requests that present a token in their body.
+     */
+    boost::optional<PasswordCredentials> credentials;
+
+    /** Shown every fault of the service; empty for none. Called by any number of threads. */
+    FaultObserver faultObserver;
 };
 
 } // namespace SsoClient

@@ -1,8 +1,8 @@
 #include "ssoClient/client/GssNegotiationContextImpl.h"
 
 #include "quillon/Exceptions.h"
-#include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/client/LegDriver.h"
+#include "ssoClient/client/tokenReading.h"
 
 #include <boost/smart_ptr/make_shared.hpp>
 
@@ -13,12 +13,14 @@ GssNegotiationContextImpl::GssNegotiationContextImpl(
     const boost::shared_ptr<const RequestBuilder>& requestBuilder,
     const boost::shared_ptr<TransportSession>& session,
     const boost::shared_ptr<const ResponseHandler>& responseHandler,
-    const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates)
+    const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates,
+    const boost::optional<ServiceDialect>& dialect)
     : _spec(spec)
     , _requestBuilder(requestBuilder)
     , _session(session)
     , _responseHandler(responseHandler)
     , _trustedCertificates(trustedCertificates)
+    , _dialect(dialect)
 {
     if (_trustedCertificates.empty()) {
         throw Quillon::InvalidArgumentException("No STS trusted certificates provided");
@@ -35,7 +37,8 @@ NegotiationResult GssNegotiationContextImpl::NegotiateToken(const Leg& leg)
     NegotiationResult result;
     result.leg = boost::make_shared<Leg>(response.leg);
     if (!response.token.empty()) {
-        result.token = CreateSamlToken(response.token, _trustedCertificates);
+        result.token = ReadToken(
+            response.token, _trustedCertificates, _dialect ? _dialect->reading : boost::none);
     }
     return result;
 }

@@ -19,7 +19,8 @@ public:
         const boost::shared_ptr<const RequestBuilder>& requestBuilder,
         const boost::shared_ptr<TransportSession>& session,
         const boost::shared_ptr<const ResponseHandler>& responseHandler,
-        const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates);
+        const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates,
+        const boost::optional<ServiceDialect>& dialect = boost::none);
 
     NegotiationResult NegotiateToken(const Leg& leg) override;
 
@@ -30,6 +31,7 @@ private:
     boost::shared_ptr<TransportSession> _session;
     boost::shared_ptr<const ResponseHandler> _responseHandler;
     std::list<Quillon::Ref<const Quillon::Crypto::Certificate>> _trustedCertificates;
+    boost::optional<ServiceDialect> _dialect;
 };
 
 } // namespace SsoClient::InternalApi

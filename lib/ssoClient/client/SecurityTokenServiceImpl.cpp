@@ -1,12 +1,12 @@
 #include "ssoClient/client/SecurityTokenServiceImpl.h"
 
 #include "quillon/MessageFormatter.h"
-#include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/client/asyncCalls.h"
 #include "ssoClient/client/descriptions.h"
 #include "ssoClient/client/negotiation.h"
 #include "ssoClient/client/operation.h"
+#include "ssoClient/client/tokenReading.h"
 #include "ssoClient/client/trustedCertificates.h"
 
 #include <boost/none.hpp>
@@ -29,11 +29,13 @@ SecurityTokenServiceImpl::SecurityTokenServiceImpl(
     const boost::shared_ptr<const RequestBuilder>& requestBuilder,
     const boost::shared_ptr<const Transport>& transport,
     const boost::shared_ptr<const ResponseHandler>& responseHandler,
-    const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates)
+    const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates,
+    const boost::optional<ServiceDialect>& dialect)
     : _requestBuilder(requestBuilder)
     , _transport(transport)
     , _responseHandler(responseHandler)
     , _trustedCertificates(trustedCertificates)
+    , _dialect(dialect)
 {}
 
 template <class Describe, class Build, class Read>
@@ -231,7 +233,8 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::ToSamlToken(
     }
     boost::shared_ptr<const SamlToken> token;
     try {
-        token = CreateSamlToken(tokenXml, _trustedCertificates);
+        token =
+            ReadToken(tokenXml, _trustedCertificates, _dialect ? _dialect->reading : boost::none);
     } catch (const ParseException& error) {
         // The caller's own tokens are fine: it is the service that answered with a bad one.
         throw SsoException(error.what());

@@ -20,7 +20,8 @@ public:
         const boost::shared_ptr<const RequestBuilder>& requestBuilder,
         const boost::shared_ptr<const Transport>& transport,
         const boost::shared_ptr<const ResponseHandler>& responseHandler,
-        const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates);
+        const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates,
+        const boost::optional<ServiceDialect>& dialect = boost::none);
 
     boost::shared_ptr<const SamlToken> AcquireToken(
         const std::string& userName,
@@ -78,6 +79,7 @@ private:
     boost::shared_ptr<const Transport> _transport;
     boost::shared_ptr<const ResponseHandler> _responseHandler;
     std::list<Quillon::Ref<const Quillon::Crypto::Certificate>> _trustedCertificates;
+    boost::optional<ServiceDialect> _dialect;
 };
 
 } // namespace SsoClient

@@ -26,6 +26,11 @@ void RequirePositive(long long timeoutMicroseconds)
     }
 }
 
+ServiceDialect GetDialect(const SecurityTokenServiceConfig& config)
+{
+    return config.dialect ? *config.dialect : ServiceDialect();
+}
+
 /** @param limits  a time-out, or all options of the exchanges. */
 template <class Limits>
 boost::shared_ptr<HttpsClient> MakeTransport(
@@ -35,15 +40,31 @@ boost::shared_ptr<HttpsClient> MakeTransport(
         config.url, config.sslContext, config.sslPeerParameter, limits);
 }
 
+boost::shared_ptr<RequestBuilderImpl> MakeRequestBuilder(const SecurityTokenServiceConfig& config)
+{
+    RequestForm form;
+    if (config.dialect) {
+        form = {*config.dialect, config.url, config.credentials};
+    }
+    return boost::make_shared<RequestBuilderImpl>(config.holderOfKeyConfig, form);
+}
+
+boost::shared_ptr<ResponseHandlerImpl> MakeResponseHandler(const SecurityTokenServiceConfig& config)
+{
+    return boost::make_shared<ResponseHandlerImpl>(
+        ReplyForm{GetDialect(config), config.faultObserver});
+}
+
 template <class Limits>
 boost::shared_ptr<SecurityTokenService> MakeService(
     const SecurityTokenServiceConfig& config, const Limits& limits)
 {
     return boost::make_shared<SecurityTokenServiceImpl>(
-        boost::make_shared<RequestBuilderImpl>(config.holderOfKeyConfig),
+        MakeRequestBuilder(config),
         MakeTransport(config, limits),
-        boost::make_shared<ResponseHandlerImpl>(),
-        config.trustedCertificates);
+        MakeResponseHandler(config),
+        config.trustedCertificates,
+        config.dialect);
 }
 
 } // namespace
@@ -67,10 +88,11 @@ boost::shared_ptr<InternalApi::GssNegotiationContext> InternalApi::CreateGssNego
 {
     return boost::make_shared<GssNegotiationContextImpl>(
         spec,
-        boost::make_shared<RequestBuilderImpl>(config.holderOfKeyConfig),
+        MakeRequestBuilder(config),
         MakeTransport(config, ContextTimeoutMicroseconds)->CreateSession(),
-        boost::make_shared<ResponseHandlerImpl>(),
-        config.trustedCertificates);
+        MakeResponseHandler(config),
+        config.trustedCertificates,
+        config.dialect);
 }
 
 } // namespace SsoClient

@@ -2,6 +2,7 @@
 
 #include "quillon/PanicVerify.h"
 #include "quillon/system/Clock.h"
+#include "ssoClient/dialect/trustNames.h"
 #include "ssoClient/message/xmlSecurityBuilders.h"
 #include "ssoClient/wire/assertionPlaces.h"
 #include "ssoClient/wire/wireNames.h"
@@ -19,13 +20,13 @@ const char* ToText(bool value) noexcept
     return value ? "true" : "false";
 }
 
-const char* GetKeyType(SamlToken::ConfirmationType confirmation)
+const char* GetKeyType(SamlToken::ConfirmationType confirmation, const Wire::TrustNames& trust)
 {
     switch (confirmation) {
     case SamlToken::CONFIRM_BEARER:
-        return Wire::BearerKeyType;
+        return trust.bearerKeyType;
     case SamlToken::CONFIRM_HOLDER_OF_KEY:
-        return Wire::PublicKeyType;
+        return trust.publicKeyType;
     }
     Quillon::PanicVerify(
         "false", AssertionPlaces::XmlRequestBuilders, AssertionPlaces::UnknownConfirmationType);
@@ -52,12 +53,38 @@ DateTime AddSecondsToDate(const DateTime& time, long long seconds)
 }
 
 // What every request begins with.
-XMLBuilderPtr CreateRequestSecurityToken(const char* tokenType, const char* requestType)
+XMLBuilderPtr CreateRequestSecurityToken(
+    const Wire::TrustNames& trust, const char* tokenType, const char* requestType)
 {
     return Composite(
-        ElementBuilder("wst", "RequestSecurityToken", {{"xmlns:wst", Wire::WsTrustNamespace}}),
+        ElementBuilder("wst", "RequestSecurityToken", {{"xmlns:wst", trust.trustNamespace}}),
         {TextElementBuilder("wst", "TokenType", tokenType),
          TextElementBuilder("wst", "RequestType", requestType)});
+}
+
+XMLBuilderPtr AudienceBuilder(const std::set<std::string>& audience, AudienceForm form)
+{
+    if (audience.empty()) {
+        return nullptr;
+    }
+    if (form == AudienceForm::PARTICIPANTS) {
+        return WstParticipantsBuilders(audience);
+    }
+    if (audience.size() > 1) {
+        throw Quillon::InvalidArgumentException(
+            "The service takes one audience, and " + std::to_string(audience.size())
+            + " are asked for");
+    }
+    return WspAppliesToBuilder(*audience.begin());
+}
+
+XMLBuilderPtr ClaimTypeBuilder(const RequestedClaim& claim)
+{
+    AttributeMap attributes = {{"Uri", claim.uri}};
+    if (claim.isOptional) {
+        attributes["Optional"] = ToText(true);
+    }
+    return ElementBuilder("ic", "ClaimType", attributes);
 }
 
 } // namespace
@@ -78,6 +105,41 @@ XMLBuilderPtr WstRenewingBuilder(bool allow)
 XMLBuilderPtr WstDelegateToBuilder(const std::string& userName)
 {
     return Composite(ElementBuilder("wst", "DelegateTo"), {WsseUsernameTokenBuilder(userName)});
+}
+
+XMLBuilderPtr WstUseKeyBuilder(XMLBuilderPtr content)
+{
+    return Composite(
+        ElementBuilder("wst", "UseKey", {{"Sig", Wire::ProofSignatureId}}), {std::move(content)});
+}
+
+XMLBuilderPtr WstClaimsBuilder(const std::vector<RequestedClaim>& claims)
+{
+    return Composite(
+        ElementBuilder(
+            "wst",
+            "Claims",
+            {{"Dialect", Wire::IdentityNamespace}, {"xmlns:ic", Wire::IdentityNamespace}}),
+        BuildersOf(claims, ClaimTypeBuilder));
+}
+
+XMLBuilderPtr WstDelegatingTokenBuilder(PresentedTokenForm form, const SamlToken& token)
+{
+    return Composite(
+        form == PresentedTokenForm::ON_BEHALF_OF
+            ? ElementBuilder("wst", "OnBehalfOf")
+            : ElementBuilder("wst14", "ActAs", {{"xmlns:wst14", Wire::WsTrust14Namespace}}),
+        {InsertSamlTokenBuilder(token)});
+}
+
+XMLBuilderPtr WspAppliesToBuilder(const std::string& address)
+{
+    return Composite(
+        ElementBuilder(
+            "wsp",
+            "AppliesTo",
+            {{"xmlns:wsa", Wire::WsAddressingNamespace}, {"xmlns:wsp", Wire::WsPolicyNamespace}}),
+        {WsaEndpointAddressReferenceBuilder(address)});
 }
 
 XMLBuilderPtr WstParticipantsBuilders(const std::set<std::string>& participants)
@@ -131,37 +193,44 @@ XMLBuilderPtr RsaAttributeBuilder(const AdviceAttribute& attribute)
 }
 
 boost::shared_ptr<XMLCompositeBuilder> CommonAcquireSecurityTokenBuilder(
-    SamlToken::ConfirmationType confirmation, const TokenSpec& spec)
+    SamlToken::ConfirmationType confirmation, const TokenSpec& spec, const ServiceDialect& dialect)
 {
+    const Wire::TrustNames& trust = Wire::GetTrustNames(dialect.trust);
     return Composite(
-        CreateRequestSecurityToken(Wire::SamlNamespace, Wire::IssueRequestType),
-        {TextElementBuilder("wst", "KeyType", GetKeyType(confirmation)),
+        CreateRequestSecurityToken(trust, Wire::SamlNamespace, trust.issueRequestType),
+        {TextElementBuilder("wst", "KeyType", GetKeyType(confirmation, trust)),
          WssuLifetimeBuilder(spec.tokenLifetimeSec),
-         WstRenewingBuilder(spec.renewable),
-         TextElementBuilder("wst", "Delegatable", ToText(spec.delegable)),
+         spec.renewable || dialect.writesFalseRenewing ? WstRenewingBuilder(spec.renewable)
+                                                       : nullptr,
+         spec.delegable || dialect.writesFalseDelegatable
+             ? TextElementBuilder("wst", "Delegatable", ToText(spec.delegable))
+             : nullptr,
          spec.delegateTo ? WstDelegateToBuilder(*spec.delegateTo) : nullptr,
-         spec.audienceRestriction.empty() ? nullptr
-                                          : WstParticipantsBuilders(spec.audienceRestriction),
+         AudienceBuilder(spec.audienceRestriction, dialect.audienceForm),
+         dialect.claims.empty() ? nullptr : WstClaimsBuilder(dialect.claims),
          spec.advice.empty() ? nullptr : RsaAdviceSetBuilder(spec.advice)});
 }
 
-XMLBuilderPtr AcquireSecurityTokenBuilder(
-    SamlToken::ConfirmationType confirmation, const TokenSpec& spec)
+boost::shared_ptr<XMLCompositeBuilder> AcquireSecurityTokenBuilder(
+    SamlToken::ConfirmationType confirmation, const TokenSpec& spec, const IssueForm& form)
 {
-    auto request = CommonAcquireSecurityTokenBuilder(confirmation, spec);
+    auto request = CommonAcquireSecurityTokenBuilder(confirmation, spec, form.dialect);
     if (confirmation == SamlToken::CONFIRM_HOLDER_OF_KEY && !spec.delegateTo) {
-        request->Add(ElementBuilder("wst", "UseKey", {{"Sig", Wire::ProofSignatureId}}));
+        request->Add(WstUseKeyBuilder(form.useKeyContent));
     }
     return request;
 }
 
 XMLBuilderPtr ExchangeSecurityTokenBuilder(
-    SamlToken::ConfirmationType confirmation, const TokenSpec& spec)
+    SamlToken::ConfirmationType confirmation, const TokenSpec& spec, const IssueForm& form)
 {
-    return CommonAcquireSecurityTokenBuilder(confirmation, spec);
+    return form.dialect.useKeyWithPresentedToken
+               ? AcquireSecurityTokenBuilder(confirmation, spec, form)
+               : CommonAcquireSecurityTokenBuilder(confirmation, spec, form.dialect);
 }
 
-XMLBuilderPtr RenewSecurityTokenBuilder(const SamlToken& token, long long lifetimeSec)
+XMLBuilderPtr RenewSecurityTokenBuilder(
+    const SamlToken& token, long long lifetimeSec, TrustVersion trust)
 {
     if (token.GetConfirmationMethod() != SamlToken::CONFIRM_HOLDER_OF_KEY) {
         Quillon::PanicVerify(
@@ -169,16 +238,18 @@ XMLBuilderPtr RenewSecurityTokenBuilder(const SamlToken& token, long long lifeti
             AssertionPlaces::XmlRequestBuilders,
             AssertionPlaces::RenewalOfBearerToken);
     }
+    const Wire::TrustNames& names = Wire::GetTrustNames(trust);
     return Composite(
-        CreateRequestSecurityToken(Wire::SamlNamespace, Wire::RenewRequestType),
+        CreateRequestSecurityToken(names, Wire::SamlNamespace, names.renewRequestType),
         {WssuLifetimeBuilder(lifetimeSec),
          Composite(ElementBuilder("wst", "RenewTarget"), {InsertSamlTokenBuilder(token)})});
 }
 
-XMLBuilderPtr ValidateSecurityTokenBuilder(const SamlToken& token)
+XMLBuilderPtr ValidateSecurityTokenBuilder(const SamlToken& token, TrustVersion trust)
 {
+    const Wire::TrustNames& names = Wire::GetTrustNames(trust);
     return Composite(
-        CreateRequestSecurityToken(Wire::StatusTokenType, Wire::ValidateRequestType),
+        CreateRequestSecurityToken(names, names.statusTokenType, names.validateRequestType),
         {Composite(ElementBuilder("wst", "ValidateTarget"), {InsertSamlTokenBuilder(token)})});
 }
 

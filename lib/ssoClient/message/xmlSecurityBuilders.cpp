@@ -2,7 +2,6 @@
 
 #include "quillon/StringUtil.h"
 #include "quillon/system/Clock.h"
-#include "ssoClient/wire/wireNames.h"
 
 #include <cstdint>
 
@@ -111,17 +110,29 @@ XMLBuilderPtr WsseX509v3BSTReferenceBuilder(const std::string& id)
             "wsse", "Reference", {{"URI", "#" + id}, {"ValueType", Wire::X509v3ValueType}})});
 }
 
-XMLBuilderPtr WsseSamlKeyIdReferenceBuilder(const std::string& assertionId)
+XMLBuilderPtr WsseSamlKeyIdReferenceBuilder(const std::string& assertionId, const char* tokenType)
 {
     return Composite(
         ElementBuilder(
             "wsse",
             "SecurityTokenReference",
-            {{"wsse11:TokenType", Wire::Saml20TokenType},
+            {{"wsse11:TokenType", tokenType},
              {"xmlns:wsse", Wire::WsseNamespace},
              {"xmlns:wsse11", Wire::Wsse11Namespace}}),
         {TextElementBuilder(
             "wsse", "KeyIdentifier", {{"ValueType", Wire::SamlIdValueType}}, assertionId)});
+}
+
+XMLBuilderPtr DsCertificateKeyInfoBuilder(const Quillon::Crypto::Certificate* certificate)
+{
+    return Composite(
+        ElementBuilder("ds", "KeyInfo", {{"xmlns:ds", Wire::DsNamespace}}),
+        {Composite(
+            ElementBuilder("ds", "X509Data"),
+            {TextElementBuilder(
+                "ds",
+                "X509Certificate",
+                Quillon::StringUtil::Base64Encode(certificate->GetEncoded()))})});
 }
 
 } // namespace SsoClient

@@ -3,6 +3,7 @@
 #include "quillon/crypto/Certificate.h"
 #include "quillon/system/DateTime.h"
 #include "ssoClient/message/xmlCommonBuilders.h"
+#include "ssoClient/wire/wireNames.h"
 
 #include <string>
 #include <vector>
@@ -50,7 +51,15 @@ XMLBuilderPtr WsseX509v3BinarySecTokenBuilder(
 /** `wsse:SecurityTokenReference` to the binary security token of that id. */
 XMLBuilderPtr WsseX509v3BSTReferenceBuilder(const std::string& id);
 
-/** `wsse:SecurityTokenReference` to the SAML assertion of that ID. */
-XMLBuilderPtr WsseSamlKeyIdReferenceBuilder(const std::string& assertionId);
+/**
+ * `wsse:SecurityTokenReference` to the SAML assertion of that ID.
+ *
+ * @param tokenType  what the reference says that it leads to; the profile's name has two spellings.
+ */
+XMLBuilderPtr WsseSamlKeyIdReferenceBuilder(
+    const std::string& assertionId, const char* tokenType = Wire::Saml20TokenType);
+
+/** `ds:KeyInfo` with the certificate in DER. @param certificate  never null. */
+XMLBuilderPtr DsCertificateKeyInfoBuilder(const Quillon::Crypto::Certificate* certificate);
 
 } // namespace SsoClient

@@ -3,9 +3,9 @@
 #include "quillon/PanicVerify.h"
 #include "quillon/StringUtil.h"
 #include "quillon/xml/security/Identifiers.h"
+#include "ssoClient/dialect/trustNames.h"
 #include "ssoClient/message/xmlSecurityBuilders.h"
 #include "ssoClient/wire/assertionPlaces.h"
-#include "ssoClient/wire/wireNames.h"
 
 #include <boost/smart_ptr/make_shared.hpp>
 
@@ -53,16 +53,43 @@ std::string GenerateUuidThatIsAName()
     return uuid;
 }
 
+// Every security header that is signed was made with a timestamp.
+ElementNode* FindTimestamp(const ElementNode& wsseSecurity)
+{
+    return wsseSecurity.FindChildElement("Timestamp", Wire::WsuNamespace);
+}
+
+// The addressing headers come first, and none without addressing.
+void AddAddressingToSignature(
+    Security::Signature* signature, const ElementNode& soapHeader, const EnvelopeForm& form)
+{
+    Quillon::Xml::Node* node = soapHeader.GetFirstChild();
+    for (std::size_t i = 0; i < form.addressing.size(); ++i) {
+        ElementNode* const header = Quillon::Xml::AsElement(node);
+        if (form.signatureScope == SignatureScope::MESSAGE || header->GetLocalName() == "To") {
+            AddElementToSignature(signature, header);
+        }
+        node = node->GetNextSibling();
+    }
+}
+
 } // namespace
 
-XMLBuilderPtr SoapBuilder(XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder)
+XMLBuilderPtr SoapBuilder(
+    XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder, const EnvelopeForm& form)
 {
+    const auto header = Composite(ElementBuilder("soapenv", "Header"), form.addressing);
+    header->Add(std::move(headerBuilder));
     return Composite(
-        ElementBuilder("soapenv", "Envelope", {{"xmlns:soapenv", Wire::SoapNamespace}}),
-        {Composite(ElementBuilder("soapenv", "Header"), {std::move(headerBuilder)}),
+        ElementBuilder(
+            "soapenv", "Envelope", {{"xmlns:soapenv", Wire::GetSoapNamespace(form.soap)}}),
+        {header,
          // Some bodies use `wst` without declaring it.
          Composite(
-             ElementBuilder("soapenv", "Body", {{"xmlns:wst", Wire::WsTrustNamespace}}),
+             ElementBuilder(
+                 "soapenv",
+                 "Body",
+                 {{"xmlns:wst", Wire::GetTrustNames(form.trust).trustNamespace}}),
              {std::move(bodyBuilder)})});
 }
 
@@ -70,39 +97,45 @@ XMLSignedSoapBuilder::XMLSignedSoapBuilder(
     XMLBuilderPtr headerBuilder,
     XMLBuilderPtr bodyBuilder,
     const Quillon::Crypto::PrivateKey* key,
-    XMLBuilderPtr keyInfoBuilder)
+    XMLBuilderPtr keyInfoBuilder,
+    EnvelopeForm form)
     : _headerBuilder(std::move(headerBuilder))
     , _bodyBuilder(std::move(bodyBuilder))
     , _key(key)
     , _keyInfoBuilder(std::move(keyInfoBuilder))
+    , _form(std::move(form))
 {
     RequireHeaderBuilder(_headerBuilder, AssertionPlaces::SignedEnvelopeWithoutHeader);
 }
 
 void XMLSignedSoapBuilder::build(Ref<ElementNode>& out) const
 {
-    SoapBuilder(_headerBuilder, _bodyBuilder)->build(out);
-    SignSoapMessage(_key, _keyInfoBuilder, out.get());
+    SoapBuilder(_headerBuilder, _bodyBuilder, _form)->build(out);
+    SignSoapMessage(_key, _keyInfoBuilder, out.get(), _form);
 }
 
 boost::shared_ptr<const XMLSignedSoapBuilder> SamlRefSignedSoapBuilder(
     XMLBuilderPtr headerBuilder,
     XMLBuilderPtr bodyBuilder,
     const Quillon::Crypto::PrivateKey* key,
-    const std::string& assertionId)
+    const std::string& assertionId,
+    const char* tokenType,
+    const EnvelopeForm& form)
 {
     return boost::make_shared<XMLSignedSoapBuilder>(
         std::move(headerBuilder),
         std::move(bodyBuilder),
         key,
-        WsseSamlKeyIdReferenceBuilder(assertionId));
+        WsseSamlKeyIdReferenceBuilder(assertionId, tokenType),
+        form);
 }
 
 boost::shared_ptr<const XMLSignedSoapBuilder> CertRefSignedSoapBuilder(
     XMLBuilderPtr headerBuilder,
     XMLBuilderPtr bodyBuilder,
     const Quillon::Crypto::PrivateKey* key,
-    const Quillon::Crypto::Certificate* certificate)
+    const Quillon::Crypto::Certificate* certificate,
+    const EnvelopeForm& form)
 {
     RequireHeaderBuilder(headerBuilder, AssertionPlaces::CertRefSignedEnvelopeWithoutHeader);
     return boost::make_shared<XMLSignedSoapBuilder>(
@@ -111,24 +144,32 @@ boost::shared_ptr<const XMLSignedSoapBuilder> CertRefSignedSoapBuilder(
             {WsseX509v3BinarySecTokenBuilder(CertificateId, certificate)}),
         std::move(bodyBuilder),
         key,
-        WsseX509v3BSTReferenceBuilder(CertificateId));
+        CertificateReferenceBuilder(),
+        form);
+}
+
+XMLBuilderPtr CertificateReferenceBuilder()
+{
+    return WsseX509v3BSTReferenceBuilder(CertificateId);
 }
 
 void SignSoapMessage(
     const Quillon::Crypto::PrivateKey* key,
     const XMLBuilderPtr& keyInfoBuilder,
-    ElementNode* envelope)
+    ElementNode* envelope,
+    const EnvelopeForm& form)
 {
+    const char* const soapNamespace = Wire::GetSoapNamespace(form.soap);
     ElementNode* const soapBody = RequireChild(
         envelope,
         "Body",
-        Wire::SoapNamespace,
+        soapNamespace,
         "soapBody != __null",
         AssertionPlaces::EnvelopeWithoutBody);
     ElementNode* const soapHeader = RequireChild(
         envelope,
         "Header",
-        Wire::SoapNamespace,
+        soapNamespace,
         "soapHeader != __null",
         AssertionPlaces::EnvelopeWithoutHeader);
     ElementNode* const wsseSecurity = RequireChild(
@@ -137,14 +178,14 @@ void SignSoapMessage(
         Wire::WsseNamespace,
         "wsseSecurity != __null",
         AssertionPlaces::HeaderWithoutSecurity);
-    // Every security header that is signed was made with a timestamp.
-    ElementNode* const timestamp = wsseSecurity->FindChildElement("Timestamp", Wire::WsuNamespace);
-
     Ref<Security::Signature> signature;
     Security::CreateBlankSignature(
         envelope, Security::ExclusiveC14n, Security::RsaSha256, "ds", signature);
-    AddElementToSignature(signature.get(), soapBody);
-    AddElementToSignature(signature.get(), timestamp);
+    if (form.signatureScope == SignatureScope::MESSAGE) {
+        AddElementToSignature(signature.get(), soapBody);
+    }
+    AddElementToSignature(signature.get(), FindTimestamp(*wsseSecurity));
+    AddAddressingToSignature(signature.get(), *soapHeader, form);
     if (keyInfoBuilder != nullptr) {
         Ref<ElementNode> keyInfo;
         keyInfoBuilder->build(keyInfo);

@@ -18,10 +18,23 @@ namespace Http = Quillon::Http;
 /** SOAP 1.1 faults come with this status [SOAP11 6.2]. */
 constexpr int SoapFaultStatus = 500;
 
+/** What SOAP 1.2 says of faults that are the sender's [SOAP12-2 7.5.1.2]. */
+constexpr int SenderFaultStatus = 400;
+
 /** Whether a reply of this status is the service's word, so that its body counts. */
 bool IsAcceptable(int status) noexcept
 {
     return status / 100 == 2 || status == SoapFaultStatus;
+}
+
+bool IsAcceptableInSoap12(int status) noexcept
+{
+    return IsAcceptable(status) || status == SenderFaultStatus;
+}
+
+Http::StatusTest GetStatusTest(SoapVersion soap) noexcept
+{
+    return soap == SoapVersion::SOAP_1_1 ? &IsAcceptable : &IsAcceptableInSoap12;
 }
 
 ExchangeOptions WithTimeout(long long timeout)
@@ -46,19 +59,30 @@ Http::ExchangeObserver MakeObserver(const Http::ExchangeObserver& callers)
     };
 }
 
+void SetSoapHeaders(const Request& request, Http::ClientRequest& httpRequest)
+{
+    // The action is a quoted string in either version [SOAP11 6.1.1] [RFC 3902].
+    const std::string action = "\"" + request.soapAction + "\"";
+    if (request.soap == SoapVersion::SOAP_1_1) {
+        httpRequest.SetHeader("Content-Type", "text/xml");
+        httpRequest.SetHeader("SOAPAction", action);
+    } else {
+        httpRequest.SetHeader(
+            "Content-Type", "application/soap+xml; charset=utf-8; action=" + action);
+    }
+}
+
 Quillon::Ref<Http::ClientRequest> ComposeRequest(
     const Request& request, const std::string& path, const ExchangeOptions& options)
 {
     Quillon::Ref<Http::ClientRequest> httpRequest;
     Http::CreateHttpRequest(Http::HttpMethod::POST, path, httpRequest);
-    httpRequest->SetHeader("Content-Type", "text/xml");
-    // The action is a quoted string [SOAP11 6.1.1].
-    httpRequest->SetHeader("SOAPAction", "\"" + request.soapAction + "\"");
+    SetSoapHeaders(request, *httpRequest);
     httpRequest->GetBodyWriter()->Write(request.body.data(), request.body.size());
     httpRequest->SetTimeout(options.timeoutMicroseconds);
     httpRequest->SetConnectTimeout(options.connectTimeoutMicroseconds);
     httpRequest->SetObserver(MakeObserver(options.observer));
-    httpRequest->SetBodyStatuses(&IsAcceptable);
+    httpRequest->SetBodyStatuses(GetStatusTest(request.soap));
     return httpRequest;
 }
 
@@ -126,7 +150,7 @@ void HttpsSession::SendRequest(const Request& request, Quillon::Ref<Quillon::Rea
         _options.timeoutMicroseconds,
         httpResponse);
     boost::shared_ptr<Quillon::Exception> error;
-    TranslateResponse(nullptr, httpResponse.get(), error, response);
+    TranslateResponse(nullptr, httpResponse.get(), error, response, request.soap);
     if (error) {
         error->Throw();
     }
@@ -142,7 +166,8 @@ void HttpsSession::SendRequestAsync(
         callback,
         boost::placeholders::_1,
         boost::placeholders::_2,
-        boost::placeholders::_3);
+        boost::placeholders::_3,
+        request.soap);
     const Quillon::Ref<Http::ClientRequest> httpRequest = ComposeRequest(request, _path, _options);
     Quillon::Ref<Http::PendingRequestItem> item;
     _userAgent->SendRequestAsync(httpRequest.get(), completion, item);
@@ -153,7 +178,8 @@ void TranslateResponse(
     Quillon::Exception const* error,
     Http::ClientResponse* response,
     boost::shared_ptr<Quillon::Exception>& outError,
-    Quillon::Ref<Quillon::Reader>& outBody)
+    Quillon::Ref<Quillon::Reader>& outBody,
+    SoapVersion soap)
 {
     if (error != nullptr) {
         outError = boost::make_shared<CommunicationException>(error->what());
@@ -166,7 +192,7 @@ void TranslateResponse(
             AssertionPlaces::NeitherErrorNorResponse);
     }
     const Http::HttpStatus& status = response->GetStatus();
-    if (IsAcceptable(status.code)) {
+    if (GetStatusTest(soap)(status.code)) {
         outBody = response->GetBody();
         return;
     }
@@ -178,11 +204,12 @@ void AsyncTranslateResponse(
     const ResponseCallback& callback,
     Quillon::Exception const* error,
     Http::ClientResponse* response,
-    Http::PendingRequestItem* /*item*/)
+    Http::PendingRequestItem* /*item*/,
+    SoapVersion soap)
 {
     boost::shared_ptr<Quillon::Exception> outError;
     Quillon::Ref<Quillon::Reader> outBody;
-    TranslateResponse(error, response, outError, outBody);
+    TranslateResponse(error, response, outError, outBody, soap);
     callback(outError.get(), outBody.get());
 }
 

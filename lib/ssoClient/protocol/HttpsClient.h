@@ -11,7 +11,7 @@
 
 namespace SsoClient {
 
-/** Posts SOAP 1.1 messages to the URL of a token service. */
+/** Posts SOAP messages to the URL of a token service. */
 class HttpsClient final : public Transport
 {
 public:
@@ -70,7 +70,8 @@ private:
 
 /**
  * Decides what an answered or failed exchange means: a reply with status 2xx or 500 is the
- * service's word (SOAP 1.1 sends faults with 500), everything else an error.
+ * service's word (SOAP 1.1 sends faults with 500), everything else an error. SOAP 1.2 sends faults
+ * with 400, too.
  *
  * @param error     why the exchange failed, or null.
  * @param response  the reply; never null if `error` is.
@@ -81,13 +82,15 @@ void TranslateResponse(
     Quillon::Exception const* error,
     Quillon::Http::ClientResponse* response,
     boost::shared_ptr<Quillon::Exception>& outError,
-    Quillon::Ref<Quillon::Reader>& outBody);
+    Quillon::Ref<Quillon::Reader>& outBody,
+    SoapVersion soap = SoapVersion::SOAP_1_1);
 
 /** Hands what `TranslateResponse` makes of a completed exchange to `callback`. */
 void AsyncTranslateResponse(
     const ResponseCallback& callback,
     Quillon::Exception const* error,
     Quillon::Http::ClientResponse* response,
-    Quillon::Http::PendingRequestItem* item);
+    Quillon::Http::PendingRequestItem* item,
+    SoapVersion soap = SoapVersion::SOAP_1_1);
 
 } // namespace SsoClient

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "quillon/Wiped.h"
+#include "ssoClient/ServiceDialect.h"
 
 #include <string>
 #include <utility>
@@ -15,6 +16,7 @@ struct Request
 {
     std::string soapAction; ///< the action URI, without quotes
     std::string body;       ///< the whole envelope as XML text
+    SoapVersion soap = SoapVersion::SOAP_1_1;
 
     Request() = default;
     Request(const Request&) = default;
@@ -26,6 +28,7 @@ struct Request
     {
         std::swap(soapAction, other.soapAction);
         std::swap(body, other.body);
+        std::swap(soap, other.soap);
         return *this;
     }
 };

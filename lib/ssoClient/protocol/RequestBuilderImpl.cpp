@@ -3,6 +3,8 @@
 #include "quillon/Exceptions.h"
 #include "quillon/PanicVerify.h"
 #include "quillon/xml/Parser.h"
+#include "ssoClient/dialect/trustNames.h"
+#include "ssoClient/message/xmlAddressingBuilders.h"
 #include "ssoClient/message/xmlRequestBuilders.h"
 #include "ssoClient/message/xmlSecurityBuilders.h"
 #include "ssoClient/message/xmlSoapBuilders.h"
@@ -72,15 +74,12 @@ std::string SerializeToXML(const XMLBaseBuilder& builder)
     return writer->TakeString();
 }
 
-std::string BuildUnSignedRequest(XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder)
-{
-    return SerializeToXML(*SoapBuilder(std::move(headerBuilder), std::move(bodyBuilder)));
-}
-
 } // namespace
 
-RequestBuilderImpl::RequestBuilderImpl(const boost::optional<HolderOfKeyConfig>& holderOfKeyConfig)
+RequestBuilderImpl::RequestBuilderImpl(
+    const boost::optional<HolderOfKeyConfig>& holderOfKeyConfig, RequestForm form)
     : _holderOfKeyConfig(GetWhole(holderOfKeyConfig))
+    , _form(std::move(form))
 {}
 
 void RequestBuilderImpl::BuildUserPassTokenRequest(
@@ -91,11 +90,12 @@ void RequestBuilderImpl::BuildUserPassTokenRequest(
 {
     ValidateLifetime(spec.tokenLifetimeSec);
     XMLBuilderPtr header = CreateHeader(WsseUsernameTokenBuilder(userName, password));
-    XMLBuilderPtr body =
-        AcquireSecurityTokenBuilder(GetEffectiveConfirmationType(spec.confirmation), spec);
-    request.soapAction = Wire::IssueAction;
-    request.body =
-        BuildTokenRequest(ConfOverrideWithDelegate(spec), std::move(header), std::move(body));
+    XMLBuilderPtr body = AcquireSecurityTokenBuilder(
+        GetEffectiveConfirmationType(spec.confirmation),
+        spec,
+        GetIssueForm(CertificateReferenceBuilder()));
+    SetAction(GetTrustNames().issueAction, request);
+    BuildTokenRequest(ConfOverrideWithDelegate(spec), std::move(header), std::move(body), request);
 }
 
 void RequestBuilderImpl::BuildInitialSPNegoRequest(
@@ -104,10 +104,12 @@ void RequestBuilderImpl::BuildInitialSPNegoRequest(
     ValidateLifetime(spec.tokenLifetimeSec);
     XMLBuilderPtr header = CreateHeader();
     XMLBuilderPtr body = boost::make_shared<XMLBodyBuilderInitialSPNego>(
-        GetEffectiveConfirmationType(spec.confirmation), spec, leg);
-    request.soapAction = Wire::IssueAction;
-    request.body =
-        BuildTokenRequest(ConfOverrideWithDelegate(spec), std::move(header), std::move(body));
+        GetEffectiveConfirmationType(spec.confirmation),
+        spec,
+        leg,
+        GetIssueForm(CertificateReferenceBuilder()));
+    SetAction(GetTrustNames().issueAction, request);
+    BuildTokenRequest(ConfOverrideWithDelegate(spec), std::move(header), std::move(body), request);
 }
 
 void RequestBuilderImpl::BuildContinuedSPNegoRequest(
@@ -115,8 +117,8 @@ void RequestBuilderImpl::BuildContinuedSPNegoRequest(
 {
     XMLBuilderPtr header = CreateHeader();
     XMLBuilderPtr body = boost::make_shared<XMLBodyBuilderContinuedSPNego>(contextId, leg);
-    request.soapAction = Wire::IssueResponseAction;
-    request.body = BuildUnSignedRequest(std::move(header), std::move(body));
+    SetAction(GetTrustNames().issueResponseAction, request);
+    BuildUnSignedRequest(std::move(header), std::move(body), request);
 }
 
 void RequestBuilderImpl::BuildCertificateTokenRequest(const TokenSpec& spec, Request& request) const
@@ -129,29 +131,70 @@ void RequestBuilderImpl::BuildCertificateTokenRequest(const TokenSpec& spec, Req
             + AcquireByCertificate);
     }
     XMLBuilderPtr header = CreateHeader();
-    XMLBuilderPtr body =
-        AcquireSecurityTokenBuilder(GetEffectiveConfirmationType(spec.confirmation), spec);
-    request.soapAction = Wire::IssueAction;
-    request.body = BuildCertRefSignedRequest(std::move(header), std::move(body));
+    XMLBuilderPtr body = AcquireSecurityTokenBuilder(
+        GetEffectiveConfirmationType(spec.confirmation),
+        spec,
+        GetIssueForm(CertificateReferenceBuilder()));
+    SetAction(GetTrustNames().issueAction, request);
+    BuildCertRefSignedRequest(std::move(header), std::move(body), request);
 }
 
 void RequestBuilderImpl::BuildExchangeTokenRequest(
     const SamlToken& token, const TokenSpec& spec, Request& request) const
 {
     ValidateLifetime(spec.tokenLifetimeSec);
+    if (_form.dialect.presentedToken == PresentedTokenForm::IN_HEADER) {
+        BuildRequestWithTokenInHeader(token, spec, request);
+    } else {
+        BuildRequestWithTokenInBody(token, spec, request);
+    }
+}
+
+void RequestBuilderImpl::BuildRequestWithTokenInHeader(
+    const SamlToken& token, const TokenSpec& spec, Request& request) const
+{
     ValidateHokIsConfigured(AcquireByToken);
     XMLBuilderPtr header = CreateHeader(InsertSamlTokenBuilder(token));
-    XMLBuilderPtr body =
-        ExchangeSecurityTokenBuilder(GetEffectiveConfirmationType(spec.confirmation), spec);
-    request.soapAction = Wire::IssueAction;
-    request.body = BuildSamlRefSignedRequest(token.GetId(), std::move(header), std::move(body));
+    XMLBuilderPtr body = ExchangeSecurityTokenBuilder(
+        GetEffectiveConfirmationType(spec.confirmation),
+        spec,
+        GetIssueForm(WsseSamlKeyIdReferenceBuilder(token.GetId(), GetSamlTokenType())));
+    SetAction(GetTrustNames().issueAction, request);
+    BuildSamlRefSignedRequest(token.GetId(), std::move(header), std::move(body), request);
+}
+
+// The token proves nothing of who asks, so the caller's own credentials do.
+void RequestBuilderImpl::BuildRequestWithTokenInBody(
+    const SamlToken& token, const TokenSpec& spec, Request& request) const
+{
+    if (!_form.credentials) {
+        ValidateHokIsConfigured(AcquireByToken);
+    }
+    XMLBuilderPtr header = CreateHeaderWithCredentials();
+    auto body = AcquireSecurityTokenBuilder(
+        GetEffectiveConfirmationType(spec.confirmation),
+        spec,
+        GetIssueForm(CertificateReferenceBuilder()));
+    body->Add(WstDelegatingTokenBuilder(_form.dialect.presentedToken, token));
+    SetAction(GetTrustNames().issueAction, request);
+    if (_form.credentials) {
+        BuildTokenRequest(ConfOverrideWithDelegate(spec), std::move(header), body, request);
+    } else {
+        BuildCertRefSignedRequest(std::move(header), body, request);
+    }
 }
 
 void RequestBuilderImpl::BuildValidateSubjectRequest(const SamlToken& token, Request& request) const
 {
-    request.soapAction = Wire::ValidateAction;
-    XMLBuilderPtr body = ValidateSecurityTokenBuilder(token);
-    request.body = BuildUnSignedRequest(CreateHeader(), std::move(body));
+    SetAction(GetTrustNames().validateAction, request);
+    XMLBuilderPtr body = ValidateSecurityTokenBuilder(token, _form.dialect.trust);
+    const bool proves = _form.dialect.validatesWithCredentials;
+    if (proves && !_form.credentials && _holderOfKeyConfig) {
+        BuildCertRefSignedRequest(CreateHeader(), std::move(body), request);
+        return;
+    }
+    BuildUnSignedRequest(
+        proves ? CreateHeaderWithCredentials() : CreateHeader(), std::move(body), request);
 }
 
 void RequestBuilderImpl::BuildRenewRequest(
@@ -160,10 +203,58 @@ void RequestBuilderImpl::BuildRenewRequest(
     ValidateLifetime(lifetimeSec);
     ValidateHokIsConfigured(Renew);
     ValidateTokenIsHok(token, Renew);
-    XMLBuilderPtr header = CreateHeader();
-    XMLBuilderPtr body = RenewSecurityTokenBuilder(token, lifetimeSec);
-    request.soapAction = Wire::RenewAction;
-    request.body = BuildCertRefSignedRequest(std::move(header), std::move(body));
+    XMLBuilderPtr header = CreateHeaderWithCredentials();
+    XMLBuilderPtr body = RenewSecurityTokenBuilder(token, lifetimeSec, _form.dialect.trust);
+    SetAction(GetTrustNames().renewAction, request);
+    BuildCertRefSignedRequest(std::move(header), std::move(body), request);
+}
+
+XMLBuilderPtr RequestBuilderImpl::CreateHeaderWithCredentials() const
+{
+    return _form.credentials ? CreateHeader(
+               WsseUsernameTokenBuilder(_form.credentials->userName, _form.credentials->password))
+                             : CreateHeader();
+}
+
+IssueForm RequestBuilderImpl::GetIssueForm(XMLBuilderPtr keyReference) const
+{
+    IssueForm form;
+    form.dialect = _form.dialect;
+    if (_form.dialect.useKey == UseKeyForm::REFERENCE) {
+        form.useKeyContent = std::move(keyReference);
+    } else if (_form.dialect.useKey == UseKeyForm::CERTIFICATE && _holderOfKeyConfig) {
+        form.useKeyContent = DsCertificateKeyInfoBuilder(_holderOfKeyConfig->certificate.get());
+    }
+    return form;
+}
+
+EnvelopeForm RequestBuilderImpl::GetEnvelopeForm(const Request& request) const
+{
+    EnvelopeForm form;
+    form.soap = _form.dialect.soap;
+    form.trust = _form.dialect.trust;
+    form.signatureScope = _form.dialect.signatureScope;
+    if (_form.dialect.addressing) {
+        form.addressing = WsaHeaderBuilders(request.soapAction, _form.url);
+    }
+    return form;
+}
+
+void RequestBuilderImpl::SetAction(const char* action, Request& request) const
+{
+    request.soapAction = action;
+    request.soap = _form.dialect.soap;
+}
+
+const char* RequestBuilderImpl::GetSamlTokenType() const noexcept
+{
+    return _form.dialect.hyphenInSamlTokenType ? Wire::Saml20TokenTypeWithHyphen
+                                               : Wire::Saml20TokenType;
+}
+
+const Wire::TrustNames& RequestBuilderImpl::GetTrustNames() const noexcept
+{
+    return Wire::GetTrustNames(_form.dialect.trust);
 }
 
 void RequestBuilderImpl::ValidateHokIsConfigured(const std::string& operationName) const
@@ -182,35 +273,51 @@ SamlToken::ConfirmationType RequestBuilderImpl::GetEffectiveConfirmationType(
                : SamlToken::CONFIRM_BEARER;
 }
 
-std::string RequestBuilderImpl::BuildTokenRequest(
+void RequestBuilderImpl::BuildTokenRequest(
     TokenSpec::Confirmation confirmation,
     XMLBuilderPtr headerBuilder,
-    XMLBuilderPtr bodyBuilder) const
+    XMLBuilderPtr bodyBuilder,
+    Request& request) const
 {
-    return GetEffectiveConfirmationType(confirmation) == SamlToken::CONFIRM_HOLDER_OF_KEY
-               ? BuildCertRefSignedRequest(std::move(headerBuilder), std::move(bodyBuilder))
-               : BuildUnSignedRequest(std::move(headerBuilder), std::move(bodyBuilder));
+    if (GetEffectiveConfirmationType(confirmation) == SamlToken::CONFIRM_HOLDER_OF_KEY) {
+        BuildCertRefSignedRequest(std::move(headerBuilder), std::move(bodyBuilder), request);
+    } else {
+        BuildUnSignedRequest(std::move(headerBuilder), std::move(bodyBuilder), request);
+    }
 }
 
-std::string RequestBuilderImpl::BuildCertRefSignedRequest(
-    XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder) const
+void RequestBuilderImpl::BuildUnSignedRequest(
+    XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder, Request& request) const
+{
+    request.body = SerializeToXML(
+        *SoapBuilder(std::move(headerBuilder), std::move(bodyBuilder), GetEnvelopeForm(request)));
+}
+
+void RequestBuilderImpl::BuildCertRefSignedRequest(
+    XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder, Request& request) const
 {
     const HolderOfKeyConfig& identity = GetHolderOfKeyConfig();
-    return SerializeToXML(*CertRefSignedSoapBuilder(
+    request.body = SerializeToXML(*CertRefSignedSoapBuilder(
         std::move(headerBuilder),
         std::move(bodyBuilder),
         identity.privateKey.get(),
-        identity.certificate.get()));
+        identity.certificate.get(),
+        GetEnvelopeForm(request)));
 }
 
-std::string RequestBuilderImpl::BuildSamlRefSignedRequest(
-    const std::string& tokenId, XMLBuilderPtr headerBuilder, XMLBuilderPtr bodyBuilder) const
+void RequestBuilderImpl::BuildSamlRefSignedRequest(
+    const std::string& tokenId,
+    XMLBuilderPtr headerBuilder,
+    XMLBuilderPtr bodyBuilder,
+    Request& request) const
 {
-    return SerializeToXML(*SamlRefSignedSoapBuilder(
+    request.body = SerializeToXML(*SamlRefSignedSoapBuilder(
         std::move(headerBuilder),
         std::move(bodyBuilder),
         GetHolderOfKeyConfig().privateKey.get(),
-        tokenId));
+        tokenId,
+        GetSamlTokenType(),
+        GetEnvelopeForm(request)));
 }
 
 const HolderOfKeyConfig& RequestBuilderImpl::GetHolderOfKeyConfig() const

@@ -4,19 +4,17 @@
 #include "quillon/http/ClientResponse.h"
 #include "quillon/xml/Parser.h"
 #include "ssoClient/Exceptions.h"
-#include "ssoClient/protocol/exchangeLog.h"
+#include "ssoClient/dialect/trustNames.h"
+#include "ssoClient/protocol/faults.h"
 #include "ssoClient/protocol/responseReading.h"
 #include "ssoClient/protocol/xmlSpnego.h"
 #include "ssoClient/wire/assertionPlaces.h"
-#include "ssoClient/wire/wireNames.h"
 #include "ssoClient/wire/xmlReading.h"
 
-#include <algorithm>
-#include <iterator>
+#include <utility>
 
 using Quillon::Ref;
 using Quillon::Xml::ElementNode;
-using Quillon::Xml::QName;
 
 namespace SsoClient {
 
@@ -26,56 +24,17 @@ static_assert(
     Quillon::Http::ReplyLimits::MaxBodyBytes == Quillon::Xml::ParserLimits::MaxDocumentBytes,
     "a reply that the parser would refuse is not received, and one that it takes is");
 
-// A name in the reply's own terms: prefixes differ between services.
-struct FaultName
-{
-    const char* namespaceUri;
-    const char* localName;
-};
-
-// [WST13 11], [SOAP Message Security 1.0, 12]
-constexpr FaultName BadCredentials[] = {
-    {Wire::WsTrustNamespace, "FailedAuthentication"},
-    {Wire::WsTrustNamespace, "InvalidSecurityToken"},
-    {Wire::WsseNamespace, "InvalidSecurityToken"},
-};
-
-bool IsBadCredentials(const QName& code)
-{
-    return std::any_of(
-        std::begin(BadCredentials), std::end(BadCredentials), [&code](const FaultName& name) {
-            return code.GetNamespaceUri() == name.namespaceUri
-                   && code.GetLocalName() == name.localName;
-        });
-}
-
-[[noreturn]] void ThrowFault(const ElementNode& fault)
-{
-    const ElementNode* const faultCode = fault.FindChildElement("faultcode");
-    const std::string codeText = GetElementText(faultCode);
-    QName code;
-    if (!codeText.empty()) {
-        ResolveQName(faultCode, codeText, Wire::SoapNamespace, code);
-    }
-    if (code.GetLocalName().empty()) {
-        throw SsoException("Invalid SOAP response: missing faultcode.");
-    }
-    const std::string faultString = GetElementText(fault.FindChildElement("faultstring"));
-    LogFault(codeText, faultString);
-    if (IsBadCredentials(code)) {
-        throw InvalidCredentialsException(
-            "Authentication failed" + (faultString.empty() ? faultString : ": " + faultString));
-    }
-    throw SsoException("Unexpected SOAP fault: " + codeText + "; request failed.");
-}
-
-void ThrowIfFault(const ElementNode& envelope)
+void ThrowIfFault(const ElementNode& envelope, const ReplyForm& form)
 {
     const ElementNode* const body = envelope.FindChildElement("Body");
     const ElementNode* const fault = body != nullptr ? body->FindChildElement("Fault") : nullptr;
-    if (fault != nullptr) {
-        ThrowFault(*fault);
+    if (fault == nullptr) {
+        return;
     }
+    if (form.faultObserver) {
+        form.faultObserver(ReadFault(*fault));
+    }
+    ThrowFault(*fault, form.dialect);
 }
 
 Ref<Quillon::Xml::Document> ParseResponse(Quillon::Reader* body)
@@ -91,7 +50,7 @@ Ref<Quillon::Xml::Document> ParseResponse(Quillon::Reader* body)
 
 // Hands the SOAP body of a reply that is not a fault to `extractor`.
 template <class Extractor>
-auto ProcessResponseWith(Quillon::Reader* body, const Extractor& extractor)
+auto ProcessResponseWith(Quillon::Reader* body, const ReplyForm& form, const Extractor& extractor)
 {
     const Ref<Quillon::Xml::Document> document = ParseResponse(body);
     const ElementNode* const envelope = document->GetRootElement();
@@ -101,33 +60,52 @@ auto ProcessResponseWith(Quillon::Reader* body, const Extractor& extractor)
             AssertionPlaces::ResponseHandlerImpl,
             AssertionPlaces::DocumentWithoutRoot);
     }
-    ThrowIfFault(*envelope);
+    ThrowIfFault(*envelope, form);
     const ElementNode* const soapBody = envelope->FindChildElement("Body");
     if (soapBody == nullptr) {
         throw SsoException("Unexpected response format: missing SAOP Body.");
     }
-    return extractor(*soapBody);
+    return extractor(*soapBody, form.dialect);
 }
 
-std::string ExtractIssuedToken(const ElementNode& soapBody)
+constexpr char Collection[] = "RequestSecurityTokenResponseCollection";
+
+// The dialect may leave it to the service.
+bool IsOtherForm(const ElementNode& soapBody, const ServiceDialect& dialect, bool hasCollection)
+{
+    const bool isCollection = soapBody.FindChildElement(Collection) != nullptr;
+    return dialect.anyReplyForm && isCollection != hasCollection;
+}
+
+std::string ExtractFromCollection(const ElementNode& soapBody)
 {
     return ToAssertionText(RequireDescendant(
         soapBody,
-        {"RequestSecurityTokenResponseCollection",
-         "RequestSecurityTokenResponse",
-         "RequestedSecurityToken",
-         "Assertion"}));
+        {Collection, "RequestSecurityTokenResponse", "RequestedSecurityToken", "Assertion"}));
 }
 
-// Only an issue request is answered by a collection [WST13 4.3, 5].
-std::string ExtractRenewedToken(const ElementNode& soapBody)
+std::string ExtractFromSingleResponse(const ElementNode& soapBody)
 {
     return ToAssertionText(RequireDescendant(
         soapBody, {"RequestSecurityTokenResponse", "RequestedSecurityToken", "Assertion"}));
 }
 
-bool ExtractValidity(const ElementNode& soapBody)
+// Only an issue request is answered by a collection [WST13 4.3, 5].
+std::string ExtractIssuedToken(const ElementNode& soapBody, const ServiceDialect& dialect)
 {
+    return IsOtherForm(soapBody, dialect, true) ? ExtractFromSingleResponse(soapBody)
+                                                : ExtractFromCollection(soapBody);
+}
+
+std::string ExtractRenewedToken(const ElementNode& soapBody, const ServiceDialect& dialect)
+{
+    return IsOtherForm(soapBody, dialect, false) ? ExtractFromCollection(soapBody)
+                                                 : ExtractFromSingleResponse(soapBody);
+}
+
+bool ExtractValidity(const ElementNode& soapBody, const ServiceDialect& dialect)
+{
+    const Wire::TrustNames& trust = Wire::GetTrustNames(dialect.trust);
     const ElementNode& code =
         RequireDescendant(soapBody, {"RequestSecurityTokenResponse", "Status", "Code"});
     const Quillon::Xml::Node* const child = code.GetFirstChild();
@@ -137,10 +115,10 @@ bool ExtractValidity(const ElementNode& soapBody)
             ToString(Quillon::Xml::NodeType::TEXT),
             child != nullptr ? ToString(child->GetNodeType()) : "nothing");
     }
-    if (text->GetText() == Wire::ValidStatus) {
+    if (text->GetText() == trust.validStatus) {
         return true;
     }
-    if (text->GetText() == Wire::InvalidStatus) {
+    if (text->GetText() == trust.invalidStatus) {
         return false;
     }
     ThrowUnexpectedFormat();
@@ -148,27 +126,34 @@ bool ExtractValidity(const ElementNode& soapBody)
 
 } // namespace
 
+ResponseHandlerImpl::ResponseHandlerImpl(ReplyForm form)
+    : _form(std::move(form))
+{}
+
 void ResponseHandlerImpl::HandleAcquireTokenResponse(
     Quillon::Reader* body, std::string& tokenXml) const
 {
-    tokenXml = ProcessResponseWith(body, ExtractIssuedToken);
+    tokenXml = ProcessResponseWith(body, _form, ExtractIssuedToken);
 }
 
 bool ResponseHandlerImpl::HandleValidateSubjectResponse(Quillon::Reader* body) const
 {
-    return ProcessResponseWith(body, ExtractValidity);
+    return ProcessResponseWith(body, _form, ExtractValidity);
 }
 
 void ResponseHandlerImpl::HandleRenewTokenResponse(
     Quillon::Reader* body, std::string& tokenXml) const
 {
-    tokenXml = ProcessResponseWith(body, ExtractRenewedToken);
+    tokenXml = ProcessResponseWith(body, _form, ExtractRenewedToken);
 }
 
 void ResponseHandlerImpl::HandleSPNegoResponse(
     Quillon::Reader* body, SPNegoResponse& response) const
 {
-    response = ProcessResponseWith(body, ExtractSPNegoResponse);
+    response = ProcessResponseWith(
+        body, _form, [](const ElementNode& soapBody, const ServiceDialect& /*dialect*/) {
+            return ExtractSPNegoResponse(soapBody);
+        });
 }
 
 } // namespace SsoClient

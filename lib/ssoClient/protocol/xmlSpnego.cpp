@@ -3,10 +3,11 @@
 #include "quillon/Exceptions.h"
 #include "quillon/StringUtil.h"
 #include "ssoClient/Exceptions.h"
-#include "ssoClient/message/xmlRequestBuilders.h"
 #include "ssoClient/protocol/responseReading.h"
 #include "ssoClient/wire/wireNames.h"
 #include "ssoClient/wire/xmlReading.h"
+
+#include <utility>
 
 using Quillon::Ref;
 using Quillon::Xml::ElementNode;
@@ -62,15 +63,16 @@ XMLBuilderPtr WstSPNegoBinExchangeBuilder(const Leg& leg)
 }
 
 XMLBodyBuilderInitialSPNego::XMLBodyBuilderInitialSPNego(
-    SamlToken::ConfirmationType confirmation, const TokenSpec& spec, const Leg& leg)
+    SamlToken::ConfirmationType confirmation, const TokenSpec& spec, const Leg& leg, IssueForm form)
     : _confirmation(confirmation)
     , _spec(spec)
     , _leg(leg)
+    , _form(std::move(form))
 {}
 
 void XMLBodyBuilderInitialSPNego::build(Ref<ElementNode>& out) const
 {
-    XMLCompositeBuilder request(AcquireSecurityTokenBuilder(_confirmation, _spec));
+    XMLCompositeBuilder request(AcquireSecurityTokenBuilder(_confirmation, _spec, _form));
     request.Add(WstSPNegoBinExchangeBuilder(_leg)).build(out);
     ElementDefineAttribute(out.get(), {Context, "urn:uuid:" + Quillon::StringUtil::GenerateUuid()});
 }

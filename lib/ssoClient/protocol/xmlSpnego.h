@@ -2,7 +2,7 @@
 
 #include "ssoClient/SamlToken.h"
 #include "ssoClient/TokenSpec.h"
-#include "ssoClient/message/xmlCommonBuilders.h"
+#include "ssoClient/message/xmlRequestBuilders.h"
 #include "ssoClient/protocol/SPNegoResponse.h"
 
 #include <string>
@@ -18,7 +18,10 @@ class XMLBodyBuilderInitialSPNego final : public XMLBaseBuilder
 {
 public:
     XMLBodyBuilderInitialSPNego(
-        SamlToken::ConfirmationType confirmation, const TokenSpec& spec, const Leg& leg);
+        SamlToken::ConfirmationType confirmation,
+        const TokenSpec& spec,
+        const Leg& leg,
+        IssueForm form = IssueForm());
 
     /** Every build names its negotiation by another context id. */
     void build(Quillon::Ref<Quillon::Xml::ElementNode>& out) const override;
@@ -27,6 +30,7 @@ private:
     SamlToken::ConfirmationType _confirmation;
     TokenSpec _spec;
     Leg _leg;
+    IssueForm _form;
 };
 
 /** The client's answer to a leg of the service. */

@@ -5,10 +5,18 @@
 /** Every namespace and identifier that goes over the wire. Prefixes are chosen by the writers. */
 namespace SsoClient::Wire {
 
-// SOAP 1.1, WS-Trust 1.3 and WS-Addressing 1.0.
+// SOAP 1.1 and 1.2, WS-Trust 1.3 and WS-Addressing 1.0.
 inline constexpr char SoapNamespace[] = "http://schemas.xmlsoap.org/soap/envelope/";
+inline constexpr char Soap12Namespace[] = "http://www.w3.org/2003/05/soap-envelope";
 inline constexpr char WsTrustNamespace[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
 inline constexpr char WsAddressingNamespace[] = "http://www.w3.org/2005/08/addressing";
+
+inline constexpr char AnonymousAddress[] = "http://www.w3.org/2005/08/addressing/anonymous";
+
+// What requests take from WS-Trust 1.4, WS-Policy and the claims of identity selectors.
+inline constexpr char WsTrust14Namespace[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200802";
+inline constexpr char WsPolicyNamespace[] = "http://schemas.xmlsoap.org/ws/2004/09/policy";
+inline constexpr char IdentityNamespace[] = "http://schemas.xmlsoap.org/ws/2005/05/identity";
 
 inline constexpr char IssueAction[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue";
 inline constexpr char IssueResponseAction[] =
@@ -53,6 +61,8 @@ inline constexpr char X509v3ValueType[] =
 // The two spellings of the profile's name differ in it as well.
 inline constexpr char Saml20TokenType[] =
     "http://docs.oasis-open.org/wss/oasis-wss-saml-tokenprofile-1.1#SAMLV2.0";
+inline constexpr char Saml20TokenTypeWithHyphen[] =
+    "http://docs.oasis-open.org/wss/oasis-wss-saml-token-profile-1.1#SAMLV2.0";
 inline constexpr char SamlIdValueType[] =
     "http://docs.oasis-open.org/wss/oasis-wss-saml-token-profile-1.1#SAMLID";
 

@@ -68,10 +68,10 @@ std::string Send(TransportSession& session, const Request& request = MakeRequest
 }
 
 /** The text of the `CommunicationException` that a request ends with; empty if it succeeds. */
-std::string SendAndFail(TransportSession& session)
+std::string SendAndFail(TransportSession& session, const Request& request = MakeRequest())
 {
     try {
-        Send(session);
+        Send(session, request);
     } catch (const CommunicationException& error) {
         return error.what();
     }
@@ -88,12 +88,12 @@ struct Told
     std::string body;
 };
 
-Told SendAsync(TransportSession& session)
+Told SendAsync(TransportSession& session, const Request& request = MakeRequest())
 {
     std::promise<Told> promise;
     Ref<ScheduledItem> pending;
     session.SendRequestAsync(
-        MakeRequest(),
+        request,
         [&](const Exception* error, Reader* body) {
             Told told;
             told.hasError = error != nullptr;
@@ -187,6 +187,49 @@ TEST(SendRequest, SendsNoFurtherHeader)
               "SOAPAction: \"http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue\"\r\n"
               "Content-Length: 19",
         head.get_future().get());
+}
+
+Request MakeSoap12Request()
+{
+    Request request = MakeRequest();
+    request.soap = SoapVersion::SOAP_1_2;
+    return request;
+}
+
+// [RFC 3902]
+TEST(SendSoap12Request, SaysItsActionInTheContentTypeAlone)
+{
+    std::promise<std::string> head;
+    const TestServer server([&](ServerConnection& connection) {
+        head.set_value(connection.ReadRequest()->head);
+        connection.Write(MakeReply("200 OK", "<reply/>"));
+    });
+    EXPECT_EQ("<reply/>", Send(*MakeClient(server).CreateSession(), MakeSoap12Request()));
+    EXPECT_EQ(
+        "POST /sts/STSService HTTP/1.1\r\nHost: 127.0.0.1:" + std::to_string(server.GetPort())
+            + "\r\nUser-Agent: SsoClient/" SSOCLIENT_VERSION
+              "\r\nAccept: */*\r\nContent-Type: application/soap+xml; charset=utf-8; "
+              "action=\"http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue\"\r\n"
+              "Content-Length: 19",
+        head.get_future().get());
+}
+
+// [SOAP12-2 7.5.1.2]
+TEST(SendSoap12Request, TakesAFaultOfTheSender)
+{
+    const TestServer server(AnswerAll(MakeReply("400 Bad Request", "<fault/>")));
+    EXPECT_EQ("<fault/>", Send(*MakeClient(server).CreateSession(), MakeSoap12Request()));
+    EXPECT_EQ("<fault/>", SendAsync(*MakeClient(server).CreateSession(), MakeSoap12Request()).body);
+    EXPECT_EQ(
+        "Server returned error: 400 Bad Request", SendAndFail(*MakeClient(server).CreateSession()));
+}
+
+TEST(SendSoap12Request, TakesNoOtherError)
+{
+    const TestServer server(AnswerAll(MakeReply("401 Unauthorized", "<html/>")));
+    EXPECT_EQ(
+        "Server returned error: 401 Unauthorized",
+        SendAndFail(*MakeClient(server).CreateSession(), MakeSoap12Request()));
 }
 
 TEST(SendRequest, HasIdleConnectionsNotProbed)

@@ -127,6 +127,52 @@ TEST(HandleAcquireTokenResponse, RefusesEachMissingStep)
     }
 }
 
+TEST(ReplyForm, IsLeftToTheServiceIfTheDialectSaysSo)
+{
+    const std::string single =
+        "<RequestSecurityTokenResponse><RequestedSecurityToken><Assertion>x</Assertion>"
+        "</RequestedSecurityToken></RequestSecurityTokenResponse>";
+    const std::string collection = "<RequestSecurityTokenResponseCollection>" + single
+                                   + "</RequestSecurityTokenResponseCollection>";
+    ReplyForm form;
+    form.dialect.anyReplyForm = true;
+    const ResponseHandlerImpl handler(form);
+    for (const std::string& body : {single, collection}) {
+        std::string issued;
+        std::string renewed;
+        handler.HandleAcquireTokenResponse(
+            Quillon::CreateStringReader(Envelope(body)).get(), issued);
+        handler.HandleRenewTokenResponse(
+            Quillon::CreateStringReader(Envelope(body)).get(), renewed);
+        EXPECT_THAT(issued, testing::EndsWith("\">x</Assertion>"));
+        EXPECT_EQ(renewed, issued);
+    }
+    EXPECT_EQ(GetFailure(Acquire, Envelope(single)), UnexpectedFormat);
+    EXPECT_EQ(GetFailure(Renew, Envelope(collection)), UnexpectedFormat);
+    EXPECT_EQ(
+        ::GetFailure([&] {
+            std::string issued;
+            handler.HandleAcquireTokenResponse(
+                Quillon::CreateStringReader(Envelope("<x/>")).get(), issued);
+        }),
+        UnexpectedFormat);
+}
+
+TEST(ReplyForm, HasTheStatusOfItsTrust)
+{
+    const std::string trust = "http://schemas.xmlsoap.org/ws/2005/02/trust/status/";
+    ReplyForm form;
+    form.dialect.trust = TrustVersion::WS_TRUST_2005_02;
+    const auto validate = [&form](const std::string& status) {
+        const std::string reply = StatusReply("<wst:Code>" + status + "</wst:Code>");
+        return ResponseHandlerImpl(form).HandleValidateSubjectResponse(
+            Quillon::CreateStringReader(reply).get());
+    };
+    EXPECT_TRUE(validate(trust + "valid"));
+    EXPECT_FALSE(validate(trust + "invalid"));
+    EXPECT_EQ(::GetFailure([&] { validate(WST "/status/valid"); }), UnexpectedFormat);
+}
+
 // [WST13 4.3]
 TEST(HandleAcquireTokenResponse, RefusesResponseWithoutCollection)
 {
