@@ -2,21 +2,13 @@
 #include "ssoClient/Descriptions.h"
 #include "ssoClient/SecurityTokenService.h"
 
-#include <fstream>
 #include <future>
 #include <iostream>
-#include <iterator>
 #include <memory>
 #include <utility>
 #include <vector>
 
 using Token = boost::shared_ptr<const SsoClient::SamlToken>;
-
-static auto ReadCertificates(const char* file)
-{
-    std::ifstream pem(file);
-    return Quillon::Crypto::ParsePemCertificates(std::string(std::istreambuf_iterator(pem), {}));
-}
 
 static std::future<Token> Begin(
     const SsoClient::SecurityTokenService& service, const char* user, const std::string& password)
@@ -56,13 +48,10 @@ try {
     if (argc < 5) {
         return 2;
     }
-    Quillon::Ssl::SSLContextOptions tls;
-    tls.useSystemAuthorities = false;
-    tls.authorities = ReadCertificates(argv[2]);
-    const auto sslContext = Quillon::Ssl::CreateSSLContext(tls);
+    const auto sslContext = Quillon::Ssl::LoadSSLContext(argv[2]); // who vouches for servers
     SsoClient::SecurityTokenServiceConfig config;
     config.url = argv[1];
-    config.trustedCertificates = ReadCertificates(argv[3]); // who may sign tokens
+    config.trustedCertificates = Quillon::Crypto::LoadPemCertificates(argv[3]); // who signs
     config.sslContext = sslContext.get();
     const auto service = CreateSecurityTokenService(config);
 

@@ -3,28 +3,17 @@
 #include "ssoClient/SecurityTokenService.h"
 #include "ssoClientGss/KerberosNegotiationHandler.h"
 
-#include <fstream>
 #include <iostream>
-#include <iterator>
-
-static auto ReadCertificates(const char* file)
-{
-    std::ifstream pem(file);
-    return Quillon::Crypto::ParsePemCertificates(std::string(std::istreambuf_iterator(pem), {}));
-}
 
 int main(int argc, char** argv)
 try {
     if (argc != 4 && argc != 6) {
         return 2;
     }
-    Quillon::Ssl::SSLContextOptions tls;
-    tls.useSystemAuthorities = false;
-    tls.authorities = ReadCertificates(argv[2]);
-    const auto sslContext = Quillon::Ssl::CreateSSLContext(tls);
+    const auto sslContext = Quillon::Ssl::LoadSSLContext(argv[2]); // who vouches for servers
     SsoClient::SecurityTokenServiceConfig config;
     config.url = argv[1];
-    config.trustedCertificates = ReadCertificates(argv[3]); // who may sign tokens
+    config.trustedCertificates = Quillon::Crypto::LoadPemCertificates(argv[3]); // who signs
     config.sslContext = sslContext.get();
 
     SsoClient::Gss::KerberosOptions kerberos;

@@ -17,7 +17,7 @@ try {
     if (argc != 3) {
         return 2;
     }
-    const auto trusted = Quillon::Crypto::ParsePemCertificates(ReadFile(argv[2]));
+    const auto trusted = Quillon::Crypto::LoadPemCertificates(argv[2]);
     const auto token = SsoClient::CreateSamlToken(ReadFile(argv[1]), trusted);
     std::cout << SsoClient::CreateRedactedDescription(*token) << "\n";
 } catch (const Quillon::Exception& error) {

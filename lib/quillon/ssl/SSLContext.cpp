@@ -106,4 +106,12 @@ Ref<SSLContext> CreateSSLContext(const SSLContextOptions& options)
     return Ref<SSLContext>(new SSLContextImpl(options));
 }
 
+Ref<SSLContext> LoadSSLContext(const std::string& authoritiesPath)
+{
+    SSLContextOptions options;
+    options.useSystemAuthorities = false;
+    options.authorities = Crypto::LoadPemCertificates(authoritiesPath);
+    return CreateSSLContext(options);
+}
+
 } // namespace Quillon::Ssl

@@ -5,6 +5,7 @@
 #include "quillon/crypto/PublicKey.h"
 #include "quillon/system/DateTime.h"
 
+#include <cstddef>
 #include <list>
 #include <string>
 #include <string_view>
@@ -55,5 +56,16 @@ QUILLON_API std::string GetSerialNumber(const Certificate& certificate);
  *                          2 GiB or more.
  */
 QUILLON_API std::list<Ref<const Certificate>> ParsePemCertificates(std::string_view pem);
+
+/** The largest file that `LoadPemCertificates` reads; a system's whole store has a 30th of it. */
+inline constexpr std::size_t MaxCertificateFileBytes = std::size_t{8} * 1024 * 1024;
+
+/**
+ * The same for a file; a pipe is read to its end.
+ *
+ * @throws CryptoException  as above, or the file cannot be read or is larger than
+ *                          `MaxCertificateFileBytes`. The text names the file.
+ */
+QUILLON_API std::list<Ref<const Certificate>> LoadPemCertificates(const std::string& path);
 
 } // namespace Quillon::Crypto

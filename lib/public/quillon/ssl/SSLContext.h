@@ -5,6 +5,7 @@
 #include "quillon/crypto/PrivateKey.h"
 
 #include <list>
+#include <string>
 
 namespace Quillon::Ssl {
 
@@ -38,5 +39,12 @@ class QUILLON_API SSLContext : public RefCounted
  *                                   does not belong to the certificate.
  */
 QUILLON_API Ref<SSLContext> CreateSSLContext(const SSLContextOptions& options);
+
+/**
+ * A context that trusts the authorities in a PEM file and no others, and shows no certificate.
+ *
+ * @throws Crypto::CryptoException  as `Crypto::LoadPemCertificates`, with the file in the text.
+ */
+QUILLON_API Ref<SSLContext> LoadSSLContext(const std::string& authoritiesPath);
 
 } // namespace Quillon::Ssl

@@ -7,8 +7,12 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <array>
 #include <atomic>
 #include <future>
+
+#include <sys/inotify.h>
+#include <unistd.h>
 
 using namespace Quillon::Http;
 using namespace Testing;
@@ -736,6 +740,18 @@ TEST_F(TlsTest, RefusesSpecsWithoutTheirParts)
         "Invalid argument : The connection spec for TCP is one for TLS.", GetArgumentError([&] {
             CreateSSLConnectionSpec(secure.get(), context.get(), Host, "", out);
         }));
+}
+
+// Where the system has no such file, trusting it would fail.
+TEST(LoadSSLContext, DoesNotOpenTheSystemsAuthorities)
+{
+    const int watch = ::inotify_init1(IN_NONBLOCK | IN_CLOEXEC);
+    ASSERT_GE(watch, 0);
+    ::inotify_add_watch(watch, X509_get_default_cert_file(), IN_OPEN);
+    Quillon::Ssl::LoadSSLContext(TEST_DATA_DIR "/keys/sts-cert.pem");
+    std::array<char, 4096> events{};
+    EXPECT_EQ(-1, ::read(watch, events.data(), events.size()));
+    ::close(watch);
 }
 
 TEST(CreateSSLContext, RefusesToTrustNobody)
