@@ -405,6 +405,19 @@ std::string CommandLine::GetHelp() const
     return _app->help();
 }
 
+std::vector<std::string> CommandLine::GetOptions(const std::vector<std::string>& arguments) const
+{
+    const CLI::App* command = _app.get();
+    for (const std::string& word : arguments) {
+        const CLI::App* below = FindCommand(*command, word);
+        if (below == nullptr) {
+            break;
+        }
+        command = below;
+    }
+    return GetOptionNames(*command);
+}
+
 bool CommandLine::Parse(const std::vector<std::string>& arguments) const
 {
     try {

@@ -124,6 +124,9 @@ public:
      */
     bool Parse(const std::vector<std::string>& arguments) const;
 
+    /** The long names of the options that the command has which the arguments begin with. */
+    std::vector<std::string> GetOptions(const std::vector<std::string>& arguments) const;
+
     /** What `--help` of the program prints. */
     std::string GetHelp() const;
 

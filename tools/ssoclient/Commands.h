@@ -28,3 +28,4 @@ void AddRenewCommand(const Command& parent, Invocation& invocation);
 void AddValidateCommand(const Command& parent, Invocation& invocation);
 void AddInspectCommand(const Command& parent, Invocation& invocation);
 void AddDoctorCommand(const Command& parent, Invocation& invocation);
+void AddProfileCommand(const Command& parent, Invocation& invocation);

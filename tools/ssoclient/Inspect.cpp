@@ -2,6 +2,7 @@
 #include "Commands.h"
 #include "Explanation.h"
 #include "Files.h"
+#include "Profile.h"
 #include "TokenOutput.h"
 #include "Trust.h"
 
@@ -58,6 +59,7 @@ void AddInspectCommand(const Command& parent, Invocation& invocation)
         .Required()
         .Check(CheckNotEmpty)
         .ValueName("");
+    AddProfileTo(command);
     AddTrustTo(command, options->trustFiles).Required();
     command
         .AddOption(

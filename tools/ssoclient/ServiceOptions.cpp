@@ -2,6 +2,7 @@
 
 #include "Arguments.h"
 #include "ExitCode.h"
+#include "Profile.h"
 
 #include "quillon/MessageFormatter.h"
 #include "quillon/StringUtil.h"
@@ -85,6 +86,7 @@ void ServiceOptions::AddTo(const Command& owner, ExchangeRecord& record, Trust t
     command.AddOption("--url", url, "The token service, https://HOST[:PORT]/PATH")
         .Required()
         .ValueName("URL");
+    AddProfileTo(command);
     const Option trustOption = AddTrustTo(command, trustFiles);
     if (trust == Trust::REQUIRED) {
         trustOption.Required();

@@ -1,5 +1,6 @@
 #include "Commands.h"
 #include "Failure.h"
+#include "Profile.h"
 #include "Terminal.h"
 #include "Versions.h"
 
@@ -19,6 +20,7 @@ void AddCommands(const Command& program, Invocation& invocation)
     AddValidateCommand(program, invocation);
     AddInspectCommand(program, invocation);
     AddDoctorCommand(program, invocation);
+    AddProfileCommand(program, invocation);
 }
 
 ExitCode Run(const std::vector<std::string>& arguments, Invocation& invocation)
@@ -31,7 +33,8 @@ ExitCode Run(const std::vector<std::string>& arguments, Invocation& invocation)
     if (arguments.empty() && IsTerminal()) {
         std::cerr << commandLine.GetHelp();
     }
-    return commandLine.Parse(arguments) ? invocation.action() : ExitCode::DONE;
+    const std::vector<std::string> words = AddProfile(arguments, commandLine.GetOptions(arguments));
+    return commandLine.Parse(words) ? invocation.action() : ExitCode::DONE;
 }
 
 } // namespace

@@ -137,7 +137,8 @@ class UsageErrors(ProgramTest):
         self.assert_misused(ssoclient(*command.split(), *arguments), command, message)
 
     def test_without_a_command(self):
-        self.assert_misuse("", "ssoclient needs a command: acquire, renew, validate, inspect, doctor")
+        self.assert_misuse("", "ssoclient needs a command: acquire, renew, validate, inspect, "
+                           "doctor, profile")
         self.assert_misuse("acquire", "ssoclient acquire needs a command: password, certificate, "
                            "token, gss")
 
@@ -148,7 +149,7 @@ class UsageErrors(ProgramTest):
 
     def test_unknown_command_is_not_shown(self):
         self.assert_misuse("", "ssoclient has no such command, only acquire, renew, validate, "
-                           "inspect", "SECRET")
+                           "inspect, doctor, profile", "SECRET")
         self.assert_misuse("acquire", "ssoclient acquire has no such command, only password, "
                            "certificate, token, gss", "SECRET", "SECRET")
 
