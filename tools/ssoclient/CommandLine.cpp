@@ -222,6 +222,49 @@ std::string CheckSeconds(const std::string& value)
                : "`" + value + "' is not a number of seconds" + ExplainUnit(value);
 }
 
+OptionDescription Describe(const CLI::Option& option)
+{
+    OptionDescription description;
+    description.isPositional = option.get_positional();
+    description.shortName = option.get_snames().empty() ? "" : option.get_snames().front();
+    description.name =
+        description.isPositional ? option.get_name(true) : option.get_lnames().front();
+    const bool takesValue = option.get_items_expected_max() > 0;
+    // Behind the value's name the parser adds what it checks.
+    const std::string value = option.get_type_name();
+    description.value =
+        takesValue && !description.isPositional ? value.substr(0, value.find(':')) : "";
+    description.text = option.get_description();
+    description.group = option.get_group();
+    description.isRequired = option.get_required();
+    description.mayRepeat = option.get_items_expected_max() > 1;
+    return description;
+}
+
+CommandDescription Describe(const CLI::App& app)
+{
+    CommandDescription description;
+    if (app.get_parent() != nullptr) {
+        description.path = Describe(*app.get_parent()).path;
+    }
+    description.path.push_back(app.get_name());
+    description.text = app.get_description();
+    description.footer = app.get_footer();
+    for (const CLI::Option* option : app.get_options()) {
+        description.options.push_back(Describe(*option));
+    }
+    return description;
+}
+
+CommandDescription DescribeAll(const CLI::App& app)
+{
+    CommandDescription description = Describe(app);
+    for (const CLI::App* command : app.get_subcommands({})) {
+        description.commands.push_back(DescribeAll(*command));
+    }
+    return description;
+}
+
 /** The parser's help, wrapped to the terminal, with the exit codes at the end. */
 class HelpFormatter : public CLI::Formatter
 {
@@ -416,6 +459,11 @@ std::vector<std::string> CommandLine::GetOptions(const std::vector<std::string>&
         command = below;
     }
     return GetOptionNames(*command);
+}
+
+CommandDescription CommandLine::Describe() const
+{
+    return DescribeAll(*_app);
 }
 
 bool CommandLine::Parse(const std::vector<std::string>& arguments) const

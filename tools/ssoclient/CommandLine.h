@@ -1,5 +1,7 @@
 #pragma once
 
+#include "CommandDescription.h"
+
 #include <functional>
 #include <memory>
 #include <optional>
@@ -126,6 +128,9 @@ public:
 
     /** The long names of the options that the command has which the arguments begin with. */
     std::vector<std::string> GetOptions(const std::vector<std::string>& arguments) const;
+
+    /** All commands with their options, as the help describes them. */
+    CommandDescription Describe() const;
 
     /** What `--help` of the program prints. */
     std::string GetHelp() const;
