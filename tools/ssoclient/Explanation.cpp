@@ -46,45 +46,59 @@ std::string DescribeConfirmation(const SamlToken& token)
                              : "holder of the key of " + Describe(*holder);
 }
 
-std::string DescribeDelegation(const SamlToken& token)
+std::vector<std::string> DescribeDelegation(const SamlToken& token)
 {
     std::vector<SsoClient::Delegate> chain;
     token.GetDelegationChain(chain);
     if (chain.empty()) {
-        return "none";
+        return {"none"};
     }
-    std::string text = Describe(token.GetSubject());
+    std::vector<std::string> links = {Describe(token.GetSubject())};
     for (const SsoClient::Delegate& delegate : chain) {
-        text +=
-            " -> " + Describe(delegate.subject) + " (" + delegate.delegationDate.ToString() + ")";
+        links.push_back(
+            Describe(delegate.subject) + " (" + delegate.delegationDate.ToString() + ")");
     }
-    return text;
+    return links;
 }
 
-std::string DescribeAudience(const SamlToken& token)
+std::vector<std::string> DescribeAudience(const SamlToken& token)
 {
     std::set<std::string> audience;
     token.GetAudience(audience);
-    std::string text;
-    for (const std::string& party : audience) {
-        text += (text.empty() ? "" : ", ") + party;
-    }
-    return text.empty() ? "anyone" : text;
+    return audience.empty() ? std::vector<std::string>{"anyone"}
+                            : std::vector<std::string>(audience.begin(), audience.end());
 }
 
-std::string ToLine(const std::string& name, const std::string& value)
+std::string ToLine(const ExplainedFact& fact)
 {
-    return "  " + name + ToOneLine(value) + "\n";
+    constexpr std::size_t NameWidth = 14;
+    std::string name = fact.name + ":";
+    name.resize(NameWidth, ' ');
+    std::string values;
+    for (const std::string& value : fact.values) {
+        values += (values.empty() ? "" : fact.isChain ? " -> " : ", ") + value;
+    }
+    return "  " + name + ToOneLine(values) + "\n";
 }
 
 } // namespace
 
+std::vector<ExplainedFact> ExplainFacts(const SamlToken& token, const Certificate* signer)
+{
+    return {
+        {"validity", {DescribeValidity(token)}},
+        {"signed by", {signer == nullptr ? "unknown" : Describe(*signer)}},
+        {"issuer", {FindIssuer(token)}},
+        {"confirmation", {DescribeConfirmation(token)}},
+        {"audience", DescribeAudience(token)},
+        {"delegation", DescribeDelegation(token), true}};
+}
+
 std::string Explain(const SamlToken& token, const Certificate* signer)
 {
-    return ToLine("validity:     ", DescribeValidity(token))
-           + ToLine("signed by:    ", signer == nullptr ? "unknown" : Describe(*signer))
-           + ToLine("issuer:       ", FindIssuer(token))
-           + ToLine("confirmation: ", DescribeConfirmation(token))
-           + ToLine("audience:     ", DescribeAudience(token))
-           + ToLine("delegation:   ", DescribeDelegation(token));
+    std::string lines;
+    for (const ExplainedFact& fact : ExplainFacts(token, signer)) {
+        lines += ToLine(fact);
+    }
+    return lines;
 }

@@ -5,6 +5,19 @@
 #include "ssoClient/SamlToken.h"
 
 #include <string>
+#include <vector>
+
+/** Something that a person wants to know of a token. */
+struct ExplainedFact
+{
+    std::string name;
+    std::vector<std::string> values;
+    bool isChain = false; ///< whether each value follows from the one before
+};
+
+/** How long the token is valid, who signed and issued it, and so on, as `Explain` has it. */
+std::vector<ExplainedFact> ExplainFacts(
+    const SsoClient::SamlToken& token, const Quillon::Crypto::Certificate* signer);
 
 /**
  * Lines for a person about a verified token: how long it is valid, who signed and issued it, what

@@ -4,12 +4,14 @@
 #include "Files.h"
 #include "Profile.h"
 #include "TokenOutput.h"
+#include "TokenPage.h"
 #include "Trust.h"
 
 #include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/Exceptions.h"
 
 #include <memory>
+#include <optional>
 
 namespace {
 
@@ -17,6 +19,7 @@ struct InspectOptions
 {
     std::string file;
     std::vector<std::string> trustFiles;
+    std::string pageFile; ///< for a page of HTML; empty for none
     long long clockToleranceSec = SsoClient::DefaultClockToleranceSec;
 };
 
@@ -38,12 +41,22 @@ Quillon::Ref<const Quillon::Crypto::Certificate> FindSigner(
 ExitCode Inspect(const InspectOptions& options, const Presentation& presentation)
 {
     TokenOutput output({}, presentation);
+    std::optional<OutputFile> page;
+    if (!options.pageFile.empty()) {
+        page.emplace(options.pageFile);
+    }
     const CertificateList trusted = ReadCertificates(options.trustFiles);
     const auto token =
         SsoClient::CreateSamlToken(ReadFile(options.file), trusted, options.clockToleranceSec);
     output.Show(token);
+    if (!page && !presentation.ShowsExplanations()) {
+        return ExitCode::DONE;
+    }
+    const auto signer = FindSigner(*token, trusted, options.clockToleranceSec);
+    if (page) {
+        page->Write(WriteTokenPage(*token, signer.get()));
+    }
     if (presentation.ShowsExplanations()) {
-        const auto signer = FindSigner(*token, trusted, options.clockToleranceSec);
         output.Print(Explain(*token, signer.get()));
     }
     return ExitCode::DONE;
@@ -69,6 +82,10 @@ void AddInspectCommand(const Command& parent, Invocation& invocation)
         .Between(0, MaxSeconds)
         .ShowDefault()
         .ValueName("SEC");
+    command
+        .AddOption("--html", options->pageFile, "Write what the token means as a page to this file")
+        .Check(CheckNotEmpty)
+        .ValueName("FILE");
     invocation.presentation.AddTo(command);
     command.ShowExample("ssoclient inspect token.xml --trust sts.pem");
     command.WhenNamed([options, &invocation] {

@@ -5,12 +5,14 @@ import hashlib
 import json
 import re
 import ssl
+import stat
 import subprocess
 import unittest
 
 import lxml.etree
+import lxml.html
 
-from programs import DATA, DONE, OUT_OF_VALIDITY, REFUSED, ProgramTest, ssoclient
+from programs import DATA, DONE, OUT_OF_VALIDITY, REFUSED, ProgramTest, ServiceTest, ssoclient
 from terminals import TerminalTest
 
 TOKENS = DATA / "tokens"
@@ -227,6 +229,29 @@ class ExplainedAtATerminal(TerminalTest):
             self.read_what_is_there().decode(),
             r"\ASamlToken \[.*\]\r\n  validity:     (5 min 0 s|4 min \d+ s) left, until \S+Z\r\n"
             r"  signed by:    .+\r\n")
+
+
+class Page(ServiceTest):
+    def test_is_one_that_a_browser_reads(self):
+        token = self.token_file(self.acquire, "--audience", "urn:a&b<c>", "urn:d")
+        page = self.folder / "page.html"
+        result = ssoclient("inspect", token, "--trust", self.sts.trust, "--html", page)
+        self.assert_done(result)
+        self.assertEqual(0o600, stat.S_IMODE(page.stat().st_mode))
+        tree = lxml.html.document_fromstring(page.read_bytes())
+        facts = {name.text_content(): name.getnext() for name in tree.iter("dt")}
+        self.assertEqual(["urn:a&b<c>", "urn:d"],
+                         [item.text_content() for item in facts["audience"].iter("li")])
+        self.assertRegex(facts["validity"].text_content(), "^(4 min 5\d|5 min 0) s left")
+        self.assertIn("CN=SsoClient development STS", facts["signed by"].text_content())
+        self.assertEqual([], tree.xpath("//script | //link | //img | //@src | //@href"))
+
+    def test_there_is_none_of_a_token_that_is_refused(self):
+        token = self.changed(self.token_file(self.acquire_by_certificate))
+        page = self.folder / "page.html"
+        result = ssoclient("inspect", token, "--trust", self.sts.trust, "--html", page)
+        self.assertEqual(REFUSED, result.code)
+        self.assertFalse(page.exists())
 
 
 if __name__ == "__main__":

@@ -59,7 +59,7 @@ class Help(unittest.TestCase):
                                  *self.IDENTITY, *self.SERVICE, *self.SPEC, *self.OUTPUT)),
                 ("renew", ("--token", "--lifetime", *self.IDENTITY, *self.SERVICE, *self.OUTPUT)),
                 ("validate", ("--token", *self.SERVICE, *self.SPEECH)),
-                ("inspect", ("FILE", "--trust", "--clock-tolerance", *self.SPEECH))):
+                ("inspect", ("FILE", "--trust", "--clock-tolerance", "--html", *self.SPEECH))):
             with self.subTest(command=command):
                 self.assert_prints(ssoclient(*command.split(), "--help"), *options)
 
