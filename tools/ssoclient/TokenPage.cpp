@@ -70,7 +70,7 @@ ExplainedFact CollectGroups(const SamlToken& token)
     token.GetGroups(groups);
     ExplainedFact fact = {"groups", {}};
     for (const SsoClient::PrincipalId& group : groups) {
-        fact.values.push_back(group.GetDomain() + "\\" + group.GetName());
+        fact.values.push_back(group.GetName() + "@" + group.GetDomain());
     }
     return fact;
 }
@@ -96,7 +96,7 @@ ExplainedFact CollectFlags(const SamlToken& token)
         "properties",
         {token.IsRenewable() ? "renewable" : "not renewable",
          token.IsDelegable() ? "delegable" : "not delegable",
-         token.IsSolution() ? "of a service" : "of a person"}};
+         token.IsSolution() ? "of a service" : "not of a service"}};
 }
 
 } // namespace
