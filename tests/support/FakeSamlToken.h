@@ -16,6 +16,8 @@ public:
     ConfirmationType confirmationMethod = CONFIRM_BEARER;
     std::vector<SsoClient::PrincipalId> groups;
     std::vector<SsoClient::Delegate> delegationChain;
+    std::set<std::string> audience{"secret-audience"};
+    Quillon::Ref<const Quillon::Crypto::Certificate> certificate;
     std::string xml;
 
     mutable int subjectReads = 0;
@@ -38,14 +40,14 @@ public:
     {
         out = delegationChain;
     }
-    void GetAudience(std::set<std::string>& out) const override { out = {"secret-audience"}; }
+    void GetAudience(std::set<std::string>& out) const override { out = audience; }
     void GetAdvice(std::vector<SsoClient::Advice>& out) const override
     {
         out = {{"secret-advice", {}}};
     }
     const Quillon::Crypto::Certificate* GetConfirmationCertificate() const override
     {
-        return nullptr;
+        return certificate.get();
     }
     const std::string& ToXml() const override { return xml; }
 };

@@ -82,6 +82,28 @@ struct TokenReading
 };
 
 /**
+ * What of an issued token is compared with what was asked for. A token that differs is refused with
+ * an `SsoException` that says how. Each part can be switched off for services that cannot do better.
+ */
+struct GrantCheck
+{
+    /** Bound to the caller's key if that was asked for, and to none if not. */
+    bool key = true;
+    /**
+     * Of the one who authenticated, or whose token was presented. Not compared: persistent and
+     * transient names, e-mail addresses, and names in a domain that the mapping gives, unless the
+     * mapping is of one directory; and whoever acts as somebody.
+     */
+    bool subject = true;
+    /** For the audience that was asked for, no more and no less; renewed: as before. */
+    bool audience = true;
+    /** Delegated to whom was asked for and to nobody else, and delegable only if that was. */
+    bool delegation = true;
+    /** Not longer than asked for, and the clock tolerance of `reading`. */
+    bool lifetime = true;
+};
+
+/**
  * A value with a member for each difference that is known. A default one is the dialect of the
  * service that the library was made for: without a dialect in the configuration, requests and
  * replies are the same.
@@ -132,6 +154,7 @@ struct ServiceDialect
     bool wsseFailedAuthentication = false;
 
     boost::optional<TokenReading> reading;
+    GrantCheck grantCheck;
 
     /** What the library speaks without a dialect. */
     static ServiceDialect Default() { return {}; }

@@ -297,6 +297,16 @@ PrincipalId FindSubject(const AssertionFacts& facts, const SubjectMapping& mappi
     ThrowNoRule("subject", facts.subject);
 }
 
+const SubjectRule* FindSubjectRule(const AssertionFacts& facts, const SubjectMapping& mapping)
+{
+    for (const SubjectRule& rule : mapping.subjects) {
+        if (FindValue(rule, facts)) {
+            return &rule;
+        }
+    }
+    return nullptr;
+}
+
 PrincipalId FindDelegate(const AssertionNameId& nameId, const SubjectMapping& mapping)
 {
     for (const SubjectRule& rule : mapping.subjects) {

@@ -11,6 +11,9 @@ void CheckRules(const SubjectMapping& mapping);
 /** The subject by the first rule that fits. @throws ParseException  none does. */
 PrincipalId FindSubject(const AssertionFacts& facts, const SubjectMapping& mapping);
 
+/** The rule by which it is found; null if none fits. */
+const SubjectRule* FindSubjectRule(const AssertionFacts& facts, const SubjectMapping& mapping);
+
 /** The same for a delegate, who has no attributes. */
 PrincipalId FindDelegate(const AssertionNameId& nameId, const SubjectMapping& mapping);
 

@@ -1,6 +1,8 @@
 #pragma once
 
 #include "ssoClient/GssNegotiationContext.h"
+#include "ssoClient/HolderOfKeyConfig.h"
+#include "ssoClient/ServiceDialect.h"
 #include "ssoClient/protocol/RequestBuilder.h"
 #include "ssoClient/protocol/ResponseHandler.h"
 #include "ssoClient/protocol/Transport.h"
@@ -20,7 +22,8 @@ public:
         const boost::shared_ptr<TransportSession>& session,
         const boost::shared_ptr<const ResponseHandler>& responseHandler,
         const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates,
-        const boost::optional<ServiceDialect>& dialect = boost::none);
+        const boost::optional<ServiceDialect>& dialect = boost::none,
+        const boost::optional<HolderOfKeyConfig>& identity = boost::none);
 
     NegotiationResult NegotiateToken(const Leg& leg) override;
 
@@ -32,6 +35,7 @@ private:
     boost::shared_ptr<const ResponseHandler> _responseHandler;
     std::list<Quillon::Ref<const Quillon::Crypto::Certificate>> _trustedCertificates;
     boost::optional<ServiceDialect> _dialect;
+    boost::optional<HolderOfKeyConfig> _identity;
 };
 
 } // namespace SsoClient::InternalApi

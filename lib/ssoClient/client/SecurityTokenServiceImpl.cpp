@@ -30,17 +30,23 @@ SecurityTokenServiceImpl::SecurityTokenServiceImpl(
     const boost::shared_ptr<const Transport>& transport,
     const boost::shared_ptr<const ResponseHandler>& responseHandler,
     const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates,
-    const boost::optional<ServiceDialect>& dialect)
+    const boost::optional<ServiceDialect>& dialect,
+    const boost::optional<HolderOfKeyConfig>& identity)
     : _requestBuilder(requestBuilder)
     , _transport(transport)
     , _responseHandler(responseHandler)
     , _trustedCertificates(trustedCertificates)
     , _dialect(dialect)
+    , _identity(identity)
 {}
 
 template <class Describe, class Build, class Read>
 boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::RunForToken(
-    const char* operationName, const Describe& describe, const Build& build, const Read& read) const
+    const char* operationName,
+    const GrantRequest& asked,
+    const Describe& describe,
+    const Build& build,
+    const Read& read) const
 {
     return Run(
         *_transport,
@@ -53,7 +59,7 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::RunForToken(
         [&](Quillon::Reader* reply) {
             std::string tokenXml;
             read(reply, tokenXml);
-            return ToSamlToken(tokenXml);
+            return ToSamlToken(tokenXml, asked);
         });
 }
 
@@ -62,6 +68,7 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireToken(
 {
     return RunForToken(
         "AcquireToken",
+        GrantRequest::ByPassword(userName, spec),
         [&] {
             return MessageFormatter::ASPrint(
                 "Requested token for subject `%1', spec `%2'", userName, WriteTokenSpec(spec));
@@ -90,7 +97,8 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByGSS(
                 _trustedCertificates,
                 LegDriver::EmptyLeg::STOPS_THE_PROCESS);
             const boost::shared_ptr<TransportSession> session = _transport->CreateSession();
-            return ToSamlToken(Negotiate(legs, *session, spec, handler));
+            return ToSamlToken(
+                Negotiate(legs, *session, spec, handler), GrantRequest::ByNegotiation(spec));
         });
 }
 
@@ -99,6 +107,7 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByCerti
 {
     return RunForToken(
         "AcquireTokenByCertificate",
+        GrantRequest::ByCertificate(spec),
         [&] { return DescribeRequest(spec); },
         [&](Request& request) { _requestBuilder->BuildCertificateTokenRequest(spec, request); },
         [&](Quillon::Reader* reply, std::string& tokenXml) {
@@ -111,6 +120,7 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByToken
 {
     return RunForToken(
         "AcquireTokenByToken",
+        GrantRequest::ByToken(token, spec),
         [&] {
             return MessageFormatter::ASPrint(
                 "Requested token for %1 with spec `%2'",
@@ -145,6 +155,7 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::RenewToken(
 {
     return RunForToken(
         "RenewToken",
+        GrantRequest::ByRenewal(token, lifetimeSec),
         [&] {
             return MessageFormatter::ASPrint(
                 "Renewing token %1 for %2 more seconds",
@@ -226,7 +237,7 @@ boost::shared_ptr<const SecurityTokenService> SecurityTokenServiceImpl::Copy() c
 }
 
 boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::ToSamlToken(
-    const std::string& tokenXml) const
+    const std::string& tokenXml, const GrantRequest& asked) const
 {
     if (tokenXml.empty()) {
         return nullptr;
@@ -238,6 +249,9 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::ToSamlToken(
     } catch (const ParseException& error) {
         // The caller's own tokens are fine: it is the service that answered with a bad one.
         throw SsoException(error.what());
+    }
+    if (_dialect) {
+        CheckGrant(*token, asked, *_dialect, _identity);
     }
     LogTrace([&token] {
         return MessageFormatter::ASPrint(

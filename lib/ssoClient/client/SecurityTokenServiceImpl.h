@@ -1,6 +1,7 @@
 #pragma once
 
 #include "ssoClient/SecurityTokenService.h"
+#include "ssoClient/client/grantChecking.h"
 #include "ssoClient/protocol/RequestBuilder.h"
 #include "ssoClient/protocol/ResponseHandler.h"
 #include "ssoClient/protocol/Transport.h"
@@ -21,7 +22,8 @@ public:
         const boost::shared_ptr<const Transport>& transport,
         const boost::shared_ptr<const ResponseHandler>& responseHandler,
         const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates,
-        const boost::optional<ServiceDialect>& dialect = boost::none);
+        const boost::optional<ServiceDialect>& dialect = boost::none,
+        const boost::optional<HolderOfKeyConfig>& identity = boost::none);
 
     boost::shared_ptr<const SamlToken> AcquireToken(
         const std::string& userName,
@@ -61,10 +63,15 @@ public:
         const TokenCompletion& completion) const override;
 
 private:
-    /** Runs an operation whose reply has a token, the text of which `read` stores. */
+    /**
+     * Runs an operation whose reply has a token, the text of which `read` stores.
+     *
+     * @param asked  what that token is to be like.
+     */
     template <class Describe, class Build, class Read>
     boost::shared_ptr<const SamlToken> RunForToken(
         const char* operationName,
+        const GrantRequest& asked,
         const Describe& describe,
         const Build& build,
         const Read& read) const;
@@ -73,13 +80,15 @@ private:
     boost::shared_ptr<const SecurityTokenService> Copy() const;
 
     /** @return the verified token; null for an empty text. */
-    boost::shared_ptr<const SamlToken> ToSamlToken(const std::string& tokenXml) const;
+    boost::shared_ptr<const SamlToken> ToSamlToken(
+        const std::string& tokenXml, const GrantRequest& asked) const;
 
     boost::shared_ptr<const RequestBuilder> _requestBuilder;
     boost::shared_ptr<const Transport> _transport;
     boost::shared_ptr<const ResponseHandler> _responseHandler;
     std::list<Quillon::Ref<const Quillon::Crypto::Certificate>> _trustedCertificates;
     boost::optional<ServiceDialect> _dialect;
+    boost::optional<HolderOfKeyConfig> _identity;
 };
 
 } // namespace SsoClient

@@ -64,7 +64,8 @@ boost::shared_ptr<SecurityTokenService> MakeService(
         MakeTransport(config, limits),
         MakeResponseHandler(config),
         config.trustedCertificates,
-        config.dialect);
+        config.dialect,
+        config.holderOfKeyConfig);
 }
 
 } // namespace
@@ -92,7 +93,8 @@ boost::shared_ptr<InternalApi::GssNegotiationContext> InternalApi::CreateGssNego
         MakeTransport(config, ContextTimeoutMicroseconds)->CreateSession(),
         MakeResponseHandler(config),
         config.trustedCertificates,
-        config.dialect);
+        config.dialect,
+        config.holderOfKeyConfig);
 }
 
 } // namespace SsoClient
