@@ -1,5 +1,6 @@
 #include "Commands.h"
 #include "IdentityOptions.h"
+#include "PresentedToken.h"
 #include "ServiceOptions.h"
 #include "TokenOutput.h"
 #include "TokenSpecOptions.h"
@@ -19,11 +20,17 @@ struct AcquireCertificateOptions
 ExitCode AcquireCertificate(
     const AcquireCertificateOptions& options, const Presentation& presentation)
 {
-    const auto service = options.service.CreateService(
-        ReadCertificates(options.service.trustFiles), options.identity.Read());
+    const CertificateList trusted = ReadCertificates(options.service.trustFiles);
+    const auto service = options.service.CreateService(trusted, options.identity.Read());
     TokenOutput output(options.output, presentation);
-    output.Show(options.service.Await(
-        presentation, [&] { return service->AcquireTokenByCertificate(options.token.spec); }));
+    const std::string& presentedFile = options.service.dialect.GetPresentedFile();
+    const auto presented = presentedFile.empty()
+                               ? boost::shared_ptr<const SsoClient::SamlToken>()
+                               : ReadToken(presentedFile, trusted, options.service.dialect);
+    output.Show(options.service.Await(presentation, [&] {
+        return presented ? service->AcquireTokenByToken(*presented, options.token.spec)
+                         : service->AcquireTokenByCertificate(options.token.spec);
+    }));
     return ExitCode::DONE;
 }
 
@@ -37,6 +44,8 @@ void AddAcquireCertificateCommand(const Command& parent, Invocation& invocation)
     options->service.AddTo(command, invocation.exchanges);
     options->identity.AddRequiredTo(command);
     options->token.AddTo(command);
+    options->service.dialect.AddIssueTo(command, options->token.spec);
+    options->service.dialect.AddDelegatingTo(command);
     options->output.AddOutTo(command);
     invocation.presentation.AddTo(command);
     command.ShowExample(

@@ -77,6 +77,7 @@ void AddAcquireGssCommand(const Command& parent, Invocation& invocation)
     AddKerberosTo(command, options->kerberos);
     options->identity.AddTo(command);
     options->token.AddTo(command);
+    options->service.dialect.AddIssueTo(command, options->token.spec);
     options->token.AddBearerTo(command);
     options->output.AddOutTo(command);
     invocation.presentation.AddTo(command);

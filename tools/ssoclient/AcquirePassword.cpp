@@ -1,6 +1,7 @@
 #include "Arguments.h"
 #include "Commands.h"
 #include "IdentityOptions.h"
+#include "PresentedToken.h"
 #include "Secret.h"
 #include "ServiceOptions.h"
 #include "TokenOutput.h"
@@ -20,6 +21,23 @@ struct AcquirePasswordOptions
     std::string passwordFile;
 };
 
+using TokenPtr = boost::shared_ptr<const SsoClient::SamlToken>;
+
+/** Asks for a token of the one whose token the user presents. */
+TokenPtr AcquireForAnother(
+    const AcquirePasswordOptions& options,
+    const std::string& password,
+    const Presentation& presentation)
+{
+    const CertificateList trusted = ReadCertificates(options.service.trustFiles);
+    const auto service = options.service.CreateService(
+        trusted, options.identity.Read(), SsoClient::PasswordCredentials(options.user, password));
+    const TokenPtr presented =
+        ReadToken(options.service.dialect.GetPresentedFile(), trusted, options.service.dialect);
+    return options.service.Await(
+        presentation, [&] { return service->AcquireTokenByToken(*presented, options.token.spec); });
+}
+
 ExitCode AcquirePassword(const AcquirePasswordOptions& options, const Presentation& presentation)
 {
     const auto service = options.service.CreateService(
@@ -27,6 +45,10 @@ ExitCode AcquirePassword(const AcquirePasswordOptions& options, const Presentati
     TokenOutput output(options.output, presentation);
     Quillon::Wiped password;
     GetPassword(options.passwordFile, password);
+    if (!options.service.dialect.GetPresentedFile().empty()) {
+        output.Show(AcquireForAnother(options, password.Get(), presentation));
+        return ExitCode::DONE;
+    }
     output.Show(options.service.Await(presentation, [&] {
         return service->AcquireToken(options.user, password.Get(), options.token.spec);
     }));
@@ -54,6 +76,8 @@ void AddAcquirePasswordCommand(const Command& parent, Invocation& invocation)
         .ValueName("FILE");
     options->identity.AddTo(command);
     options->token.AddTo(command);
+    options->service.dialect.AddIssueTo(command, options->token.spec);
+    options->service.dialect.AddDelegatingTo(command);
     options->token.AddBearerTo(command);
     options->output.AddOutTo(command);
     invocation.presentation.AddTo(command);

@@ -23,7 +23,7 @@ ExitCode AcquireToken(const AcquireTokenOptions& options, const Presentation& pr
     const CertificateList trusted = ReadCertificates(options.service.trustFiles);
     const auto service = options.service.CreateService(trusted, options.identity.Read());
     TokenOutput output(options.output, presentation);
-    const auto presented = ReadToken(options.tokenFile, trusted);
+    const auto presented = ReadToken(options.tokenFile, trusted, options.service.dialect);
     output.Show(options.service.Await(presentation, [&] {
         return service->AcquireTokenByToken(*presented, options.token.spec);
     }));
@@ -41,6 +41,7 @@ void AddAcquireTokenCommand(const Command& parent, Invocation& invocation)
     AddTokenTo(command, options->tokenFile);
     options->identity.AddRequiredTo(command);
     options->token.AddTo(command);
+    options->service.dialect.AddIssueTo(command, options->token.spec);
     options->token.AddBearerTo(command);
     options->output.AddOutTo(command);
     invocation.presentation.AddTo(command);

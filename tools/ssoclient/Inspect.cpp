@@ -1,11 +1,13 @@
 #include "Arguments.h"
 #include "Commands.h"
+#include "DialectOptions.h"
 #include "Explanation.h"
 #include "Files.h"
 #include "Profile.h"
 #include "TokenOutput.h"
 #include "TokenPage.h"
 #include "Trust.h"
+#include "assertionFacts.h"
 
 #include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/Exceptions.h"
@@ -21,6 +23,12 @@ struct InspectOptions
     std::vector<std::string> trustFiles;
     std::string pageFile; ///< for a page of HTML; empty for none
     long long clockToleranceSec = SsoClient::DefaultClockToleranceSec;
+    ReadingOptions reading;
+    std::optional<std::string> audience;
+    std::optional<std::string> recipient;
+
+    /** Whether an option only has a meaning for assertions of any producer. */
+    bool IsGeneral() const { return reading.IsGiven() || audience || recipient; }
 };
 
 /** The one of the trusted certificates that the token verifies with by itself. */
@@ -38,8 +46,41 @@ Quillon::Ref<const Quillon::Crypto::Certificate> FindSigner(
     return {};
 }
 
+SsoClient::AssertionRules MakeRules(const InspectOptions& options)
+{
+    SsoClient::AssertionRules rules;
+    rules.clockToleranceSec = options.clockToleranceSec;
+    if (options.audience) {
+        rules.audience = *options.audience;
+    }
+    if (options.recipient) {
+        rules.recipient = *options.recipient;
+    }
+    return rules;
+}
+
+/** Shows every fact, or the token that is made of them if it is said who its subject is. */
+ExitCode InspectGeneral(const InspectOptions& options, const Presentation& presentation)
+{
+    const CertificateList trusted = ReadCertificates(options.trustFiles);
+    const auto assertion =
+        SsoClient::VerifyAssertion(ReadFile(options.file), trusted, MakeRules(options));
+    if (!options.reading.subjects.empty()) {
+        SsoClient::TokenReading reading;
+        options.reading.ApplyTo(reading);
+        TokenOutput({}, presentation).Show(SsoClient::CreateSamlToken(assertion, reading.mapping));
+    } else if (!presentation.quiet) {
+        TokenOutput::Print(
+            presentation.json ? DescribeAsJson(*assertion) : DescribeAsLines(*assertion));
+    }
+    return ExitCode::DONE;
+}
+
 ExitCode Inspect(const InspectOptions& options, const Presentation& presentation)
 {
+    if (options.IsGeneral()) {
+        return InspectGeneral(options, presentation);
+    }
     TokenOutput output({}, presentation);
     std::optional<OutputFile> page;
     if (!options.pageFile.empty()) {
@@ -86,6 +127,14 @@ void AddInspectCommand(const Command& parent, Invocation& invocation)
         .AddOption("--html", options->pageFile, "Write what the token means as a page to this file")
         .Check(CheckNotEmpty)
         .ValueName("FILE");
+    options->reading.AddTo(command);
+    const Command general = command.InGroup("Other services");
+    general.AddOption("--audience", options->audience, "The audience that must be named")
+        .Check(CheckNotEmptyText)
+        .ValueName("URI");
+    general.AddOption("--recipient", options->recipient, "The recipient that must be named")
+        .Check(CheckNotEmptyText)
+        .ValueName("URI");
     invocation.presentation.AddTo(command);
     command.ShowExample("ssoclient inspect token.xml --trust sts.pem");
     command.WhenNamed([options, &invocation] {

@@ -14,7 +14,13 @@ void AddTokenTo(const Command& command, std::string& tokenFile)
 }
 
 boost::shared_ptr<const SsoClient::SamlToken> ReadToken(
-    const std::string& tokenFile, const CertificateList& trusted)
+    const std::string& tokenFile, const CertificateList& trusted, const DialectOptions& dialect)
 {
-    return SsoClient::CreateSamlToken(ReadFile(tokenFile), trusted);
+    const auto spoken = dialect.Make();
+    if (!spoken || !spoken->reading) {
+        return SsoClient::CreateSamlToken(ReadFile(tokenFile), trusted);
+    }
+    const SsoClient::TokenReading& reading = *spoken->reading;
+    return SsoClient::CreateSamlToken(
+        SsoClient::VerifyAssertion(ReadFile(tokenFile), trusted, reading.rules), reading.mapping);
 }

@@ -120,11 +120,13 @@ void ServiceOptions::AddTo(const Command& owner, ExchangeRecord& record, Trust t
         "--verbose",
         verbose,
         "Write what the library does, and what is exchanged with the service, to standard error");
+    dialect.AddTo(owner);
 }
 
 boost::shared_ptr<SsoClient::SecurityTokenService> ServiceOptions::CreateService(
     const CertificateList& trusted,
-    const boost::optional<SsoClient::HolderOfKeyConfig>& identity) const
+    const boost::optional<SsoClient::HolderOfKeyConfig>& identity,
+    const boost::optional<SsoClient::PasswordCredentials>& credentials) const
 {
     if (verbose) {
         EnableTraceLines();
@@ -137,6 +139,8 @@ boost::shared_ptr<SsoClient::SecurityTokenService> ServiceOptions::CreateService
     config.trustedCertificates = trusted;
     config.sslPeerParameter = peer;
     config.holderOfKeyConfig = identity;
+    config.dialect = dialect.Make();
+    config.credentials = credentials;
     config.sslContext = context.get();
     return SsoClient::CreateSecurityTokenService(config, GetExchangeOptions());
 }

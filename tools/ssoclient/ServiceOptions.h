@@ -1,6 +1,7 @@
 #pragma once
 
 #include "CommandLine.h"
+#include "DialectOptions.h"
 #include "ExchangeRecord.h"
 #include "Trust.h"
 #include "WaitNotice.h"
@@ -29,6 +30,7 @@ struct ServiceOptions
     bool insecureHttp = false;
     long long timeoutSec = 240; ///< of each exchange
     bool verbose = false;
+    DialectOptions dialect;
 
     enum class Trust
     {
@@ -48,12 +50,14 @@ struct ServiceOptions
     /**
      * Creates the service, and turns its trace lines on if that is asked for.
      *
-     * @param trusted   what `trustFiles` hold.
-     * @param identity  of the caller, if there is one.
+     * @param trusted      what `trustFiles` hold.
+     * @param identity     of the caller, if there is one.
+     * @param credentials  of the caller, if a dialect wants them beside what it presents.
      */
     boost::shared_ptr<SsoClient::SecurityTokenService> CreateService(
         const CertificateList& trusted,
-        const boost::optional<SsoClient::HolderOfKeyConfig>& identity = boost::none) const;
+        const boost::optional<SsoClient::HolderOfKeyConfig>& identity = boost::none,
+        const boost::optional<SsoClient::PasswordCredentials>& credentials = boost::none) const;
 
     /** What `call` returns, which asks the service. Says at a terminal when that takes long. */
     template <class Call>

@@ -17,7 +17,7 @@ ExitCode Validate(const ValidateOptions& options, const Presentation& presentati
 {
     const CertificateList trusted = ReadCertificates(options.service.trustFiles);
     const auto service = options.service.CreateService(trusted);
-    const auto token = ReadToken(options.tokenFile, trusted);
+    const auto token = ReadToken(options.tokenFile, trusted, options.service.dialect);
     const bool isValid =
         options.service.Await(presentation, [&] { return service->ValidateSubject(*token); });
     ShowValidity(isValid, presentation);

@@ -26,6 +26,8 @@ class ScriptedService:
         self.status = 500
         self.body = b""
         self.headers = {"Content-Type": "text/xml"}
+        self.request = None  # the last one
+        self.request_headers = None
         self.hold = threading.Event()
         self.hold.set()
         self.has_request = threading.Semaphore(0)
@@ -33,7 +35,8 @@ class ScriptedService:
 
         class Handler(http.server.BaseHTTPRequestHandler):
             def do_POST(self):
-                self.rfile.read(int(self.headers["Content-Length"]))
+                service.request = self.rfile.read(int(self.headers["Content-Length"]))
+                service.request_headers = self.headers
                 service.has_request.release()
                 service.hold.wait(timeout=120)
                 self.send_response(service.status)
