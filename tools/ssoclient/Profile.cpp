@@ -259,7 +259,7 @@ std::vector<std::string> AddProfile(
             continue;
         }
         for (const std::string& value : values) {
-            words.push_back(option + "=" + value);
+            words.push_back(MessageFormatter::ASPrint("%1=%2", option, value));
         }
     }
     words.insert(words.end(), arguments.begin() + static_cast<long>(given.size()), arguments.end());
