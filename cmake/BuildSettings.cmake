@@ -21,12 +21,14 @@ if(SSOCLIENT_WERROR)
     add_compile_options(-Werror)
 endif()
 
-# Hardening that costs nothing measurable; the linker flags make the GOT read-only.
-add_compile_options(-fstack-protector-strong)
-if(CMAKE_BUILD_TYPE STREQUAL "Release" OR CMAKE_BUILD_TYPE STREQUAL "RelWithDebInfo")
-    add_compile_options(-U_FORTIFY_SOURCE -D_FORTIFY_SOURCE=2)
+set(SSOCLIENT_SANITIZE "" CACHE STRING "Sanitizers to build with, for example address,undefined")
+if(SSOCLIENT_SANITIZE)
+    add_compile_options(-fsanitize=${SSOCLIENT_SANITIZE} -fno-sanitize-recover=all
+        -fno-omit-frame-pointer)
+    add_link_options(-fsanitize=${SSOCLIENT_SANITIZE})
 endif()
-add_link_options(-Wl,-z,relro,-z,now)
+
+include(Hardening)
 
 # Shared unless BUILD_SHARED_LIBS says otherwise; without any word CMake itself would make them static.
 set(library_type SHARED)
@@ -43,10 +45,3 @@ function(ssoclient_stay_loaded library)
         target_link_options(${library} INTERFACE -Wl,-z,nodelete)
     endif()
 endfunction()
-
-set(SSOCLIENT_SANITIZE "" CACHE STRING "Sanitizers to build with, for example address,undefined")
-if(SSOCLIENT_SANITIZE)
-    add_compile_options(-fsanitize=${SSOCLIENT_SANITIZE} -fno-sanitize-recover=all
-        -fno-omit-frame-pointer)
-    add_link_options(-fsanitize=${SSOCLIENT_SANITIZE})
-endif()

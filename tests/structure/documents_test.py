@@ -35,7 +35,33 @@ def help_of(*command):
                           capture_output=True, text=True, check=True).stdout
 
 
+def tests_by_suite():
+    """The names of tests and of their suites; of the Python tests, the classes."""
+    found = {}
+    for path in sources.files("tests"):
+        for suite, name in re.findall(r"^TEST(?:_F|_P)?\((\w+),\s*(\w+)\)",
+                                      path.read_text("utf-8"), re.MULTILINE):
+            found.setdefault(suite, set()).add(f"{suite}.{name}")
+    for path in (sources.ROOT / "tests").rglob("*_test.py"):
+        for suite in re.findall(r"^class (\w+)\(", path.read_text("utf-8"), re.MULTILINE):
+            found.setdefault(suite, set())
+    return found
+
+
 class Documents(unittest.TestCase):
+    def test_every_promise_of_the_threat_model_is_held_by_tests_that_exist(self):
+        suites = tests_by_suite()
+        names = set(suites).union(*suites.values())
+        section = read("docs/threat-model.md").split("## Promises, and what holds them")[1]
+        rows = re.findall(r"^\| ([^|]+) \| ([^|]+) \|$", section.split("\n## ")[0], re.MULTILINE)
+        promises = [row for row in rows if row[0] != "Promise" and set(row[0]) != {"-"}]
+        self.assertGreater(len(promises), 20)
+        for promise, tests in promises:
+            held_by = re.findall(r"`([^`]+)`", tests)
+            with self.subTest(promise=promise):
+                self.assertTrue(held_by)
+                self.assertEqual([], [name for name in held_by if name not in names])
+
     def test_readme_shows_the_example_program(self):
         blocks = re.findall(r"^```cpp\n(.*?)^```$", read("README.md"), re.MULTILINE | re.DOTALL)
         self.assertIn(read("examples/acquire_with_password.cpp"), blocks)

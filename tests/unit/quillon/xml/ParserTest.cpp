@@ -298,6 +298,19 @@ TEST(Parse, RefusesEveryDoctype)
     }
 }
 
+// [XML Names 2.1], [RFC 3986 4.1]
+TEST(Parse, RefusesANamespaceNameThatIsNoUri)
+{
+    for (const std::string name : {"urn:a", "a", "http://[::1]/", "%20"}) {
+        EXPECT_EQ(GetParseError("<p:r xmlns:p='" + name + "'/>"), "accepted") << name;
+    }
+    EXPECT_EQ(
+        GetParseError("<p:r xmlns:p='a b'/>"),
+        "xmlns:p: 'a b' is not a valid URI at line 1, column 19");
+    EXPECT_NE(GetParseError("<p:r xmlns:p='urn:<'/>"), "accepted");
+    EXPECT_NE(GetParseError("<r xmlns='%2'/>"), "accepted");
+}
+
 TEST(Parse, RefusesWhatIsNotWellFormed)
 {
     for (const char* text :
