@@ -2,6 +2,7 @@
 # libraries and nothing else, unless it asks; docs/building.md has the table.
 option(SSOCLIENT_BUILD_GSS "Build libssoclient_gss, the handler for Kerberos" ON)
 option(SSOCLIENT_BUILD_BENCHMARKS "Build the benchmarks" ${PROJECT_IS_TOP_LEVEL})
+option(SSOCLIENT_FUZZ "Link the programs of tests/fuzz with libFuzzer" OFF)
 option(SSOCLIENT_INSTALL "Have install rules" ${PROJECT_IS_TOP_LEVEL})
 option(SSOCLIENT_WERROR "Treat compiler warnings as errors" ${PROJECT_IS_TOP_LEVEL})
 
