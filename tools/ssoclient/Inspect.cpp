@@ -89,6 +89,10 @@ ExitCode Inspect(const InspectOptions& options, const Presentation& presentation
     const CertificateList trusted = ReadCertificates(options.trustFiles);
     const auto token =
         SsoClient::CreateSamlToken(ReadFile(options.file), trusted, options.clockToleranceSec);
+    // Before anything is shown: the token may expire in between.
+    const auto signer = presentation.ShowsExplanations()
+                            ? FindSigner(*token, trusted, options.clockToleranceSec)
+                            : nullptr;
     output.Show(token);
     if (!page && !presentation.ShowsExplanations()) {
         return ExitCode::DONE;

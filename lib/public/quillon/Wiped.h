@@ -59,10 +59,14 @@ public:
 
     const std::string& Get() const noexcept { return _text; }
 
+    /** `text` may be a part of this one. */
     void Append(std::string_view text)
     {
-        Reserve(_text.size() + text.size());
-        _text.append(text);
+        if (HasRoomFor(text.size())) {
+            _text.append(text);
+        } else {
+            AppendToLarger(text);
+        }
     }
 
     /** Only of a text that is not empty. */
@@ -77,15 +81,18 @@ private:
     // A short text would stand in the string object itself, parts of it even after it has grown.
     static constexpr std::size_t MinCapacity = 64;
 
-    void Reserve(std::size_t size)
+    bool HasRoomFor(std::size_t size) const noexcept
     {
-        if (size > _text.capacity() || _text.capacity() < MinCapacity) {
-            std::string larger;
-            larger.reserve(std::max({size, 2 * _text.capacity(), MinCapacity}));
-            larger.append(_text);
-            _text.swap(larger);
-            Wipe(larger);
-        }
+        return size <= _text.capacity() - _text.size() && _text.capacity() >= MinCapacity;
+    }
+
+    void AppendToLarger(std::string_view text)
+    {
+        std::string larger;
+        larger.reserve(std::max({_text.size() + text.size(), 2 * _text.capacity(), MinCapacity}));
+        larger.append(_text).append(text);
+        _text.swap(larger);
+        Wipe(larger);
     }
 
     std::string _text;

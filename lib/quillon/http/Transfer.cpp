@@ -231,6 +231,7 @@ int Transfer::OnRequest(void* self, char* /*ip*/, char* /*localIp*/, int /*port*
 {
     Transfer& transfer = *static_cast<Transfer*>(self);
     transfer.FindRecord();
+    transfer._earlierError = transfer.GetSystemError();
     transfer._isRepeated = std::exchange(transfer._isSent, true);
     return transfer._isRepeated ? CURL_PREREQFUNC_ABORT : CURL_PREREQFUNC_OK;
 }
@@ -396,8 +397,10 @@ std::string Transfer::DescribeRefusedConnection() const
 std::string Transfer::DescribeBrokenConnection() const
 {
     const int error = GetSystemError();
+    const bool isOfThisConnection = error != 0 && error != _earlierError;
     return "The exchange with " + _exchange->GetServer() + " failed: "
-           + (error != 0 ? System::DescribeSystemError(error) : GetDetail(CURLE_RECV_ERROR)) + ".";
+           + (isOfThisConnection ? System::DescribeSystemError(error) : GetDetail(CURLE_RECV_ERROR))
+           + ".";
 }
 
 /** libcurl's words for a failure, without the codes of OpenSSL that may stand before them. */

@@ -82,6 +82,7 @@ private:
     bool _isSent = false;         // libcurl has begun to send the request
     bool _isRepeated = false;     // libcurl has tried to send it again
     int _socketError = 0;
+    int _earlierError = 0; // of an address that was tried before the one that answered
     std::array<char, CURL_ERROR_SIZE> _errorText{};
     StringListOwner _headers;
     StringListOwner _connectTo;

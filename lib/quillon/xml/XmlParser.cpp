@@ -36,6 +36,15 @@ std::string_view ToView(const xmlChar* text) noexcept
     return text == nullptr ? std::string_view() : reinterpret_cast<const char*>(text);
 }
 
+/** Where the character begins that the octet at `position` belongs to [RFC 3629 3]. */
+std::size_t FindCharacterStart(std::string_view text, std::size_t position) noexcept
+{
+    while (position > 0 && (static_cast<unsigned char>(text[position]) & 0xC0U) == 0x80U) {
+        --position;
+    }
+    return position;
+}
+
 /** A message of the parser in one line of printable text. */
 std::string CleanMessage(const char* message)
 {
@@ -44,7 +53,7 @@ std::string CleanMessage(const char* message)
     // It may repeat names of the document, which are long only to be a nuisance.
     constexpr std::size_t MaxLength = 500;
     if (text.size() > MaxLength) {
-        text.replace(MaxLength, std::string::npos, "...");
+        text.replace(FindCharacterStart(text, MaxLength), std::string::npos, "...");
     }
     for (char& byte : text) {
         if (static_cast<unsigned char>(byte) < 0x20U) {

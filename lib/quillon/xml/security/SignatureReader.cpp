@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <array>
+#include <map>
 
 namespace Quillon::Xml::Security {
 
@@ -238,12 +239,24 @@ KeyInfo ReadKeyInfo(const ElementNode& element)
     return keyInfo;
 }
 
-/** Refuses names whose prefix nothing declares. */
+/**
+ * Refuses names whose prefix nothing declares. Counts the declarations in scope: a look-up in the
+ * tree would go through all ancestors for each of the names.
+ */
 class PrefixCheck
 {
 public:
-    void Enter(const ElementNode& element) const
+    /** @param outer  the element around those that are walked through; null if there is none. */
+    explicit PrefixCheck(const ElementNode* outer)
     {
+        for (; outer != nullptr; outer = outer->GetParent()) {
+            Open(*outer);
+        }
+    }
+
+    void Enter(const ElementNode& element)
+    {
+        Open(element);
         RequireDeclared(element, element.GetPrefix());
         for (const Attribute& attribute : element.GetAttributes()) {
             if (!attribute.IsNamespaceDeclaration()) {
@@ -251,19 +264,49 @@ public:
             }
         }
     }
-    void Leave(const ElementNode& /*element*/) const noexcept {}
+    void Leave(const ElementNode& element)
+    {
+        for (const Attribute& attribute : element.GetAttributes()) {
+            if (attribute.IsNamespaceDeclaration()) {
+                Close(GetDeclaredPrefix(attribute));
+            }
+        }
+    }
     template <class Leaf>
     void Visit(const Leaf& /*leaf*/) const noexcept
     {}
 
 private:
-    static void RequireDeclared(const ElementNode& element, std::string_view prefix)
+    static std::string_view GetDeclaredPrefix(const Attribute& declaration) noexcept
     {
-        std::string_view namespaceUri;
-        if (!prefix.empty() && !element.LookupNamespace(prefix, namespaceUri)) {
+        return declaration.GetPrefix().empty() ? std::string_view() : declaration.GetLocalName();
+    }
+
+    void Open(const ElementNode& element)
+    {
+        for (const Attribute& attribute : element.GetAttributes()) {
+            if (attribute.IsNamespaceDeclaration()) {
+                ++_declarations[GetDeclaredPrefix(attribute)];
+            }
+        }
+    }
+
+    void Close(std::string_view prefix)
+    {
+        const auto found = _declarations.find(prefix);
+        if (--found->second == 0) {
+            _declarations.erase(found);
+        }
+    }
+
+    void RequireDeclared(const ElementNode& element, std::string_view prefix) const
+    {
+        if (!prefix.empty() && _declarations.count(prefix) == 0) {
             Fail(Quote(element.GetName()) + " uses the undeclared prefix " + Quote(prefix));
         }
     }
+
+    std::map<std::string_view, std::size_t> _declarations{{"xml", 1}}; // [XML Names 3]
 };
 
 /**
@@ -272,7 +315,7 @@ private:
  */
 void RequireDeclaredPrefixes(const ElementNode& signature, const ElementNode& signedInfo)
 {
-    PrefixCheck check;
+    PrefixCheck check(signature.GetParent());
     WalkTree(signature, &signedInfo, check);
 }
 

@@ -33,6 +33,15 @@ const ElementNode* FindRenderer(
     return renderer;
 }
 
+bool StandsIn(const ElementNode& apex, const ElementNode& element) noexcept
+{
+    const ElementNode* ancestor = &element;
+    while (ancestor != nullptr && ancestor != &apex) {
+        ancestor = ancestor->GetParent();
+    }
+    return ancestor != nullptr;
+}
+
 std::string_view GetBinding(const ElementNode& element, std::string_view prefix) noexcept
 {
     std::string_view uri;
@@ -48,6 +57,9 @@ bool Covers(
     const ElementNode& element,
     std::string_view prefix) noexcept
 {
+    if (!StandsIn(apex, element)) {
+        return false;
+    }
     const auto& listed = method.inclusivePrefixes;
     if (!method.isExclusive || std::find(listed.begin(), listed.end(), prefix) != listed.end()) {
         return true;

@@ -7,8 +7,8 @@
 namespace Quillon::Xml::Security {
 
 /**
- * Whether the canonical form of `apex` fixes what `prefix` is bound to at `element`, which is
- * `apex` or stands in it.
+ * Whether the canonical form of `apex` fixes what `prefix` is bound to at `element`: never if that
+ * stands outside `apex`.
  */
 bool Covers(
     const CanonicalizationMethod& method,

@@ -62,6 +62,18 @@ TEST(Wiped, HoldsACopyOfWhatItIsGiven)
     EXPECT_EQ(original, Long);
 }
 
+TEST(Wiped, TakesAPartOfItself)
+{
+    for (const std::string_view text : {Short, Long}) {
+        Wiped doubled{std::string(text)};
+        doubled.Append(doubled.Get());
+        EXPECT_EQ(doubled.Get(), std::string(text) + std::string(text));
+        doubled.Append(std::string_view(doubled.Get()).substr(1, 3));
+        EXPECT_EQ(
+            doubled.Get(), std::string(text) + std::string(text) + std::string(text.substr(1, 3)));
+    }
+}
+
 TEST(Wiped, LeavesNothingOfATextThatItTakes)
 {
     for (const std::string_view secret : {Short, Long}) {

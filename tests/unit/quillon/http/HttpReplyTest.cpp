@@ -1,4 +1,5 @@
 #include "HttpClient.h"
+#include "NameLookup.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -156,6 +157,26 @@ TEST(Reply, IsNoneIfAllThatComesIsAGoAhead)
     EXPECT_EQ(
         "The server " + Describe(server) + " closed the connection without a reply.",
         HttpClient(server).PostAndFail());
+}
+
+namespace {
+
+/** What `server` is told to have done wrong when it is reached as `host`. */
+std::string GetFailure(const TestServer& server, const std::string& host)
+{
+    std::string text = HttpClient(MakeTcpSpec(server, host)).PostAndFail();
+    const std::string name = Describe(server, host);
+    const std::size_t position = text.find(name);
+    return position == std::string::npos ? text : text.replace(position, name.size(), "it");
+}
+
+} // namespace
+
+TEST(Reply, IsNotBlamedForAnAddressThatRefusedBefore)
+{
+    const TestServer server(
+        AnswerAll("HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\nno chunk\r\n"));
+    EXPECT_EQ(GetFailure(server, "127.0.0.1"), GetFailure(server, NameLookup::TwoAddressHost));
 }
 
 /** What follows a status whose body does not count. */

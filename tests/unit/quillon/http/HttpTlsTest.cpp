@@ -364,6 +364,20 @@ TEST_F(TlsTest, ResumesSessionsBetweenAgentsOfOneSpec)
     EXPECT_EQ(3, CountResumed());
 }
 
+// [RFC 8446 C.4]
+TEST_F(TlsTest, UsesNoTls13TicketTwice)
+{
+    const Ref<ConnectionSpec> spec = MakeSpec();
+    SSL_CTX_set_num_tickets(tls.GetContext(), 1);
+    HttpClient(spec).Post();
+    SSL_CTX_set_num_tickets(tls.GetContext(), 0);
+    HttpClient(spec).Post();
+    EXPECT_EQ(1, CountResumed());
+    HttpClient(spec).Post();
+    EXPECT_EQ(1, CountResumed());
+    EXPECT_EQ(3U, tls.GetHandshakes().size());
+}
+
 TEST_F(TlsTest, ResumesTls12Sessions)
 {
     SSL_CTX_set_max_proto_version(tls.GetContext(), TLS1_2_VERSION);

@@ -15,6 +15,16 @@ bool isBlocked = false;
 int waiting = 0;
 Testing::NameLookup::Lookup latest;
 
+/** The end of a list of addresses, where more can be added. */
+addrinfo*& GetEnd(addrinfo& list)
+{
+    addrinfo** end = &list.ai_next;
+    while (*end != nullptr) {
+        end = &(*end)->ai_next;
+    }
+    return *end;
+}
+
 } // namespace
 
 namespace Testing::NameLookup {
@@ -69,5 +79,9 @@ extern "C" __attribute__((visibility("default"))) int getaddrinfo(
     }
     static const auto original =
         reinterpret_cast<decltype(&getaddrinfo)>(dlsym(RTLD_NEXT, "getaddrinfo"));
+    if (node != nullptr && std::strcmp(node, Testing::NameLookup::TwoAddressHost) == 0) {
+        const int error = original("127.0.0.2", service, hints, result);
+        return error != 0 ? error : original("127.0.0.1", service, hints, &GetEnd(**result));
+    }
     return original(node, service, hints, result);
 }

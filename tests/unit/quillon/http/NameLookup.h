@@ -8,6 +8,9 @@ inline constexpr char BlockedHost[] = "blocked.invalid";
 /** A host that is not known. */
 inline constexpr char UnknownHost[] = "unknown.invalid";
 
+/** A host with two addresses, 127.0.0.2 before 127.0.0.1. */
+inline constexpr char TwoAddressHost[] = "two.invalid";
+
 /** Whether the calling thread takes none of the signals that concern a library. */
 bool AreSignalsBlocked();
 

@@ -127,6 +127,24 @@ TEST(CoversBinding, IfOneOfSeveralReferencesDoes)
     EXPECT_FALSE(IsCovered(Signed(start, "<leaf/>", ""), "p"));
 }
 
+TEST(CoversBinding, NotOutsideTheSignedElement)
+{
+    for (const char* const form : {Exclusive, Inclusive}) {
+        for (const char* const leaf : {"<leaf/>", "<p:leaf/>"}) {
+            const Ref<Document> document = ParseText(
+                std::string("<o xmlns:p='urn:p'>") + leaf + Signed("<r>", "", WithReference(form))
+                + "</o>");
+            const ElementNode* root = document->GetRootElement();
+            ElementNode* part = root->FindChildElement("r");
+            Ref<Signature> signature;
+            CreateSignatureFromDom(
+                part, part->FindChildElement("Signature"), SignatureProfile::NARROW, signature);
+            EXPECT_FALSE(signature->CoversBinding(*root->FindChildElement("leaf"), "p")) << leaf;
+            EXPECT_FALSE(signature->CoversBinding(*root, "p"));
+        }
+    }
+}
+
 TEST(CoversBinding, RefusesTransformsOutsideTheProfile)
 {
     const std::string xml = Signed(

@@ -228,6 +228,14 @@ TEST(Parse, SaysNoMoreThanALineOfADocumentThatItRefuses)
     }
 }
 
+TEST(Parse, CutsNoCharacterOfADocumentThatItRefuses)
+{
+    for (const std::string shift : {"", "a"}) {
+        const std::string error = GetParseError("<" + shift + Repeat("\xC3\xA9", 2'000) + "></r>");
+        EXPECT_EQ(GetParseError("<r><![CDATA[" + error + "]]></r>"), "accepted") << error;
+    }
+}
+
 // [RFC 3629]
 TEST(Parse, RefusesOctetsThatAreNotUtf8)
 {

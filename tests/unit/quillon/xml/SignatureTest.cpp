@@ -336,6 +336,21 @@ TEST(ReadKeyInfo, RefusesUndeclaredPrefixes)
         VerifyWithKeyInfo("<ds:KeyInfo o:Id='k'/>"), "'ds:KeyInfo' uses the undeclared prefix 'o'");
 }
 
+TEST(ReadKeyInfo, KnowsWhereADeclarationEnds)
+{
+    const auto judge = [](const std::string& content) {
+        return VerifyWithKeyInfo(
+            "<ds:KeyInfo><ds:KeyValue>" + content + "</ds:KeyValue></ds:KeyInfo>");
+    };
+    EXPECT_EQ(
+        judge("<a xmlns:o='urn:o'><o:b/></a><o:Other/>"),
+        "'o:Other' uses the undeclared prefix 'o'");
+    EXPECT_EQ(
+        judge("<a xmlns:o='urn:o'><o:b xmlns:o='urn:x' xmlns='urn:y'><c/></o:b><o:b/></a>"),
+        "accepted");
+    EXPECT_EQ(judge("<a xmlns='urn:a' xml:lang='en'/>"), "accepted");
+}
+
 /** Subject and fingerprint as the text of an untrusted signer has them. */
 std::string DescribeCertificate(const std::string& name)
 {

@@ -122,13 +122,14 @@ public:
 
     /**
      * Whether the signature fixes what `prefix` (empty for the default namespace) is bound to at
-     * `element`, which stands in the signed element. A name in a value, as that of `xsi:type`, may
-     * decide something only then: the exclusive form does not carry a declaration that no element
-     * or attribute name uses [EXC-C14N 1.3], so anyone could have changed it. Says nothing about
-     * whether the signature verifies.
+     * `element`; never if that stands outside the signed element. A name in a value, as that of
+     * `xsi:type`, may decide something only then: the exclusive form does not carry a declaration
+     * that no element or attribute name uses [EXC-C14N 1.3], so anyone could have changed it. Says
+     * nothing about whether the signature verifies.
      *
-     * @return true if one of the references is in inclusive form, or lists the prefix, or renders
-     *         the same binding at the element or the nearest of its ancestors that uses the prefix.
+     * @return true if `element` is in the signed one, and one of the references is in inclusive
+     * form, or lists the prefix, or renders the same binding at the element or the nearest of its
+     * ancestors that uses the prefix.
      * @throws XmlSecurityException  a canonicalization lies outside the profile.
      */
     virtual bool CoversBinding(const ElementNode& element, std::string_view prefix) const = 0;
