@@ -67,7 +67,7 @@ TEST(PrincipalIdDeathTest, StopsWithoutName)
     EXPECT_EXIT(
         PrincipalId("", "b"),
         testing::KilledBySignal(SIGABRT),
-        "!name.empty\\(\\) \\(lib/public/ssoClient/PrincipalId:43\\)");
+        "^PanicVerify failed: !name\\.empty\\(\\) \\(lib/public/ssoClient/PrincipalId:43\\)\n$");
 }
 
 TEST(PrincipalIdDeathTest, StopsWithoutDomain)
@@ -75,7 +75,7 @@ TEST(PrincipalIdDeathTest, StopsWithoutDomain)
     EXPECT_EXIT(
         PrincipalId("a", ""),
         testing::KilledBySignal(SIGABRT),
-        "!domain.empty\\(\\) \\(lib/public/ssoClient/PrincipalId:44\\)");
+        "^PanicVerify failed: !domain\\.empty\\(\\) \\(lib/public/ssoClient/PrincipalId:44\\)\n$");
 }
 
 TEST(PrincipalIdDeathTest, ReportsTheNameFirst)

@@ -3,6 +3,8 @@
 #include "quillon/xml/Parser.h"
 #include "ssoClient/message/xmlCommonBuilders.h"
 
+#include <gmock/gmock.h>
+
 #include <string>
 
 inline Quillon::Ref<Quillon::Xml::ElementNode> Build(const SsoClient::XMLBaseBuilder& builder)
@@ -23,4 +25,10 @@ inline std::string ToText(const Quillon::Xml::ElementNode& element)
 inline std::string ToText(const SsoClient::XMLBuilderPtr& builder)
 {
     return ToText(*Build(*builder));
+}
+
+/** All that standard error gets when an invariant of the builders breaks at `unit:number`. */
+inline auto StopsAt(const std::string& expression, const std::string& place)
+{
+    return testing::StrEq("PanicVerify failed: " + expression + " (lib/ssoClient/" + place + ")\n");
 }

@@ -158,11 +158,7 @@ TEST(XMLCompositeBuilder, GivesIndependentTreesEachTime)
 TEST(XMLCompositeBuilderDeathTest, StopsTheProcessWithoutRoot)
 {
     EXPECT_DEATH(
-        XMLCompositeBuilder(nullptr),
-        AllOf(
-            HasSubstr("rootBuilder != __null"),
-            HasSubstr("lib/ssoClient/xmlCommonBuilders"),
-            HasSubstr("168")));
+        XMLCompositeBuilder(nullptr), StopsAt("rootBuilder != __null", "xmlCommonBuilders:168"));
 }
 
 TEST(Composite, HoldsItsChildrenInOrderAndPassesOverNull)

@@ -222,6 +222,8 @@ TEST(BuildContinuedSPNegoRequest, RefusesContextIdThatXmlCannotHold)
         }),
         "InvalidArgumentException: Invalid argument : The value of attribute 'Context' "
         "holds a character that XML does not allow at octet 2");
+    // The action is set before the envelope is built, as in every request.
+    EXPECT_EQ(request.soapAction, WST "/RSTR/Issue");
     EXPECT_EQ(request.body, "");
 }
 

@@ -141,11 +141,54 @@ TEST_F(CheckOrder, KeyInfoComesBeforeX509DataBeforeX509Certificate)
     EXPECT_EQ(UnexpectedAttributes("KeyInfo"), JudgeUnsigned(text));
 }
 
-TEST_F(CheckOrder, CertificateComesBeforeWhatFollowsIt)
+TEST_F(CheckOrder, AttributesOfX509CertificateComeBeforeItsText)
 {
     const std::string text =
-        Replace(HolderOfKey("AAAA"), "</ds:X509Certificate>", "</ds:X509Certificate><a/>");
-    EXPECT_EQ("CryptoException: ", JudgeUnsigned(text).substr(0, 17));
+        Replace(HolderOfKey("AAAA"), "<ds:X509Certificate>", "<ds:X509Certificate a=\"\"><a/>");
+    EXPECT_EQ(UnexpectedAttributes("X509Certificate"), JudgeUnsigned(text));
+}
+
+TEST_F(CheckOrder, CertificateComesBeforeWhatFollowsIt)
+{
+    const auto judge = [](const std::string& certificate) {
+        const std::string text =
+            Replace(HolderOfKey(certificate), "</ds:X509Certificate>", "</ds:X509Certificate><a/>");
+        return JudgeUnsigned(InsertBefore(text, "</ds:KeyInfo>", "<a/>"));
+    };
+    EXPECT_EQ("CryptoException: ", judge("AAAA").substr(0, 17));
+    EXPECT_EQ(
+        "ParseException: Unexpected elements after X509Certificate",
+        judge(StsKey().GetCertificateBase64()));
+}
+
+TEST_F(CheckOrder, NameOfAnElementComesBeforeItsAttributes)
+{
+    const auto judge = [](const std::string& text, const std::string& startTag) {
+        return JudgeUnsigned(InsertBefore(text, startTag, "<a b=\"\"/>"));
+    };
+    EXPECT_EQ(Expected("Subject"), judge(Bearer(), "<saml:Subject>"));
+    EXPECT_EQ(Expected("SubjectConfirmation"), judge(Bearer(), "<saml:SubjectConfirmation "));
+    EXPECT_EQ(Expected("Conditions"), judge(Bearer(), "<saml:Conditions "));
+    EXPECT_EQ(Expected("AuthnStatement"), judge(Bearer(), "<saml:AuthnStatement "));
+    EXPECT_EQ(Expected("AuthnContext"), judge(Bearer(), "<saml:AuthnContext>"));
+    const std::string withKey = HolderOfKey("AAAA");
+    EXPECT_EQ(Expected("KeyInfo"), judge(withKey, "<ds:KeyInfo "));
+    EXPECT_EQ(Expected("X509Data"), judge(withKey, "<ds:X509Data>"));
+    EXPECT_EQ(Expected("X509Certificate"), judge(withKey, "<ds:X509Certificate>"));
+    EXPECT_EQ(
+        Expected("Delegate"),
+        JudgeConditions("<saml:Condition xsi:type=\"del:DelegationRestrictionType\"><a b=\"\"/>"
+                        "</saml:Condition>"));
+    EXPECT_EQ(
+        Expected("RSAAdvice"),
+        JudgeReplaced(
+            "<saml:AuthnStatement ",
+            "<saml:Advice><a b=\"\"/></saml:Advice><saml:AuthnStatement "));
+    EXPECT_EQ(
+        Expected("Attribute"),
+        JudgeReplaced(
+            "</saml:Assertion>",
+            "<saml:AttributeStatement><a b=\"\"/></saml:AttributeStatement></saml:Assertion>"));
 }
 
 TEST_F(CheckOrder, AttributesAndDatesOfConditionsComeBeforeTheirChildren)
