@@ -351,6 +351,17 @@ TEST(ReadKeyInfo, KnowsWhereADeclarationEnds)
     EXPECT_EQ(judge("<a xmlns='urn:a' xml:lang='en'/>"), "accepted");
 }
 
+TEST(ReadKeyInfo, KnowsTheDeclarationsAroundTheSignature)
+{
+    std::string text = ReadTestData("documents/whole.xml");
+    text.insert(text.find("</ds:Signature>"), "<ds:KeyInfo><o:Other/></ds:KeyInfo>");
+    text.insert(text.find('>'), " xmlns:o='urn:o'");
+    const Ref<Document> document = ParseText(text);
+    ElementNode* root = document->GetRootElement();
+    Ref<Signature> signature;
+    EXPECT_NO_THROW(CreateSignatureFromDom(root, root->FindChildElement("Signature"), signature));
+}
+
 /** Subject and fingerprint as the text of an untrusted signer has them. */
 std::string DescribeCertificate(const std::string& name)
 {
