@@ -90,14 +90,10 @@ ExitCode Inspect(const InspectOptions& options, const Presentation& presentation
     const auto token =
         SsoClient::CreateSamlToken(ReadFile(options.file), trusted, options.clockToleranceSec);
     // Before anything is shown: the token may expire in between.
-    const auto signer = presentation.ShowsExplanations()
-                            ? FindSigner(*token, trusted, options.clockToleranceSec)
-                            : nullptr;
+    const bool needsSigner = page || presentation.ShowsExplanations();
+    const auto signer =
+        needsSigner ? FindSigner(*token, trusted, options.clockToleranceSec) : nullptr;
     output.Show(token);
-    if (!page && !presentation.ShowsExplanations()) {
-        return ExitCode::DONE;
-    }
-    const auto signer = FindSigner(*token, trusted, options.clockToleranceSec);
     if (page) {
         page->Write(WriteTokenPage(*token, signer.get()));
     }
