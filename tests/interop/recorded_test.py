@@ -1,6 +1,5 @@
 """Requests are, byte for byte, those that services have been getting since they were recorded."""
 
-import os
 import pathlib
 import sys
 import unittest
