@@ -1,29 +1,43 @@
-# Installs the libraries, the public headers and the tools, with a CMake package and pkg-config
-# files. All of it can be moved: nothing that is installed names the prefix.
+# Installs the libraries, the public headers and the command line, with a CMake package and pkg-config
+# files. All of it can be moved: nothing that is installed names the prefix. The components are those
+# of the Debian packages.
 include(CMakePackageConfigHelpers)
+
+set(CMAKE_INSTALL_DEFAULT_COMPONENT_NAME libssoclient-dev)
 
 set(package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/SsoClient)
 
-set(libraries quillon ssoclient)
+function(ssoclient_install_library target name)
+    set_target_properties(${target} PROPERTIES INSTALL_RPATH "$ORIGIN")
+    install(TARGETS ${target} EXPORT SsoClientTargets
+        LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
+            COMPONENT ${name}${PROJECT_VERSION_MAJOR} NAMELINK_COMPONENT libssoclient-dev
+        ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR})
+endfunction()
+
 set(pc_files quillon ssoclient)
+ssoclient_install_library(quillon libquillon)
+ssoclient_install_library(ssoclient libssoclient)
 if(SSOCLIENT_BUILD_GSS)
-    list(APPEND libraries ssoclient_gss)
     list(APPEND pc_files ssoclient-gss)
+    ssoclient_install_library(ssoclient_gss libssoclient-gss)
 endif()
-set_target_properties(${libraries} PROPERTIES INSTALL_RPATH "$ORIGIN")
-install(TARGETS ${libraries} EXPORT SsoClientTargets
-    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
-    ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR})
 install(DIRECTORY lib/public/ DESTINATION ${CMAKE_INSTALL_INCLUDEDIR} FILES_MATCHING PATTERN *.h)
 
 file(RELATIVE_PATH bin_to_lib
     ${CMAKE_INSTALL_FULL_BINDIR} ${CMAKE_INSTALL_FULL_LIBDIR})
-foreach(tool ssoclient_tool ssoclient-devsts)
-    if(TARGET ${tool})
-        set_target_properties(${tool} PROPERTIES INSTALL_RPATH "$ORIGIN/${bin_to_lib}")
-        install(TARGETS ${tool} RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
-    endif()
-endforeach()
+if(SSOCLIENT_BUILD_TOOLS)
+    set_target_properties(ssoclient_tool PROPERTIES INSTALL_RPATH "$ORIGIN/${bin_to_lib}")
+    install(TARGETS ssoclient_tool RUNTIME
+        DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT ssoclient)
+endif()
+# A service with well-known users is no part of a usual installation.
+if(SSOCLIENT_BUILD_DEVSTS)
+    install(TARGETS ssoclient-devsts RUNTIME
+        DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT ssoclient-devsts EXCLUDE_FROM_ALL)
+    install(FILES tools/devsts/ssoclient-devsts.1
+        DESTINATION ${CMAKE_INSTALL_MANDIR}/man1 COMPONENT ssoclient-devsts EXCLUDE_FROM_ALL)
+endif()
 
 # Whoever links a static library links what it is made with, too.
 if(library_type STREQUAL STATIC)

@@ -60,7 +60,14 @@ class Install(unittest.TestCase):
     @unittest.skipUnless(os.environ["TOOLS"] == "1", "the tools are not built")
     def test_tools_find_their_libraries(self):
         self.assertRegex(run(self.prefix / "bin" / "ssoclient", "--version"), r"^ssoclient \d")
-        self.assertIn("--state", run(self.prefix / "bin" / "ssoclient-devsts", "--help"))
+        self.assertEqual(["ssoclient"], [path.name for path in (self.prefix / "bin").iterdir()])
+
+    @unittest.skipUnless(os.environ["TOOLS"] == "1", "the tools are not built")
+    def test_development_sts_is_installed_when_it_is_asked_for(self):
+        prefix = self.folder / "devsts"
+        run(os.environ["CMAKE"], "--install", os.environ["BUILD_DIR"], "--prefix", prefix,
+            "--component", "ssoclient-devsts")
+        self.assertIn("--state", run(prefix / "bin" / "ssoclient-devsts", "--help"))
 
     def test_private_headers_stay_at_home(self):
         installed = {path.relative_to(self.prefix / "include").as_posix()

@@ -1,0 +1,108 @@
+"""Follows the README to the letter, in a copy of the tree and with an environment of its own."""
+
+import os
+import pathlib
+import re
+import subprocess
+import tempfile
+import unittest
+
+from commands import run
+
+ROOT = pathlib.Path(__file__).resolve().parents[2]
+ADDRESS = "https://git.example.com/ssoclient.git"
+
+# What is said to be done in another terminal, and the line that shows that it is ready.
+SERVER = "ssoclient-devsts "
+READY = "listening on"
+
+# Needs a realm. The tests of the command line have one.
+KERBEROS = "kinit "
+
+# The network and /opt are the test's own, and go with it.
+PRELUDE = f"""
+set -euo pipefail
+ip link set lo up
+mount -t tmpfs tmpfs /opt
+start_server() {{
+    server >server.log 2>&1 </dev/null &
+    trap 'kill %1' EXIT
+    for _ in $(seq 300); do
+        if grep --quiet '^{READY}' server.log; then return; fi
+        sleep 0.1
+    done
+    cat server.log
+    return 1
+}}
+"""
+
+ENDING = """
+./run uninstall /opt/ssoclient
+test ! -e /opt/ssoclient
+"""
+
+
+def blocks():
+    text = (ROOT / "README.md").read_text("utf-8")
+    return re.findall(r"^```sh\n(.*?)^```$", text, re.MULTILINE | re.DOTALL)
+
+
+def script():
+    parts = [PRELUDE]
+    for block in blocks():
+        if block.startswith(SERVER):
+            parts.append(f"server() {{\n{block}}}\nstart_server\n")
+        elif not block.startswith(KERBEROS):
+            parts.append(block)
+    return "\n".join([*parts, ENDING])
+
+
+class Readme(unittest.TestCase):
+    def setUp(self):
+        folder = tempfile.TemporaryDirectory()
+        self.addCleanup(folder.cleanup)
+        self.folder = pathlib.Path(folder.name)
+        self.environment = {
+            "PATH": "/usr/local/sbin:/usr/local/bin:/usr/sbin:/usr/bin:/sbin:/bin",
+            "HOME": str(self.folder),
+            # What has been compiled already is not what the README is about.
+            "CCACHE_DIR": run("ccache", "--get-config", "cache_dir").strip()}
+        self.publish()
+
+    def git(self, *arguments):
+        return run("git", "-c", "user.name=Test", "-c", "user.email=test@example.test", *arguments,
+                   env=self.environment, cwd=self.folder)
+
+    def publish(self):
+        """Puts the tree, as it is now, where the address of the README leads."""
+        names = run("git", "ls-files", "-z", "--cached", "--others", "--exclude-standard", cwd=ROOT)
+        there = [name for name in names.split("\0") if name and (ROOT / name).is_file()]
+        subprocess.run(["cp", "--parents", *there, self.folder / "source"],
+                       cwd=ROOT, check=(self.folder / "source").mkdir() is None)
+        self.git("-C", "source", "init", "--quiet")
+        self.git("-C", "source", "add", "--all")
+        self.git("-C", "source", "commit", "--quiet", "--message", "All")
+        self.git("config", "--global", f"url.{self.folder / 'source'}.insteadOf", ADDRESS)
+
+    def test_every_command_works_in_order(self):
+        as_root = [] if os.getuid() == 0 else ["--map-root-user"]
+        result = subprocess.run(
+            ["unshare", "--mount", "--net", *as_root, "bash", "-c", script()],
+            env=self.environment, cwd=self.folder, timeout=600, text=True,
+            stdout=subprocess.PIPE, stderr=subprocess.STDOUT)
+        self.assertEqual(0, result.returncode, result.stdout)
+        for text in ("export CMAKE_PREFIX_PATH=/opt/ssoclient\n",
+                     '"subject"', "valid\n", "uninstalled from /opt/ssoclient\n"):
+            self.assertIn(text, result.stdout)
+
+    def test_the_lines_of_the_readme_are_those_that_run_prints(self):
+        printed = re.findall(r"^    printf .(export \w+=)", (ROOT / "run").read_text("utf-8"),
+                             re.MULTILINE)
+        shown = [line for block in blocks() for line in re.findall(r"^export \w+=", block,
+                                                                   re.MULTILINE)]
+        self.assertEqual(4, len(printed))
+        self.assertEqual(printed, shown)
+
+
+if __name__ == "__main__":
+    unittest.main()
