@@ -12,10 +12,12 @@ fail() {
 }
 
 cd "$(mktemp -d)"
-apt-get install --yes --no-install-recommends "$packages"/*.deb g++ pkg-config
+apt-get install --yes --no-install-recommends --option DPkg::Options::=--force-unsafe-io \
+    "$packages"/*.deb g++ pkg-config
 
 printf '\nThe development STS and the command line\n'
-ssoclient-devsts --state . --listen 127.0.0.1:0 >server.log 2>&1 </dev/null &
+: >server.log # so that it can be read before the server has written to it
+ssoclient-devsts --state . --listen 127.0.0.1:0 >>server.log 2>&1 </dev/null &
 server=$!
 url=
 while [[ -z $url ]]; do
