@@ -66,7 +66,8 @@ class Readme(unittest.TestCase):
             "PATH": "/usr/local/sbin:/usr/local/bin:/usr/sbin:/usr/bin:/sbin:/bin",
             "HOME": str(self.folder),
             # What has been compiled already is not what the README is about.
-            "CCACHE_DIR": run("ccache", "--get-config", "cache_dir").strip()}
+            "CCACHE_DIR": run("ccache", "--get-config", "cache_dir").strip(),
+            "CCACHE_MAXSIZE": run("ccache", "--get-config", "max_size").strip()}
         self.publish()
 
     def git(self, *arguments):
