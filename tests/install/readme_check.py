@@ -89,7 +89,7 @@ class Readme(unittest.TestCase):
         as_root = [] if os.getuid() == 0 else ["--map-root-user"]
         result = subprocess.run(
             ["unshare", "--mount", "--net", *as_root, "bash", "-c", script()],
-            env=self.environment, cwd=self.folder, timeout=600, text=True,
+            env=self.environment, cwd=self.folder, timeout=1200, text=True,
             stdout=subprocess.PIPE, stderr=subprocess.STDOUT)
         self.assertEqual(0, result.returncode, result.stdout)
         for text in ("export CMAKE_PREFIX_PATH=/opt/ssoclient\n",
