@@ -51,7 +51,7 @@ def script():
     parts = [PRELUDE]
     for block in blocks():
         if block.startswith(SERVER):
-            parts.append(f"server() {{\n{block}}}\nstart_server\n")
+            parts.append(f"server() {{\nexec {block}}}\nstart_server\n")  # the job is the server
         elif not block.startswith(KERBEROS):
             parts.append(block)
     return "\n".join([*parts, ENDING])
