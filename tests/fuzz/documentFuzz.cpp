@@ -162,19 +162,24 @@ void Describe(xmlNode* node, Description& out)
 
 // ---------------------------------------------------------------------------- the others' word
 
+/** Names beyond ASCII are those of the fourth edition of XML to expat, of the fifth to libxml2. */
 bool ExpatAccepts(std::string_view text)
 {
     XML_Parser parser = XML_ParserCreate("UTF-8");
-    const bool accepts =
+    const bool isWellFormed =
         XML_Parse(parser, text.data(), static_cast<int>(text.size()), 1) == XML_STATUS_OK;
+    const bool mayBeAName = XML_GetErrorCode(parser) == XML_ERROR_INVALID_TOKEN
+                            && std::any_of(text.begin(), text.end(), [](char character) {
+                                   return static_cast<unsigned char>(character) >= 0x80;
+                               });
     XML_ParserFree(parser);
-    return accepts;
+    return isWellFormed || mayBeAName;
 }
 
 /** What is refused on purpose, by what its text contains. */
 bool IsOnPurpose(const std::string& refusal)
 {
-    constexpr std::array<std::string_view, 11> Reasons{
+    constexpr std::array<std::string_view, 14> Reasons{
         "DOCTYPE",
         "Encoding '",
         "More than ",
@@ -183,8 +188,11 @@ bool IsOnPurpose(const std::string& refusal)
         "only UTF-8 is read",
         "XML version '",
         "is not a valid URI",
-        "xmlns",     // declarations that libxml2 only warns of
-        "namespace", // an empty or a reserved one
+        "NUL character",        // libxml2 takes it for the end
+        "colons are forbidden", // in the name of an instruction
+        "QName",                // two colons
+        "xmlns",                // declarations that libxml2 only warns of
+        "namespace",            // an empty or a reserved one
         "Namespace"};
     return std::any_of(Reasons.begin(), Reasons.end(), [&refusal](std::string_view reason) {
         return refusal.find(reason) != std::string::npos;
