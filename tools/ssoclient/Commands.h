@@ -14,6 +14,7 @@ struct Invocation
     std::function<ExitCode()> action;
     Presentation presentation;
     ExchangeRecord exchanges; ///< with the service
+    std::string passage;      ///< of a file that is refused; empty if it is not known
 };
 
 /**

@@ -1,6 +1,7 @@
 #include "Arguments.h"
 #include "Commands.h"
 #include "DialectOptions.h"
+#include "ExitCode.h"
 #include "Explanation.h"
 #include "Files.h"
 #include "Profile.h"
@@ -8,6 +9,7 @@
 #include "TokenPage.h"
 #include "Trust.h"
 #include "assertionFacts.h"
+#include "passage.h"
 
 #include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/Exceptions.h"
@@ -60,11 +62,15 @@ SsoClient::AssertionRules MakeRules(const InspectOptions& options)
 }
 
 /** Shows every fact, or the token that is made of them if it is said who its subject is. */
-ExitCode InspectGeneral(const InspectOptions& options, const Presentation& presentation)
+ExitCode InspectGeneral(
+    const InspectOptions& options, const Presentation& presentation, std::string& text)
 {
+    if (!options.pageFile.empty()) {
+        throw UsageError("--html shows tokens of the default kind, not general assertions");
+    }
     const CertificateList trusted = ReadCertificates(options.trustFiles);
-    const auto assertion =
-        SsoClient::VerifyAssertion(ReadFile(options.file), trusted, MakeRules(options));
+    text = ReadFile(options.file);
+    const auto assertion = SsoClient::VerifyAssertion(text, trusted, MakeRules(options));
     if (!options.reading.subjects.empty()) {
         SsoClient::TokenReading reading;
         options.reading.ApplyTo(reading);
@@ -76,10 +82,11 @@ ExitCode InspectGeneral(const InspectOptions& options, const Presentation& prese
     return ExitCode::DONE;
 }
 
-ExitCode Inspect(const InspectOptions& options, const Presentation& presentation)
+/** @param text  receives what the file holds, once it is read. */
+ExitCode Inspect(const InspectOptions& options, const Presentation& presentation, std::string& text)
 {
     if (options.IsGeneral()) {
-        return InspectGeneral(options, presentation);
+        return InspectGeneral(options, presentation, text);
     }
     TokenOutput output({}, presentation);
     std::optional<OutputFile> page;
@@ -87,8 +94,8 @@ ExitCode Inspect(const InspectOptions& options, const Presentation& presentation
         page.emplace(options.pageFile);
     }
     const CertificateList trusted = ReadCertificates(options.trustFiles);
-    const auto token =
-        SsoClient::CreateSamlToken(ReadFile(options.file), trusted, options.clockToleranceSec);
+    text = ReadFile(options.file);
+    const auto token = SsoClient::CreateSamlToken(text, trusted, options.clockToleranceSec);
     // Before anything is shown: the token may expire in between.
     const bool needsSigner = page || presentation.ShowsExplanations();
     const auto signer =
@@ -139,7 +146,13 @@ void AddInspectCommand(const Command& parent, Invocation& invocation)
     command.ShowExample("ssoclient inspect token.xml --trust sts.pem");
     command.WhenNamed([options, &invocation] {
         invocation.action = [options, &invocation] {
-            return Inspect(*options, invocation.presentation);
+            std::string text;
+            try {
+                return Inspect(*options, invocation.presentation, text);
+            } catch (const Quillon::Exception& error) {
+                invocation.passage = FindPassage(error.what(), text);
+                throw;
+            }
         };
     });
 }

@@ -32,6 +32,10 @@ int main(int argc, char** argv)
         invocation.presentation.json |=
             std::find(arguments.begin(), arguments.end(), "--json") != arguments.end();
         ReportFailure(error, invocation.exchanges.GetLatest(), invocation.presentation);
+        const Presentation& presentation = invocation.presentation;
+        if (!invocation.passage.empty() && presentation.ShowsHints() && !presentation.json) {
+            Notice("passage: " + invocation.passage);
+        }
         return static_cast<int>(GetExitCode(error));
     }
 }
