@@ -26,7 +26,8 @@ using ValidationCompletion =
     boost::function<void(const boost::optional<bool>&, const Quillon::Exception*)>;
 
 /**
- * Obtains, renews and validates tokens at a WS-Trust 1.3 security token service. Every operation
+ * Obtains, renews and validates tokens at a WS-Trust 1.3 security token service, or at another one
+ * in the dialect of the configuration. Every operation
  * has a blocking and an asynchronous form.
  *
  * No operation retries. Each may throw:
@@ -42,7 +43,8 @@ using ValidationCompletion =
  * - `InvalidCredentialsException` if the service rejects the credentials;
  * - `InvalidSignatureException` if the token it sends does not verify;
  * - `SsoException` for any other fault or an answer that cannot be used; as a `ParseException` if
- *   the code of a fault has a prefix that nothing declares.
+ *   the code of a fault has a prefix that nothing declares. With a dialect, also for a token that
+ *   is not the one that was asked for (see `GrantCheck`).
  * An answer that is malformed in a particular place ends with the exception of that place:
  * - `Quillon::Xml::XMLParseException` if the token in it cannot be parsed by itself;
  * - `Quillon::Xml::Security::XmlSecurityException` if it has no canonical form;
@@ -101,7 +103,8 @@ public:
 
     /**
      * Acquires a token by presenting `token`, for delegation or with other properties. The
-     * request is signed with the caller's own key.
+     * request is signed with the caller's own key, unless a dialect with the token in the body has
+     * the configuration's user name and password say who asks.
      *
      * @return as `AcquireToken`.
      */
