@@ -104,6 +104,16 @@ TEST(Soap12Fault, IsOfBadCredentialsByItsSubcode)
         bad);
 }
 
+TEST(Soap12Fault, IsOfBadCredentialsThoughASubcodeSaysMore)
+{
+    EXPECT_EQ(
+        GetFailure(
+            Soap12Dialect(),
+            SenderFault("t:FailedAuthentication</S:Value><S:Subcode><S:Value>t:More</S:Value>"
+                        "</S:Subcode><S:Value>t:Last")),
+        "InvalidCredentialsException: Authentication failed");
+}
+
 TEST(Soap12Fault, IsNotOfBadCredentialsByANameOfAnotherNamespace)
 {
     EXPECT_EQ(
