@@ -15,8 +15,17 @@ struct ValidateOptions
     std::string tokenFile;
 };
 
+/** Without a dialect nobody signs the request, and a key that goes unused would mislead. */
+void RequireUseOfKey(const ValidateOptions& options)
+{
+    if (options.identity.key && !options.service.dialect.Make()) {
+        throw UsageError("validate signs with --key in a --dialect only");
+    }
+}
+
 ExitCode Validate(const ValidateOptions& options, const Presentation& presentation)
 {
+    RequireUseOfKey(options);
     const CertificateList trusted = ReadCertificates(options.service.trustFiles);
     const auto service = options.service.CreateService(trusted, options.identity.Read());
     const auto token = ReadToken(options.tokenFile, trusted, options.service.dialect);

@@ -56,9 +56,16 @@ class Validate(ServiceTest):
         self.assert_fails_matching(self.validate(token, service=self.nowhere), COMMUNICATION,
                                    "HttpException", ".+")
 
-    def test_takes_no_key(self):
-        self.assert_misused(self.validate("x", "--key", self.sts.key, service=self.nowhere),
-                            "validate", "ssoclient validate has no option --key")
+    def test_takes_a_key_with_its_certificate_and_a_dialect_only(self):
+        key = ("--key", self.sts.key)
+        self.assert_misused(self.validate("x", *key, service=self.nowhere), "validate",
+                            "--key requires --cert")
+        identity = (*key, "--cert", self.sts.certificate)
+        self.assert_fails(self.validate("x", *identity, service=self.nowhere), USAGE, "UsageError",
+                          "validate signs with --key in a --dialect only")
+        self.assert_fails(self.validate("/no/such/file", *identity, "--dialect", "cxf",
+                                        service=self.nowhere), USAGE, "UsageError",
+                          "cannot open `/no/such/file': No such file or directory")
 
     def test_verbose_tells_the_result(self):
         token = self.token_file(self.acquire)
