@@ -1,4 +1,5 @@
 #include "Commands.h"
+#include "IdentityOptions.h"
 #include "PresentedToken.h"
 #include "ServiceOptions.h"
 #include "TokenOutput.h"
@@ -10,6 +11,7 @@ namespace {
 struct ValidateOptions
 {
     ServiceOptions service;
+    IdentityOptions identity;
     std::string tokenFile;
 };
 
@@ -25,7 +27,7 @@ ExitCode Validate(const ValidateOptions& options, const Presentation& presentati
 {
     RequireUseOfKey(options);
     const CertificateList trusted = ReadCertificates(options.service.trustFiles);
-    const auto service = options.service.CreateService(trusted);
+    const auto service = options.service.CreateService(trusted, options.identity.Read());
     const auto token = ReadToken(options.tokenFile, trusted, options.service.dialect);
     const bool isValid =
         options.service.Await(presentation, [&] { return service->ValidateSubject(*token); });
@@ -42,6 +44,7 @@ void AddValidateCommand(const Command& parent, Invocation& invocation)
     const auto options = std::make_shared<ValidateOptions>();
     options->service.AddTo(command, invocation.exchanges);
     AddTokenTo(command, options->tokenFile);
+    options->identity.AddTo(command);
     invocation.presentation.AddTo(command);
     command.ShowExample("ssoclient validate --url https://sts.example.com/sts \\\n      --trust "
                         "sts.pem --token token.xml");
