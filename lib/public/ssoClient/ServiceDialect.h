@@ -83,7 +83,8 @@ struct TokenReading
 
 /**
  * What of an issued token is compared with what was asked for. A token that differs is refused with
- * an `SsoException` that says how. Each part can be switched off for services that cannot do better.
+ * an `SsoException` that says how. Each part can be switched off for services that cannot do
+ * better.
  */
 struct GrantCheck
 {

@@ -24,9 +24,10 @@ using FileOwner = std::unique_ptr<std::FILE, FileCloser>;
 
 FileOwner Open(const std::string& path)
 {
-    if (path.find('\0') != std::string::npos) {
+    const std::size_t end = path.find('\0');
+    if (end != std::string::npos) {
         // The system would open what the part before it names.
-        Fail(path.c_str(), "the name has a NUL character");
+        Fail(path.substr(0, end), "the name has a NUL character");
     }
     FileOwner file(std::fopen(path.c_str(), "rbe"));
     if (!file) {
