@@ -110,6 +110,30 @@ ExitCode Inspect(const InspectOptions& options, const Presentation& presentation
     return ExitCode::DONE;
 }
 
+void AddGeneralOptions(const Command& command, InspectOptions& options)
+{
+    options.reading.AddTo(command);
+    const Command general = command.InGroup("Other services");
+    general.AddOption("--audience", options.audience, "The audience that must be named")
+        .Check(CheckNotEmptyText)
+        .ValueName("URI");
+    general.AddOption("--recipient", options.recipient, "The recipient that must be named")
+        .Check(CheckNotEmptyText)
+        .ValueName("URI");
+}
+
+/** A failure leaves the passage of the file that it is about. */
+ExitCode InspectAndFindPassage(const InspectOptions& options, Invocation& invocation)
+{
+    std::string text;
+    try {
+        return Inspect(options, invocation.presentation, text);
+    } catch (const Quillon::Exception& error) {
+        invocation.passage = FindPassage(error.what(), text);
+        throw;
+    }
+}
+
 } // namespace
 
 void AddInspectCommand(const Command& parent, Invocation& invocation)
@@ -134,25 +158,12 @@ void AddInspectCommand(const Command& parent, Invocation& invocation)
         .AddOption("--html", options->pageFile, "Write what the token means as a page to this file")
         .Check(CheckNotEmpty)
         .ValueName("FILE");
-    options->reading.AddTo(command);
-    const Command general = command.InGroup("Other services");
-    general.AddOption("--audience", options->audience, "The audience that must be named")
-        .Check(CheckNotEmptyText)
-        .ValueName("URI");
-    general.AddOption("--recipient", options->recipient, "The recipient that must be named")
-        .Check(CheckNotEmptyText)
-        .ValueName("URI");
+    AddGeneralOptions(command, *options);
     invocation.presentation.AddTo(command);
     command.ShowExample("ssoclient inspect token.xml --trust sts.pem");
     command.WhenNamed([options, &invocation] {
         invocation.action = [options, &invocation] {
-            std::string text;
-            try {
-                return Inspect(*options, invocation.presentation, text);
-            } catch (const Quillon::Exception& error) {
-                invocation.passage = FindPassage(error.what(), text);
-                throw;
-            }
+            return InspectAndFindPassage(*options, invocation);
         };
     });
 }

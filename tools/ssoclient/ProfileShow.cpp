@@ -27,7 +27,9 @@ std::string ToLines(const Profile& profile)
     std::string lines;
     for (const auto& [key, values] : profile.values) {
         for (const std::string& value : values) {
-            lines += ToOneLine("--" + key + " " + value) + "\n";
+            std::string option = "--";
+            option.append(key).append(" ").append(value);
+            lines.append(ToOneLine(option)).append("\n");
         }
     }
     return lines;

@@ -161,7 +161,7 @@ SsoClient::ExchangeOptions ServiceOptions::GetExchangeOptions() const
 
 Server ServiceOptions::RequireServer() const
 {
-    const Server server = ParseServer(url);
+    Server server = ParseServer(url);
     RequireSecureOrWanted(server, insecureHttp);
     return server;
 }

@@ -75,6 +75,16 @@ ExplainedFact CollectGroups(const SamlToken& token)
     return fact;
 }
 
+void CollectValues(
+    const std::string& name, const std::vector<std::string>& values, ExplainedFact& fact)
+{
+    fact.values.reserve(fact.values.size() + values.size());
+    for (const std::string& value : values) {
+        fact.values.push_back(name);
+        fact.values.back().append(" = ").append(value);
+    }
+}
+
 ExplainedFact CollectAdvice(const SamlToken& token)
 {
     std::vector<SsoClient::Advice> advice;
@@ -82,9 +92,7 @@ ExplainedFact CollectAdvice(const SamlToken& token)
     ExplainedFact fact = {"advice", {}};
     for (const SsoClient::Advice& each : advice) {
         for (const SsoClient::AdviceAttribute& attribute : each.attributes) {
-            for (const std::string& value : attribute.values) {
-                fact.values.push_back(each.source + ": " + attribute.name + " = " + value);
-            }
+            CollectValues(each.source + ": " + attribute.name, attribute.values, fact);
         }
     }
     return fact;
