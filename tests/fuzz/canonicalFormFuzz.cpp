@@ -10,26 +10,6 @@ using namespace Quillon::Xml;
 const std::vector<std::vector<std::string>> PrefixLists{
     {}, {"a", "b"}, {"#default"}, {"#default", "ds", "unused"}};
 
-void CollectElements(xmlNode* node, std::vector<xmlNode*>& elements)
-{
-    for (; node != nullptr; node = node->next) {
-        if (node->type == XML_ELEMENT_NODE) {
-            elements.push_back(node);
-            CollectElements(node->children, elements);
-        }
-    }
-}
-
-void CollectElements(const Node* node, std::vector<const ElementNode*>& elements)
-{
-    for (; node != nullptr; node = node->GetNextSibling()) {
-        if (const ElementNode* element = AsElement(node)) {
-            elements.push_back(element);
-            CollectElements(element->GetFirstChild(), elements);
-        }
-    }
-}
-
 /**
  * libxml2 writes `&` and the like in a namespace name as they are, which nobody could read again,
  * and takes an undeclared prefix for a part of the name, where ours refuses.

@@ -65,3 +65,14 @@ inline std::string CanonicalizeWithLibxml(
     xmlOutputBufferClose(buffer);
     return text;
 }
+
+/** Of a tree, in document order. */
+inline void CollectElements(xmlNode* node, std::vector<xmlNode*>& elements)
+{
+    for (; node != nullptr; node = node->next) {
+        if (node->type == XML_ELEMENT_NODE) {
+            elements.push_back(node);
+            CollectElements(node->children, elements);
+        }
+    }
+}

@@ -11,27 +11,6 @@ namespace {
 
 constexpr unsigned Documents = 10000;
 
-/** The elements of both trees, in the same document order. */
-void CollectElements(xmlNode* node, std::vector<xmlNode*>& elements)
-{
-    for (; node != nullptr; node = node->next) {
-        if (node->type == XML_ELEMENT_NODE) {
-            elements.push_back(node);
-            CollectElements(node->children, elements);
-        }
-    }
-}
-
-void CollectElements(const Node* node, std::vector<const ElementNode*>& elements)
-{
-    for (; node != nullptr; node = node->GetNextSibling()) {
-        if (const ElementNode* element = AsElement(node)) {
-            elements.push_back(element);
-            CollectElements(element->GetFirstChild(), elements);
-        }
-    }
-}
-
 const std::vector<std::vector<std::string>> PrefixLists{
     {}, {"a", "zz"}, {"#default"}, {"#default", "b", "ns-1", "unused"}};
 

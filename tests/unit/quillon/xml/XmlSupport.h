@@ -37,6 +37,17 @@ std::string CanonicalizeToText(
     return writer->TakeString();
 }
 
+/** Of a tree, in document order. */
+inline void CollectElements(const Node* node, std::vector<const ElementNode*>& elements)
+{
+    for (; node != nullptr; node = node->GetNextSibling()) {
+        if (const ElementNode* element = AsElement(node)) {
+            elements.push_back(element);
+            CollectElements(element->GetFirstChild(), elements);
+        }
+    }
+}
+
 /** The message of the `XMLParseException` that parsing `text` raises; "accepted" if it does not. */
 inline std::string GetParseError(std::string_view text)
 {
