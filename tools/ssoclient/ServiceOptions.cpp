@@ -77,6 +77,25 @@ void EnableTraceLines()
     }
 }
 
+void AddPeerTo(const Command& command, ServiceOptions& options)
+{
+    command
+        .AddOption(
+            "--ca",
+            options.authorityFiles,
+            "PEM files with the authorities to trust for TLS (default: the system's)")
+        .Check(CheckNotEmpty)
+        .ValueName("PEM");
+    command
+        .AddOption(
+            "--peer",
+            options.peer,
+            "What the TLS server must prove: another host name, or sha256//BASE64 of its public "
+            "key (default: the host name of the URL)")
+        .Check(CheckNotEmpty)
+        .ValueName("TEXT");
+}
+
 } // namespace
 
 void ServiceOptions::AddTo(const Command& owner, ExchangeRecord& record, Trust trust)
@@ -91,21 +110,7 @@ void ServiceOptions::AddTo(const Command& owner, ExchangeRecord& record, Trust t
     if (trust == Trust::REQUIRED) {
         trustOption.Required();
     }
-    command
-        .AddOption(
-            "--ca",
-            authorityFiles,
-            "PEM files with the authorities to trust for TLS (default: the system's)")
-        .Check(CheckNotEmpty)
-        .ValueName("PEM");
-    command
-        .AddOption(
-            "--peer",
-            peer,
-            "What the TLS server must prove: another host name, or sha256//BASE64 of its public "
-            "key (default: the host name of the URL)")
-        .Check(CheckNotEmpty)
-        .ValueName("TEXT");
+    AddPeerTo(command, *this);
     command.AddFlag(
         "--insecure-http", insecureHttp, "Let an http: URL lead to another machine, in the clear");
     command

@@ -33,7 +33,8 @@ struct SoapFault
     std::vector<SoapFaultText> texts;    ///< the fault string, or the reason in each language
     std::string node;                    ///< the fault actor, or the node
     std::string role;                    ///< SOAP 1.2
-    std::string detail;                  ///< the whole element as canonical XML [EXC-C14N]
+    /** The whole element as canonical XML [EXC-C14N]; as it is written if it has no such form. */
+    std::string detail;
 };
 
 /**

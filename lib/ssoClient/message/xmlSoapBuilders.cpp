@@ -73,6 +73,15 @@ void AddAddressingToSignature(
     }
 }
 
+void AddKeyInfo(Security::Signature* signature, const XMLBuilderPtr& keyInfoBuilder)
+{
+    if (keyInfoBuilder != nullptr) {
+        Ref<ElementNode> keyInfo;
+        keyInfoBuilder->build(keyInfo);
+        signature->AddKeyInfoContent(keyInfo.get());
+    }
+}
+
 } // namespace
 
 XMLBuilderPtr SoapBuilder(
@@ -186,11 +195,7 @@ void SignSoapMessage(
     }
     AddElementToSignature(signature.get(), FindTimestamp(*wsseSecurity));
     AddAddressingToSignature(signature.get(), *soapHeader, form);
-    if (keyInfoBuilder != nullptr) {
-        Ref<ElementNode> keyInfo;
-        keyInfoBuilder->build(keyInfo);
-        signature->AddKeyInfoContent(keyInfo.get());
-    }
+    AddKeyInfo(signature.get(), keyInfoBuilder);
     signature->Sign(key);
     signature->GetElement()->DefineAttribute("Id", Wire::ProofSignatureId);
     wsseSecurity->AppendChild(signature->GetElement());

@@ -27,6 +27,13 @@ Quillon::Service::Logger& GetExchangeLogger()
     return *logger;
 }
 
+/** Without the query, which may carry what lets its reader in. */
+std::string DescribeTarget(const std::string& path)
+{
+    const std::size_t query = path.find('?');
+    return query == std::string::npos ? path : path.substr(0, query) + "?...";
+}
+
 void LogLine(const std::string& line)
 {
     GetExchangeLogger().Log(Quillon::Service::LOG_LEVEL_TRACE, line);
@@ -77,7 +84,7 @@ void LogExchange(const ExchangeFacts& facts)
 {
     LogLine(MessageFormatter::ASPrint(
         "POST %1 to %2 (%3): %4%5",
-        facts.path,
+        DescribeTarget(facts.path),
         facts.server,
         facts.address.empty() ? "no address" : facts.address,
         DescribeOutcome(facts),

@@ -1,5 +1,7 @@
 #include "ssoClient/protocol/faults.h"
 
+#include "quillon/xml/Parser.h"
+#include "quillon/xml/security/Exceptions.h"
 #include "quillon/xml/security/Identifiers.h"
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/dialect/trustNames.h"
@@ -125,10 +127,24 @@ SoapFaultCode ReadCode(const std::string& text, const Resolve& resolve)
     return code;
 }
 
+std::string ToXmlAsWritten(const ElementNode& element)
+{
+    const auto writer = Quillon::CreateStringWriter();
+    Quillon::Xml::Serialize(&element, writer.get());
+    return writer->TakeString();
+}
+
+/** What a service put into a detail must not keep the fault from being told. */
 std::string ReadDetail(const ElementNode* detail)
 {
-    return detail == nullptr ? std::string()
-                             : ToCanonicalXml(detail, Quillon::Xml::Security::ExclusiveC14n);
+    if (detail == nullptr) {
+        return {};
+    }
+    try {
+        return ToCanonicalXml(detail, Quillon::Xml::Security::ExclusiveC14n);
+    } catch (const Quillon::Xml::Security::XmlSecurityException&) {
+        return ToXmlAsWritten(*detail);
+    }
 }
 
 SoapFault ReadSoap11Fault(const ElementNode& fault)

@@ -280,15 +280,7 @@ std::string VerifyWithKeyInfo(const std::string& keyInfo, const std::string& tru
     const std::string end = "</ds:Signature>";
     std::string text = ReadTestData("documents/whole.xml");
     const Ref<Document> document = ParseText(text.insert(text.find(end), keyInfo));
-    ElementNode* root = document->GetRootElement();
-    Ref<Signature> signature;
-    try {
-        CreateSignatureFromDom(root, root->FindChildElement("Signature"), signature);
-    } catch (const SignatureSyntaxException& error) {
-        return error.what();
-    }
-    return GetSecurityError(
-        [&] { signature->Verify(CreateTrustSetKeyResolver(GetTestCertificates(trusted)).get()); });
+    return Verify(document->GetRootElement(), trusted);
 }
 
 // [XMLDSIG 4.4]
@@ -302,10 +294,10 @@ TEST(ReadKeyInfo, TakesWhatTheSchemaHas)
           "<ds:X509Data><o:Other xmlns:o='urn:o'/></ds:X509Data>",
           "<Other xmlns='urn:o'/>",
           "<o:Other xmlns:o='urn:o' xml:lang='en' o:a=''><b/></o:Other>"}) {
-        EXPECT_EQ(VerifyWithKeyInfo("<ds:KeyInfo>" + content + "</ds:KeyInfo>"), "accepted")
+        EXPECT_EQ(VerifyWithKeyInfo("<ds:KeyInfo>" + content + "</ds:KeyInfo>"), "genuine")
             << content;
     }
-    EXPECT_EQ(VerifyWithKeyInfo("<ds:KeyInfo Id='k'/>"), "accepted");
+    EXPECT_EQ(VerifyWithKeyInfo("<ds:KeyInfo Id='k'/>"), "genuine");
 }
 
 TEST(ReadKeyInfo, RefusesWhatTheSchemaHasNot)
@@ -347,8 +339,8 @@ TEST(ReadKeyInfo, KnowsWhereADeclarationEnds)
         "'o:Other' uses the undeclared prefix 'o'");
     EXPECT_EQ(
         judge("<a xmlns:o='urn:o'><o:b xmlns:o='urn:x' xmlns='urn:y'><c/></o:b><o:b/></a>"),
-        "accepted");
-    EXPECT_EQ(judge("<a xmlns='urn:a' xml:lang='en'/>"), "accepted");
+        "genuine");
+    EXPECT_EQ(judge("<a xmlns='urn:a' xml:lang='en'/>"), "genuine");
 }
 
 TEST(ReadKeyInfo, KnowsTheDeclarationsAroundTheSignature)

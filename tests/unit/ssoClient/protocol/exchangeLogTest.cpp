@@ -130,6 +130,19 @@ TEST_F(ExchangeLog, TellsAFailureAndWhatTlsSaidUntilThen)
             "SsoClient.Exchange[64]: TLSv1.3 with TLS_AES_256_GCM_SHA384, no certificate shown"));
 }
 
+// A query may carry what lets its reader in.
+TEST_F(ExchangeLog, TellsOfAQueryOnlyThatThereIsOne)
+{
+    ExchangeFacts facts;
+    facts.path = "/sts?key=secret";
+    facts.server = "sts.test port 80";
+    LogExchange(facts);
+    EXPECT_THAT(
+        TakeLines(),
+        ElementsAre("SsoClient.Exchange[64]: POST /sts?... to sts.test port 80 (no address): no "
+                    "reply"));
+}
+
 TEST_F(ExchangeLog, TellsAFault)
 {
     EXPECT_THAT(

@@ -212,6 +212,25 @@ TEST(FaultObserver, SeesAllOfASoap12FaultInAnyDialect)
     EXPECT_EQ(fault.detail, "<S:Detail xmlns:S=\"" SOAP12 "\">why</S:Detail>");
 }
 
+// What the observer is shown must not decide what the operation ends with.
+TEST(FaultObserver, SeesADetailThatHasNoCanonicalFormAsItIsWritten)
+{
+    for (const std::string detail :
+         {"<detail><p:x/></detail>", "<detail><x xmlns='relative'/></detail>"}) {
+        std::vector<SoapFault> seen;
+        const ResponseHandlerImpl handler(
+            {ServiceDialect(), [&seen](const SoapFault& fault) { seen.push_back(fault); }});
+        const std::string reply = Fault11("<faultcode>t:X</faultcode>" + detail);
+        EXPECT_EQ(
+            ::GetFailure([&] {
+                handler.HandleValidateSubjectResponse(Quillon::CreateStringReader(reply).get());
+            }),
+            "SsoException: Unexpected SOAP fault: t:X; request failed.");
+        ASSERT_EQ(seen.size(), 1U);
+        EXPECT_EQ(seen.front().detail.substr(0, 11), detail.substr(0, 11));
+    }
+}
+
 TEST(FaultObserver, SeesAFaultThatSaysNothing)
 {
     ASSERT_EQ(Observe(Fault11("")).size(), 1U);
