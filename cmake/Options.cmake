@@ -4,6 +4,7 @@ option(SSOCLIENT_BUILD_GSS "Build libssoclient_gss, the handler for Kerberos" ON
 option(SSOCLIENT_BUILD_BENCHMARKS "Build the benchmarks" ${PROJECT_IS_TOP_LEVEL})
 option(SSOCLIENT_FUZZ "Link the programs of tests/fuzz with libFuzzer" OFF)
 option(SSOCLIENT_INSTALL "Have install rules" ${PROJECT_IS_TOP_LEVEL})
+option(SSOCLIENT_UNITY_BUILD "Compile tools and tests several sources at a time" OFF)
 option(SSOCLIENT_WERROR "Treat compiler warnings as errors" ${PROJECT_IS_TOP_LEVEL})
 
 # The tests try the handler for Kerberos, and the command line has a command that needs it.
@@ -21,3 +22,7 @@ if(NOT SSOCLIENT_BUILD_GSS)
         endif()
     endforeach()
 endif()
+
+# The libraries are compiled a source at a time, even in a project that has another habit: equal names
+# in anonymous namespaces of different sources are no mistake.
+set(CMAKE_UNITY_BUILD OFF)

@@ -90,7 +90,7 @@ protected:
     }
 };
 
-std::string NameOf(const testing::TestParamInfo<Value>& info)
+std::string NameOfValue(const testing::TestParamInfo<Value>& info)
 {
     return info.param.name;
 }
@@ -107,6 +107,6 @@ TEST_P(InsertedComment, TakesBlanksOffTheEndsAndNothingElse)
     }
 }
 
-INSTANTIATE_TEST_SUITE_P(In, InsertedComment, testing::ValuesIn(Values), NameOf);
+INSTANTIATE_TEST_SUITE_P(In, InsertedComment, testing::ValuesIn(Values), NameOfValue);
 
 } // namespace HostileTests

@@ -97,7 +97,7 @@ protected:
     }
 };
 
-std::string NameOf(const testing::TestParamInfo<Subject>& info)
+std::string NameOfSubject(const testing::TestParamInfo<Subject>& info)
 {
     return info.param.name;
 }
@@ -130,6 +130,6 @@ TEST_P(MutatedToken, IsRefusedWhenCutShort)
     }
 }
 
-INSTANTIATE_TEST_SUITE_P(Of, MutatedToken, testing::ValuesIn(Subjects), NameOf);
+INSTANTIATE_TEST_SUITE_P(Of, MutatedToken, testing::ValuesIn(Subjects), NameOfSubject);
 
 } // namespace HostileTests

@@ -119,7 +119,7 @@ TEST_P(CommentInAValue, LeavesTokenAndOwnTextAlikeOrIsRefused)
     }
 }
 
-std::string NameOf(const testing::TestParamInfo<const char*>& tested)
+std::string NameOfFile(const testing::TestParamInfo<const char*>& tested)
 {
     return tested.index == 0 ? "BlankEnds" : "Everything";
 }
@@ -128,6 +128,6 @@ INSTANTIATE_TEST_SUITE_P(
     Of,
     CommentInAValue,
     testing::Values("accepted/blank-ends.xml", "accepted/everything.xml"),
-    NameOf);
+    NameOfFile);
 
 } // namespace HostileTests

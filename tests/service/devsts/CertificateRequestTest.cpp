@@ -16,11 +16,6 @@ std::string CertificateRequest()
     return Sign(CertificateTemplate("", HolderOfKeyBody()));
 }
 
-std::string AlicesPassword()
-{
-    return UsernameToken("alice@example.test", "alice-secret");
-}
-
 constexpr const char* ConfirmationCertificate =
     "//saml:SubjectConfirmation[@Method='urn:oasis:names:tc:SAML:2.0:cm:holder-of-key']"
     "/saml:SubjectConfirmationData[@xsi:type='saml:KeyInfoConfirmationDataType']"

@@ -8,11 +8,6 @@ namespace {
 
 using Texts = std::vector<std::string>;
 
-std::string AlicesPassword()
-{
-    return UsernameToken("alice@example.test", "alice-secret");
-}
-
 std::string Body(const std::string& extras = "", const std::string& keyType = "PublicKey")
 {
     return IssueBody(keyType, extras);

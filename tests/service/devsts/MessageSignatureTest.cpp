@@ -6,7 +6,7 @@ namespace DevStsTests {
 
 namespace {
 
-struct Case
+struct Change
 {
     std::string name;
     std::string from; ///< stands once in the good template
@@ -14,12 +14,12 @@ struct Case
     std::string text;
 };
 
-void PrintTo(const Case& instance, std::ostream* out)
+void PrintTo(const Change& instance, std::ostream* out)
 {
     *out << instance.name;
 }
 
-std::string CaseName(const testing::TestParamInfo<Case>& info)
+std::string ChangeName(const testing::TestParamInfo<Change>& info)
 {
     return info.param.name;
 }
@@ -50,12 +50,12 @@ std::string Instead(const std::string& found, const std::string& expected)
 }
 
 // Honestly signed by the known client, but in a way that this STS does not admit.
-class InadmissibleSignature : public ServerTest, public testing::WithParamInterface<Case>
+class InadmissibleSignature : public ServerTest, public testing::WithParamInterface<Change>
 {};
 
 TEST_P(InadmissibleSignature, IsRefusedWithTheReason)
 {
-    const Case& instance = GetParam();
+    const Change& instance = GetParam();
     const std::string request = Sign(Replaced(GoodTemplate(), instance.from, instance.to));
     EXPECT_EQ(FaultText(PostIssue(request), "wst:InvalidRequest"), instance.text);
 }
@@ -64,45 +64,45 @@ INSTANTIATE_TEST_SUITE_P(
     References,
     InadmissibleSignature,
     testing::Values(
-        Case{"BodyOnly", Reference("timestamp-1"), "", TwoReferences},
-        Case{"TimestampOnly", Reference("body-1"), "", TwoReferences},
-        Case{
+        Change{"BodyOnly", Reference("timestamp-1"), "", TwoReferences},
+        Change{"TimestampOnly", Reference("body-1"), "", TwoReferences},
+        Change{
             "OtherOrder",
             Reference("body-1") + Reference("timestamp-1"),
             Reference("timestamp-1") + Reference("body-1"),
             TwoReferences},
-        Case{"BodyTwice", Reference("timestamp-1"), Reference("body-1"), TwoReferences},
-        Case{
+        Change{"BodyTwice", Reference("timestamp-1"), Reference("body-1"), TwoReferences},
+        Change{
             "WholeDocument",
             "</ds:SignedInfo>",
             Replaced(Reference("x"), "#x", "") + "</ds:SignedInfo>",
             TwoReferences}),
-    CaseName);
+    ChangeName);
 
 INSTANTIATE_TEST_SUITE_P(
     Algorithms,
     InadmissibleSignature,
     testing::Values(
-        Case{
+        Change{
             "RsaSha512",
             "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256",
             "http://www.w3.org/2001/04/xmldsig-more#rsa-sha512",
             Instead(
                 "http://www.w3.org/2001/04/xmldsig-more#rsa-sha512",
                 "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256")},
-        Case{
+        Change{
             "InclusiveC14n",
             std::string("CanonicalizationMethod Algorithm=\"") + ExclusiveC14n,
             "CanonicalizationMethod Algorithm=\"http://www.w3.org/TR/2001/REC-xml-c14n-20010315",
             Instead("http://www.w3.org/TR/2001/REC-xml-c14n-20010315", ExclusiveC14n)},
-        Case{
+        Change{
             "Sha512Digest",
             Reference("body-1"),
             Replaced(Reference("body-1"), "xmlenc#sha256", "xmlenc#sha512"),
             Instead(
                 "http://www.w3.org/2001/04/xmlenc#sha512",
                 "http://www.w3.org/2001/04/xmlenc#sha256")},
-        Case{
+        Change{
             "XPathTransform",
             Reference("body-1"),
             Replaced(
@@ -112,23 +112,23 @@ INSTANTIATE_TEST_SUITE_P(
                 "Algorithm=\"http://www.w3.org/TR/1999/REC-xpath-19991116\">"
                 "<ds:XPath>false()</ds:XPath></ds:Transform>"),
             Instead("http://www.w3.org/TR/1999/REC-xpath-19991116", ExclusiveC14n)},
-        Case{
+        Change{
             "ObjectInSignature",
             "</ds:KeyInfo>",
             "</ds:KeyInfo><ds:Object/>",
             "Unexpected 'Object' under 'Signature'"}),
-    CaseName);
+    ChangeName);
 
 INSTANTIATE_TEST_SUITE_P(
     Keys,
     InadmissibleSignature,
     testing::Values(
-        Case{
+        Change{
             "OtherTokenName",
             "URI=\"#holderOfKeyCertificate\"",
             "URI=\"#other\"",
             "The signature names the key '#other', which is not there"},
-        Case{
+        Change{
             "OtherValueType",
             CertificateReference(),
             Replaced(CertificateReference(), "#X509v3", "#X509PKIPathv1"),
@@ -136,13 +136,13 @@ INSTANTIATE_TEST_SUITE_P(
             "oasis-200401-wss-x509-token-profile-1.0#X509v3', not "
             "'http://docs.oasis-open.org/wss/2004/01/"
             "oasis-200401-wss-x509-token-profile-1.0#X509PKIPathv1'"},
-        Case{
+        Change{
             "KeyInTheOpen",
             CertificateReference(),
             "<ds:KeyValue/>",
             "Expected element 'SecurityTokenReference' of namespace '" + std::string(Ns::Wsse)
                 + "' under 'KeyInfo', found 'KeyValue'"}),
-    CaseName);
+    ChangeName);
 
 using AdmissibleSignature = ServerTest;
 

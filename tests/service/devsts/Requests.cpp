@@ -46,6 +46,11 @@ std::string UsernameToken(const std::string& name, const std::string& password)
            + password + "</wsse:Password></wsse:UsernameToken>";
 }
 
+std::string AlicesPassword()
+{
+    return UsernameToken("alice@example.test", "alice-secret");
+}
+
 std::string IssueBody(const std::string& keyType, const std::string& extras)
 {
     return "<wst:RequestSecurityToken" + Declare("wst", Ns::Wst)
@@ -63,8 +68,7 @@ std::string IssueBody(const std::string& keyType, const std::string& extras)
 
 std::string PasswordRequest(const std::string& extras)
 {
-    return Envelope(
-        UsernameToken("alice@example.test", "alice-secret"), IssueBody("Bearer", extras));
+    return Envelope(AlicesPassword(), IssueBody("Bearer", extras));
 }
 
 std::string DelegateTo(const std::string& name)

@@ -28,6 +28,9 @@ std::string Envelope(const std::string& headerPart, const std::string& body);
 
 std::string UsernameToken(const std::string& name, const std::string& password);
 
+/** The same with Alice's. */
+std::string AlicesPassword();
+
 /** The body of an Issue request; `extras` stand at its end. */
 std::string IssueBody(const std::string& keyType = "Bearer", const std::string& extras = "");
 

@@ -4,15 +4,15 @@
 
 namespace {
 
-constexpr char Text[] = "<a>\n  <b x=1/>\n</a>";
+constexpr char Passage[] = "<a>\n  <b x=1/>\n</a>";
 
 } // namespace
 
 TEST(FindPassage, MarksThePlaceInItsLine)
 {
-    EXPECT_EQ(FindPassage("\" expected at line 2, column 8", Text), "  <b x=[here]1/>");
-    EXPECT_EQ(FindPassage("Element 'b' at 2,3 is odd", Text), "  [here]<b x=1/>");
-    EXPECT_EQ(FindPassage("no end at line 3, column 99", Text), "</a>[here]");
+    EXPECT_EQ(FindPassage("\" expected at line 2, column 8", Passage), "  <b x=[here]1/>");
+    EXPECT_EQ(FindPassage("Element 'b' at 2,3 is odd", Passage), "  [here]<b x=1/>");
+    EXPECT_EQ(FindPassage("no end at line 3, column 99", Passage), "</a>[here]");
 }
 
 TEST(FindPassage, CutsALongLine)
@@ -30,7 +30,7 @@ TEST(FindPassage, IsEmptyWithoutAPlace)
           "x at line 9, column 1",
           "x at 0,0",
           "x at 99999999,1"}) {
-        EXPECT_EQ(FindPassage(message, Text), "") << message;
+        EXPECT_EQ(FindPassage(message, Passage), "") << message;
     }
     EXPECT_EQ(FindPassage("x at 1,1", ""), "");
 }

@@ -67,7 +67,7 @@ bool IsBlankText(const xmlNode* node)
     return node->type == XML_TEXT_NODE && xmlIsBlankNode(const_cast<xmlNode*>(node)) == 1;
 }
 
-bool Names(const xmlAttr* attribute, const XmlName& name)
+bool HasName(const xmlAttr* attribute, const XmlName& name)
 {
     return View(attribute->name) == name.local && NamespaceOf(attribute->ns) == name.ns;
 }
@@ -127,7 +127,7 @@ std::optional<std::string> FindAttribute(const xmlNode* element, const XmlName& 
 {
     for (const xmlAttr* attribute = element->properties; attribute != nullptr;
          attribute = attribute->next) {
-        if (Names(attribute, name)) {
+        if (HasName(attribute, name)) {
             const XmlString value(xmlNodeListGetString(element->doc, attribute->children, 1));
             return std::string(View(value.get()));
         }
@@ -149,7 +149,7 @@ void AllowAttributes(const xmlNode* element, std::initializer_list<XmlName> allo
     for (const xmlAttr* attribute = element->properties; attribute != nullptr;
          attribute = attribute->next) {
         const bool known = std::any_of(allowed.begin(), allowed.end(), [&](const XmlName& name) {
-            return Names(attribute, name);
+            return HasName(attribute, name);
         });
         if (!known) {
             throw ShapeError(

@@ -18,6 +18,18 @@ inline bool HasHappened(std::promise<void>& event)
     return event.get_future().wait_for(std::chrono::seconds(10)) == std::future_status::ready;
 }
 
+/** What an `InvalidArgumentException` of `action` says; empty if there is none. */
+template <class Action>
+std::string GetArgumentError(const Action& action)
+{
+    try {
+        action();
+    } catch (const Quillon::InvalidArgumentException& error) {
+        return error.what();
+    }
+    return "";
+}
+
 /** What a test wants to know of a reply. */
 struct Reply
 {

@@ -9,17 +9,6 @@ using Quillon::Ref;
 
 namespace {
 
-template <class Action>
-std::string GetArgumentError(const Action& action)
-{
-    try {
-        action();
-    } catch (const InvalidArgumentException& error) {
-        return error.what();
-    }
-    return "";
-}
-
 // [RFC 3986 3.3]
 TEST(CreateHttpRequest, RefusesPathsThatWouldChangeTheRequestLine)
 {

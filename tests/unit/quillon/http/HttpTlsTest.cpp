@@ -694,17 +694,6 @@ TEST_F(PartialWildcardTest, IsNoName)
         HttpClient(MakeSpec("", "sts.example.test")).PostAndFail());
 }
 
-template <class Action>
-std::string GetArgumentError(const Action& action)
-{
-    try {
-        action();
-    } catch (const InvalidArgumentException& error) {
-        return error.what();
-    }
-    return "";
-}
-
 TEST_F(TlsTest, RefusesMalformedPins)
 {
     const std::string notDigest = "\" is not the Base64 of a SHA-256 digest.";

@@ -26,7 +26,7 @@ std::vector<Row> Select(bool accepted)
 }
 
 /** The file's name without folder and suffix, in the letters that a test's name may have. */
-std::string NameOf(const testing::TestParamInfo<Row>& info)
+std::string NameOfRow(const testing::TestParamInfo<Row>& info)
 {
     std::string name = std::filesystem::path(info.param.file).stem().string();
     std::replace_if(
@@ -70,8 +70,8 @@ TEST_P(RefusedAssertion, SaysWhy)
         << row.about << "\nfound: " << text << "\nexpected: " << row.contains;
 }
 
-INSTANTIATE_TEST_SUITE_P(Table, AcceptedAssertion, testing::ValuesIn(Select(true)), NameOf);
-INSTANTIATE_TEST_SUITE_P(Table, RefusedAssertion, testing::ValuesIn(Select(false)), NameOf);
+INSTANTIATE_TEST_SUITE_P(Table, AcceptedAssertion, testing::ValuesIn(Select(true)), NameOfRow);
+INSTANTIATE_TEST_SUITE_P(Table, RefusedAssertion, testing::ValuesIn(Select(false)), NameOfRow);
 
 TEST(AssertionTable, NamesEveryFile)
 {

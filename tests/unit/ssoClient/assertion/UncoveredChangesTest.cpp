@@ -84,7 +84,7 @@ protected:
     }
 };
 
-std::string NameOf(const testing::TestParamInfo<const char*>& info)
+std::string NameOfDocument(const testing::TestParamInfo<const char*>& info)
 {
     std::string name;
     for (const char letter : std::string(info.param)) {
@@ -131,7 +131,7 @@ INSTANTIATE_TEST_SUITE_P(
         "covered-type-of-a-value",
         "context-declaration",
         "comments-at-the-ends"),
-    NameOf);
+    NameOfDocument);
 
 TEST(UncoveredChange, OfATypesNamespaceIsNotEvenSeen)
 {

@@ -67,7 +67,8 @@ protected:
     }
 };
 
-constexpr char OtherToken[] = "SsoException: The service issued another token than was asked for: ";
+constexpr char IssuedAnother[] =
+    "SsoException: The service issued another token than was asked for: ";
 
 } // namespace
 
@@ -133,7 +134,7 @@ TEST_F(DialectGrant, RefusesTheTokenOfAnotherUser)
         return GetFailure([&] { GetService().AcquireToken(user, "s3cret", spec); });
     };
     EXPECT_EQ(acquire("alice"), "none");
-    EXPECT_THAT(acquire("bob"), StartsWith(OtherToken + std::string("its subject is ")));
+    EXPECT_THAT(acquire("bob"), StartsWith(IssuedAnother + std::string("its subject is ")));
     dialect.grantCheck.subject = false;
     EXPECT_EQ(acquire("bob"), "none");
 }
@@ -141,7 +142,7 @@ TEST_F(DialectGrant, RefusesTheTokenOfAnotherUser)
 TEST_F(DialectGrant, RefusesABearerTokenInThePlaceOfOneThatIsBound)
 {
     Answer("cxf-bearer-rsa");
-    EXPECT_EQ(GetCertificateFailure(), OtherToken + std::string("it is bound to no key"));
+    EXPECT_EQ(GetCertificateFailure(), IssuedAnother + std::string("it is bound to no key"));
 }
 
 TEST_F(DialectGrant, RefusesATokenThatIsBoundToAnotherKey)
@@ -152,7 +153,7 @@ TEST_F(DialectGrant, RefusesATokenThatIsBoundToAnotherKey)
     identity = MakeIdentity("foreign");
     EXPECT_EQ(
         GetCertificateFailure(),
-        OtherToken + std::string("it is bound to another key than the caller's"));
+        IssuedAnother + std::string("it is bound to another key than the caller's"));
     dialect.grantCheck.key = false;
     EXPECT_EQ(GetCertificateFailure(), "none");
 }
@@ -162,7 +163,7 @@ TEST_F(DialectGrant, ComparesTheNameOfTheCertificate)
     Answer("cxf-holder-of-key-rsa");
     EXPECT_EQ(
         GetCertificateFailure(),
-        OtherToken
+        IssuedAnother
             + std::string("its subject is {Name: CN=service,O=Example; "
                           "Domain:http://cxf.apache.org/sts}, and it was asked for by or for "
                           "CN=solution-user,O=Example"));
@@ -197,7 +198,7 @@ TEST_F(DialectGrant, IsNotComparedWithoutADialect)
     };
     EXPECT_EQ(acquire(boost::none), "none");
     EXPECT_EQ(
-        acquire(ServiceDialect::Default()), OtherToken + std::string("it is bound to no key"));
+        acquire(ServiceDialect::Default()), IssuedAnother + std::string("it is bound to no key"));
 }
 
 TEST_F(DialectGrant, IsComparedInStepwiseNegotiationsToo)
@@ -217,5 +218,5 @@ TEST_F(DialectGrant, IsComparedInStepwiseNegotiationsToo)
         identity);
     EXPECT_EQ(
         GetFailure([&] { context.NegotiateToken(Leg{1}); }),
-        OtherToken + std::string("it is bound to no key"));
+        IssuedAnother + std::string("it is bound to no key"));
 }

@@ -7,6 +7,9 @@
 
 #include <string>
 
+/** When messages are written. */
+inline constexpr char Now[] = "2011-07-05T09:03:07.042Z";
+
 inline Quillon::Ref<Quillon::Xml::ElementNode> Build(const SsoClient::XMLBaseBuilder& builder)
 {
     Quillon::Ref<Quillon::Xml::ElementNode> element;

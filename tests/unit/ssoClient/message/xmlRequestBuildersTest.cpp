@@ -20,8 +20,6 @@ namespace {
 #define WSSE "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd"
 #define WSU "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd"
 
-constexpr char Now[] = "2011-07-05T09:03:07.042Z";
-
 constexpr char Lifetime300[] = "<wst:Lifetime xmlns:wsu=\"" WSU "\">"
                                "<wsu:Created>2011-07-05T09:03:07.042Z</wsu:Created>"
                                "<wsu:Expires>2011-07-05T09:08:07.042Z</wsu:Expires>"

@@ -16,8 +16,6 @@ namespace {
 #define X509V3                                                                                     \
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-x509-token-profile-1.0#X509v3"
 
-constexpr char Now[] = "2011-07-05T09:03:07.042Z";
-
 /** A certificate of which only the encoding counts. */
 class EncodingOnly : public Quillon::Crypto::Certificate
 {

@@ -23,10 +23,8 @@ namespace {
 #define SOAP "http://schemas.xmlsoap.org/soap/envelope/"
 #define WST "http://docs.oasis-open.org/ws-sx/ws-trust/200512"
 #define WSS "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-"
-#define WSU WSS "wssecurity-utility-1.0.xsd"
-#define WSSE WSS "wssecurity-secext-1.0.xsd"
-
-constexpr char Now[] = "2011-07-05T09:03:07.042Z";
+#define WSSE "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd"
+#define WSU "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd"
 
 Ref<const Quillon::Crypto::Certificate> GetClientCertificate()
 {

@@ -46,7 +46,7 @@ std::string Acquire(const std::string& reply)
     return tokenXml;
 }
 
-std::string Renew(const std::string& reply)
+std::string ReadRenewal(const std::string& reply)
 {
     std::string tokenXml;
     ResponseHandlerImpl().HandleRenewTokenResponse(
@@ -54,7 +54,7 @@ std::string Renew(const std::string& reply)
     return tokenXml;
 }
 
-bool Validate(const std::string& reply)
+bool ReadVerdict(const std::string& reply)
 {
     return ResponseHandlerImpl().HandleValidateSubjectResponse(
         Quillon::CreateStringReader(reply).get());
@@ -148,7 +148,7 @@ TEST(ReplyForm, IsLeftToTheServiceIfTheDialectSaysSo)
         EXPECT_EQ(renewed, issued);
     }
     EXPECT_EQ(GetFailure(Acquire, Envelope(single)), UnexpectedFormat);
-    EXPECT_EQ(GetFailure(Renew, Envelope(collection)), UnexpectedFormat);
+    EXPECT_EQ(GetFailure(ReadRenewal, Envelope(collection)), UnexpectedFormat);
     EXPECT_EQ(
         ::GetFailure([&] {
             std::string issued;
@@ -210,9 +210,9 @@ TEST(HandleAcquireTokenResponse, LeavesTheOutputAloneOnFailure)
 TEST(HandleRenewTokenResponse, GivesTheAssertionInCanonicalForm)
 {
     EXPECT_EQ(
-        Renew(Envelope("<w:RequestSecurityTokenResponse xmlns:w=\"" WST "\">"
-                       "<w:RequestedSecurityToken><Assertion/></w:RequestedSecurityToken>"
-                       "</w:RequestSecurityTokenResponse>")),
+        ReadRenewal(Envelope("<w:RequestSecurityTokenResponse xmlns:w=\"" WST "\">"
+                             "<w:RequestedSecurityToken><Assertion/></w:RequestedSecurityToken>"
+                             "</w:RequestSecurityTokenResponse>")),
         "<Assertion xmlns:S=\"" SOAP "\" xmlns:w=\"" WST "\"></Assertion>");
 }
 
@@ -221,7 +221,7 @@ TEST(HandleRenewTokenResponse, RefusesCollection)
 {
     EXPECT_EQ(
         GetFailure(
-            Renew,
+            ReadRenewal,
             Envelope("<RequestSecurityTokenResponseCollection><RequestSecurityTokenResponse>"
                      "<RequestedSecurityToken><Assertion/></RequestedSecurityToken>"
                      "</RequestSecurityTokenResponse>"
@@ -231,8 +231,8 @@ TEST(HandleRenewTokenResponse, RefusesCollection)
 
 TEST(HandleValidateSubjectResponse, ReadsTheVerdict)
 {
-    EXPECT_TRUE(Validate(StatusReply("<wst:Code>" WST "/status/valid</wst:Code>")));
-    EXPECT_FALSE(Validate(StatusReply("<wst:Code>" WST "/status/invalid</wst:Code>")));
+    EXPECT_TRUE(ReadVerdict(StatusReply("<wst:Code>" WST "/status/valid</wst:Code>")));
+    EXPECT_FALSE(ReadVerdict(StatusReply("<wst:Code>" WST "/status/invalid</wst:Code>")));
 }
 
 TEST(HandleValidateSubjectResponse, RefusesAnyOtherCode)
@@ -244,7 +244,7 @@ TEST(HandleValidateSubjectResponse, RefusesAnyOtherCode)
           WST "/status/",
           "http://other/status/valid"}) {
         EXPECT_EQ(
-            GetFailure(Validate, StatusReply("<wst:Code>" + code + "</wst:Code>")),
+            GetFailure(ReadVerdict, StatusReply("<wst:Code>" + code + "</wst:Code>")),
             UnexpectedFormat)
             << code;
     }
@@ -252,9 +252,10 @@ TEST(HandleValidateSubjectResponse, RefusesAnyOtherCode)
 
 TEST(HandleValidateSubjectResponse, RefusesEachMissingStep)
 {
-    EXPECT_EQ(GetFailure(Validate, Envelope("")), UnexpectedFormat);
-    EXPECT_EQ(GetFailure(Validate, Envelope("<RequestSecurityTokenResponse/>")), UnexpectedFormat);
-    EXPECT_EQ(GetFailure(Validate, StatusReply("")), UnexpectedFormat);
+    EXPECT_EQ(GetFailure(ReadVerdict, Envelope("")), UnexpectedFormat);
+    EXPECT_EQ(
+        GetFailure(ReadVerdict, Envelope("<RequestSecurityTokenResponse/>")), UnexpectedFormat);
+    EXPECT_EQ(GetFailure(ReadVerdict, StatusReply("")), UnexpectedFormat);
 }
 
 TEST(HandleValidateSubjectResponse, RefusesCodeThatDoesNotStartWithText)
@@ -264,7 +265,7 @@ TEST(HandleValidateSubjectResponse, RefusesCodeThatDoesNotStartWithText)
           std::pair("<x/>", "element"),
           std::pair("<!-- c -->" WST "/status/valid", "comment")}) {
         try {
-            Validate(StatusReply("<wst:Code>" + std::string(content) + "</wst:Code>"));
+            ReadVerdict(StatusReply("<wst:Code>" + std::string(content) + "</wst:Code>"));
             ADD_FAILURE() << "accepted: " << content;
         } catch (const Quillon::TypeMismatchException& error) {
             EXPECT_EQ(error.what(), "Type mismatch: expected text, found " + std::string(found));
@@ -275,10 +276,11 @@ TEST(HandleValidateSubjectResponse, RefusesCodeThatDoesNotStartWithText)
 // A comment ends the text that an element starts with.
 TEST(HandleValidateSubjectResponse, LooksAtTheFirstChildOfTheCodeOnly)
 {
-    EXPECT_TRUE(Validate(StatusReply("<wst:Code>" WST "/status/valid<!-- c -->x</wst:Code>")));
-    EXPECT_FALSE(Validate(StatusReply("<wst:Code>" WST "/status/invalid<x/></wst:Code>")));
+    EXPECT_TRUE(ReadVerdict(StatusReply("<wst:Code>" WST "/status/valid<!-- c -->x</wst:Code>")));
+    EXPECT_FALSE(ReadVerdict(StatusReply("<wst:Code>" WST "/status/invalid<x/></wst:Code>")));
     EXPECT_EQ(
-        GetFailure(Validate, StatusReply("<wst:Code>x<!-- c -->" WST "/status/valid</wst:Code>")),
+        GetFailure(
+            ReadVerdict, StatusReply("<wst:Code>x<!-- c -->" WST "/status/valid</wst:Code>")),
         UnexpectedFormat);
 }
 
@@ -292,11 +294,11 @@ TEST(ProcessResponse, LooksAtTheFirstBodyOnly)
     const auto envelope = [](const std::string& bodies) {
         return "<S:Envelope xmlns:S=\"" SOAP "\">" + bodies + "</S:Envelope>";
     };
-    EXPECT_EQ(GetFailure(Validate, envelope(empty + verdict)), UnexpectedFormat);
-    EXPECT_TRUE(Validate(envelope(verdict + empty)));
-    EXPECT_TRUE(Validate(envelope(verdict + fault)));
+    EXPECT_EQ(GetFailure(ReadVerdict, envelope(empty + verdict)), UnexpectedFormat);
+    EXPECT_TRUE(ReadVerdict(envelope(verdict + empty)));
+    EXPECT_TRUE(ReadVerdict(envelope(verdict + fault)));
     EXPECT_EQ(
-        GetFailure(Validate, envelope(fault + verdict)),
+        GetFailure(ReadVerdict, envelope(fault + verdict)),
         "SsoException: Unexpected SOAP fault: S:Server; request failed.");
 }
 
@@ -365,8 +367,8 @@ TEST(ProcessResponse, ReportsMissingBody)
 {
     const char expected[] = "SsoException: Unexpected response format: missing SAOP Body.";
     EXPECT_EQ(GetFailure(Acquire, "<html><body/></html>"), expected);
-    EXPECT_EQ(GetFailure(Renew, "<S:Envelope xmlns:S=\"" SOAP "\"/>"), expected);
-    EXPECT_EQ(GetFailure(Validate, "<Envelope><Header><Body/></Header></Envelope>"), expected);
+    EXPECT_EQ(GetFailure(ReadRenewal, "<S:Envelope xmlns:S=\"" SOAP "\"/>"), expected);
+    EXPECT_EQ(GetFailure(ReadVerdict, "<Envelope><Header><Body/></Header></Envelope>"), expected);
 }
 
 // [WST13 11]
@@ -397,8 +399,8 @@ TEST(ProcessResponse, ReportsBadCredentialsToEveryOperation)
     const std::string reply = FaultWithCode("wst:FailedAuthentication");
     const char expected[] = "InvalidCredentialsException: Authentication failed";
     EXPECT_EQ(GetFailure(Acquire, reply), expected);
-    EXPECT_EQ(GetFailure(Renew, reply), expected);
-    EXPECT_EQ(GetFailure(Validate, reply), expected);
+    EXPECT_EQ(GetFailure(ReadRenewal, reply), expected);
+    EXPECT_EQ(GetFailure(ReadVerdict, reply), expected);
 }
 
 TEST(ProcessResponse, ReportsOtherFaultsByTheirCodeAsWritten)
@@ -452,7 +454,7 @@ TEST(ProcessResponse, LooksForFaultBeforeAnythingElse)
 {
     EXPECT_EQ(
         GetFailure(
-            Validate,
+            ReadVerdict,
             Envelope("<RequestSecurityTokenResponse><Status><Code>" WST
                      "/status/valid</Code></Status></RequestSecurityTokenResponse>"
                      "<S:Fault><faultcode>S:Server</faultcode></S:Fault>")),

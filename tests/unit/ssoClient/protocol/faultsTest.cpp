@@ -54,9 +54,9 @@ ServiceDialect Soap12Dialect()
     return dialect;
 }
 
-std::string GetFailure(const ServiceDialect& dialect, const std::string& reply)
+std::string GetFaultFailure(const ServiceDialect& dialect, const std::string& reply)
 {
-    return ::GetFailure([&] {
+    return GetFailure([&] {
         std::string tokenXml;
         ResponseHandlerImpl({dialect, FaultObserver()})
             .HandleAcquireTokenResponse(Quillon::CreateStringReader(reply).get(), tokenXml);
@@ -68,7 +68,7 @@ std::vector<SoapFault> Observe(const std::string& reply)
     std::vector<SoapFault> seen;
     const ResponseHandlerImpl handler(
         {ServiceDialect(), [&seen](const SoapFault& fault) { seen.push_back(fault); }});
-    ::GetFailure([&] {
+    GetFailure([&] {
         std::string tokenXml;
         handler.HandleAcquireTokenResponse(Quillon::CreateStringReader(reply).get(), tokenXml);
     });
@@ -81,10 +81,10 @@ std::vector<SoapFault> Observe(const std::string& reply)
 TEST(Soap12Fault, IsToldByItsCodesAsWritten)
 {
     EXPECT_EQ(
-        GetFailure(Soap12Dialect(), SenderFault("\n t:BadRequest ", Reason)),
+        GetFaultFailure(Soap12Dialect(), SenderFault("\n t:BadRequest ", Reason)),
         "SsoException: Unexpected SOAP fault: S:Sender/t:BadRequest; request failed.");
     EXPECT_EQ(
-        GetFailure(Soap12Dialect(), Fault12("<S:Code><S:Value>S:Receiver</S:Value></S:Code>")),
+        GetFaultFailure(Soap12Dialect(), Fault12("<S:Code><S:Value>S:Receiver</S:Value></S:Code>")),
         "SsoException: Unexpected SOAP fault: S:Receiver; request failed.");
 }
 
@@ -92,12 +92,12 @@ TEST(Soap12Fault, IsOfBadCredentialsByItsSubcode)
 {
     const std::string bad = "InvalidCredentialsException: Authentication failed";
     EXPECT_EQ(
-        GetFailure(Soap12Dialect(), SenderFault("t:FailedAuthentication", Reason)),
+        GetFaultFailure(Soap12Dialect(), SenderFault("t:FailedAuthentication", Reason)),
         bad + ": wrong");
-    EXPECT_EQ(GetFailure(Soap12Dialect(), SenderFault("t:InvalidSecurityToken")), bad);
-    EXPECT_EQ(GetFailure(Soap12Dialect(), SenderFault("o:InvalidSecurityToken")), bad);
+    EXPECT_EQ(GetFaultFailure(Soap12Dialect(), SenderFault("t:InvalidSecurityToken")), bad);
+    EXPECT_EQ(GetFaultFailure(Soap12Dialect(), SenderFault("o:InvalidSecurityToken")), bad);
     EXPECT_EQ(
-        GetFailure(
+        GetFaultFailure(
             Soap12Dialect(),
             SenderFault("t:RequestFailed</S:Value><S:Subcode><S:Value>t:FailedAuthentication"
                         "</S:Value></S:Subcode><S:Value>t:More")),
@@ -107,7 +107,7 @@ TEST(Soap12Fault, IsOfBadCredentialsByItsSubcode)
 TEST(Soap12Fault, IsOfBadCredentialsThoughASubcodeSaysMore)
 {
     EXPECT_EQ(
-        GetFailure(
+        GetFaultFailure(
             Soap12Dialect(),
             SenderFault("t:FailedAuthentication</S:Value><S:Subcode><S:Value>t:More</S:Value>"
                         "</S:Subcode><S:Value>t:Last")),
@@ -117,26 +117,27 @@ TEST(Soap12Fault, IsOfBadCredentialsThoughASubcodeSaysMore)
 TEST(Soap12Fault, IsNotOfBadCredentialsByANameOfAnotherNamespace)
 {
     EXPECT_EQ(
-        GetFailure(Soap12Dialect(), SenderFault("old:FailedAuthentication", Reason)),
+        GetFaultFailure(Soap12Dialect(), SenderFault("old:FailedAuthentication", Reason)),
         "SsoException: Unexpected SOAP fault: S:Sender/old:FailedAuthentication; request failed.");
     EXPECT_EQ(
-        GetFailure(Soap12Dialect(), SenderFault("FailedAuthentication", Reason)),
+        GetFaultFailure(Soap12Dialect(), SenderFault("FailedAuthentication", Reason)),
         "SsoException: Unexpected SOAP fault: S:Sender/FailedAuthentication; request failed.");
 }
 
 TEST(Soap12Fault, MustHaveACodeWhosePrefixIsDeclared)
 {
     EXPECT_EQ(
-        GetFailure(Soap12Dialect(), Fault12("<S:Code/>")),
+        GetFaultFailure(Soap12Dialect(), Fault12("<S:Code/>")),
         "SsoException: Invalid SOAP response: missing fault code.");
     EXPECT_EQ(
-        GetFailure(Soap12Dialect(), SenderFault("x:Unknown")).substr(0, 15), "ParseException:");
+        GetFaultFailure(Soap12Dialect(), SenderFault("x:Unknown")).substr(0, 15),
+        "ParseException:");
 }
 
 TEST(Soap12Fault, IsNoneToADialectOfSoap11)
 {
     EXPECT_EQ(
-        GetFailure(ServiceDialect(), SenderFault("t:BadRequest")),
+        GetFaultFailure(ServiceDialect(), SenderFault("t:BadRequest")),
         "SsoException: Invalid SOAP response: missing faultcode.");
 }
 
@@ -144,7 +145,7 @@ TEST(Soap12Fault, IsNoneToADialectOfSoap11)
 TEST(Soap12Fault, MayComeAsOneOfSoap11)
 {
     EXPECT_EQ(
-        GetFailure(Soap12Dialect(), Fault11("<faultcode>S:VersionMismatch</faultcode>")),
+        GetFaultFailure(Soap12Dialect(), Fault11("<faultcode>S:VersionMismatch</faultcode>")),
         "SsoException: Unexpected SOAP fault: S:VersionMismatch; request failed.");
 }
 
@@ -152,11 +153,12 @@ TEST(FaultOfAuthentication, OfWsSecurityIsOfBadCredentialsIfTheDialectSaysSo)
 {
     const std::string reply = Fault11("<faultcode>o:FailedAuthentication</faultcode>");
     EXPECT_EQ(
-        GetFailure(ServiceDialect(), reply),
+        GetFaultFailure(ServiceDialect(), reply),
         "SsoException: Unexpected SOAP fault: o:FailedAuthentication; request failed.");
     ServiceDialect dialect;
     dialect.wsseFailedAuthentication = true;
-    EXPECT_EQ(GetFailure(dialect, reply), "InvalidCredentialsException: Authentication failed");
+    EXPECT_EQ(
+        GetFaultFailure(dialect, reply), "InvalidCredentialsException: Authentication failed");
 }
 
 TEST(FaultOfAuthentication, IsOfTheTrustNamespaceOfTheDialect)
@@ -164,10 +166,10 @@ TEST(FaultOfAuthentication, IsOfTheTrustNamespaceOfTheDialect)
     ServiceDialect dialect = Soap12Dialect();
     dialect.trust = TrustVersion::WS_TRUST_2005_02;
     EXPECT_EQ(
-        GetFailure(dialect, SenderFault("old:FailedAuthentication")),
+        GetFaultFailure(dialect, SenderFault("old:FailedAuthentication")),
         "InvalidCredentialsException: Authentication failed");
     EXPECT_EQ(
-        GetFailure(dialect, SenderFault("t:FailedAuthentication")),
+        GetFaultFailure(dialect, SenderFault("t:FailedAuthentication")),
         "SsoException: Unexpected SOAP fault: S:Sender/t:FailedAuthentication; request failed.");
 }
 
@@ -222,7 +224,7 @@ TEST(FaultObserver, SeesADetailThatHasNoCanonicalFormAsItIsWritten)
             {ServiceDialect(), [&seen](const SoapFault& fault) { seen.push_back(fault); }});
         const std::string reply = Fault11("<faultcode>t:X</faultcode>" + detail);
         EXPECT_EQ(
-            ::GetFailure([&] {
+            GetFailure([&] {
                 handler.HandleValidateSubjectResponse(Quillon::CreateStringReader(reply).get());
             }),
             "SsoException: Unexpected SOAP fault: t:X; request failed.");
@@ -247,7 +249,7 @@ TEST(FaultObserver, MayThrow)
     const ResponseHandlerImpl handler(
         {ServiceDialect(), [](const SoapFault&) { throw Quillon::InvalidStateException("seen"); }});
     EXPECT_EQ(
-        ::GetFailure([&] {
+        GetFailure([&] {
             handler.HandleValidateSubjectResponse(
                 Quillon::CreateStringReader(Fault11("<faultcode>t:X</faultcode>")).get());
         }),

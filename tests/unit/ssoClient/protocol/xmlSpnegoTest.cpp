@@ -23,7 +23,7 @@ namespace {
     "ValueType=\"http://schemas.xmlsoap.org/ws/2005/02/trust/spnego\">"
 
 constexpr char SamlType[] = "urn:oasis:names:tc:SAML:2.0:assertion";
-constexpr char UnexpectedFormat[] = "SsoException: Unexpected XML format";
+constexpr char UnexpectedXml[] = "SsoException: Unexpected XML format";
 
 const Leg Hello{'h', 'e', 'l', 'l', 'o'};
 
@@ -250,20 +250,19 @@ TEST(HandleSPNegoResponse, LeavesTheResponseAloneOnFailure)
 
 TEST(HandleSPNegoResponse, RefusesReplyWithoutResponse)
 {
-    EXPECT_EQ(GetReplyFailure(""), UnexpectedFormat);
-    EXPECT_EQ(GetReplyFailure(Collection("")), UnexpectedFormat);
+    EXPECT_EQ(GetReplyFailure(""), UnexpectedXml);
+    EXPECT_EQ(GetReplyFailure(Collection("")), UnexpectedXml);
 }
 
 TEST(HandleSPNegoResponse, RefusesResponseWithoutContext)
 {
-    EXPECT_EQ(GetReplyFailure(Response(Exchange("aGVsbG8="), "")), UnexpectedFormat);
-    EXPECT_EQ(
-        GetReplyFailure(Response(Exchange("aGVsbG8="), " w:Context=\"ctx\"")), UnexpectedFormat);
+    EXPECT_EQ(GetReplyFailure(Response(Exchange("aGVsbG8="), "")), UnexpectedXml);
+    EXPECT_EQ(GetReplyFailure(Response(Exchange("aGVsbG8="), " w:Context=\"ctx\"")), UnexpectedXml);
 }
 
 TEST(HandleSPNegoResponse, RefusesResponseWithNeitherLegNorToken)
 {
-    EXPECT_EQ(GetReplyFailure(Response("<w:TokenType>x</w:TokenType>")), UnexpectedFormat);
+    EXPECT_EQ(GetReplyFailure(Response("<w:TokenType>x</w:TokenType>")), UnexpectedXml);
 }
 
 TEST(HandleSPNegoResponse, AcceptsARequestedTokenThatHoldsNoAssertion)
@@ -341,7 +340,7 @@ TEST(HandleSPNegoResponse, RefusesAnyOtherTokenType)
 
 TEST(HandleSPNegoResponse, ChecksContextThenLegThenTokenType)
 {
-    EXPECT_EQ(GetReplyFailure(Response(Exchange("?") + Token("x"), "")), UnexpectedFormat);
+    EXPECT_EQ(GetReplyFailure(Response(Exchange("?") + Token("x"), "")), UnexpectedXml);
     EXPECT_EQ(
         GetReplyFailure(Response(Exchange("?") + Token("x"))),
         "SsoException: Base64 format exception");

@@ -17,34 +17,9 @@ using Quillon::Crypto::Certificate;
 
 namespace {
 
-constexpr char EndOfConditions[] = "</saml:Conditions>";
-constexpr char EndOfAssertion[] = "</saml:Assertion>";
 constexpr char StartAttribute[] = "NotBefore=\"2012-01-31T11:55:00Z\"";
 constexpr char ConfirmationEnd[] =
     "NotOnOrAfter=\"2012-01-31T12:05:00Z\"></saml:SubjectConfirmationData>";
-
-std::list<Ref<const Certificate>> TrustSts()
-{
-    return {StsKey().GetCertificate()};
-}
-
-boost::shared_ptr<const SamlToken> MakeToken(const std::string& assertion)
-{
-    return CreateSamlToken(StsKey().Sign(assertion), TrustSts());
-}
-
-std::string WithConditions(const std::string& conditions)
-{
-    return InsertBefore(Bearer(), EndOfConditions, conditions);
-}
-
-std::string WithAttributes(const std::string& attributes)
-{
-    return InsertBefore(
-        Bearer(),
-        EndOfAssertion,
-        "<saml:AttributeStatement>" + attributes + "</saml:AttributeStatement>");
-}
 
 /** A token on behalf of `delegateId` with the given chain; no delegate id if it is empty. */
 std::string Delegated(const std::string& delegateId, const std::vector<std::string>& delegates)

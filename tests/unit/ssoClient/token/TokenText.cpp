@@ -155,6 +155,19 @@ std::string InsertBefore(
     return Replace(text, where, inserted + where);
 }
 
+std::string WithConditions(const std::string& conditions)
+{
+    return InsertBefore(Bearer(), EndOfConditions, conditions);
+}
+
+std::string WithAttributes(const std::string& attributes)
+{
+    return InsertBefore(
+        Bearer(),
+        EndOfAssertion,
+        "<saml:AttributeStatement>" + attributes + "</saml:AttributeStatement>");
+}
+
 std::string WithDummySignature(const std::string& assertion)
 {
     return WithSignature(assertion, SignedInfoContent("AAAA", "#_token"), "AAAA");
@@ -196,6 +209,16 @@ const SigningKey& StsKey()
     return key;
 }
 
+std::list<Quillon::Ref<const Quillon::Crypto::Certificate>> TrustSts()
+{
+    return {StsKey().GetCertificate()};
+}
+
+boost::shared_ptr<const SsoClient::SamlToken> MakeToken(const std::string& assertion)
+{
+    return SsoClient::CreateSamlToken(StsKey().Sign(assertion), TrustSts());
+}
+
 FixedClock::FixedClock(const std::string& time)
     : _now(time)
 {
@@ -223,6 +246,16 @@ std::string Judge(
 std::string JudgeUnsigned(const std::string& assertion, long long clockToleranceSec)
 {
     return Judge(WithDummySignature(assertion), {}, clockToleranceSec);
+}
+
+std::string JudgeReplaced(const std::string& from, const std::string& to)
+{
+    return JudgeUnsigned(Replace(Bearer(), from, to));
+}
+
+std::string JudgeConditions(const std::string& conditions)
+{
+    return JudgeUnsigned(WithConditions(conditions));
 }
 
 } // namespace TokenText

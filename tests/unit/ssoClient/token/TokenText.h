@@ -2,7 +2,11 @@
 
 #include "quillon/crypto/Certificate.h"
 #include "quillon/system/Clock.h"
+#include "ssoClient/SamlToken.h"
 
+#include <boost/smart_ptr/shared_ptr.hpp>
+
+#include <list>
 #include <memory>
 #include <string>
 #include <vector>
@@ -37,6 +41,15 @@ std::string Replace(const std::string& text, const std::string& from, const std:
 std::string InsertBefore(
     const std::string& text, const std::string& where, const std::string& inserted);
 
+inline constexpr char EndOfConditions[] = "</saml:Conditions>";
+inline constexpr char EndOfAssertion[] = "</saml:Assertion>";
+
+/** A bearer assertion with `conditions` as the children of its Conditions. */
+std::string WithConditions(const std::string& conditions);
+
+/** A bearer assertion with a statement of `attributes`. */
+std::string WithAttributes(const std::string& attributes);
+
 /** Adds a signature that has the right form and the wrong values. */
 std::string WithDummySignature(const std::string& assertion);
 
@@ -66,6 +79,12 @@ private:
 /** The key of the token service, made on first use. */
 const SigningKey& StsKey();
 
+/** The certificate of that key. */
+std::list<Quillon::Ref<const Quillon::Crypto::Certificate>> TrustSts();
+
+/** The token of an assertion, signed with that key. */
+boost::shared_ptr<const SsoClient::SamlToken> MakeToken(const std::string& assertion);
+
 /** Sets the time of the process while it lives. */
 class FixedClock final : public Quillon::System::Clock
 {
@@ -89,6 +108,12 @@ std::string Judge(
 
 /** The same for an assertion that still needs a (dummy) signature. */
 std::string JudgeUnsigned(const std::string& assertion, long long clockToleranceSec = 600);
+
+/** The same for a bearer assertion with `to` in the place of `from`. */
+std::string JudgeReplaced(const std::string& from, const std::string& to);
+
+/** The same for a bearer assertion with `conditions` in its Conditions. */
+std::string JudgeConditions(const std::string& conditions);
 
 /** What `Judge` says of a token that has nothing wrong but its signature, if nobody is trusted. */
 inline constexpr char ReachesSignature[] =

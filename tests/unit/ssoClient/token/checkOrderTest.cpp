@@ -19,18 +19,6 @@ protected:
     FixedClock _clock; // NOLINT(readability-identifier-naming): a fixture's member is protected
 };
 
-/** Judges a bearer token with `to` in the place of `from`. */
-std::string JudgeReplaced(const std::string& from, const std::string& to)
-{
-    return JudgeUnsigned(Replace(Bearer(), from, to));
-}
-
-/** Judges a bearer token with `content` in its Conditions. */
-std::string JudgeConditions(const std::string& content)
-{
-    return JudgeUnsigned(InsertBefore(Bearer(), "</saml:Conditions>", content));
-}
-
 std::string JudgeSigned(const std::string& assertion)
 {
     return Judge(StsKey().Sign(assertion), {StsKey().GetCertificate()});

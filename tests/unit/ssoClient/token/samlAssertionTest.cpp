@@ -8,7 +8,6 @@ using namespace TokenText;
 
 namespace {
 
-constexpr char EmptyConditions[] = "NotOnOrAfter=\"2012-01-31T12:05:00Z\"></saml:Conditions>";
 constexpr char EndOfConfirmationData[] = "</saml:SubjectConfirmationData>";
 
 /** Judges tokens at a time at which they are valid. */
@@ -17,25 +16,6 @@ class ReadAssertion : public testing::Test
 protected:
     FixedClock _clock; // NOLINT(readability-identifier-naming): a fixture's member is protected
 };
-
-/** A bearer assertion with `conditions` as the children of its Conditions. */
-std::string WithConditions(const std::string& conditions)
-{
-    return Replace(
-        Bearer(),
-        EmptyConditions,
-        "NotOnOrAfter=\"2012-01-31T12:05:00Z\">" + conditions + "</saml:Conditions>");
-}
-
-std::string JudgeConditions(const std::string& conditions)
-{
-    return JudgeUnsigned(WithConditions(conditions));
-}
-
-std::string JudgeReplaced(const std::string& from, const std::string& to)
-{
-    return JudgeUnsigned(Replace(Bearer(), from, to));
-}
 
 } // namespace
 

@@ -10,8 +10,6 @@ using namespace TokenText;
 
 namespace {
 
-constexpr char EndOfAssertion[] = "</saml:Assertion>";
-
 class ReadStatements : public testing::Test
 {
 protected:

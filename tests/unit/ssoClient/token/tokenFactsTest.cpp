@@ -19,31 +19,6 @@ using Quillon::Ref;
 
 namespace {
 
-constexpr char EndOfConditions[] = "</saml:Conditions>";
-
-std::list<Ref<const Quillon::Crypto::Certificate>> TrustSts()
-{
-    return {StsKey().GetCertificate()};
-}
-
-boost::shared_ptr<const SamlToken> MakeToken(const std::string& assertion)
-{
-    return CreateSamlToken(StsKey().Sign(assertion), TrustSts());
-}
-
-std::string WithAttributes(const std::string& attributes)
-{
-    return InsertBefore(
-        Bearer(),
-        "</saml:Assertion>",
-        "<saml:AttributeStatement>" + attributes + "</saml:AttributeStatement>");
-}
-
-std::string WithConditions(const std::string& conditions)
-{
-    return InsertBefore(Bearer(), EndOfConditions, conditions);
-}
-
 std::string ToUpper(std::string text)
 {
     std::transform(text.begin(), text.end(), text.begin(), [](unsigned char letter) {

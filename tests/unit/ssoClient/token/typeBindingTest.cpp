@@ -12,8 +12,6 @@ namespace Wire = SsoClient::Wire;
 
 namespace {
 
-constexpr char EndOfConditions[] = "</saml:Conditions>";
-
 /** Judges tokens signed with a condition's type behind the prefix `t`, which the signature omits.
  */
 class TypeBinding : public testing::Test
