@@ -6,6 +6,7 @@
 using namespace Quillon::Http;
 using Quillon::InvalidArgumentException;
 using Quillon::Ref;
+using Testing::GetArgumentError;
 
 namespace {
 
