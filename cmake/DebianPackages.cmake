@@ -14,7 +14,7 @@ set(CPACK_DEBIAN_PACKAGE_RELEASE 1)
 set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS ON)
 set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS_PRIVATE_DIRS
     ${PROJECT_BINARY_DIR}/lib/quillon ${PROJECT_BINARY_DIR}/lib/ssoClient
-    ${PROJECT_BINARY_DIR}/lib/ssoClientGss)
+    ${PROJECT_BINARY_DIR}/lib/ssoClientGss ${PROJECT_BINARY_DIR}/lib/ssoClientRuntime)
 set(CPACK_PRE_BUILD_SCRIPTS ${PROJECT_SOURCE_DIR}/packaging/debian/compressManuals.cmake)
 set(CPACK_POST_BUILD_SCRIPTS ${PROJECT_SOURCE_DIR}/packaging/debian/dropScripts.cmake)
 set(CPACK_DEBIAN_PACKAGE_CONTROL_STRICT_PERMISSION ON)
@@ -41,6 +41,7 @@ endfunction()
 ssoclient_library_package(libquillon${major} libquillon)
 ssoclient_library_package(libssoclient${major} libssoclient)
 ssoclient_library_package(libssoclient-gss${major} libssoclient_gss)
+ssoclient_library_package(libssoclient-runtime${major} libssoclient_runtime)
 
 # ssoclient_package(NAME SECTION DEPENDS DESCRIPTION): the first line of the description is the
 # summary.
@@ -73,9 +74,16 @@ ssoclient_package(libssoclient-gss${major} libs "libssoclient${major} ${same_ver
     "SAML 2.0 tokens for Kerberos tickets (library)
 Negotiates with MIT Kerberos for SsoClient: a token service then issues a
 SAML 2.0 token to whoever has a ticket.")
+ssoclient_package(libssoclient-runtime${major} libs "libssoclient${major} ${same_version}"
+    "SAML 2.0 tokens in long-running processes (library)
+Keeps good tokens for as long as a process lives: refreshes them in the
+background, bridges outages of the token service, and caches tokens that
+were exchanged for those of users.")
 string(CONCAT all_libraries "libquillon${major} ${same_version}, libssoclient${major} ${same_version}, "
     "libssoclient-gss${major} ${same_version}")
-ssoclient_package(libssoclient-dev libdevel "${all_libraries}, libboost-dev (>= 1.74)"
+set(development_libraries
+    "${all_libraries}, libssoclient-runtime${major} ${same_version}")
+ssoclient_package(libssoclient-dev libdevel "${development_libraries}, libboost-dev (>= 1.74)"
     "SAML 2.0 tokens from a WS-Trust 1.3 token service (development files)
 The headers of SsoClient and of Quillon below it, with a CMake package and
 pkg-config files.")

@@ -43,6 +43,7 @@ expect() {
 expect quillon quillon_consumer '^aW5zdGFsbGVk$'
 expect ssoclient consumer '^XMLParseException$'
 expect ssoclient-gss gss_consumer '/no/keytab'
+expect ssoclient-runtime runtime_consumer '^SsoException: nobody gives any$'
 
 printf '\nRemoved again\n'
 names=()

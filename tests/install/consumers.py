@@ -16,10 +16,12 @@ SAYS = {
         "Invalid argument : A keytab needs the principal whose key is in it\n"
         "Cannot log on as 'nobody@EXAMPLE.TEST' with the keytab '/no/keytab':"
         " Key table file '/no/keytab' not found\n",
+    "runtime_consumer": "NoTokenException\nSsoException: nobody gives any\n",
 }
 
 # The pkg-config package, and the program that shows it.
-SOURCES = {"ssoclient": "consumer", "quillon": "quillon_consumer", "ssoclient-gss": "gss_consumer"}
+SOURCES = {"ssoclient": "consumer", "quillon": "quillon_consumer", "ssoclient-gss": "gss_consumer",
+           "ssoclient-runtime": "runtime_consumer"}
 
 
 def build_with_cmake(build, *options):

@@ -44,13 +44,15 @@ class Install(unittest.TestCase):
         return re.findall(r"\(NEEDED\).*\[(.+)\]", self.read_dynamic_section(library))
 
     def test_libraries_cannot_be_unloaded(self):
-        for library in ("libquillon.so", "libssoclient.so", "libssoclient_gss.so"):
+        for library in ("libquillon.so", "libssoclient.so", "libssoclient_gss.so",
+                        "libssoclient_runtime.so"):
             with self.subTest(library=library):
                 self.assertRegex(self.read_dynamic_section(library), r"\(FLAGS_1\).*\bNODELETE\b")
 
     def test_only_the_kerberos_handler_needs_kerberos(self):
         kerberos = re.compile(r"lib(gssapi|krb5|k5crypto|com_err)")
         for library, is_needed in (("libquillon.so", False), ("libssoclient.so", False),
+                                   ("libssoclient_runtime.so", False),
                                    ("libssoclient_gss.so", True)):
             with self.subTest(library=library):
                 needed = self.get_needed(library)

@@ -42,7 +42,7 @@ class Static(unittest.TestCase):
         self.assertNotRegex(names, r"Quillon::Http::|SsoClient::CreateSecurityTokenService")
 
     def test_installed_libraries_are_static(self):
-        self.assertEqual({"libquillon.a", "libssoclient.a", "libssoclient_gss.a"},
+        self.assertEqual({"libquillon.a", "libssoclient.a", "libssoclient_gss.a", "libssoclient_runtime.a"},
                          {path.name for path in (self.prefix / "lib").glob("lib*")})
 
     def test_cmake_package(self):

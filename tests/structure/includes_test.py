@@ -60,12 +60,27 @@ class Includes(unittest.TestCase):
                      and include.resolves_under("lib"))
             and not include.target.startswith(tuple(GSS_UNITS)))
 
-    def test_core_sees_nothing_of_the_kerberos_handler(self):
+    def test_runtime_sees_only_itself_public_headers_and_boost(self):
+        paths = sources.files("lib/ssoClientRuntime", "lib/public/ssoClientRuntime")
+        self.assert_none(
+            include for include in sources.includes(paths)
+            if not is_boost_or_standard(include)
+            and not (include.is_quoted and include.resolves_under("lib/public"))
+            and not (include.is_quoted and include.target.startswith("ssoClientRuntime/")
+                     and include.resolves_under("lib")))
+
+    def test_runtime_and_kerberos_handler_do_not_know_each_other(self):
+        for own, other in (("Runtime", "Gss"), ("Gss", "Runtime")):
+            paths = sources.files(f"lib/ssoClient{own}", f"lib/public/ssoClient{own}")
+            self.assert_none(include for include in sources.includes(paths)
+                             if include.target.startswith(f"ssoClient{other}/"))
+
+    def test_core_sees_nothing_of_what_stands_on_it(self):
         paths = sources.files("lib/ssoClient", "lib/public/ssoClient", "lib/quillon",
                               "lib/public/quillon")
         self.assert_none(
             include for include in sources.includes(paths)
-            if include.target.startswith("ssoClientGss/"))
+            if include.target.startswith(("ssoClientGss/", "ssoClientRuntime/")))
 
     def test_quillon_sees_nothing_of_ssoclient(self):
         paths = sources.files("lib/quillon", "lib/public/quillon")

@@ -14,6 +14,7 @@ LISTS = pathlib.Path(__file__).resolve().parent / "symbols"
 LIBRARIES = {
     "quillon": "lib/quillon/libquillon.so",
     "ssoclient": "lib/ssoClient/libssoclient.so",
+    "ssoclient_runtime": "lib/ssoClientRuntime/libssoclient_runtime.so",
     "ssoclient_gss": "lib/ssoClientGss/libssoclient_gss.so",
 }
 

@@ -2,7 +2,8 @@
 
 #include "system/systemError.h"
 #include "threads/ProcessEnd.h"
-#include "threads/SignalBlock.h"
+
+#include "quillon/system/SignalBlock.h"
 
 #include <cerrno>
 #include <system_error>

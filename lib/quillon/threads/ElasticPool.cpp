@@ -1,10 +1,10 @@
 #include "threads/ElasticPool.h"
 
 #include "system/systemError.h"
-#include "threads/SignalBlock.h"
 
 #include "quillon/Exceptions.h"
 #include "quillon/service/Logger.h"
+#include "quillon/system/SignalBlock.h"
 
 #include <algorithm>
 #include <cxxabi.h>
