@@ -1,16 +1,16 @@
 #include "ssoClientRuntime/RefreshMachine.h"
 
+#include "VirtualEnvironment.h"
+
 #include <gtest/gtest.h>
 
 #include <chrono>
-#include <limits>
 
 using namespace SsoClient;
 using namespace std::chrono_literals;
+using Testing::AlmostOne;
 
 namespace {
-
-constexpr double AlmostOne = 1 - std::numeric_limits<double>::epsilon();
 
 double Seconds(Span span)
 {

@@ -6,6 +6,7 @@
 #include <boost/smart_ptr/make_shared.hpp>
 
 #include <deque>
+#include <limits>
 #include <map>
 #include <mutex>
 #include <optional>
@@ -14,7 +15,8 @@
 
 namespace Testing {
 
-using namespace std::chrono_literals;
+/** The largest number that chance gives. */
+inline constexpr double AlmostOne = 1 - std::numeric_limits<double>::epsilon();
 
 /**
  * Clocks that stand still until they are moved, and work that runs when the test says so, on its

@@ -1,5 +1,7 @@
 #include "ssoClientRuntime/attempts.h"
 
+#include "ScriptedService.h"
+
 #include "support/FakeSamlToken.h"
 #include "support/TestData.h"
 
@@ -16,10 +18,9 @@
 
 using namespace SsoClient;
 using namespace std::chrono_literals;
+using Testing::Token;
 
 namespace {
-
-using Token = boost::shared_ptr<const SamlToken>;
 
 template <class Error>
 std::string TryToThrow(const Error& error)
