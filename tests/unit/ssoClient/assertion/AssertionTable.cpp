@@ -50,11 +50,12 @@ AssertionRules ToRules(const Json& rules)
     return result;
 }
 
-std::vector<Row> LoadRows()
+/** Appends the rows of a folder's table. */
+void LoadRows(const std::string& folder, const Json& lines, std::vector<Row>& rows)
 {
-    std::vector<Row> rows;
-    for (const Json& line : GetTable().at("assertions")) {
+    for (const Json& line : lines) {
         Row row;
+        row.folder = folder;
         line.at("file").get_to(row.file);
         line.at("about").get_to(row.about);
         row.rules = ToRules(line.at("rules"));
@@ -66,6 +67,17 @@ std::vector<Row> LoadRows()
         }
         rows.push_back(std::move(row));
     }
+}
+
+std::vector<Row> LoadRows()
+{
+    std::vector<Row> rows;
+    LoadRows("assertions", GetTable().at("assertions"), rows);
+    const Json peers = Json::parse(ReadTestData("peers/expected.json"));
+    if (peers.at("defaults") != GetTable().at("defaults")) {
+        throw std::runtime_error("the tables are of different times or certificates");
+    }
+    LoadRows("peers", peers.at("assertions"), rows);
     return rows;
 }
 
@@ -305,7 +317,7 @@ const Certificates& GetTrusted()
 
 std::string Read(const Row& row)
 {
-    return ReadTestData("assertions/" + row.file);
+    return ReadTestData(row.folder + "/" + row.file);
 }
 
 std::string DescribeFacts(const VerifiedAssertion& assertion)

@@ -14,6 +14,7 @@ using Certificates = std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>
 /** One document. */
 struct Row
 {
+    std::string folder; ///< of the test data
     std::string file;
     std::string about;
     SsoClient::AssertionRules rules;

@@ -25,6 +25,13 @@ std::vector<Row> Select(bool accepted)
     return rows;
 }
 
+std::ptrdiff_t CountAccepted(const std::string& folder)
+{
+    const std::vector<Row> rows = Select(true);
+    return std::count_if(
+        rows.begin(), rows.end(), [&folder](const Row& row) { return row.folder == folder; });
+}
+
 /** The file's name without folder and suffix, in the letters that a test's name may have. */
 std::string NameOfRow(const testing::TestParamInfo<Row>& info)
 {
@@ -76,13 +83,15 @@ INSTANTIATE_TEST_SUITE_P(Table, RefusedAssertion, testing::ValuesIn(Select(false
 TEST(AssertionTable, NamesEveryFile)
 {
     std::size_t files = 0;
-    for (const char* folder : {"accepted", "refused"}) {
+    for (const char* folder :
+         {"assertions/accepted", "assertions/refused", "peers/accepted", "peers/refused"}) {
         const std::filesystem::directory_iterator entries(
-            std::filesystem::path(TEST_DATA_DIR "/assertions") / folder);
+            std::filesystem::path(TEST_DATA_DIR) / folder);
         files += static_cast<std::size_t>(std::distance(begin(entries), end(entries)));
     }
     EXPECT_EQ(files, GetRows().size());
-    EXPECT_GE(Select(true).size(), 60U);
+    EXPECT_GE(CountAccepted("assertions"), 60);
+    EXPECT_GE(CountAccepted("peers"), 60);
     EXPECT_EQ(Select(true).size(), Select(false).size());
 }
 
