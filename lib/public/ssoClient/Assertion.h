@@ -1,6 +1,7 @@
 #pragma once
 
 #include "quillon/crypto/Certificate.h"
+#include "quillon/crypto/PrivateKey.h"
 #include "quillon/system/DateTime.h"
 #include "quillon/xml/QName.h"
 #include "ssoClient/Export.h"
@@ -190,6 +191,11 @@ struct AssertionRules
     std::set<std::string> confirmationMethods = {BearerConfirmation, HolderOfKeyConfirmation};
     /** How long ago it may have been issued, in seconds, whatever end it gives itself. */
     boost::optional<long long> maximumAgeSec;
+    /**
+     * RSA keys that an encrypted assertion is decrypted with; each is tried, so that there may be
+     * an old and a new one. Without any an encrypted assertion is refused.
+     */
+    std::vector<Quillon::Ref<const Quillon::Crypto::PrivateKey>> decryptionKeys;
 };
 
 /** Everything that an assertion says. */
@@ -236,7 +242,10 @@ public:
     /** The first attribute of that name; null if there is none. */
     const AssertionAttribute* FindAttribute(const std::string& name) const noexcept;
 
-    /** The text as it was given. A bearer assertion is a credential: guard it. */
+    /**
+     * The text as it was given or, of an encrypted one, as it was decrypted. A bearer assertion is
+     * a credential: guard it.
+     */
     const std::string& ToXml() const noexcept { return _xml; }
 
 private:
@@ -253,14 +262,19 @@ private:
 /**
  * Verifies a SAML 2.0 assertion, then reads it, then judges it by the rules.
  *
- * Refused whatever the rules: a condition that is not known [SAML-CORE 2.5.1]; anything encrypted;
- * an assertion without an end of validity; one whose subject has no confirmation that the rules
- * accept, or several (then the rules must say which); an `xsi:type` that decides something while
- * the signature does not cover what its prefix is bound to; a comment or processing instruction
- * that cuts a value in two. What only the caller can judge is told: name identifier formats and
- * qualifiers, one-time use, delegation, proxy restrictions, addresses.
+ * An `EncryptedAssertion` [SAML-CORE 2.3.4] is decrypted before, and what was in it must be one
+ * signed assertion. Accepted: AES-128, AES-192 and AES-256 in GCM, their keys by RSA-OAEP with
+ * SHA-1, SHA-256, SHA-384 or SHA-512. Not accepted: CBC and PKCS #1 v1.5, which betray the text to
+ * who sees how decrypting fails.
  *
- * @param xml                  the assertion alone, UTF-8.
+ * Refused whatever the rules: a condition that is not known [SAML-CORE 2.5.1]; anything encrypted
+ * in the assertion; an assertion without an end of validity; one whose subject has no confirmation
+ * that the rules accept, or several (then the rules must say which); an `xsi:type` that decides
+ * something while the signature does not cover what its prefix is bound to; a comment or processing
+ * instruction that cuts a value in two. What only the caller can judge is told: name identifier
+ * formats and qualifiers, one-time use, delegation, proxy restrictions, addresses.
+ *
+ * @param xml                  the assertion alone, encrypted or not, UTF-8.
  * @param trustedCertificates  the certificates whose keys may have signed, byte for byte. Their
  *                             own validity dates are not looked at. Each may sign for any issuer.
  *
@@ -270,9 +284,12 @@ private:
  *                                             element with its line and column, the value found and
  *                                             the value expected.
  * @throws Quillon::Xml::XMLParseException     `xml` is not well-formed or exceeds a limit.
- * @throws Quillon::InvalidArgumentException   a trusted certificate is null.
+ * @throws Quillon::Crypto::CryptoException    OpenSSL does not offer what the text is encrypted by.
+ * @throws Quillon::InvalidArgumentException   a trusted certificate or a decryption key is null, or
+ *                                             such a key is not RSA.
  *
- * Thread safety: any number of threads. Cost: one parse, one hash and one public-key operation.
+ * Thread safety: any number of threads. Cost: one parse, one hash and one public-key operation; of
+ * an encrypted one twice the parsing, and a private-key operation for each key that is tried.
  */
 SSOCLIENT_API boost::shared_ptr<const VerifiedAssertion> VerifyAssertion(
     const std::string& xml,

@@ -44,6 +44,7 @@ using KeyOwner = std::unique_ptr<EVP_PKEY, OpenSslDeleter<EVP_PKEY_free>>;
 using KeyContextOwner = std::unique_ptr<EVP_PKEY_CTX, OpenSslDeleter<EVP_PKEY_CTX_free>>;
 using DigestOwner = std::unique_ptr<EVP_MD, OpenSslDeleter<EVP_MD_free>>;
 using DigestContextOwner = std::unique_ptr<EVP_MD_CTX, OpenSslDeleter<EVP_MD_CTX_free>>;
+using CipherContextOwner = std::unique_ptr<EVP_CIPHER_CTX, OpenSslDeleter<EVP_CIPHER_CTX_free>>;
 /** Frees what OpenSSL allocated as plain memory. */
 struct OpenSslMemoryDeleter
 {

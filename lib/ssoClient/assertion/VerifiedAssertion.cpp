@@ -1,6 +1,8 @@
+#include "quillon/xml/Parser.h"
 #include "ssoClient/Assertion.h"
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/assertion/assertionReading.h"
+#include "ssoClient/assertion/decryption.h"
 #include "ssoClient/assertion/judging.h"
 #include "ssoClient/wire/wireNames.h"
 #include "ssoClient/wire/xmlReading.h"
@@ -17,20 +19,17 @@ namespace Security = Quillon::Xml::Security;
 
 namespace {
 
-ElementNode& GetAssertionElement(const Quillon::Xml::Document& document)
+using Certificates = std::list<Ref<const Certificate>>;
+
+void RequireAssertion(const ElementNode& root)
 {
-    ElementNode& root = *document.GetRootElement();
-    if (root.HasQName("EncryptedAssertion", Wire::SamlNamespace)) {
-        throw ParseException("The assertion is encrypted; decrypt it first");
-    }
     if (!root.HasQName("Assertion", Wire::SamlNamespace)) {
         throw ParseException(
             "Expected element 'Assertion' of SAML 2.0, found " + GeneralReader::Describe(root));
     }
-    return root;
 }
 
-void Verify(const Security::Signature& signature, const std::list<Ref<const Certificate>>& trusted)
+void Verify(const Security::Signature& signature, const Certificates& trusted)
 {
     const auto resolver = Security::CreateTrustSetKeyResolver(trusted);
     bool verified = false;
@@ -77,13 +76,43 @@ class AssertionVerifier
 {
 public:
     static boost::shared_ptr<const VerifiedAssertion> Verify(
-        const std::string& xml,
-        const std::list<Ref<const Certificate>>& trusted,
-        const AssertionRules& rules)
+        const std::string& xml, const Certificates& trusted, const AssertionRules& rules)
     {
+        GeneralReader::RequireDecryptionKeys(rules.decryptionKeys);
         Ref<Quillon::Xml::Document> document;
         ParseXML(xml, document);
-        ElementNode& root = GetAssertionElement(*document);
+        ElementNode& root = *document->GetRootElement();
+        if (root.HasQName("EncryptedAssertion", Wire::SamlNamespace)) {
+            const Quillon::Wiped text = GeneralReader::DecryptAssertion(root, rules.decryptionKeys);
+            return VerifyDecrypted(text.Get(), trusted, rules);
+        }
+        return Verify(root, xml, trusted, rules);
+    }
+
+private:
+    /** Lines and columns are those of a text that the caller does not see: the failure says so. */
+    static boost::shared_ptr<const VerifiedAssertion> VerifyDecrypted(
+        const std::string& xml, const Certificates& trusted, const AssertionRules& rules)
+    {
+        const std::string where = "In what was encrypted: ";
+        try {
+            Ref<Quillon::Xml::Document> document;
+            ParseXML(xml, document);
+            return Verify(*document->GetRootElement(), xml, trusted, rules);
+        } catch (const Quillon::Xml::XMLParseException& error) {
+            throw Quillon::Xml::XMLParseException(where + error.what());
+        } catch (const ParseException& error) {
+            throw ParseException(where + error.what());
+        }
+    }
+
+    static boost::shared_ptr<const VerifiedAssertion> Verify(
+        ElementNode& root,
+        const std::string& xml,
+        const Certificates& trusted,
+        const AssertionRules& rules)
+    {
+        RequireAssertion(root);
         const Ref<Security::Signature> signature = GeneralReader::FindSignature(root);
         SsoClient::Verify(*signature, trusted);
 

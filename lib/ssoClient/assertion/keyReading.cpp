@@ -1,6 +1,5 @@
 #include "ssoClient/assertion/keyReading.h"
 
-#include "quillon/StringUtil.h"
 #include "quillon/crypto/KeyValue.h"
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/wire/wireNames.h"
@@ -35,29 +34,6 @@ bool IsDs(const ElementNode& element, std::string_view localName)
     return element.HasQName(localName, Wire::DsNamespace);
 }
 
-const ElementNode& TakeNamed(
-    ElementCursor& cursor, std::string_view localName, const char* namespaceUri)
-{
-    const ElementNode* element = cursor.Get();
-    if (element == nullptr || !element->HasQName(localName, namespaceUri)) {
-        throw ParseException(
-            "Expected element '" + std::string(localName) + "', found "
-            + (element == nullptr ? "none" : Describe(*element)));
-    }
-    return cursor.TakeAny();
-}
-
-std::vector<unsigned char> ReadBase64(const ElementNode& element)
-{
-    std::vector<unsigned char> bytes;
-    try {
-        Quillon::StringUtil::Base64Decode(GetText(element), bytes);
-    } catch (const Quillon::Base64FormatException& error) {
-        throw ParseException(Describe(element) + " is not Base64: " + error.what());
-    }
-    return bytes;
-}
-
 Ref<const Certificate> ReadCertificate(const ElementNode& element)
 {
     const std::vector<unsigned char> bytes = ReadBase64(element);
@@ -71,8 +47,8 @@ Ref<const Certificate> ReadCertificate(const ElementNode& element)
 Key ReadRsaKeyValue(const ElementNode& element)
 {
     ElementCursor child(element);
-    const auto modulus = ReadBase64(TakeNamed(child, "Modulus", Wire::DsNamespace));
-    const auto exponent = ReadBase64(TakeNamed(child, "Exponent", Wire::DsNamespace));
+    const auto modulus = ReadBase64(child.TakeNamed("Modulus", Wire::DsNamespace));
+    const auto exponent = ReadBase64(child.TakeNamed("Exponent", Wire::DsNamespace));
     child.RequireEnd();
     return Quillon::Crypto::CreateRsaPublicKey(modulus, exponent);
 }
@@ -80,8 +56,8 @@ Key ReadRsaKeyValue(const ElementNode& element)
 Key ReadEcKeyValue(const ElementNode& element)
 {
     ElementCursor child(element);
-    const ElementNode& curve = TakeNamed(child, "NamedCurve", Dsig11Namespace);
-    const auto point = ReadBase64(TakeNamed(child, "PublicKey", Dsig11Namespace));
+    const ElementNode& curve = child.TakeNamed("NamedCurve", Dsig11Namespace);
+    const auto point = ReadBase64(child.TakeNamed("PublicKey", Dsig11Namespace));
     child.RequireEnd();
     const std::string uri = GetRequired(curve, "URI");
     const auto* found = std::find_if(
@@ -115,8 +91,8 @@ CertificateReference ReadIssuerSerial(const ElementNode& element)
 {
     ElementCursor child(element);
     CertificateReference reference;
-    reference.issuerName = GetUri(TakeNamed(child, "X509IssuerName", Wire::DsNamespace));
-    reference.serialNumber = GetUri(TakeNamed(child, "X509SerialNumber", Wire::DsNamespace));
+    reference.issuerName = GetUri(child.TakeNamed("X509IssuerName", Wire::DsNamespace));
+    reference.serialNumber = GetUri(child.TakeNamed("X509SerialNumber", Wire::DsNamespace));
     child.RequireEnd();
     return reference;
 }

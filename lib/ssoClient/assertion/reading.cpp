@@ -1,5 +1,6 @@
 #include "ssoClient/assertion/reading.h"
 
+#include "quillon/StringUtil.h"
 #include "quillon/xml/security/Identifiers.h"
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/wire/wireNames.h"
@@ -113,13 +114,17 @@ bool ElementCursor::IsAt(std::string_view localName) const noexcept
 
 const ElementNode& ElementCursor::Take(std::string_view localName)
 {
-    const ElementNode* element = TakeIf(localName);
-    if (element == nullptr) {
+    return TakeNamed(localName, Wire::SamlNamespace);
+}
+
+const ElementNode& ElementCursor::TakeNamed(std::string_view localName, const char* namespaceUri)
+{
+    if (_current == nullptr || !_current->HasQName(localName, namespaceUri)) {
         throw ParseException(
             "Expected element '" + std::string(localName) + "' in " + Describe(_parent) + ", found "
             + (_current == nullptr ? "its end" : Describe(*_current)));
     }
-    return *element;
+    return TakeAny();
 }
 
 const ElementNode* ElementCursor::TakeIf(std::string_view localName)
@@ -318,6 +323,17 @@ std::string GetUri(const ElementNode& element)
         throw ParseException(Describe(element) + " has no value");
     }
     return std::string(uri);
+}
+
+std::vector<unsigned char> ReadBase64(const ElementNode& element)
+{
+    std::vector<unsigned char> bytes;
+    try {
+        Quillon::StringUtil::Base64Decode(GetText(element), bytes);
+    } catch (const Quillon::Base64FormatException& error) {
+        throw ParseException(Describe(element) + " is not Base64: " + error.what());
+    }
+    return bytes;
 }
 
 AssertionXml ReadXml(const ElementNode& element)

@@ -11,6 +11,7 @@
 #include <initializer_list>
 #include <string>
 #include <string_view>
+#include <vector>
 
 /**
  * How the elements of a verified assertion are read: in the order of the schema, nothing passed
@@ -53,6 +54,9 @@ public:
 
     /** The same, or null if another one is next. */
     const ElementNode* TakeIf(std::string_view localName);
+
+    /** The next child, which must be an element of that name and namespace. */
+    const ElementNode& TakeNamed(std::string_view localName, const char* namespaceUri);
 
     /** The next child, whatever it is, which must be there. */
     const ElementNode& TakeAny();
@@ -116,6 +120,9 @@ std::string GetText(const ElementNode& element);
 
 /** The same without the blanks around it, for URIs; must not be empty. */
 std::string GetUri(const ElementNode& element);
+
+/** The octets that the element's text stands for. */
+std::vector<unsigned char> ReadBase64(const ElementNode& element);
 
 /** The element and all that is in it. Text that a comment cuts is one text again. */
 AssertionXml ReadXml(const ElementNode& element);

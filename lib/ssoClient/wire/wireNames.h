@@ -75,6 +75,10 @@ inline constexpr char DelegationNamespace[] = "urn:oasis:names:tc:SAML:2.0:condi
 inline constexpr char BearerMethod[] = "urn:oasis:names:tc:SAML:2.0:cm:bearer";
 inline constexpr char HolderOfKeyMethod[] = "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key";
 
+// XML Encryption 1.0 and what 1.1 adds.
+inline constexpr char XencNamespace[] = "http://www.w3.org/2001/04/xmlenc#";
+inline constexpr char Xenc11Namespace[] = "http://www.w3.org/2009/xmlenc11#";
+
 // XML Signature and XML Schema.
 using Quillon::Xml::Security::DsNamespace;
 inline constexpr char XsNamespace[] = "http://www.w3.org/2001/XMLSchema";

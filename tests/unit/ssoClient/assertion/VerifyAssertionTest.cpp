@@ -56,7 +56,7 @@ TEST(VerifyAssertion, RefusesOtherDocuments)
     EXPECT_EQ(
         ErrorOf<ParseException>(
             std::string("<s:EncryptedAssertion xmlns:s='") + SamlNamespace + "'/>"),
-        "The assertion is encrypted; decrypt it first");
+        "The assertion is encrypted, and the rules have no key to decrypt it");
     EXPECT_NE(ErrorOf<Quillon::Xml::XMLParseException>("<a>"), "accepted");
 }
 
