@@ -26,7 +26,7 @@ ExitCode AcquireCertificate(
     const std::string& presentedFile = options.service.dialect.GetPresentedFile();
     const auto presented = presentedFile.empty()
                                ? boost::shared_ptr<const SsoClient::SamlToken>()
-                               : ReadToken(presentedFile, trusted, options.service.dialect);
+                               : ReadToken(presentedFile, trusted, options.service);
     output.Show(options.service.Await(presentation, [&] {
         return presented ? service->AcquireTokenByToken(*presented, options.token.spec)
                          : service->AcquireTokenByCertificate(options.token.spec);

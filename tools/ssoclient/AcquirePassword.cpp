@@ -33,7 +33,7 @@ TokenPtr AcquireForAnother(
     const auto service = options.service.CreateService(
         trusted, options.identity.Read(), SsoClient::PasswordCredentials(options.user, password));
     const TokenPtr presented =
-        ReadToken(options.service.dialect.GetPresentedFile(), trusted, options.service.dialect);
+        ReadToken(options.service.dialect.GetPresentedFile(), trusted, options.service);
     return options.service.Await(
         presentation, [&] { return service->AcquireTokenByToken(*presented, options.token.spec); });
 }

@@ -23,7 +23,7 @@ ExitCode AcquireToken(const AcquireTokenOptions& options, const Presentation& pr
     const CertificateList trusted = ReadCertificates(options.service.trustFiles);
     const auto service = options.service.CreateService(trusted, options.identity.Read());
     TokenOutput output(options.output, presentation);
-    const auto presented = ReadToken(options.tokenFile, trusted, options.service.dialect);
+    const auto presented = ReadToken(options.tokenFile, trusted, options.service);
     output.Show(options.service.Await(presentation, [&] {
         return service->AcquireTokenByToken(*presented, options.token.spec);
     }));

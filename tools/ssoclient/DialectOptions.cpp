@@ -101,15 +101,18 @@ void ReadingOptions::AddTo(const Command& owner)
             "domain if --domain is given; may repeat")
         .Check(CheckNotEmptyText)
         .ValueName("NAME");
+    decryptionKeys.AddTo(command);
 }
 
 bool ReadingOptions::IsGiven() const
 {
-    return general || domain || !subjects.empty() || !groupAttributes.empty();
+    return general || domain || !subjects.empty() || !groupAttributes.empty()
+           || decryptionKeys.IsGiven();
 }
 
 void ReadingOptions::ApplyTo(SsoClient::TokenReading& reading) const
 {
+    reading.rules.decryptionKeys = decryptionKeys.Get();
     SsoClient::SubjectMapping& mapping = reading.mapping;
     if (!subjects.empty()) {
         mapping.subjects.clear();

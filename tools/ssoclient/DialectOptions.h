@@ -1,6 +1,7 @@
 #pragma once
 
 #include "CommandLine.h"
+#include "DecryptionKeys.h"
 
 #include "ssoClient/ServiceDialect.h"
 #include "ssoClient/TokenSpec.h"
@@ -18,6 +19,7 @@ struct ReadingOptions
     std::vector<std::string> subjects;
     std::optional<std::string> domain;
     std::vector<std::string> groupAttributes;
+    DecryptionKeys decryptionKeys;
 
     void AddTo(const Command& command);
 

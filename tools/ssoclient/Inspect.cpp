@@ -4,6 +4,7 @@
 #include "ExitCode.h"
 #include "Explanation.h"
 #include "Files.h"
+#include "GeneralReading.h"
 #include "Profile.h"
 #include "TokenOutput.h"
 #include "TokenPage.h"
@@ -24,6 +25,7 @@ struct InspectOptions
     std::string file;
     std::vector<std::string> trustFiles;
     std::string pageFile; ///< for a page of HTML; empty for none
+    bool verbose = false;
     long long clockToleranceSec = SsoClient::DefaultClockToleranceSec;
     ReadingOptions reading;
     std::optional<std::string> audience;
@@ -52,6 +54,7 @@ SsoClient::AssertionRules MakeRules(const InspectOptions& options)
 {
     SsoClient::AssertionRules rules;
     rules.clockToleranceSec = options.clockToleranceSec;
+    rules.decryptionKeys = options.reading.decryptionKeys.Get();
     if (options.audience) {
         rules.audience = *options.audience;
     }
@@ -59,6 +62,19 @@ SsoClient::AssertionRules MakeRules(const InspectOptions& options)
         rules.recipient = *options.recipient;
     }
     return rules;
+}
+
+boost::shared_ptr<const SsoClient::SamlToken> ReadDefaultToken(
+    const std::string& text, const CertificateList& trusted, const InspectOptions& options)
+{
+    try {
+        return SsoClient::CreateSamlToken(text, trusted, options.clockToleranceSec);
+    } catch (const Quillon::Exception&) {
+        if (options.verbose) {
+            NoteGeneralReading(text, trusted, options.clockToleranceSec);
+        }
+        throw;
+    }
 }
 
 /** Shows every fact, or the token that is made of them if it is said who its subject is. */
@@ -95,7 +111,7 @@ ExitCode Inspect(const InspectOptions& options, const Presentation& presentation
     }
     const CertificateList trusted = ReadCertificates(options.trustFiles);
     text = ReadFile(options.file);
-    const auto token = SsoClient::CreateSamlToken(text, trusted, options.clockToleranceSec);
+    const auto token = ReadDefaultToken(text, trusted, options);
     // Before anything is shown: the token may expire in between.
     const bool needsSigner = page || presentation.ShowsExplanations();
     const auto signer =
@@ -159,6 +175,10 @@ void AddInspectCommand(const Command& parent, Invocation& invocation)
         .Check(CheckNotEmpty)
         .ValueName("FILE");
     AddGeneralOptions(command, *options);
+    command.AddFlag(
+        "--verbose",
+        options->verbose,
+        "Say of a token that is refused whether it would be read with --general");
     invocation.presentation.AddTo(command);
     command.ShowExample("ssoclient inspect token.xml --trust sts.pem");
     command.WhenNamed([options, &invocation] {

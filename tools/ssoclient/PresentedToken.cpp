@@ -2,8 +2,26 @@
 
 #include "Arguments.h"
 #include "Files.h"
+#include "GeneralReading.h"
 
 #include "ssoClient/CreateSamlToken.h"
+
+namespace {
+
+boost::shared_ptr<const SsoClient::SamlToken> ReadDefaultToken(
+    const std::string& text, const CertificateList& trusted, bool verbose)
+{
+    try {
+        return SsoClient::CreateSamlToken(text, trusted);
+    } catch (const Quillon::Exception&) {
+        if (verbose) {
+            NoteGeneralReading(text, trusted, SsoClient::DefaultClockToleranceSec);
+        }
+        throw;
+    }
+}
+
+} // namespace
 
 void AddTokenTo(const Command& command, std::string& tokenFile)
 {
@@ -14,13 +32,14 @@ void AddTokenTo(const Command& command, std::string& tokenFile)
 }
 
 boost::shared_ptr<const SsoClient::SamlToken> ReadToken(
-    const std::string& tokenFile, const CertificateList& trusted, const DialectOptions& dialect)
+    const std::string& tokenFile, const CertificateList& trusted, const ServiceOptions& service)
 {
-    const auto spoken = dialect.Make();
+    const auto spoken = service.dialect.Make();
+    const std::string text = ReadFile(tokenFile);
     if (!spoken || !spoken->reading) {
-        return SsoClient::CreateSamlToken(ReadFile(tokenFile), trusted);
+        return ReadDefaultToken(text, trusted, service.verbose);
     }
     const SsoClient::TokenReading& reading = *spoken->reading;
     return SsoClient::CreateSamlToken(
-        SsoClient::VerifyAssertion(ReadFile(tokenFile), trusted, reading.rules), reading.mapping);
+        SsoClient::VerifyAssertion(text, trusted, reading.rules), reading.mapping);
 }

@@ -1,7 +1,7 @@
 #pragma once
 
 #include "CommandLine.h"
-#include "DialectOptions.h"
+#include "ServiceOptions.h"
 #include "Trust.h"
 
 #include "ssoClient/SamlToken.h"
@@ -16,7 +16,7 @@ void AddTokenTo(const Command& command, std::string& tokenFile);
 /**
  * Reads a token that is to be presented to the service, and verifies it; `-` is standard input.
  *
- * @param dialect  says how tokens are read.
+ * @param service  says how tokens are read, and whether more is said of one that is refused.
  */
 boost::shared_ptr<const SsoClient::SamlToken> ReadToken(
-    const std::string& tokenFile, const CertificateList& trusted, const DialectOptions& dialect);
+    const std::string& tokenFile, const CertificateList& trusted, const ServiceOptions& service);

@@ -23,7 +23,7 @@ ExitCode Renew(const RenewOptions& options, const Presentation& presentation)
     const CertificateList trusted = ReadCertificates(options.service.trustFiles);
     const auto service = options.service.CreateService(trusted, options.identity.Read());
     TokenOutput output(options.output, presentation);
-    const auto presented = ReadToken(options.tokenFile, trusted, options.service.dialect);
+    const auto presented = ReadToken(options.tokenFile, trusted, options.service);
     output.Show(options.service.Await(
         presentation, [&] { return service->RenewToken(*presented, options.lifetimeSec); }));
     return ExitCode::DONE;

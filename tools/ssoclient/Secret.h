@@ -15,6 +15,10 @@ struct SecretKind
 inline constexpr SecretKind Password = {"password", "Password: ", "--password-file"};
 inline constexpr SecretKind KeyPassphrase = {
     "key passphrase", "Key passphrase: ", "--key-passphrase-file"};
+inline constexpr SecretKind DecryptionKeyPassphrase = {
+    "passphrase of the decryption key",
+    "Passphrase of the decryption key: ",
+    "--decrypt-key-passphrase-file"};
 
 /**
  * Gets a secret, which may be any octets: the first line of the file, of standard input for `-`, or

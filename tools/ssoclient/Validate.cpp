@@ -28,7 +28,7 @@ ExitCode Validate(const ValidateOptions& options, const Presentation& presentati
     RequireUseOfKey(options);
     const CertificateList trusted = ReadCertificates(options.service.trustFiles);
     const auto service = options.service.CreateService(trusted, options.identity.Read());
-    const auto token = ReadToken(options.tokenFile, trusted, options.service.dialect);
+    const auto token = ReadToken(options.tokenFile, trusted, options.service);
     const bool isValid =
         options.service.Await(presentation, [&] { return service->ValidateSubject(*token); });
     ShowValidity(isValid, presentation);

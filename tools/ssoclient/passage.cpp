@@ -8,6 +8,9 @@ namespace {
 /** What is shown at each side of the place. */
 constexpr std::size_t MaxSideBytes = 40;
 
+/** Begins a message about a text that the file does not show. */
+constexpr char HiddenText[] = "In what was encrypted: ";
+
 struct Place
 {
     std::size_t line = 0; ///< 1 is the first; 0 if none is named
@@ -38,6 +41,9 @@ std::size_t FindLine(const std::string& text, std::size_t line)
 
 std::string FindPassage(const std::string& message, const std::string& text)
 {
+    if (message.find(HiddenText) != std::string::npos) {
+        return "";
+    }
     const Place place = FindPlace(message.substr(0, MaxSideBytes * MaxSideBytes));
     const std::size_t begin = place.line == 0 ? text.size() : FindLine(text, place.line);
     if (begin >= text.size()) {

@@ -103,4 +103,11 @@ void LogFault(const std::string& code, const std::string& text)
     }
 }
 
+void LogGeneralToken(const std::string& nameFormat)
+{
+    LogLine(MessageFormatter::ASPrint(
+        "the token would be read as a general assertion; the Format of its NameID is `%1'",
+        Shorten(nameFormat)));
+}
+
 } // namespace SsoClient

@@ -19,4 +19,11 @@ void LogExchange(const Quillon::Http::ExchangeFacts& facts);
 /** Writes the code and the text of a SOAP fault, cut where they are long. */
 void LogFault(const std::string& code, const std::string& text);
 
+/**
+ * Writes that a token which is refused would be read as a general assertion.
+ *
+ * @param nameFormat  of its subject's name identifier; empty if there is none.
+ */
+void LogGeneralToken(const std::string& nameFormat);
+
 } // namespace SsoClient

@@ -1,11 +1,19 @@
 """`ssoclient inspect --general` on assertions of many producers, which other tools made."""
 
 import json
+import sys
+import time
 import unittest
 
-from programs import DATA, DONE, REFUSED, USAGE, ProgramTest, ssoclient
+from programs import DATA, DONE, REFUSED, USAGE, ProgramTest, run, ssoclient
+from scripted import ScriptedTest
 
 ASSERTIONS = DATA / "assertions"
+ENCRYPTED = DATA / "encrypted"
+sys.path.append(str(ASSERTIONS))
+
+from assertiongen import assertion, names  # noqa: E402
+
 KEYS = ("sts", "sts-second", "sts-p256", "sts-p384", "sts-p521")
 TRUST = ["--trust", *(DATA / "keys" / f"{key}-cert.pem" for key in KEYS)]
 # The assertions are of other years; this tolerance takes the clock out of the test.
@@ -114,6 +122,156 @@ class General(ProgramTest):
             with self.subTest(file=name):
                 result = inspect(name, "--general")
                 self.assertEqual((REFUSED, ""), (result.code, result.out))
+
+
+def key(name):
+    return DATA / "keys" / f"{name}-key.pem"
+
+
+class Decrypting(ProgramTest):
+    """`--decrypt-key`, with what other tools have encrypted for the key `client`."""
+
+    def decrypt(self, name, *options):
+        return ssoclient("inspect", ENCRYPTED / name, *TRUST, *ANY_TIME, *options)
+
+    def test_the_facts_are_those_of_what_was_encrypted(self):
+        plain = inspect("accepted/adfs-rsa.xml", "--general")
+        for options in (("--general", "--decrypt-key", key("client")),
+                        ("--decrypt-key", key("client")),
+                        ("--decrypt-key", key("sts-second"), "--decrypt-key", key("client"))):
+            with self.subTest(options=options):
+                result = self.decrypt("accepted/aes256-gcm.xml", *options)
+                self.assertEqual((DONE, ""), (result.code, result.err))
+                self.assertEqual(plain.out, result.out)
+
+    def test_subject_makes_it_a_token(self):
+        result = self.decrypt("accepted/aes256-gcm.xml", "--decrypt-key", key("client"),
+                              "--subject", "upn")
+        self.assertIn("subject={Name: alice; Domain:example.com}", result.out)
+
+    def test_without_the_key_it_is_refused(self):
+        self.assert_fails(
+            self.decrypt("accepted/aes256-gcm.xml", "--general"), REFUSED,
+            "ParseException",
+            "The assertion is encrypted, and the rules have no key to decrypt it")
+        self.assert_fails(
+            self.decrypt("accepted/aes256-gcm.xml", "--decrypt-key", key("foreign")), REFUSED,
+            "ParseException",
+            "The assertion cannot be decrypted with the keys of the rules")
+
+    def test_a_key_may_have_a_passphrase(self):
+        locked = self.folder / "locked.key"
+        run("openssl", "pkcs8", "-topk8", "-in", key("client"), "-out", locked, "-passout",
+            "pass:right")
+        options = ["accepted/aes256-gcm.xml", "--decrypt-key", locked,
+                   "--decrypt-key-passphrase-file"]
+        right = self.decrypt(*options, self.write("right", "right\n"))
+        self.assertEqual((DONE, ""), (right.code, right.err))
+        wrong = self.decrypt(*options, self.write("wrong", "wrong\n"))
+        self.assertEqual(USAGE, wrong.code)
+        self.assertIn("the passphrase is wrong", wrong.err)
+
+    def test_only_rsa_keys_decrypt(self):
+        self.assert_fails(
+            self.decrypt("accepted/aes256-gcm.xml", "--decrypt-key", key("sts-p256")), USAGE,
+            "UsageError",
+            "assertions are decrypted with an RSA key, not with one of type EC prime256v1")
+
+    def test_a_key_that_is_not_there_is_misuse(self):
+        result = self.decrypt("accepted/aes256-gcm.xml", "--decrypt-key", self.folder / "none")
+        self.assertEqual(USAGE, result.code)
+        self.assertIn("none", result.err)
+
+    def test_no_passage_of_the_file_is_shown_for_what_was_encrypted_in_it(self):
+        inside = self.decrypt("refused/unsigned-inside.xml", "--decrypt-key", key("client"),
+                              "--explain")
+        self.assertIn("In what was encrypted: 'Assertion' at 1,1 is not signed", inside.err)
+        self.assertNotIn("passage:", inside.err)
+        outside = self.decrypt("refused/no-key.xml", "--decrypt-key", key("client"), "--explain")
+        self.assertIn("passage:", outside.err)
+
+
+def live(**changes):
+    """An assertion of now, in a form that only the general reader takes."""
+    def stamp(seconds):
+        return time.strftime("%Y-%m-%dT%H:%M:%SZ", time.gmtime(time.time() + seconds))
+    now = {"instant": stamp(-60), "confirmations": [{"method": names.BEARER, "end": stamp(3600)}],
+           "conditions": {"start": stamp(-60), "end": stamp(3600), "audiences": []},
+           "subject": {"value": "alice@example.com", "format": names.EMAIL}}
+    return assertion.write(assertion.assertion(**{**now, **changes}))
+
+
+class Verbose(ScriptedTest):
+    """What is said of a token that `--general` would read, and not of any other."""
+
+    FORMAT = "; the Format of its NameID is "
+    NOTE = f"ssoclient: the token would be read with --general{FORMAT}{names.EMAIL}\n"
+    LINE = ("SsoClient.Exchange[64]: the token would be read as a general assertion"
+            f"{FORMAT}`{names.EMAIL}'\n")
+
+    def setUp(self):
+        super().setUp()
+        self.token = self.write("token.xml", live())
+
+    def reply(self, token):
+        self.service.say(
+            '<s:Envelope xmlns:s="http://schemas.xmlsoap.org/soap/envelope/" '
+            'xmlns:t="http://docs.oasis-open.org/ws-sx/ws-trust/200512"><s:Body>'
+            "<t:RequestSecurityTokenResponseCollection><t:RequestSecurityTokenResponse>"
+            f"<t:RequestedSecurityToken>{token}</t:RequestedSecurityToken>"
+            "</t:RequestSecurityTokenResponse></t:RequestSecurityTokenResponseCollection>"
+            "</s:Body></s:Envelope>", status=200)
+
+    def inspect(self, token, *options):
+        return ssoclient("inspect", token, *TRUST, *options)
+
+    def present(self, token, *options):
+        return ssoclient("validate", "--url", self.service.url, *TRUST, "--token", token, *options)
+
+    def test_a_file(self):
+        result = self.inspect(self.token, "--verbose")
+        self.assertEqual(REFUSED, result.code)
+        self.assertTrue(result.err.startswith(self.NOTE), result.err)
+        self.assertEqual(2, result.err.count("\n"))
+        self.assertEqual(result.err, self.NOTE + self.inspect(self.token).err)
+
+    def test_a_name_without_format(self):
+        for subject, told in (({"value": "alice"}, "its NameID has no Format"),
+                              (None, "it has no NameID")):
+            token = self.write("plain.xml", live(subject=subject))
+            self.assertIn(f"would be read with --general; {told}\n",
+                          self.inspect(token, "--verbose").err)
+
+    def test_a_presented_token(self):
+        result = self.present(self.token, "--verbose")
+        self.assertEqual(REFUSED, result.code)
+        self.assertIn(self.NOTE, result.err)
+        self.assertEqual(1, self.present(self.token).err.count("\n"))
+
+    def test_a_token_of_a_reply(self):
+        self.reply(self.token.read_text("utf-8"))
+        result = self.acquire("--verbose")
+        self.assertEqual(REFUSED, result.code)
+        self.assertIn(self.LINE, result.err)
+        self.assertEqual(1, self.acquire().err.count("\n"))
+
+    def test_nothing_is_said_of_a_token_that_is_refused_anyway(self):
+        for change in ({"sign": {"key": "foreign", "key_info": ["foreign"]}}, {"version": "1.1"}):
+            with self.subTest(change=change):
+                token = self.write("refused.xml", live(**change))
+                self.reply(token.read_text("utf-8"))
+                for result in (self.inspect(token, "--verbose"), self.present(token, "--verbose"),
+                               self.acquire("--verbose")):
+                    self.assertEqual(REFUSED, result.code)
+                    self.assertNotIn("would be read", result.err)
+
+    def test_nothing_is_said_of_a_token_that_is_read(self):
+        for options in (("--general",), ("--general", "--verbose")):
+            result = self.inspect(self.token, *options)
+            self.assertEqual((DONE, ""), (result.code, result.err))
+        self.reply(self.token.read_text("utf-8"))
+        result = self.acquire("--verbose", "--subject", "email", "--domain", "d")
+        self.assertNotIn("would be read", result.err)
 
 
 if __name__ == "__main__":

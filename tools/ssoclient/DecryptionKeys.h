@@ -1,0 +1,32 @@
+#pragma once
+
+#include "CommandLine.h"
+
+#include "quillon/crypto/PrivateKey.h"
+
+#include <optional>
+#include <string>
+#include <vector>
+
+/** The private keys that encrypted assertions are decrypted with. */
+class DecryptionKeys
+{
+public:
+    using Keys = std::vector<Quillon::Ref<const Quillon::Crypto::PrivateKey>>;
+
+    void AddTo(const Command& command);
+
+    bool IsGiven() const { return !_names.empty(); }
+
+    /**
+     * The keys, which are read once, so that a passphrase is asked for once.
+     *
+     * @throws UsageError  one cannot be read, or is no RSA key.
+     */
+    const Keys& Get() const;
+
+private:
+    std::vector<std::string> _names;
+    std::string _passphraseFile;
+    mutable std::optional<Keys> _keys;
+};
