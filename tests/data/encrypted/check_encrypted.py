@@ -8,7 +8,7 @@ from io import BytesIO
 from lxml import etree
 
 from encryptedgen import commands
-from make_encrypted import ASSERTIONS, HERE
+from make_encrypted import ASSERTIONS, HERE, PEERS
 
 
 def canonical(octets):
@@ -24,7 +24,8 @@ def main():
     for row in rows:
         text = commands.decrypt(HERE / row["file"], row["keys"][-1])
         opened += text is not None
-        plain = (ASSERTIONS / row["plain"]).read_bytes()
+        folder = PEERS if row["maker"] == "opensaml" else ASSERTIONS
+        plain = (folder / row["plain"]).read_bytes()
         if text is not None and canonical(text) != canonical(plain):
             wrong.append(row["file"])
     print(f"{opened} of {len(rows)} opened, {len(wrong)} wrong: {wrong}")

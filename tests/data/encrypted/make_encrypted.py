@@ -1,5 +1,11 @@
 #!/usr/bin/python3
-"""Makes the encrypted assertions, each with hostile neighbours, and what must come of them."""
+"""Makes the encrypted assertions, each with hostile neighbours, and what must come of them.
+
+    make_encrypted.py [JARS]
+
+JARS is a folder with the jars that ../../interop/cxf lists; without it, what OpenSAML has encrypted
+is kept.
+"""
 
 import inspect
 import json
@@ -10,6 +16,7 @@ from encryptedgen import commands, document, names, rows
 
 HERE = Path(__file__).resolve().parent
 ASSERTIONS = HERE.parent / "assertions"
+PEERS = HERE.parent / "peers"
 sys.path.append(str(HERE.parent))
 
 from kept_documents import KeptDocuments  # noqa: E402
@@ -29,8 +36,10 @@ def describe(spec):
 class Maker:
     def __init__(self):
         self._documents = KeptDocuments(HERE, "encrypted")
-        table = json.loads((ASSERTIONS / "expected.json").read_text("utf-8"))
-        self._rules = {row["file"]: row["rules"] for row in table["assertions"]}
+        self._rules = {}
+        for folder in (ASSERTIONS, PEERS):
+            table = json.loads((folder / "expected.json").read_text("utf-8"))
+            self._rules |= {row["file"]: row["rules"] for row in table["assertions"]}
 
     def add_row(self, row):
         self._add_written("accepted", row["name"], row["about"], row, row["spec"])
@@ -62,11 +71,26 @@ class Maker:
             about="what xmlsec1 writes", maker="xmlsec1", section="XMLENC11 4.1", plain=plain,
             rules=self._rules[plain], keys=["client"], **outcome)
 
+    def add_opensaml(self, name, plain, neighbour, text, jars, how, **change):
+        """By OpenSAML, and a neighbour by it that differs in `change`."""
+        self._add_opensaml(f"accepted/opensaml-{name}.xml", plain, jars, how)
+        self._add_opensaml(f"refused/opensaml-{neighbour}.xml", plain, jars, {**how, **change},
+                           refusal={"class": rows.PARSE, "contains": text})
+
+    def _add_opensaml(self, file, plain, jars, how, **outcome):
+        plain = plain_file(plain)
+        self._documents.add(
+            file, repr(sorted(how.items())) + (PEERS / plain).read_text("utf-8"),
+            lambda: commands.encrypt_with_opensaml(PEERS / plain, jars, **how),
+            about="what OpenSAML writes", maker="opensaml", section="SAML-CORE 2.3.4", plain=plain,
+            rules=self._rules[plain], keys=["client"], **outcome)
+
     def finish(self):
         self._documents.finish()
 
 
 def main():
+    jars = sys.argv[1] if len(sys.argv) > 1 else None
     maker = Maker()
     for row in rows.rows():
         maker.add_row(row)
@@ -75,6 +99,20 @@ def main():
     maker.add_commanded(192, "simplesamlphp-pss", "for-somebody-else", rows.CLOSED, to="foreign")
     maker.add_commanded(256, "opensaml-ec", "rsa-1-5", "is not accepted, expected RSA-OAEP",
                         method=names.RSA_1_5)
+    inside = {"content": names.gcm(256), "method": names.OAEP_MGF1P, "place": "INLINE"}
+    maker.add_opensaml("inside", "opensaml-adfs-rsa", "cbc", "CBC lets others decrypt it", jars,
+                       inside, content=names.cbc(256))
+    maker.add_opensaml("beside", "opensaml-shibboleth-ec", "for-somebody-else", rows.CLOSED, jars,
+                       {**inside, "content": names.gcm(128), "place": "PEER"}, to=("foreign",))
+    maker.add_opensaml(
+        "for-several", "opensaml-okta-pss", "for-several-others", rows.CLOSED, jars,
+        {"content": names.gcm(256), "method": names.OAEP, "digest": names.SHA256,
+         "mask": names.mgf("sha256"), "place": "PEER", "to": ("foreign", "client")},
+        to=("foreign", "sts-second"))
+    maker.add_opensaml("oaep-sha512", "opensaml-cxf-holder-of-key-rsa", "rsa-1-5",
+                       "is not accepted, expected RSA-OAEP", jars,
+                       {**inside, "method": names.OAEP, "digest": names.SHA512},
+                       method=names.RSA_1_5, digest="-")
     maker.finish()
 
 

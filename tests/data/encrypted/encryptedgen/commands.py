@@ -1,4 +1,4 @@
-"""Documents that xmlsec1 encrypts by its own code, from a template."""
+"""Documents that other programs encrypt by their own code: xmlsec1 from a template, and OpenSAML."""
 
 import re
 import subprocess
@@ -26,6 +26,17 @@ def encrypt(file, content, bits, method=names.OAEP_MGF1P, to="client"):
             check=True, capture_output=True, text=True).stdout
     data = re.sub(r"^<\?xml[^>]*\?>\s*", "", text)
     return f'<saml:EncryptedAssertion xmlns:saml="{names.SAML}">{data}</saml:EncryptedAssertion>\n'
+
+
+def encrypt_with_opensaml(
+        file, jars, content, method, place, digest="-", mask="-", to=("client",)):
+    program = Path(__file__).resolve().parents[1] / "opensaml" / "EncryptAssertion.java"
+    if jars is None:
+        raise ValueError("OpenSAML's jars are needed to make a document again")
+    certificates = [ciphers.KEYS / f"{name}-cert.pem" for name in to]
+    return subprocess.run(
+        ["java", "-cp", f"{jars}/*", program, file, content, method, digest, mask, place,
+         *certificates], check=True, capture_output=True, text=True).stdout
 
 
 def decrypt(file, name):
