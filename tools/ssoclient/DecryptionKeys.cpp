@@ -40,7 +40,7 @@ void DecryptionKeys::AddTo(const Command& command)
                            .ValueName("KEY");
     command
         .AddOption(
-            "--decrypt-key-passphrase-file",
+            "--decrypt-passphrase-file",
             _passphraseFile,
             "File whose first line is the passphrase of that key, - for standard input (default: "
             "ask for it)")

@@ -18,7 +18,7 @@ inline constexpr SecretKind KeyPassphrase = {
 inline constexpr SecretKind DecryptionKeyPassphrase = {
     "passphrase of the decryption key",
     "Passphrase of the decryption key: ",
-    "--decrypt-key-passphrase-file"};
+    "--decrypt-passphrase-file"};
 
 /**
  * Gets a secret, which may be any octets: the first line of the file, of standard input for `-`, or

@@ -164,7 +164,7 @@ class Decrypting(ProgramTest):
         run("openssl", "pkcs8", "-topk8", "-in", key("client"), "-out", locked, "-passout",
             "pass:right")
         options = ["accepted/aes256-gcm.xml", "--decrypt-key", locked,
-                   "--decrypt-key-passphrase-file"]
+                   "--decrypt-passphrase-file"]
         right = self.decrypt(*options, self.write("right", "right\n"))
         self.assertEqual((DONE, ""), (right.code, right.err))
         wrong = self.decrypt(*options, self.write("wrong", "wrong\n"))
