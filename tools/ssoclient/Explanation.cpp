@@ -9,41 +9,21 @@
 
 using Quillon::MessageFormatter;
 using Quillon::Crypto::Certificate;
+using Quillon::System::DateTime;
 using SsoClient::SamlToken;
 
 namespace {
-
-/** A token outside its validity has been verified only if the clock tolerance allows it. */
-std::string DescribeValidity(const SamlToken& token)
-{
-    const long long now = Quillon::System::GetUtcDateTime().GetUtcTime();
-    const long long start = token.GetStartDate().GetUtcTime();
-    const long long end = token.GetEndDate().GetUtcTime();
-    if (now < start) {
-        return "begins in " + DescribeDuration(start - now) + ", which the clock tolerance allows";
-    }
-    if (now >= end) {
-        return "ended " + DescribeDuration(now - end) + " ago, which the clock tolerance allows";
-    }
-    return DescribeDuration(end - now) + " left, until " + token.GetEndDate().ToString();
-}
 
 std::string Describe(const SsoClient::PrincipalId& principal)
 {
     return principal.GetName() + "@" + principal.GetDomain();
 }
 
-std::string Describe(const Certificate& certificate)
-{
-    return MessageFormatter::ASPrint(
-        "%1 (SHA-256 %2)", certificate.GetSubjectName(), certificate.GetFingerprint());
-}
-
 std::string DescribeConfirmation(const SamlToken& token)
 {
     const Certificate* holder = token.GetConfirmationCertificate();
     return holder == nullptr ? "bearer: whoever has the token is its subject"
-                             : "holder of the key of " + Describe(*holder);
+                             : "holder of the key of " + DescribeCertificate(*holder);
 }
 
 std::vector<std::string> DescribeDelegation(const SamlToken& token)
@@ -83,11 +63,31 @@ std::string ToLine(const ExplainedFact& fact)
 
 } // namespace
 
+std::string DescribeValidity(const DateTime& startDate, const DateTime& endDate)
+{
+    const long long now = Quillon::System::GetUtcDateTime().GetUtcTime();
+    const long long start = startDate.GetUtcTime();
+    const long long end = endDate.GetUtcTime();
+    if (now < start) {
+        return "begins in " + DescribeDuration(start - now) + ", which the clock tolerance allows";
+    }
+    if (now >= end) {
+        return "ended " + DescribeDuration(now - end) + " ago, which the clock tolerance allows";
+    }
+    return DescribeDuration(end - now) + " left, until " + endDate.ToString();
+}
+
+std::string DescribeCertificate(const Certificate& certificate)
+{
+    return MessageFormatter::ASPrint(
+        "%1 (SHA-256 %2)", certificate.GetSubjectName(), certificate.GetFingerprint());
+}
+
 std::vector<ExplainedFact> ExplainFacts(const SamlToken& token, const Certificate* signer)
 {
     return {
-        {"validity", {DescribeValidity(token)}},
-        {"signed by", {signer == nullptr ? "unknown" : Describe(*signer)}},
+        {"validity", {DescribeValidity(token.GetStartDate(), token.GetEndDate())}},
+        {"signed by", {signer == nullptr ? "unknown" : DescribeCertificate(*signer)}},
         {"issuer", {FindIssuer(token)}},
         {"confirmation", {DescribeConfirmation(token)}},
         {"audience", DescribeAudience(token)},

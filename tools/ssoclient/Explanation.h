@@ -15,6 +15,13 @@ struct ExplainedFact
     bool isChain = false; ///< whether each value follows from the one before
 };
 
+/** How long a validity still lasts; one that does not hold now was let pass by the tolerance. */
+std::string DescribeValidity(
+    const Quillon::System::DateTime& startDate, const Quillon::System::DateTime& endDate);
+
+/** A certificate by its subject and fingerprint. */
+std::string DescribeCertificate(const Quillon::Crypto::Certificate& certificate);
+
 /** How long the token is valid, who signed and issued it, and so on, as `Explain` has it. */
 std::vector<ExplainedFact> ExplainFacts(
     const SsoClient::SamlToken& token, const Quillon::Crypto::Certificate* signer);

@@ -1,4 +1,5 @@
 #include "Arguments.h"
+#include "AssertionPage.h"
 #include "Commands.h"
 #include "DialectOptions.h"
 #include "ExitCode.h"
@@ -35,19 +36,27 @@ struct InspectOptions
     bool IsGeneral() const { return reading.IsGiven() || audience || recipient; }
 };
 
-/** The one of the trusted certificates that the token verifies with by itself. */
+/** The one of the trusted certificates with which alone `verify` succeeds. */
+template <class Verify>
 Quillon::Ref<const Quillon::Crypto::Certificate> FindSigner(
-    const SsoClient::SamlToken& token, const CertificateList& trusted, long long clockToleranceSec)
+    const CertificateList& trusted, const Verify& verify)
 {
     for (const auto& certificate : trusted) {
         try {
-            SsoClient::CreateSamlToken(token.ToXml(), {certificate}, clockToleranceSec);
+            verify(CertificateList{certificate});
             return certificate;
         } catch (const SsoClient::InvalidSignatureException&) {
             continue;
         }
     }
     return {};
+}
+
+/** Where the page goes; looked up before anything is read. */
+std::optional<OutputFile> OpenPage(const InspectOptions& options)
+{
+    return options.pageFile.empty() ? std::nullopt
+                                    : std::optional<OutputFile>(std::in_place, options.pageFile);
 }
 
 SsoClient::AssertionRules MakeRules(const InspectOptions& options)
@@ -77,16 +86,25 @@ boost::shared_ptr<const SsoClient::SamlToken> ReadDefaultToken(
     }
 }
 
+Quillon::Ref<const Quillon::Crypto::Certificate> FindAssertionSigner(
+    const std::string& text, const CertificateList& trusted, const SsoClient::AssertionRules& rules)
+{
+    return FindSigner(trusted, [&](const CertificateList& candidate) {
+        SsoClient::VerifyAssertion(text, candidate, rules);
+    });
+}
+
 /** Shows every fact, or the token that is made of them if it is said who its subject is. */
 ExitCode InspectGeneral(
     const InspectOptions& options, const Presentation& presentation, std::string& text)
 {
-    if (!options.pageFile.empty()) {
-        throw UsageError("--html shows tokens of the default kind, not general assertions");
-    }
+    const std::optional<OutputFile> page = OpenPage(options);
     const CertificateList trusted = ReadCertificates(options.trustFiles);
     text = ReadFile(options.file);
-    const auto assertion = SsoClient::VerifyAssertion(text, trusted, MakeRules(options));
+    const SsoClient::AssertionRules rules = MakeRules(options);
+    const auto assertion = SsoClient::VerifyAssertion(text, trusted, rules);
+    // Before anything is shown: the assertion may expire in between.
+    const auto signer = page ? FindAssertionSigner(text, trusted, rules) : nullptr;
     if (!options.reading.subjects.empty()) {
         SsoClient::TokenReading reading;
         options.reading.ApplyTo(reading);
@@ -95,7 +113,20 @@ ExitCode InspectGeneral(
         TokenOutput::Print(
             presentation.json ? DescribeAsJson(*assertion) : DescribeAsLines(*assertion));
     }
+    if (page) {
+        page->Write(WriteAssertionPage(*assertion, signer.get()));
+    }
     return ExitCode::DONE;
+}
+
+Quillon::Ref<const Quillon::Crypto::Certificate> FindTokenSigner(
+    const SsoClient::SamlToken& token,
+    const CertificateList& trusted,
+    const InspectOptions& options)
+{
+    return FindSigner(trusted, [&](const CertificateList& candidate) {
+        SsoClient::CreateSamlToken(token.ToXml(), candidate, options.clockToleranceSec);
+    });
 }
 
 /** @param text  receives what the file holds, once it is read. */
@@ -105,17 +136,13 @@ ExitCode Inspect(const InspectOptions& options, const Presentation& presentation
         return InspectGeneral(options, presentation, text);
     }
     TokenOutput output({}, presentation);
-    std::optional<OutputFile> page;
-    if (!options.pageFile.empty()) {
-        page.emplace(options.pageFile);
-    }
+    const std::optional<OutputFile> page = OpenPage(options);
     const CertificateList trusted = ReadCertificates(options.trustFiles);
     text = ReadFile(options.file);
     const auto token = ReadDefaultToken(text, trusted, options);
     // Before anything is shown: the token may expire in between.
     const bool needsSigner = page || presentation.ShowsExplanations();
-    const auto signer =
-        needsSigner ? FindSigner(*token, trusted, options.clockToleranceSec) : nullptr;
+    const auto signer = needsSigner ? FindTokenSigner(*token, trusted, options) : nullptr;
     output.Show(token);
     if (page) {
         page->Write(WriteTokenPage(*token, signer.get()));

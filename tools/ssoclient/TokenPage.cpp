@@ -1,67 +1,27 @@
 #include "TokenPage.h"
 
-#include "OneLine.h"
-
-#include <string_view>
+#include "html.h"
 
 using SsoClient::SamlToken;
 
 namespace {
 
-constexpr std::string_view Style =
-    "body{font:1rem/1.5 system-ui,sans-serif;margin:2rem auto;max-width:60rem;padding:0 1rem;"
-    "color:#1b1b1b;background:#fff}"
-    "h1{font-size:1.4rem;overflow-wrap:anywhere}"
-    "dl{display:grid;grid-template-columns:10rem 1fr;gap:.5rem 1rem}"
-    "dt{font-weight:600}"
-    "dd{margin:0;overflow-wrap:anywhere;min-width:0}"
-    "ul,ol{margin:0;padding-left:1.2rem}"
-    "@media(max-width:40rem){dl{grid-template-columns:1fr;gap:0}dd{margin-bottom:.8rem}}";
-
-/** Text between tags, and nothing that steers what shows it. */
-std::string Escape(const std::string& text)
-{
-    std::string escaped;
-    for (const char character : ToOneLine(text)) {
-        switch (character) {
-        case '&':
-            escaped += "&amp;";
-            break;
-        case '<':
-            escaped += "&lt;";
-            break;
-        case '>':
-            escaped += "&gt;";
-            break;
-        case '"':
-            escaped += "&quot;";
-            break;
-        case '\'':
-            escaped += "&#39;";
-            break;
-        default:
-            escaped += character;
-        }
-    }
-    return escaped;
-}
-
 std::string WriteValues(const ExplainedFact& fact)
 {
     if (fact.values.size() == 1) {
-        return Escape(fact.values.front());
+        return EscapeForHtml(fact.values.front());
     }
     const std::string list = fact.isChain ? "ol" : "ul";
     std::string items;
     for (const std::string& value : fact.values) {
-        items += "<li>" + Escape(value) + "</li>";
+        items += "<li>" + EscapeForHtml(value) + "</li>";
     }
     return fact.values.empty() ? "none" : "<" + list + ">" + items + "</" + list + ">";
 }
 
 std::string WriteFact(const ExplainedFact& fact)
 {
-    return "<dt>" + Escape(fact.name) + "</dt><dd>" + WriteValues(fact) + "</dd>\n";
+    return "<dt>" + EscapeForHtml(fact.name) + "</dt><dd>" + WriteValues(fact) + "</dd>\n";
 }
 
 ExplainedFact CollectGroups(const SamlToken& token)
@@ -120,12 +80,7 @@ std::string WriteTokenPage(const SamlToken& token, const Quillon::Crypto::Certif
     for (const ExplainedFact& fact : facts) {
         rows += WriteFact(fact);
     }
-    const std::string title =
-        Escape("Token of " + token.GetSubject().GetName() + "@" + token.GetSubject().GetDomain());
-    return "<!DOCTYPE html>\n<html lang=\"en\"><head><meta charset=\"utf-8\"/>\n"
-           "<meta http-equiv=\"Content-Security-Policy\" content=\"default-src 'none'; style-src "
-           "'unsafe-inline'\"/>\n"
-           "<meta name=\"viewport\" content=\"width=device-width, initial-scale=1\"/>\n<title>"
-           + title + "</title>\n<style>" + std::string(Style) + "</style></head>\n<body><h1>"
-           + title + "</h1>\n<dl>\n" + rows + "</dl>\n</body></html>\n";
+    const SsoClient::PrincipalId& subject = token.GetSubject();
+    return WriteHtmlPage(
+        "Token of " + subject.GetName() + "@" + subject.GetDomain(), "<dl>\n" + rows + "</dl>\n");
 }

@@ -12,7 +12,7 @@ import unittest
 import lxml.etree
 import lxml.html
 
-from programs import (DATA, DONE, OUT_OF_VALIDITY, REFUSED, USAGE, ProgramTest, ServiceTest,
+from programs import (DATA, DONE, OUT_OF_VALIDITY, REFUSED, ProgramTest, ServiceTest,
                       ssoclient)
 from terminals import TerminalTest
 
@@ -247,19 +247,14 @@ class Page(ServiceTest):
         self.assertIn("CN=SsoClient development STS", facts["signed by"].text_content())
         self.assertEqual([], tree.xpath("//script | //link | //img | //@src | //@href"))
 
-    def test_there_is_none_of_a_general_assertion(self):
-        result = ssoclient("inspect", "x", "--trust", self.sts.trust, "--general", "--html", "p")
-        self.assert_fails(result, USAGE, "UsageError",
-                          "--html shows tokens of the default kind, not general assertions")
-
     def test_passage_of_a_file_that_is_refused_is_shown(self):
-        for options, lines in (((), 1), (("--explain",), 2), (("--explain", "--json"), 1)):
+        for options, lines in (((), 1), (("--explain",), 3), (("--explain", "--json"), 1)):
             with self.subTest(options=options):
                 result = ssoclient("inspect", "-", "--trust", self.sts.trust, *options,
                                    stdin="<a>\n  <b x=1/>\n</a>")
                 self.assertEqual(REFUSED, result.code)
                 self.assertEqual(lines, result.err.count("\n"))
-                self.assertEqual(lines == 2, result.err.endswith(
+                self.assertEqual(lines == 3, result.err.endswith(
                     "\nssoclient: passage:   <b x=[here]1/>\n"))
 
     def test_there_is_none_of_a_token_that_is_refused(self):
