@@ -18,12 +18,13 @@ from scripted import TRUST, ScriptedAndRealTest, ScriptedTest, fault
 
 KEYS = DATA / "keys"
 SOURCE = pathlib.Path(__file__).parents[3] / "tools" / "ssoclient" / "Hints.cpp"
+SITUATIONS = pathlib.Path(__file__).parents[3] / "docs" / "situations.md"
 MET = set()
 
 
-def rows():
-    """The table of the program: what a message holds, and the advice."""
-    table = SOURCE.read_text("utf-8").partition("Hints[] = {")[2].partition("\n};")[0]
+def rows(name):
+    """A table of the program: what a message holds, or its class, and the advice."""
+    table = SOURCE.read_text("utf-8").partition(f" {name}[] = {{")[2].partition("\n};")[0]
     literal = r'"(?:[^"\\]|\\.)*"'
     found = [(ast.literal_eval(first), "".join(map(ast.literal_eval, re.findall(literal, rest))))
              for first, rest in re.findall(rf"\{{({literal}),\s*((?:{literal}\s*)+)(?:,\s*&\w+)?\}}",
@@ -32,7 +33,8 @@ def rows():
     return found
 
 
-ROWS = rows()
+ROWS = rows("Hints")
+CLASS_ROWS = rows("ClassHints")
 
 
 class Hints(ScriptedAndRealTest):
@@ -206,7 +208,16 @@ class Hints(ScriptedAndRealTest):
                           "Unexpected SOAP fault: wst:UnableToRenew; request failed.")
 
     def test_zz_every_row_is_met(self):
-        self.assertEqual([], [row for row, _ in ROWS if row not in MET])
+        """Here, or where what is said in each situation is compared with its document."""
+        told = re.findall(r"^ssoclient: (\w+): (.+)\nssoclient: hint: (.+)$",
+                          SITUATIONS.read_text("utf-8"), re.MULTILINE)
+        self.assertGreater(len(told), 60)
+        self.assertEqual([], [
+            row for row, advice in ROWS if row not in MET and not any(
+                row in message and hint.startswith(advice) for _, message, hint in told)])
+        self.assertEqual([], [
+            row for row, advice in CLASS_ROWS
+            if not any((row, advice) == (name, hint) for name, _, hint in told)])
 
 
 if __name__ == "__main__":

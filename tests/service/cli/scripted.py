@@ -15,7 +15,7 @@ def fault(code, text="", namespace=WST):
     """A SOAP fault, as a service sends it."""
     return (
         '<s:Envelope xmlns:s="http://schemas.xmlsoap.org/soap/envelope/"><s:Body><s:Fault>'
-        f'<faultcode xmlns:wst="{namespace}">{code}</faultcode>'
+        f'<faultcode xmlns:{code.partition(":")[0]}="{namespace}">{code}</faultcode>'
         f"<faultstring>{escape(text)}</faultstring></s:Fault></s:Body></s:Envelope>")
 
 
