@@ -4,7 +4,9 @@ set(major ${PROJECT_VERSION_MAJOR})
 set(CPACK_GENERATOR DEB)
 set(CPACK_PACKAGE_NAME ssoclient)
 set(CPACK_PACKAGE_VENDOR SsoClient)
-set(CPACK_PACKAGE_CONTACT "SsoClient maintainers <maintainers@ssoclient.example>")
+set(SSOCLIENT_PACKAGE_CONTACT "SsoClient maintainers <maintainers@ssoclient.example>" CACHE STRING
+    "Who answers for the Debian packages, as NAME <ADDRESS>")
+set(CPACK_PACKAGE_CONTACT ${SSOCLIENT_PACKAGE_CONTACT})
 set(CPACK_PACKAGE_DIRECTORY ${PROJECT_SOURCE_DIR}/build/packages)
 set(CPACK_STRIP_FILES ON)
 set(CPACK_DEB_COMPONENT_INSTALL ON)
@@ -24,8 +26,10 @@ set(same_version "(= ${PROJECT_VERSION}-${CPACK_DEBIAN_PACKAGE_RELEASE})")
 
 find_program(GZIP_PROGRAM gzip)
 if(GZIP_PROGRAM)
+    configure_file(${PROJECT_SOURCE_DIR}/packaging/debian/changelog
+        ${PROJECT_BINARY_DIR}/changelog.Debian @ONLY)
     execute_process(COMMAND ${GZIP_PROGRAM} -9n
-        INPUT_FILE ${PROJECT_SOURCE_DIR}/packaging/debian/changelog
+        INPUT_FILE ${PROJECT_BINARY_DIR}/changelog.Debian
         OUTPUT_FILE ${PROJECT_BINARY_DIR}/changelog.Debian.gz)
 endif()
 
