@@ -16,17 +16,26 @@ ADDRESS = "https://git.example.com/ssoclient.git"
 SERVER = "ssoclient-devsts "
 READY = "listening on"
 
-# Needs a realm. The tests of the command line have one.
+# What is typed into a terminal, and with which password.
 KERBEROS = "kinit "
+PASSWORD = "alice.password"
 
 # The network and /opt are the test's own, and go with it.
 PRELUDE = f"""
 set -euo pipefail
 ip link set lo up
 mount -t tmpfs tmpfs /opt
+server_pid=
+stop_server() {{
+    [[ -z $server_pid ]] || kill "$server_pid"
+    wait
+    server_pid=
+}}
+trap stop_server EXIT
 start_server() {{
+    stop_server
     server >server.log 2>&1 </dev/null &
-    trap 'kill %1' EXIT
+    server_pid=$!
     for _ in $(seq 300); do
         if grep --quiet '^{READY}' server.log; then return; fi
         sleep 0.1
@@ -34,6 +43,21 @@ start_server() {{
     cat server.log
     return 1
 }}
+"""
+
+# The realm ends with the shell, which holds the other end of the pipe. Its keytabs are where the
+# README has them.
+REALM = f"""
+mkfifo realm.pipe
+setsid --fork tests/support/kdc.sh <realm.pipe >realm.folder &
+exec 9>realm.pipe
+for _ in $(seq 300); do
+    if [[ -s realm.folder ]]; then break; fi
+    sleep 0.1
+done
+realm=$(cat realm.folder)
+export KRB5_CONFIG=$realm/krb5.conf KRB5CCNAME=FILE:$PWD/ticket
+cp "$realm"/*.keytab "$realm/{PASSWORD}" .
 """
 
 ENDING = """
@@ -51,8 +75,12 @@ def script():
     parts = [PRELUDE]
     for block in blocks():
         if block.startswith(SERVER):
+            if "--keytab" in block:
+                parts.append(REALM)
             parts.append(f"server() {{\nexec {block}}}\nstart_server\n")  # the job is the server
-        elif not block.startswith(KERBEROS):
+        elif block.startswith(KERBEROS):
+            parts.append(f"kerberos() {{\n{block}}}\nkerberos <{PASSWORD}\n")
+        else:
             parts.append(block)
     return "\n".join([*parts, ENDING])
 
