@@ -208,6 +208,12 @@ constexpr Hint Hints[] = {
     {"Token lifetime must be positive", "give --lifetime at least 1 second"},
     {"The URL is malformed: ", "write --url as https://HOST[:PORT]/PATH"},
     {"The pinned key ", "`ssoclient doctor --url URL` shows the pin that the server has"},
+    {"is encrypted, and the rules have no key", "give the private key with --decrypt-key"},
+    {"cannot be decrypted with the keys",
+     "check that the key of --decrypt-key belongs to the certificate that the producer encrypts "
+     "for"},
+    {"assertions are decrypted with an RSA key",
+     "have the producer encrypt for an RSA key, and give that with --decrypt-key"},
     {"No rule fits the subject",
      "name the format or the attribute that the message tells, with --subject"},
     {"An audience restriction names ",

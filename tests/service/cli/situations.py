@@ -135,6 +135,8 @@ class Scene:
                 ("test.pem", DATA / "keys/sts-cert.pem"),
                 ("expired.xml", DATA / "tokens/accepted/clock-start-equals-now.xml"),
                 ("sha1.xml", DATA / "tokens/refused/algorithms/algorithm-rsa-sha1.xml"),
+                ("encrypted.xml", DATA / "encrypted/accepted/aes256-gcm.xml"),
+                ("ec.key", DATA / "keys/sts-p256-key.pem"),
                 ("adfs.xml", DATA / "assertions/accepted/adfs-rsa.xml")):
             shutil.copy(source, self.folder / name)
         self.write("password", DevelopmentSts.PASSWORD + "\n")
@@ -455,6 +457,11 @@ SITUATIONS = {
         "The token was pretty-printed": lambda s: s.inspect("pretty.xml"),
         "The token is signed with SHA-1": lambda s: s.inspect("sha1.xml", trust="test.pem"),
         "Another producer made the assertion": lambda s: s.inspect("adfs.xml", trust="test.pem"),
+        "The assertion is encrypted": lambda s: s.inspect("encrypted.xml", "--general"),
+        "The assertion is encrypted for another key":
+            lambda s: s.inspect("encrypted.xml", "--decrypt-key", "me.key"),
+        "The key to decrypt with is no RSA key":
+            lambda s: s.inspect("encrypted.xml", "--decrypt-key", "ec.key"),
         "The assertion is for another audience": lambda s: s.inspect(
             "adfs.xml", "--audience", "https://other.example.com", "--clock-tolerance", 10 ** 9,
             trust="test.pem"),
