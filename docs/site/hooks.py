@@ -3,6 +3,7 @@
 import pathlib
 import re
 
+from mkdocs.exceptions import ConfigurationError
 from mkdocs.structure.files import File
 from mkdocs.structure.nav import Link
 
@@ -46,6 +47,9 @@ def on_files(files, config):
 
 
 def on_nav(nav, **_):
-    """The reference is not a page of this program's."""
+    """Every document has its place; the reference is not a page of this program's."""
+    lost = set(map(name, documents())) - {page.file.src_path for page in nav.pages}
+    if lost:
+        raise ConfigurationError(f"mkdocs.yml has no place for {', '.join(sorted(lost))}")
     nav.items.insert(2, Link("Reference of the headers", "reference/index.html"))
     return nav
