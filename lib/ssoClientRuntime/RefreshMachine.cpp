@@ -13,9 +13,9 @@ constexpr Span LongestSleep = std::chrono::minutes(1);
 // A token that lasts this long ends a row of failures. One that is refused earlier continues it.
 constexpr Span ProbationTime = std::chrono::minutes(1);
 
-// Where the moment of a first refresh may begin, as a share of the usual one. Not at once, because
-// what is short-lived should not ask twice.
-constexpr double EarliestFirstRefresh = 1.0 / 7;
+// The earliest moment of a first refresh, as a share of the usual one. The wider the range, the
+// more evenly those spread that start together; what lives for a moment only need not ask twice.
+constexpr double EarliestFirstRefresh = 0.02;
 
 // Of the time that a short token is handed out, what is over when it is refreshed at the latest.
 constexpr double LatestRefresh = 0.9;
@@ -91,7 +91,7 @@ bool RefreshMachine::Accept(const Moment& asked, const Moment& now, const TokenF
 /** Processes that start together, or recover together, would refresh together for hours. */
 double RefreshMachine::DrawRefreshShare()
 {
-    if (_isIrregular || _outage) {
+    if (_policy.spreadsFirst && (_isIrregular || _outage)) {
         return _policy.refreshAt * DrawBetween(EarliestFirstRefresh, 1);
     }
     return _policy.refreshAt * (1 + _policy.jitter * DrawBetween(-1, 1));
@@ -183,7 +183,7 @@ Span RefreshMachine::GetRefusedWait() const
 
 Span RefreshMachine::DrawShareOfLeft(Span left)
 {
-    return std::min(_policy.patience, Scale(left, DrawBetween(1.0 / 3, 2.0 / 3)));
+    return std::min(_policy.patience, Scale(left, DrawBetween(0.5, 0.75)));
 }
 
 } // namespace SsoClient

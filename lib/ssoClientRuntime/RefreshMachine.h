@@ -12,6 +12,7 @@ struct RefreshPolicy
 {
     double refreshAt = 0.7;
     double jitter = 0.1;
+    bool spreadsFirst = true;
     Span minRemaining = std::chrono::seconds(60);
     Span minWait = std::chrono::seconds(1);
     Span maxWait = std::chrono::minutes(5);

@@ -35,6 +35,7 @@ RefreshPolicy MakePolicy(const TokenSourceOptions& options)
     RefreshPolicy policy;
     policy.refreshAt = options.refreshAt;
     policy.jitter = options.jitter;
+    policy.spreadsFirst = options.spreadsFirst;
     policy.minRemaining = options.minRemainingValidity;
     policy.minWait = options.minWait;
     policy.maxWait = options.maxWait;

@@ -48,11 +48,15 @@ struct TokenSourceOptions
     /**
      * By how much of that share the moment is drawn earlier or later, so that many processes do not
      * ask at once; from 0, and so that the latest moment stays before the token's end.
-     *
-     * After a start, or a time without a refresh, the moment is drawn from a wider range instead,
-     * from a seventh of `refreshAt` on: those are what many processes have at once.
      */
     double jitter = 0.1;
+
+    /**
+     * Whether the moment is drawn from a wider range, from the beginning on, after a start, a
+     * failure, and whatever else made a token come out of turn: these are what many processes have
+     * at once.
+     */
+    bool spreadsFirst = true;
 
     /** A token with less validity than this is not handed out. From 0. */
     std::chrono::milliseconds minRemainingValidity = std::chrono::seconds(60);
@@ -74,7 +78,7 @@ struct TokenSourceOptions
 
     /**
      * While there is a good token nobody suffers, so the second failure in a row, and any further,
-     * is answered with a wait of a third to two thirds of the time that the token is still good
+     * is answered with a wait of half to three quarters of the time that the token is still good
      * for, up to this, if that is longer. 0: never. It keeps what is due in an outage from coming
      * all at once when the service is back.
      */

@@ -105,13 +105,13 @@ TEST_F(RefreshMachineTest, SpreadsTheFirstRefreshMoreWidely)
     chance = 0;
     machine.Begin(now);
     Arrive();
-    EXPECT_NEAR(360.0, Seconds(PassUntilDue()), 0.01);
+    EXPECT_NEAR(50.4, Seconds(PassUntilDue()), 0.01);
     machine.Begin(now);
     machine.Fail(now, FailureKind::TRANSIENT);
     PassUntilDue();
     machine.Begin(now);
     Arrive();
-    EXPECT_NEAR(360.0, Seconds(PassUntilDue()), 0.01) << "after an outage";
+    EXPECT_NEAR(50.4, Seconds(PassUntilDue()), 0.01) << "after an outage";
     machine.Begin(now);
     Arrive();
     chance = AlmostOne;
@@ -305,11 +305,11 @@ TEST_F(RefreshMachineTest, IsPatientInAnOutageWhileTheTokenIsGood)
     EXPECT_EQ(Span(2s), FailAndWait(FailureKind::TRANSIENT)) << "may be a passing failure";
     Pass(2s);
     chance = 0;
-    EXPECT_EQ((Span(17min) - 2s) / 3, FailAndWait(FailureKind::TRANSIENT));
+    EXPECT_EQ((Span(17min) - 2s) / 2, FailAndWait(FailureKind::TRANSIENT));
     PassUntilDue();
     chance = AlmostOne;
     EXPECT_NEAR(
-        Seconds(Span(17min - 2s) * 4 / 9), Seconds(FailAndWait(FailureKind::TRANSIENT)), 0.01);
+        Seconds(Span(17min - 2s) * 3 / 8), Seconds(FailAndWait(FailureKind::TRANSIENT)), 0.01);
     chance = 0.5;
     PassUntilDue();
     FailAndWait(FailureKind::TRANSIENT);

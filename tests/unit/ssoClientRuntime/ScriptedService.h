@@ -5,6 +5,7 @@
 #include "support/FakeSamlToken.h"
 
 #include "quillon/http/HttpException.h"
+#include "quillon/service/Logger.h"
 #include "ssoClient/SecurityTokenService.h"
 
 #include <boost/smart_ptr/make_shared.hpp>
@@ -37,7 +38,9 @@ public:
     Quillon::Ref<const Quillon::Crypto::Certificate> holder; ///< makes tokens renewable
     std::function<void()> before = [] {};                    ///< each operation
 
-    std::vector<std::string> calls;
+    std::function<void(const std::string&)> seePassword = [](const std::string&) {};
+
+    std::vector<std::string> calls; ///< with all but passwords
     int underWay = 0;
     int mostUnderWay = 0;
 
@@ -46,7 +49,8 @@ public:
         const std::string& password,
         const SsoClient::TokenSpec& /*spec*/) const override
     {
-        return Issue("password " + userName + " " + password);
+        seePassword(password);
+        return Issue("password " + userName);
     }
     Token AcquireTokenByGSS(
         const SsoClient::TokenSpec& /*spec*/, SsoClient::NegotiationHandler& handler) const override

@@ -124,6 +124,8 @@ TEST_F(TokenSourceTest, RefreshesInTheBackground)
 TEST_F(TokenSourceTest, AsksTheProviderForThePasswordEachTime)
 {
     int asked = 0;
+    Calls passwords;
+    service->seePassword = [&](const std::string& password) { passwords.push_back(password); };
     const auto source = CreatePasswordTokenSource(
         service,
         [&] { return PasswordCredentials("alice", "secret" + std::to_string(++asked)); },
@@ -131,7 +133,8 @@ TEST_F(TokenSourceTest, AsksTheProviderForThePasswordEachTime)
         options);
     source->GetToken();
     environment->Pass(43min);
-    EXPECT_EQ((Calls{"password alice secret1", "password alice secret2"}), service->calls);
+    EXPECT_EQ((Calls{"password alice", "password alice"}), service->calls);
+    EXPECT_EQ((Calls{"secret1", "secret2"}), passwords);
 }
 
 TEST_F(TokenSourceTest, RenewsATokenOfItsOwnKey)
