@@ -1,5 +1,6 @@
 #include "RatioReporter.h"
 #include "SignBenchmark.h"
+#include "TokenSourceBenchmark.h"
 #include "VerifyBenchmark.h"
 
 #include <benchmark/benchmark.h>
@@ -12,6 +13,7 @@ int main(int argc, char** argv)
     }
     Benchmarks::RegisterVerifyBenchmarks();
     Benchmarks::RegisterSignBenchmarks();
+    Benchmarks::RegisterTokenSourceBenchmarks();
     Benchmarks::RatioReporter reporter;
     benchmark::RunSpecifiedBenchmarks(&reporter);
     benchmark::Shutdown();

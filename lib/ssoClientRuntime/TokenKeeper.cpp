@@ -19,11 +19,6 @@ DateTime ToDateTime(Span wall)
     return DateTimeFromUtc(wall.count(), false);
 }
 
-std::string ToText(Span wall)
-{
-    return ToDateTime(wall).ToString();
-}
-
 TokenKeeper::TimePoint ToTimePoint(Span steady)
 {
     return TokenKeeper::TimePoint(
@@ -87,9 +82,7 @@ TokenKeeper::TokenKeeper(TokenWays ways, const TokenSourceOptions& options)
 
 Moment TokenKeeper::GetNow() const
 {
-    return {
-        Span(_environment->GetWallTime().GetUtcTime()),
-        duration_cast<Span>(_environment->GetSteadyTime().time_since_epoch())};
+    return ReadClocks(*_environment);
 }
 
 TokenKeeper::Token TokenKeeper::GetToken()
@@ -356,9 +349,7 @@ void TokenKeeper::Accept(const Result& result, const Moment& now)
     const Span tookHalf = (now.steady - result.asked.steady) / 2;
     _serviceClockAhead = validity.issued - (now.wall - tookHalf);
     if (!_machine.Accept(result.asked, now, result.facts)) {
-        _reason = MakeReason<InvalidTokenException>(
-            "The token that came was issued at " + ToText(validity.issued) + " and ends at "
-            + ToText(validity.end) + ", which is too early at " + ToText(now.wall));
+        _reason = MakeTooEarly(validity, now);
         return;
     }
     _token = result.outcome.token;

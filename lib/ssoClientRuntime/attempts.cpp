@@ -25,6 +25,11 @@ Span ToSpan(const DateTime& time)
     return Span(time.GetUtcTime());
 }
 
+std::string ToText(Span wall)
+{
+    return Quillon::System::DateTimeFromUtc(wall.count(), false).ToString();
+}
+
 /** @throws Quillon::Exception  there is none. */
 DateTime ParseIssueInstant(const std::string& xml)
 {
@@ -85,6 +90,19 @@ bool IsRenewableBy(const SamlToken& token, const Quillon::Crypto::Certificate* i
     return token.IsRenewable() && token.GetConfirmationMethod() == SamlToken::CONFIRM_HOLDER_OF_KEY
            && identity != nullptr && holder != nullptr
            && holder->GetEncoded() == identity->GetEncoded();
+}
+
+std::shared_ptr<const Quillon::Exception> MakeTooEarly(const Validity& validity, const Moment& now)
+{
+    return Keep(InvalidTokenException(
+        "The token that came was issued at " + ToText(validity.issued) + " and ends at "
+        + ToText(validity.end) + ", which is too early at " + ToText(now.wall)));
+}
+
+Moment ReadClocks(const RuntimeEnvironment& environment)
+{
+    const auto steady = environment.GetSteadyTime().time_since_epoch();
+    return {ToSpan(environment.GetWallTime()), std::chrono::duration_cast<Span>(steady)};
 }
 
 std::string DescribeFailure(const Quillon::Exception& failure)

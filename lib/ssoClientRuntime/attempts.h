@@ -3,6 +3,7 @@
 #include "quillon/Exceptions.h"
 #include "ssoClient/SamlToken.h"
 #include "ssoClientRuntime/RefreshMachine.h"
+#include "ssoClientRuntime/RuntimeEnvironment.h"
 
 #include <boost/smart_ptr/shared_ptr.hpp>
 
@@ -39,6 +40,12 @@ Validity ReadValidity(const SamlToken& token);
 
 /** Whether a token may be renewed by the holder of that certificate, which may be null. */
 bool IsRenewableBy(const SamlToken& token, const Quillon::Crypto::Certificate* identity);
+
+/** What a token that came with too little validity left fails with. */
+std::shared_ptr<const Quillon::Exception> MakeTooEarly(const Validity& validity, const Moment& now);
+
+/** Both clocks. */
+Moment ReadClocks(const RuntimeEnvironment& environment);
 
 /** Class and text, no longer than what a log line should have. */
 std::string DescribeFailure(const Quillon::Exception& failure);

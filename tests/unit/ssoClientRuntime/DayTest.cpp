@@ -1,3 +1,4 @@
+#include "ssoClientRuntime/DelegatedTokens.h"
 #include "ssoClientRuntime/TokenSource.h"
 
 #include "ScriptedService.h"
@@ -218,6 +219,26 @@ TEST(Day, LeavesNoSecretBehind)
     const FreedMemory freed(Secret);
     Day(7).Live();
     EXPECT_FALSE(freed.HeldTheText());
+}
+
+TEST(DelegatedTokens, OverwriteWhatTheyKeptOfAPresentedToken)
+{
+    const auto environment = boost::make_shared<VirtualEnvironment>();
+    const auto service = boost::make_shared<ScriptedService>(environment);
+    DelegatedTokensOptions options;
+    options.environment = environment;
+    const auto tokens = CreateDelegatedTokens(options);
+    FakeSamlToken user;
+    user.xml = "<user>" + std::string(Secret) + "</user>";
+    user.endDate = Testing::After(environment->GetWallTime(), 24h);
+    {
+        const FreedMemory freed(Secret);
+        tokens->GetToken(service, user, TokenSpec());
+        tokens->GetToken(service, user, TokenSpec());
+        EXPECT_EQ(1U, tokens->GetStatus().entries);
+        tokens->Clear();
+        EXPECT_FALSE(freed.HeldTheText());
+    }
 }
 
 } // namespace
