@@ -12,7 +12,7 @@ using SsoClient::SubjectRule;
 
 namespace {
 
-constexpr char Group[] = "Other services";
+constexpr char DialectGroup[] = "Other services";
 
 struct NamedForm
 {
@@ -80,7 +80,7 @@ std::string CheckDialect(const std::string& text)
 
 void ReadingOptions::AddTo(const Command& owner)
 {
-    const Command command = owner.InGroup(Group);
+    const Command command = owner.InGroup(DialectGroup);
     command.AddFlag("--general", general, "Read SAML 2.0 assertions of any producer");
     command
         .AddOption(
@@ -132,7 +132,7 @@ void ReadingOptions::ApplyTo(SsoClient::TokenReading& reading) const
 
 void DialectOptions::AddTo(const Command& owner)
 {
-    owner.InGroup(Group)
+    owner.InGroup(DialectGroup)
         .AddOption(
             "--dialect",
             name,
@@ -145,7 +145,7 @@ void DialectOptions::AddTo(const Command& owner)
 
 void DialectOptions::AddIssueTo(const Command& owner, SsoClient::TokenSpec& spec)
 {
-    const Command command = owner.InGroup(Group);
+    const Command command = owner.InGroup(DialectGroup);
     command
         .AddOption(
             "--applies-to",
@@ -163,7 +163,7 @@ void DialectOptions::AddIssueTo(const Command& owner, SsoClient::TokenSpec& spec
 
 void DialectOptions::AddDelegatingTo(const Command& owner)
 {
-    const Command command = owner.InGroup(Group);
+    const Command command = owner.InGroup(DialectGroup);
     const Option onBehalfOf = command
                                   .AddOption(
                                       "--on-behalf-of",

@@ -4,12 +4,13 @@
 
 namespace {
 
-struct Unit
+struct ShownUnit
 {
     long long seconds;
     const char* name;
 };
-constexpr std::array<Unit, 4> Units = {{{86400, "d"}, {3600, "h"}, {60, "min"}, {1, "s"}}};
+constexpr std::array<ShownUnit, 4> ShownUnits = {
+    {{86400, "d"}, {3600, "h"}, {60, "min"}, {1, "s"}}};
 
 } // namespace
 
@@ -18,11 +19,11 @@ std::string DescribeDuration(long long microseconds)
     constexpr long long MicrosPerSecond = 1'000'000;
     long long seconds = microseconds / MicrosPerSecond;
     std::string text;
-    for (std::size_t i = 0, shown = 0; i < Units.size() && shown < 2; ++i) {
-        const long long count = seconds / Units[i].seconds;
+    for (std::size_t i = 0, shown = 0; i < ShownUnits.size() && shown < 2; ++i) {
+        const long long count = seconds / ShownUnits[i].seconds;
         if (count > 0 || shown > 0) {
-            text += (shown > 0 ? " " : "") + std::to_string(count) + " " + Units[i].name;
-            seconds -= count * Units[i].seconds;
+            text += (shown > 0 ? " " : "") + std::to_string(count) + " " + ShownUnits[i].name;
+            seconds -= count * ShownUnits[i].seconds;
             ++shown;
         }
     }

@@ -7,9 +7,6 @@
 
 namespace {
 
-/** How much of the format of a name is repeated. */
-constexpr std::size_t MaxShownBytes = 300;
-
 std::string DescribeSubject(const SsoClient::VerifiedAssertion& assertion)
 {
     const auto& subject = assertion.GetFacts().subject;

@@ -16,9 +16,6 @@ using Quillon::Http::ExchangeFacts;
 
 namespace {
 
-/** How much of a text of the server is repeated. */
-constexpr std::size_t MaxShownBytes = 300;
-
 /** Smaller ones come from the way of the reply. */
 constexpr long long MaxUnremarkableMicros = 2'000'000;
 

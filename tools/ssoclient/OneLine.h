@@ -19,5 +19,8 @@ bool HasControls(std::string_view text);
  */
 std::string ToOneLine(std::string_view text);
 
+/** How much of a text of others a message repeats. */
+inline constexpr std::size_t MaxShownBytes = 300;
+
 /** At most `maxBytes` of `text`, and how long it is if that is not all of it. */
 std::string Shorten(const std::string& text, std::size_t maxBytes);

@@ -15,15 +15,6 @@ using Quillon::Crypto::PrivateKey;
 
 namespace {
 
-/** Whether `key` begins with a scheme [RFC 3986 3.1], and so is not the name of a file. */
-bool IsUri(const std::string& key)
-{
-    constexpr char SchemeCharacters[] =
-        "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+-.";
-    const std::size_t end = key.find_first_not_of(SchemeCharacters);
-    return end != 0 && end != std::string::npos && key[end] == ':';
-}
-
 /** `text`, which names the URI of a key, without the PIN that the URI may have [RFC 7512 2.4]. */
 std::string HidePin(std::string text, const std::string& uri)
 {
@@ -43,6 +34,14 @@ std::string HidePin(std::string text, const std::string& uri)
 }
 
 } // namespace
+
+bool IsUri(const std::string& key)
+{
+    constexpr char SchemeCharacters[] =
+        "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+-.";
+    const std::size_t end = key.find_first_not_of(SchemeCharacters);
+    return end != 0 && end != std::string::npos && key[end] == ':';
+}
 
 Quillon::Ref<const PrivateKey> ReadPrivateKey(
     const std::string& key, const SecretKind& kind, const std::string& passphraseFile)

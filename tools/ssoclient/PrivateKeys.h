@@ -6,6 +6,9 @@
 
 #include <string>
 
+/** Whether `key` begins with a scheme [RFC 3986 3.1], and so is not the name of a file. */
+bool IsUri(const std::string& key);
+
 /**
  * Reads the private key that an option names: a PEM or DER file, or the URI of a key in an OpenSSL
  * store. Asks for its passphrase at most once, and only if it has one.

@@ -4,6 +4,7 @@
 #include "ExitCode.h"
 #include "Files.h"
 #include "Neighbour.h"
+#include "PrivateKeys.h"
 
 #include "quillon/MessageFormatter.h"
 
@@ -95,14 +96,6 @@ const toml::table& FindTable(
         ThrowAt(file, node->source(), "`" + name + "' is no profile, which begins with [NAME]");
     }
     return *node->as_table();
-}
-
-/** What begins with a scheme is a URI, as with `--key`. */
-bool IsUri(const std::string& value)
-{
-    const std::size_t end = value.find_first_not_of(
-        "abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ0123456789+-.");
-    return end != std::string::npos && end > 0 && value[end] == ':';
 }
 
 std::string Resolve(const std::string& value, const Key& key, const std::string& file)

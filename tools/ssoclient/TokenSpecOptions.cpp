@@ -24,7 +24,7 @@ Entry& FindOrAdd(std::vector<Entry>& entries, std::string Entry::*key, const std
     return added;
 }
 
-constexpr char Group[] = "The token that is asked for";
+constexpr char SpecGroup[] = "The token that is asked for";
 
 void AddAdvice(std::vector<SsoClient::Advice>& advice, const AdviceWords& words)
 {
@@ -42,7 +42,7 @@ void AddAdvice(std::vector<SsoClient::Advice>& advice, const AdviceWords& words)
 
 void TokenSpecOptions::AddTo(const Command& owner)
 {
-    const Command command = owner.InGroup(Group);
+    const Command command = owner.InGroup(SpecGroup);
     command.AddOption("--lifetime", spec.tokenLifetimeSec, "Lifetime of the token in seconds")
         .ShowDefault()
         .Check(CheckLifetime)
@@ -74,7 +74,7 @@ void TokenSpecOptions::AddTo(const Command& owner)
 
 void TokenSpecOptions::AddBearerTo(const Command& command)
 {
-    command.InGroup(Group).AddFlag(
+    command.InGroup(SpecGroup).AddFlag(
         "--bearer",
         [this] { spec.confirmation = SsoClient::TokenSpec::CONFIRMATION_BEARER; },
         "Ask for a bearer token, although there is a key");

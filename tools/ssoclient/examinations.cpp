@@ -26,8 +26,6 @@ constexpr long long SoonMicros = 30LL * 86'400 * MicrosPerSecond;
 /** Requests are valid for minutes, and the way takes some seconds. */
 constexpr long long MaxClockMicros = 60 * MicrosPerSecond;
 
-constexpr std::size_t MaxShownBytes = 300;
-
 struct Validity
 {
     Health health;
