@@ -66,6 +66,11 @@ class Documents(unittest.TestCase):
         blocks = re.findall(r"^```cpp\n(.*?)^```$", read("README.md"), re.MULTILINE | re.DOTALL)
         self.assertIn(read("examples/acquire_with_password.cpp"), blocks)
 
+    def test_guide_of_token_sources_shows_its_example_program(self):
+        blocks = re.findall(r"^```cpp\n(.*?)^```$", read("docs/long-running.md"),
+                            re.MULTILINE | re.DOTALL)
+        self.assertIn(read("examples/keep_token.cpp"), blocks)
+
     def test_every_exception_class_is_described(self):
         text = read("docs/errors.md")
         classes = [name for path in sources.files("lib/public")

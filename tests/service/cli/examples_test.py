@@ -42,6 +42,27 @@ class Examples(ServiceTest):
             r"bob@example\.test: InvalidCredentialsException: .+\n"
             r"nobody@example\.test: InvalidCredentialsException: .+\n\Z")
 
+    def keep_token(self, password):
+        path = self.folder / "password"
+        path.write_text(password + "\n", "utf-8")
+        return run(os.environ["KEEP_EXAMPLE"], self.sts.url, self.sts.ca, self.sts.trust,
+                   DevelopmentSts.USER, path, stdin="one\ntwo\n")
+
+    def test_keep_token(self):
+        result = self.keep_token(DevelopmentSts.PASSWORD)
+        self.assertEqual(DONE, result.code)
+        self.assertRegex(result.err, r"\Aa token, good until \S+Z\n\Z")
+        first, second = result.out.splitlines(keepends=True)
+        self.assertEqual(first, second)
+        self.assertRegex(first, DESCRIPTION)
+
+    def test_keep_token_asks_once_with_a_wrong_password(self):
+        result = self.keep_token("wrong")
+        self.assertEqual(DONE, result.code)
+        self.assertEqual(1, result.err.count("no new token: "))
+        self.assertRegex(result.out, r"\A(There is no token; attempts have failed since \S+, the next"
+                                     r" one is at \S+: InvalidCredentialsException: .+\n){2}\Z")
+
     def test_inspect_file(self):
         out = self.folder / "token.xml"
         self.assert_done(self.acquire("--out", out))

@@ -228,6 +228,15 @@ TEST_F(RefreshMachineTest, AcquiresAtOnceWhatCannotBeRenewed)
     EXPECT_EQ(Attempt::ACQUIRE, machine.Begin(now));
 }
 
+TEST_F(RefreshMachineTest, AcquiresAtOnceWhatCannotBeRenewedThoughItWasOutOfTurn)
+{
+    BecomeRegular(true);
+    machine.Retry();
+    EXPECT_EQ(Attempt::RENEW, machine.Begin(now));
+    machine.Fail(now, FailureKind::REFUSED);
+    EXPECT_EQ(Attempt::ACQUIRE, machine.Begin(now));
+}
+
 TEST_F(RefreshMachineTest, RenewsAgainAfterAPassingFailure)
 {
     BecomeRegular(true);
