@@ -18,6 +18,8 @@ PASSWORD = "changeit"
 
 OTHER_TOKEN = "SsoException: The service issued another token than was asked for: "
 SECURITY_ERROR = r"SsoException: Unexpected SOAP fault: .*SecurityError; request failed\."
+POLICY_ERROR = r"SsoException: Unexpected SOAP fault: soap:(Server|Receiver); request failed\."
+REQUEST_FAILED = r"SsoException: Unexpected SOAP fault: .*RequestFailed; request failed\."
 NOT_UNDERSTOOD = r"SsoException: Unexpected SOAP fault: .*BadRequest; request failed\."
 
 # How each call ends, with both versions of SOAP.
@@ -30,11 +32,15 @@ ENDS = {
         "SsoException: The audience restrictions have no audience in common",
     "password for less time": OTHER_TOKEN + r"it ends in 1[78]\d\d seconds, .* with 300",
     "password with claims": "ok alice",
+    "claim": "claimed",
     "password without a dialect": NOT_UNDERSTOOD,
+    "password where a certificate is wanted": SECURITY_ERROR,
     "password of long ago": SECURITY_ERROR,
     "certificate": "ok CN=solution-user,O=Example",
     "certificate by reference": "ok CN=solution-user,O=Example",
     "certificate not named": NOT_UNDERSTOOD,
+    "certificate where a password is wanted": SECURITY_ERROR,
+    "certificate where a token is wanted": SECURITY_ERROR,
     "certificate with a flag": NOT_UNDERSTOOD,
     "certificate of a stranger": SECURITY_ERROR,
     "token": "ok CN=solution-user,O=Example",
@@ -42,14 +48,33 @@ ENDS = {
     "token without a key": r"SsoException: Unexpected SOAP fault: .*InvalidRequest; .*",
     "token that was changed": SECURITY_ERROR,
     "certificate on behalf of": "ok alice",
+    "on behalf of what was changed": REQUEST_FAILED,
     "password on behalf of": "ok alice",
     "certificate to act as": "ok CN=solution-user,O=Example",
     "password to act as": "ok alice",
     "validate with a key": "valid",
+    "validate what was changed": "invalid",
     "validate without credentials": SECURITY_ERROR,
     "validate with a password": "valid",
     "certificate for a renewable token": "ok CN=solution-user,O=Example",
     "renew": "ok CN=solution-user,O=Example",
+    "renew what is not renewable": REQUEST_FAILED,
+}
+
+# What a WS-SecurityPolicy says otherwise.
+ENDS_WITH_POLICIES = {
+    **ENDS,
+    "password where a certificate is wanted": POLICY_ERROR,
+    "certificate where a password is wanted": POLICY_ERROR,
+    "certificate where a token is wanted": POLICY_ERROR,
+    "validate without credentials": POLICY_ERROR,
+    "token as a SAML token": "ok CN=solution-user,O=Example",
+    "password without addressing":
+        r"SsoException: Unexpected SOAP fault: .*MessageAddressingHeaderRequired; request failed\.",
+    "password with addressing": "ok alice",
+    "certificate in an asymmetric binding": "ok CN=solution-user,O=Example",
+    "validate in an asymmetric binding": "valid",
+    "on behalf of in an asymmetric binding": "ok alice",
 }
 
 
@@ -112,7 +137,8 @@ class Cxf(unittest.TestCase):
             port = free.getsockname()[1]
         cls.url = f"https://localhost:{port}"
         service = subprocess.Popen(
-            ["java", "-cp", f"{folder}:{class_path}", "StsServer", str(folder), str(port)],
+            ["java", "-cp", f"{folder}:{class_path}", "StsServer", str(folder), str(port),
+             str(HERE / "policies")],
             stdin=subprocess.PIPE, stdout=subprocess.PIPE, stderr=subprocess.DEVNULL, text=True)
 
         def stop():
@@ -123,23 +149,29 @@ class Cxf(unittest.TestCase):
         cls.addClassCleanup(stop)
         cls.assertEqual(cls(), "ready\n", service.stdout.readline())
 
-    def talk(self, soap):
+    def talk(self, soap, path="", *more):
         said = subprocess.run(
-            [os.environ["INTEROP_CXF"], f"{self.url}/{soap}/", self.authority, soap],
+            [os.environ["INTEROP_CXF"], f"{self.url}/{path}{soap}/", self.authority, soap, *more],
             capture_output=True, text=True, check=True, timeout=240).stdout
         return dict(line.split(": ", 1) for line in said.splitlines())
 
-    def assert_ends(self, ends):
-        self.assertEqual(sorted(ENDS), sorted(ends))
-        for name, pattern in ENDS.items():
+    def assert_ends(self, ends, expected):
+        self.assertEqual(sorted(expected), sorted(ends))
+        for name, pattern in expected.items():
             with self.subTest(call=name):
                 self.assertRegex(ends[name], f"\\A{pattern}\\Z")
 
     def test_soap_11(self):
-        self.assert_ends(self.talk("11"))
+        self.assert_ends(self.talk("11"), ENDS)
 
     def test_soap_12(self):
-        self.assert_ends(self.talk("12"))
+        self.assert_ends(self.talk("12"), ENDS)
+
+    def test_soap_11_with_policies(self):
+        self.assert_ends(self.talk("11", "policy/", "policies"), ENDS_WITH_POLICIES)
+
+    def test_soap_12_with_policies(self):
+        self.assert_ends(self.talk("12", "policy/", "policies"), ENDS_WITH_POLICIES)
 
 
 if __name__ == "__main__":

@@ -1,6 +1,7 @@
 // Talks to the endpoints of an Apache CXF token service as a caller would, and says of each call
-// how it ended: interop_cxf URL CA.PEM SOAP, where the URL is that of the endpoints for SOAP 11
-// or 12. Each line is "NAME: ok SUBJECT", "NAME: valid" or "NAME: CLASS: TEXT".
+// how it ended: interop_cxf URL CA.PEM SOAP [policies], where the URL is that of the endpoints for
+// SOAP 11 or 12, and the last word says that they have policies, and more of them there are. Each
+// line is "NAME: ok SUBJECT", "NAME: valid" or "NAME: CLASS: TEXT".
 
 #include "quillon/ssl/SSLContext.h"
 #include "ssoClient/SecurityTokenService.h"
@@ -38,6 +39,13 @@ TokenPtr Say(const std::string& name, const Acquire& acquire)
     return token;
 }
 
+/** The first value of an attribute of the assertion that the token was made of. */
+std::string GetClaim(const SamlToken& token, const std::string& name)
+{
+    const AssertionAttribute* claim = GetAssertion(token)->FindAttribute(name);
+    return claim == nullptr ? "none" : claim->values.front().text;
+}
+
 class Talk
 {
 public:
@@ -58,6 +66,18 @@ public:
         PresentTokens();
         ActForOthers();
         ValidateAndRenew();
+    }
+
+    void RunWithPolicies() const
+    {
+        Present("token as a SAML token", WithKey("saml"), *_bound);
+        SecurityTokenServiceConfig config = At("addressed");
+        Password("password with addressing", config, _spec);
+        config.dialect->addressing = false;
+        Password("password without addressing", config, _spec);
+        Certificate("certificate in an asymmetric binding", WithKey("asymmetric"), _spec);
+        Validate("validate in an asymmetric binding", WithKey("asymmetric"), *_bearer);
+        Present("on behalf of in an asymmetric binding", OnBehalfOf("asymmetric"), *_bearer);
     }
 
 private:
@@ -121,9 +141,11 @@ private:
         Password("password for less time", At("password"), spec);
         SecurityTokenServiceConfig config = At("password");
         config.dialect->claims = {{"urn:claim", true}};
-        Password("password with claims", config, _spec);
+        const TokenPtr token = Password("password with claims", config, _spec);
+        std::cout << "claim: " << (token ? GetClaim(*token, "urn:claim") : "no token") << "\n";
         config.dialect = boost::none;
         Password("password without a dialect", config, _spec);
+        Password("password where a certificate is wanted", At("certificate"), _spec);
         const FixedClock clock("2020-01-01T00:00:00Z");
         Password("password of long ago", At("password"), _spec);
     }
@@ -136,6 +158,8 @@ private:
         Certificate("certificate by reference", config, _spec);
         config.dialect->useKey = UseKeyForm::EMPTY;
         Certificate("certificate not named", config, _spec);
+        Certificate("certificate where a password is wanted", WithKey("password"), _spec);
+        Certificate("certificate where a token is wanted", WithKey("token"), _spec);
         config = WithKey("certificate");
         config.dialect->writesFalseDelegatable = true;
         Certificate("certificate with a flag", config, _spec);
@@ -154,15 +178,30 @@ private:
         config = WithKey("token");
         config.dialect->useKeyWithPresentedToken = false;
         Present("token without a key", config, *_bound);
+        Present("token that was changed", WithKey("token"), Change(*_bound, "solution-user"));
+    }
+
+    /** The same token with the first letter of `word` in another case. */
+    static FakeSamlToken Change(const SamlToken& token, const std::string& word)
+    {
         FakeSamlToken changed;
-        changed.id = _bound->GetId();
-        changed.xml = _bound->ToXml();
-        changed.xml.replace(changed.xml.find("solution-user"), 8, "SOLUTION");
-        Present("token that was changed", WithKey("token"), changed);
+        changed.id = token.GetId();
+        changed.xml = token.ToXml();
+        changed.xml[changed.xml.find(word)] ^= ' ';
+        return changed;
+    }
+
+    SecurityTokenServiceConfig OnBehalfOf(const std::string& endpoint) const
+    {
+        SecurityTokenServiceConfig config = WithKey(endpoint);
+        config.dialect->presentedToken = PresentedTokenForm::ON_BEHALF_OF;
+        return config;
     }
 
     void ActForOthers() const
     {
+        Present(
+            "on behalf of what was changed", OnBehalfOf("certificate"), Change(*_bearer, "alice"));
         for (const auto form : {PresentedTokenForm::ON_BEHALF_OF, PresentedTokenForm::ACT_AS}) {
             const std::string name =
                 form == PresentedTokenForm::ACT_AS ? "to act as" : "on behalf of";
@@ -176,29 +215,37 @@ private:
         }
     }
 
-    void Validate(const std::string& name, const SecurityTokenServiceConfig& config) const
+    static void Validate(
+        const std::string& name, const SecurityTokenServiceConfig& config, const SamlToken& token)
     {
         bool isValid = false;
         const std::string failure = GetFailure(
-            [&] { isValid = CreateSecurityTokenService(config)->ValidateSubject(*_bearer); });
+            [&] { isValid = CreateSecurityTokenService(config)->ValidateSubject(token); });
         std::cout << name << ": " << (failure == "none" ? (isValid ? "valid" : "invalid") : failure)
                   << "\n";
     }
 
+    void Renew(const std::string& name, const SamlToken& token) const
+    {
+        Say(name, [&] {
+            return CreateSecurityTokenService(WithKey("certificate"))->RenewToken(token, 1800);
+        });
+    }
+
     void ValidateAndRenew() const
     {
-        Validate("validate with a key", WithKey("certificate"));
+        Validate("validate with a key", WithKey("certificate"), *_bearer);
+        Validate("validate what was changed", WithKey("certificate"), Change(*_bearer, "alice"));
         SecurityTokenServiceConfig config = At("password");
-        Validate("validate without credentials", config);
+        Validate("validate without credentials", config, *_bearer);
         config.credentials = PasswordCredentials("alice", "secret");
-        Validate("validate with a password", config);
+        Validate("validate with a password", config, *_bearer);
         TokenSpec spec = _spec;
         spec.renewable = true;
         const TokenPtr token =
             Certificate("certificate for a renewable token", WithKey("certificate"), spec);
-        Say("renew", [&] {
-            return CreateSecurityTokenService(WithKey("certificate"))->RenewToken(*token, 1800);
-        });
+        Renew("renew", *token);
+        Renew("renew what is not renewable", *_bound);
     }
 
     const std::string _url;
@@ -212,8 +259,8 @@ private:
 
 int main(int argc, char** argv)
 {
-    if (argc != 4) {
-        std::cerr << "usage: interop_cxf URL CA.PEM SOAP\n";
+    if (argc != 4 && argc != 5) {
+        std::cerr << "usage: interop_cxf URL CA.PEM SOAP [policies]\n";
         return 2;
     }
     Quillon::Ssl::SSLContextOptions options;
@@ -221,6 +268,10 @@ int main(int argc, char** argv)
     options.authorities = Quillon::Crypto::ParsePemCertificates(ReadFile(argv[2]));
     const auto context = Quillon::Ssl::CreateSSLContext(options);
     const bool isSoap12 = std::string(argv[3]) == "12";
-    Talk(argv[1], context.get(), isSoap12 ? SoapVersion::SOAP_1_2 : SoapVersion::SOAP_1_1).RunAll();
+    Talk talk(argv[1], context.get(), isSoap12 ? SoapVersion::SOAP_1_2 : SoapVersion::SOAP_1_1);
+    talk.RunAll();
+    if (argc == 5) {
+        talk.RunWithPolicies();
+    }
     return 0;
 }
