@@ -68,7 +68,7 @@ class Maker:
         self._documents.add(
             file, repr(arguments) + (ASSERTIONS / plain).read_text("utf-8"),
             lambda: commands.encrypt(ASSERTIONS / plain, **arguments),
-            about="what xmlsec1 writes", maker="xmlsec1", section="XMLENC11 4.1", plain=plain,
+            about="what xmlsec1 writes", maker="xmlsec1", section="XMLENC11 4", plain=plain,
             rules=self._rules[plain], keys=["client"], **outcome)
 
     def add_opensaml(self, name, plain, neighbour, text, jars, how, **change):

@@ -209,7 +209,7 @@ def _contents_of_the_text():
          ("nul-inside", _inside(lambda text: text + "\0"), INSIDE, XML),
          ("not-utf-8-inside", _inside(
              lambda text: first.sub("><!-- \udcff -->", text, count=1)), INSIDE, XML))
-    _row("its-own-declarations", "what is inside declares all its prefixes", "XMLENC11 4.3",
+    _row("its-own-declarations", "what is inside declares all its prefixes", "XMLENC11 4",
          document(plain="shibboleth-rsa"),
          ("declared-outside", document(
              plain="shibboleth-rsa",
