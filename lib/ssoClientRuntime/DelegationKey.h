@@ -36,8 +36,8 @@ public:
 private:
     Service _service;
     Quillon::Wiped _text; // the spec, and then the token
-    std::size_t _specBytes;
-    Digest _digest;
+    std::size_t _specBytes = 0;
+    Digest _digest{};
 };
 
 } // namespace SsoClient

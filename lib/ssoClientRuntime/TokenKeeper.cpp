@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <future>
+#include <iterator>
 #include <utility>
 
 namespace SsoClient {
@@ -67,6 +68,11 @@ void RunSomewhere(RuntimeEnvironment& environment, const RuntimeEnvironment::Wor
     } catch (const std::exception& error) {
         Warn(std::string("A completion raised ") + error.what());
     }
+}
+
+std::function<void()> Tell(std::function<void(const Outcome&)> settle, const Outcome& answer)
+{
+    return [settle = std::move(settle), answer] { settle(answer); };
 }
 
 } // namespace
@@ -203,12 +209,12 @@ void TokenKeeper::Proceed(const Moment& now, Chores& chores)
 void TokenKeeper::SettleWaiters(const Moment& now, Chores& chores)
 {
     for (auto waiter = _waiters.begin(); waiter != _waiters.end();) {
-        const std::optional<Outcome> answer = GetAnswer(*waiter, now);
-        if (answer) {
-            chores.emplace_back(
-                [settle = std::move(waiter->settle), answer = *answer] { settle(answer); });
+        const auto next = std::next(waiter);
+        if (const std::optional<Outcome> answer = GetAnswer(*waiter, now)) {
+            chores.push_back(Tell(std::move(waiter->settle), *answer));
+            _waiters.erase(waiter);
         }
-        waiter = answer ? _waiters.erase(waiter) : std::next(waiter);
+        waiter = next;
     }
 }
 
@@ -248,13 +254,24 @@ void TokenKeeper::ArmTimer(const Moment& now, Chores& chores)
         return;
     }
     _armedFor = next;
-    chores.emplace_back([this, time = *next] {
-        _environment->RunAt(ToTimePoint(time), [weak = weak_from_this(), time] {
-            if (const auto self = weak.lock()) {
-                self->OnTimer(time);
-            }
-        });
-    });
+    chores.emplace_back([this, time = *next] { SetTimer(time); });
+}
+
+/** Work that does nothing if there is no source any more. */
+template <class Call>
+RuntimeEnvironment::Work TokenKeeper::WhileAlive(const Call& call)
+{
+    return [weak = weak_from_this(), call] {
+        if (const auto self = weak.lock()) {
+            call(*self);
+        }
+    };
+}
+
+void TokenKeeper::SetTimer(Span time)
+{
+    const auto ring = [time](TokenKeeper& keeper) { keeper.OnTimer(time); };
+    _environment->RunAt(ToTimePoint(time), WhileAlive(ring));
 }
 
 void TokenKeeper::LetGo()
@@ -275,11 +292,7 @@ void TokenKeeper::OnTimer(Span time)
 void TokenKeeper::QueueAttempt()
 {
     try {
-        _environment->Run([weak = weak_from_this()] {
-            if (const auto self = weak.lock()) {
-                self->MakePendingAttempt();
-            }
-        });
+        _environment->Run(WhileAlive([](TokenKeeper& keeper) { keeper.MakePendingAttempt(); }));
     } catch (const Quillon::Exception& failure) {
         DropPendingAttempt(failure);
     }

@@ -87,6 +87,9 @@ private:
     TokenOutage DescribeOutage(const Moment& now) const;
     TokenSourceStatus DescribeStatus(const Moment& now) const;
 
+    template <class Call>
+    RuntimeEnvironment::Work WhileAlive(const Call& call);
+    void SetTimer(Span time);
     void OnTimer(Span time);
     void QueueAttempt();
     bool MakePendingAttempt();

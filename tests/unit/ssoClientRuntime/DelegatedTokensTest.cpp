@@ -136,6 +136,9 @@ TEST_F(DelegatedTokensTest, TellsNeighbouringFieldsApart)
     spec.audienceRestriction = {"1;a1;b"};
     other.audienceRestriction = {"1;a", "b"};
     EXPECT_FALSE(AreTheSame(spec, other));
+    spec.audienceRestriction = {"a", "bc"};
+    other.audienceRestriction = {"ab", "c"};
+    EXPECT_FALSE(AreTheSame(spec, other));
     spec.audienceRestriction = {"a"};
     other.audienceRestriction = {};
     other.advice = {{"a", {}}};
@@ -298,6 +301,17 @@ TEST_F(DelegatedTokensTest, HasOneExchangeForAKeyHoweverManyWantIt)
     }
     EXPECT_EQ(1U, service->calls.size());
     EXPECT_EQ(1U, tokens->GetStatus().misses);
+}
+
+TEST_F(DelegatedTokensTest, NeverJoinsTheExchangeOfAnotherUser)
+{
+    const auto tokens = CreateDelegatedTokens(options);
+    service->before = [&] {
+        service->before = [] {};
+        EXPECT_EQ("_2", tokens->GetToken(service, Present("<b/>"), spec)->GetId());
+    };
+    tokens->GetToken(service, Present("<a/>"), spec);
+    EXPECT_EQ(2U, service->calls.size());
 }
 
 TEST_F(DelegatedTokensTest, RefusesOptionsThatMakeNoSense)

@@ -107,9 +107,10 @@ private:
         calls.push_back(call);
         mostUnderWay = std::max(mostUnderWay, ++underWay);
         const std::shared_ptr<int> leave(&underWay, [](int* count) { --*count; });
-        before();
         const auto token = boost::make_shared<FakeSamlToken>();
         token->id = "_" + std::to_string(calls.size());
+        const std::function<void()> now = before; // which may be given another one meanwhile
+        now();
         token->startDate = After(_environment->GetWallTime(), clockAhead);
         token->endDate = After(token->startDate, lifetime);
         token->renewable = holder != nullptr;
