@@ -70,4 +70,13 @@ public:
     ~InvalidCredentialsException() override;
 };
 
+/** The caller has called the operation off; see `CancellationSource`. */
+class SSOCLIENT_API CancelledException
+    : public Quillon::ExceptionOf<CancelledException, SsoException>
+{
+public:
+    using ExceptionOf::ExceptionOf;
+    ~CancelledException() override;
+};
+
 } // namespace SsoClient

@@ -7,8 +7,9 @@
 
 namespace Quillon::Http {
 
-ConnectionPoolImpl::ConnectionPoolImpl(Ref<const ConnectionSpecImpl> spec)
-    : _connections(HttpEngine::Get().AddConnections(std::move(spec)))
+ConnectionPoolImpl::ConnectionPoolImpl(
+    Ref<const ConnectionSpecImpl> spec, std::optional<std::chrono::microseconds> idleLimit)
+    : _connections(HttpEngine::Get().AddConnections(std::move(spec), idleLimit))
 {}
 
 ConnectionPoolImpl::~ConnectionPoolImpl()
@@ -16,7 +17,7 @@ ConnectionPoolImpl::~ConnectionPoolImpl()
     HttpEngine::Get().RetireConnections(_connections);
 }
 
-CURLSH* ConnectionPoolImpl::GetShare()
+CURLSH* ConnectionPoolImpl::Use()
 {
     if (_connections->share == nullptr) {
         ShareOwner share(curl_share_init());
@@ -27,16 +28,42 @@ CURLSH* ConnectionPoolImpl::GetShare()
         }
         _connections->share = std::move(share);
     }
+    ++_connections->transfers;
     return _connections->share.get();
 }
 
-void CreateHttpConnectionPool(ConnectionSpec* spec, Ref<HttpConnectionPool>& out)
+void ConnectionPoolImpl::Leave() noexcept
+{
+    --_connections->transfers;
+    _connections->idleSince = Connections::Clock::now();
+}
+
+namespace {
+
+Ref<const ConnectionSpecImpl> RequireSpec(ConnectionSpec* spec)
 {
     if (spec == nullptr) {
         throw InvalidArgumentException("There is no connection spec.");
     }
-    out = Ref<HttpConnectionPool>(new ConnectionPoolImpl(
-        Ref<const ConnectionSpecImpl>(static_cast<const ConnectionSpecImpl*>(spec))));
+    return Ref<const ConnectionSpecImpl>(static_cast<const ConnectionSpecImpl*>(spec));
+}
+
+} // namespace
+
+void CreateHttpConnectionPool(ConnectionSpec* spec, Ref<HttpConnectionPool>& out)
+{
+    out = Ref<HttpConnectionPool>(new ConnectionPoolImpl(RequireSpec(spec)));
+}
+
+void CreateHttpConnectionPool(
+    ConnectionSpec* spec, long long idleLimit, Ref<HttpConnectionPool>& out)
+{
+    if (idleLimit <= 0) {
+        throw InvalidArgumentException(
+            "The idle limit of " + std::to_string(idleLimit) + " microseconds is not positive.");
+    }
+    out = Ref<HttpConnectionPool>(
+        new ConnectionPoolImpl(RequireSpec(spec), std::chrono::microseconds(idleLimit)));
 }
 
 } // namespace Quillon::Http

@@ -5,7 +5,9 @@
 
 #include "quillon/http/UserAgent.h"
 
+#include <chrono>
 #include <list>
+#include <optional>
 
 namespace Quillon::Http {
 
@@ -19,20 +21,31 @@ struct Connections
         : spec(std::move(connectionSpec))
     {}
 
+    using Clock = std::chrono::steady_clock;
+
     Ref<const ConnectionSpecImpl> spec; // outlives the connections, which point to its `tls`
     ShareOwner share;                   // made with the first exchange
+
+    std::optional<std::chrono::microseconds> idleLimit; // none: they stay as long as the pool
+    unsigned transfers = 0;                             // under way
+    Clock::time_point idleSince;                        // if there are none
 };
 
 class ConnectionPoolImpl final : public HttpConnectionPool
 {
 public:
-    explicit ConnectionPoolImpl(Ref<const ConnectionSpecImpl> spec);
+    explicit ConnectionPoolImpl(
+        Ref<const ConnectionSpecImpl> spec,
+        std::optional<std::chrono::microseconds> idleLimit = std::nullopt);
     ~ConnectionPoolImpl() override;
 
     const ConnectionSpecImpl& GetSpec() const noexcept { return *_connections->spec; }
 
-    /** libcurl's handle of the connections. On the I/O thread. */
-    CURLSH* GetShare();
+    /** libcurl's handle of the connections, for a transfer that begins. On the I/O thread. */
+    CURLSH* Use();
+
+    /** To be called when that transfer has ended. On the I/O thread. */
+    void Leave() noexcept;
 
 private:
     std::list<Connections>::iterator _connections;

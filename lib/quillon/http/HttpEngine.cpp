@@ -5,7 +5,9 @@
 
 #include "quillon/system/SignalBlock.h"
 
+#include <algorithm>
 #include <cerrno>
+#include <chrono>
 #include <system_error>
 #include <unistd.h>
 #include <utility>
@@ -15,7 +17,7 @@ namespace Quillon::Http {
 namespace {
 
 /** The poll returns for every event; this only bounds the harm of one that got lost. */
-constexpr int LongestPollMs = 60'000;
+constexpr std::chrono::milliseconds LongestPoll{60'000};
 
 /** No process has this one. */
 constexpr int NoProcess = -1;
@@ -141,14 +143,19 @@ void HttpEngine::RequireOwnProcess() const
     }
 }
 
-std::list<Connections>::iterator HttpEngine::AddConnections(Ref<const ConnectionSpecImpl> spec)
+std::list<Connections>::iterator HttpEngine::AddConnections(
+    Ref<const ConnectionSpecImpl> spec, std::optional<std::chrono::microseconds> idleLimit)
 {
     RequireOwnProcess();
     const System::ProcessLock lock(_mutex);
     if (!IsOwn(lock)) {
         ThrowForked();
     }
-    return _connections.emplace(_connections.end(), std::move(spec));
+    // Those with a limit stand together, so that looking for idle ones takes no look at the rest.
+    const auto place = idleLimit ? _connections.begin() : _connections.end();
+    const auto connections = _connections.emplace(place, std::move(spec));
+    connections->idleLimit = idleLimit;
+    return connections;
 }
 
 void HttpEngine::RetireConnections(std::list<Connections>::iterator connections) noexcept
@@ -201,7 +208,8 @@ void HttpEngine::Run()
         int running = 0;
         curl_multi_perform(_multi, &running);
         CompleteFinished();
-        curl_multi_poll(_multi, nullptr, 0, LongestPollMs, nullptr);
+        const auto longest = static_cast<int>(CloseIdle().count());
+        curl_multi_poll(_multi, nullptr, 0, longest, nullptr);
     }
     CloseEverything();
 }
@@ -250,6 +258,35 @@ void HttpEngine::DropCancelled()
             ++position;
         }
     }
+}
+
+/**
+ * Closes the connections that have been idle for too long.
+ *
+ * @return when to look again, at the latest.
+ */
+std::chrono::milliseconds HttpEngine::CloseIdle()
+{
+    using std::chrono::milliseconds;
+    std::list<ShareOwner> due; // closed after the lock
+    milliseconds longest = LongestPoll;
+    const auto now = Connections::Clock::now();
+    const System::ProcessLock lock(_mutex);
+    for (Connections& connections : _connections) {
+        if (!connections.idleLimit) {
+            break;
+        }
+        if (connections.share == nullptr || connections.transfers > 0) {
+            continue;
+        }
+        const auto left = *connections.idleLimit - (now - connections.idleSince);
+        if (left.count() <= 0) {
+            due.push_back(std::move(connections.share));
+        } else {
+            longest = std::min(longest, std::chrono::ceil<milliseconds>(left));
+        }
+    }
+    return longest;
 }
 
 void HttpEngine::CompleteFinished()

@@ -55,7 +55,8 @@ public:
     void NoteCancellation() noexcept;
 
     /** @throws HttpException  the process is a child that was forked too late. */
-    std::list<Connections>::iterator AddConnections(Ref<const ConnectionSpecImpl> spec);
+    std::list<Connections>::iterator AddConnections(
+        Ref<const ConnectionSpecImpl> spec, std::optional<std::chrono::microseconds> idleLimit);
     void RetireConnections(std::list<Connections>::iterator connections) noexcept;
 
     /** Stops the threads; what is in flight fails, and so does what comes later. */
@@ -78,6 +79,7 @@ private:
     bool TakeWork(std::vector<std::unique_ptr<Transfer>>& submitted);
     void StartTransfer(std::unique_ptr<Transfer> transfer);
     void DropCancelled();
+    std::chrono::milliseconds CloseIdle();
     void CompleteFinished();
     void Complete(std::unique_ptr<Transfer> transfer, Outcome outcome);
     std::unique_ptr<Transfer> Remove(CURL* easy);

@@ -83,6 +83,7 @@ bool ReplyCollector::AddStatusLine(std::string_view line)
     _status.reasonPhrase = Trim(line.substr(digits));
     _location.clear();
     _date.clear();
+    _retryAfter.clear();
     _hasLength = false;
     _announcesEnd = false;
     _contentLength.reset();
@@ -120,6 +121,8 @@ void ReplyCollector::NoteField(const std::string& lowerName, std::string_view va
         _location = value;
     } else if (lowerName == "date") {
         _date = value;
+    } else if (lowerName == "retry-after") {
+        _retryAfter = value;
     }
 }
 

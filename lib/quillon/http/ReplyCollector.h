@@ -18,7 +18,7 @@ class ReplyCollector
 public:
     /**
      * @param wantsBody    for which status codes the body counts; null: for all.
-     * @param isObserved  whether `Location` and `Date` are kept.
+     * @param isObserved  whether `Location`, `Date` and `Retry-After` are kept.
      */
     ReplyCollector(StatusTest wantsBody, bool isObserved) noexcept
         : _wantsBody(wantsBody)
@@ -47,6 +47,7 @@ public:
     /** The fields of these names in the latest head; empty if it has none. */
     const std::string& GetLocation() const noexcept { return _location; }
     const std::string& GetDate() const noexcept { return _date; }
+    const std::string& GetRetryAfter() const noexcept { return _retryAfter; }
 
     /** Whether the head of a final reply is complete. */
     bool HasHead() const noexcept { return _next == Next::BODY || _next == Next::NOTHING; }
@@ -97,6 +98,7 @@ private:
     HttpStatus _status;
     std::string _location;
     std::string _date;
+    std::string _retryAfter;
     std::string _body;
     std::string _problem;
 };

@@ -61,6 +61,14 @@ Transfer::Transfer(
     SetCallbacks();
 }
 
+Transfer::~Transfer()
+{
+    _easy.reset(); // before its connections count as idle
+    if (_usesPool) {
+        _pool->Leave();
+    }
+}
+
 template <class T>
 void Transfer::Set(CURLoption option, T value)
 {
@@ -164,7 +172,9 @@ void Transfer::SetCallbacks()
 
 void Transfer::Prepare()
 {
-    Set(CURLOPT_SHARE, _pool->GetShare());
+    CURLSH* const connections = _pool->Use();
+    _usesPool = true;
+    Set(CURLOPT_SHARE, connections);
     if (_cookies != nullptr) {
         _givenCookies = _cookies->GetLines();
         for (const std::string& line : _givenCookies) {
@@ -299,6 +309,9 @@ ExchangeFacts Transfer::CollectFacts(const Outcome& outcome) const
     facts.status = _reply.GetStatus().code;
     facts.location = _reply.GetLocation();
     facts.date = ParseHttpDate(_reply.GetDate());
+    facts.retryAfterSeconds = ParseRetryAfter(_reply.GetRetryAfter(), facts.date);
+    facts.isSent = _isSent;
+    facts.isSessionResumed = _record->isResumed;
     facts.failure = outcome.error != nullptr ? outcome.error->what() : "";
     return facts;
 }

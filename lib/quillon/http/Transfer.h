@@ -25,6 +25,10 @@ public:
         Ref<CookieStoreImpl> cookies,
         Ref<Exchange> exchange);
 
+    ~Transfer();
+    Transfer(const Transfer&) = delete;
+    Transfer& operator=(const Transfer&) = delete;
+
     /** Attaches what is shared with other transfers. On the I/O thread. */
     void Prepare();
 
@@ -80,7 +84,8 @@ private:
     ReplyCollector _reply;
     Ref<Ssl::PeerRecord> _record; // of the connection
     bool _isSent = false;         // libcurl has begun to send the request
-    bool _isRepeated = false;     // libcurl has tried to send it again
+    bool _usesPool = false;
+    bool _isRepeated = false; // libcurl has tried to send it again
     int _socketError = 0;
     int _earlierError = 0; // of an address that was tried before the one that answered
     std::array<char, CURL_ERROR_SIZE> _errorText{};

@@ -77,6 +77,7 @@ void NoteParameters(const SSL* ssl, PeerRecord& record)
 {
     record.version = SSL_get_version(ssl);
     record.cipher = SSL_get_cipher_name(ssl);
+    record.isResumed = SSL_session_reused(ssl) == 1;
 }
 
 /** Looks on while OpenSSL verifies, and changes nothing: a chain that is refused is gone later. */

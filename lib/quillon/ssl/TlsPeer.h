@@ -17,6 +17,7 @@ struct PeerRecord final : public RefCounted
     bool isObserved = false; ///< whether the rest is collected
     std::string version;     ///< of TLS
     std::string cipher;
+    bool isResumed = false; ///< whether an earlier session was taken up
     std::list<Ref<const Crypto::Certificate>> certificates; ///< as shown, the peer's own first
 };
 

@@ -49,16 +49,16 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::RunForToken(
     const Read& read) const
 {
     return Run(
-        *_transport,
+        GetRoad(),
         operationName,
         describe,
         [&](Request& request) {
             build(request);
             RefuseNullCertificate(_trustedCertificates);
         },
-        [&](Quillon::Reader* reply) {
+        [&](const ResponseHandler& handler, Quillon::Reader* reply) {
             std::string tokenXml;
-            read(reply, tokenXml);
+            read(handler, reply, tokenXml);
             return ToSamlToken(tokenXml, asked);
         });
 }
@@ -78,9 +78,9 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireToken(
             RefuseNullCertificate(_trustedCertificates);
             LogTrace([] { return "SecurityTokenServiceImpl::AcquireToken sending request"; });
         },
-        [&](Quillon::Reader* reply, std::string& tokenXml) {
+        [&](const ResponseHandler& handler, Quillon::Reader* reply, std::string& tokenXml) {
             LogTrace([] { return "SecurityTokenServiceImpl::AcquireToken processing response"; });
-            _responseHandler->HandleAcquireTokenResponse(reply, tokenXml);
+            handler.HandleAcquireTokenResponse(reply, tokenXml);
         });
 }
 
@@ -88,17 +88,20 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByGSS(
     const TokenSpec& spec, NegotiationHandler& handler) const
 {
     return Run(
+        _control.get(),
         "AcquireTokenByGSS",
         [&] { return DescribeRequest(spec); },
-        [&] {
+        [&](Call& call) {
+            const boost::shared_ptr<const ResponseHandler> replies = call.Observe(_responseHandler);
             const LegDriver legs(
                 *_requestBuilder,
-                *_responseHandler,
+                *replies,
                 _trustedCertificates,
                 LegDriver::EmptyLeg::STOPS_THE_PROCESS);
-            const boost::shared_ptr<TransportSession> session = _transport->CreateSession();
+            const boost::shared_ptr<TransportSession> session =
+                call.CreateSession(*_transport, true);
             return ToSamlToken(
-                Negotiate(legs, *session, spec, handler), GrantRequest::ByNegotiation(spec));
+                Negotiate(call, legs, *session, spec, handler), GrantRequest::ByNegotiation(spec));
         });
 }
 
@@ -110,8 +113,8 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByCerti
         GrantRequest::ByCertificate(spec),
         [&] { return DescribeRequest(spec); },
         [&](Request& request) { _requestBuilder->BuildCertificateTokenRequest(spec, request); },
-        [&](Quillon::Reader* reply, std::string& tokenXml) {
-            _responseHandler->HandleAcquireTokenResponse(reply, tokenXml);
+        [&](const ResponseHandler& handler, Quillon::Reader* reply, std::string& tokenXml) {
+            handler.HandleAcquireTokenResponse(reply, tokenXml);
         });
 }
 
@@ -128,23 +131,23 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByToken
                 WriteTokenSpec(spec));
         },
         [&](Request& request) { _requestBuilder->BuildExchangeTokenRequest(token, spec, request); },
-        [&](Quillon::Reader* reply, std::string& tokenXml) {
-            _responseHandler->HandleAcquireTokenResponse(reply, tokenXml);
+        [&](const ResponseHandler& handler, Quillon::Reader* reply, std::string& tokenXml) {
+            handler.HandleAcquireTokenResponse(reply, tokenXml);
         });
 }
 
 bool SecurityTokenServiceImpl::ValidateSubject(const SamlToken& token) const
 {
     return Run(
-        *_transport,
+        GetRoad(),
         "ValidateSubject",
         [&] {
             return MessageFormatter::ASPrint(
                 "Validating subject of token %1", CreateRedactedDescription(token));
         },
         [&](Request& request) { _requestBuilder->BuildValidateSubjectRequest(token, request); },
-        [&](Quillon::Reader* reply) {
-            const bool result = _responseHandler->HandleValidateSubjectResponse(reply);
+        [&](const ResponseHandler& handler, Quillon::Reader* reply) {
+            const bool result = handler.HandleValidateSubjectResponse(reply);
             LogTrace([result] { return MessageFormatter::ASPrint("Result: %1", result); });
             return result;
         });
@@ -163,9 +166,19 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::RenewToken(
                 lifetimeSec);
         },
         [&](Request& request) { _requestBuilder->BuildRenewRequest(token, lifetimeSec, request); },
-        [&](Quillon::Reader* reply, std::string& tokenXml) {
-            _responseHandler->HandleRenewTokenResponse(reply, tokenXml);
+        [&](const ResponseHandler& handler, Quillon::Reader* reply, std::string& tokenXml) {
+            handler.HandleRenewTokenResponse(reply, tokenXml);
         });
+}
+
+template <class Call, class... Rest>
+void SecurityTokenServiceImpl::Queue(const Call& call, const Rest&... rest) const
+{
+    if (_control == nullptr) {
+        SyncToAsyncCall(call, rest...);
+    } else {
+        SyncToCancellableCall(_control->options.cancellation, call, rest...);
+    }
 }
 
 void SecurityTokenServiceImpl::AcquireTokenAsync(
@@ -174,7 +187,7 @@ void SecurityTokenServiceImpl::AcquireTokenAsync(
     const TokenSpec& spec,
     const TokenCompletion& completion) const
 {
-    SyncToAsyncCall(
+    Queue(
         TokenCall(boost::bind(
             &SecurityTokenService::AcquireToken, Copy(), userName, PassSecret(password), spec)),
         completion);
@@ -185,7 +198,7 @@ void SecurityTokenServiceImpl::AcquireTokenByGssAsync(
     const boost::shared_ptr<NegotiationHandler>& handler,
     const TokenCompletion& completion) const
 {
-    SyncToAsyncCall(
+    Queue(
         TokenCall(boost::bind(
             &SecurityTokenService::AcquireTokenByGSS, Copy(), spec, PassByRef(handler))),
         completion);
@@ -194,7 +207,7 @@ void SecurityTokenServiceImpl::AcquireTokenByGssAsync(
 void SecurityTokenServiceImpl::AcquireTokenByCertificateAsync(
     const TokenSpec& spec, const TokenCompletion& completion) const
 {
-    SyncToAsyncCall(
+    Queue(
         TokenCall(boost::bind(&SecurityTokenService::AcquireTokenByCertificate, Copy(), spec)),
         completion);
 }
@@ -204,7 +217,7 @@ void SecurityTokenServiceImpl::AcquireTokenByTokenAsync(
     const TokenSpec& spec,
     const TokenCompletion& completion) const
 {
-    SyncToAsyncCall(
+    Queue(
         TokenCall(boost::bind(
             &SecurityTokenService::AcquireTokenByToken, Copy(), PassByRef(token), spec)),
         completion);
@@ -213,7 +226,7 @@ void SecurityTokenServiceImpl::AcquireTokenByTokenAsync(
 void SecurityTokenServiceImpl::ValidateSubjectAsync(
     const boost::shared_ptr<const SamlToken>& token, const ValidationCompletion& completion) const
 {
-    SyncToAsyncCall(
+    Queue(
         ValidationCall(
             boost::bind(&SecurityTokenService::ValidateSubject, Copy(), PassByRef(token))),
         completion,
@@ -225,15 +238,33 @@ void SecurityTokenServiceImpl::RenewTokenAsync(
     long long lifetimeSec,
     const TokenCompletion& completion) const
 {
-    SyncToAsyncCall(
+    Queue(
         TokenCall(
             boost::bind(&SecurityTokenService::RenewToken, Copy(), PassByRef(token), lifetimeSec)),
         completion);
 }
 
+boost::shared_ptr<SecurityTokenService> SecurityTokenServiceImpl::UnderControl(
+    const CallControl& control) const
+{
+    const auto copy = boost::make_shared<SecurityTokenServiceImpl>(*this);
+    copy->_transport = _transport->WithReuse(control.options.connectionReuse);
+    copy->_control = boost::make_shared<const CallControl>(control);
+    return copy;
+}
+
 boost::shared_ptr<const SecurityTokenService> SecurityTokenServiceImpl::Copy() const
 {
-    return boost::make_shared<SecurityTokenServiceImpl>(*this);
+    const auto copy = boost::make_shared<SecurityTokenServiceImpl>(*this);
+    if (_control != nullptr) {
+        copy->_control = boost::make_shared<const CallControl>(_control->Started());
+    }
+    return copy;
+}
+
+Road SecurityTokenServiceImpl::GetRoad() const noexcept
+{
+    return {_control.get(), *_transport, _responseHandler};
 }
 
 boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::ToSamlToken(

@@ -2,6 +2,7 @@
 
 #include "ssoClient/SecurityTokenService.h"
 #include "ssoClient/client/grantChecking.h"
+#include "ssoClient/client/operation.h"
 #include "ssoClient/protocol/RequestBuilder.h"
 #include "ssoClient/protocol/ResponseHandler.h"
 #include "ssoClient/protocol/Transport.h"
@@ -24,6 +25,9 @@ public:
         const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& trustedCertificates,
         const boost::optional<ServiceDialect>& dialect = boost::none,
         const boost::optional<HolderOfKeyConfig>& identity = boost::none);
+
+    /** A service that shares everything with this one but what is said of its calls. */
+    boost::shared_ptr<SecurityTokenService> UnderControl(const CallControl& control) const;
 
     boost::shared_ptr<const SamlToken> AcquireToken(
         const std::string& userName,
@@ -79,6 +83,12 @@ private:
     /** What an asynchronous operation works with: the caller's object may go meanwhile. */
     boost::shared_ptr<const SecurityTokenService> Copy() const;
 
+    Road GetRoad() const noexcept;
+
+    /** Queues a blocking operation, so that it can be called off if it is under control. */
+    template <class Call, class... Rest>
+    void Queue(const Call& call, const Rest&... rest) const;
+
     /** @return the verified token; null for an empty text. */
     boost::shared_ptr<const SamlToken> ToSamlToken(
         const std::string& tokenXml, const GrantRequest& asked) const;
@@ -89,6 +99,7 @@ private:
     std::list<Quillon::Ref<const Quillon::Crypto::Certificate>> _trustedCertificates;
     boost::optional<ServiceDialect> _dialect;
     boost::optional<HolderOfKeyConfig> _identity;
+    boost::shared_ptr<const CallControl> _control; // null without options
 };
 
 } // namespace SsoClient

@@ -5,7 +5,9 @@
 #include "quillon/PanicVerify.h"
 #include "quillon/Wiped.h"
 #include "quillon/system/ThreadPool.h"
+#include "ssoClient/Exceptions.h"
 #include "ssoClient/SamlToken.h"
+#include "ssoClient/client/cancelling.h"
 #include "ssoClient/wire/assertionPlaces.h"
 
 #include <boost/bind/bind.hpp>
@@ -13,6 +15,7 @@
 #include <boost/smart_ptr/make_shared.hpp>
 #include <boost/smart_ptr/shared_ptr.hpp>
 
+#include <atomic>
 #include <string>
 
 /** How a blocking operation becomes an asynchronous one. */
@@ -88,6 +91,50 @@ void SyncToAsyncCall(
         resultFunc,
         defaultResult);
     Quillon::System::GetThreadPool()->Queue(work);
+}
+
+/** Who takes a queued call: the thread that makes it, or who calls it off before. */
+class QueuedCall
+{
+public:
+    /** @return whether it is the caller's; the first one's. */
+    bool Take() noexcept { return !_isTaken.exchange(true); }
+
+private:
+    std::atomic<bool> _isTaken{false};
+};
+
+/**
+ * Queues that call; until it has a thread, the source of `token` may end it, and the completion is
+ * called there.
+ */
+template <class SyncFunc, class ResultFunc, class DefaultResult>
+void SyncToCancellableCall(
+    const CancellationToken& token,
+    const SyncFunc& syncFunc,
+    const ResultFunc& resultFunc,
+    const DefaultResult& defaultResult)
+{
+    const auto queued = boost::make_shared<QueuedCall>();
+    const auto watch = boost::make_shared<CancellationWatch>(
+        token.IsCancelled() ? CancellationToken() : token, [queued, resultFunc, defaultResult] {
+            if (queued->Take()) {
+                const CancelledException error("The operation was cancelled.");
+                resultFunc(defaultResult, &error);
+            }
+        });
+    Quillon::System::GetThreadPool()->Queue([=] {
+        if (watch != nullptr && queued->Take()) {
+            SyncCallToResultFunc(syncFunc, resultFunc, defaultResult);
+        }
+    });
+}
+
+template <class SyncFunc, class ResultFunc>
+void SyncToCancellableCall(
+    const CancellationToken& token, const SyncFunc& syncFunc, const ResultFunc& resultFunc)
+{
+    SyncToCancellableCall(token, syncFunc, resultFunc, boost::shared_ptr<const SamlToken>());
 }
 
 /** For operations that give a token. */

@@ -12,6 +12,7 @@ namespace {
 
 // Lets the handler answer the last reply, and sends the answer.
 void ExchangeLegs(
+    Call& call,
     const LegDriver& legs,
     TransportSession& session,
     const TokenSpec& spec,
@@ -23,7 +24,11 @@ void ExchangeLegs(
         throw Quillon::InvalidArgumentException(
             "Invalid NegotiationHandler: the returned leg may not be NULL");
     }
-    legs.Exchange(session, *userLeg, spec, response.contextId, response);
+    const Repeat rule = response.contextId.empty() ? Repeat::IF_NOT_SENT : Repeat::NEVER;
+    call.Attempt(rule, [&] {
+        legs.Exchange(session, *userLeg, spec, response.contextId, response);
+        return true;
+    });
     if (response.contextId.empty()) {
         throw CommunicationException("Error processing the response to SPNego token request: no "
                                      "Context ID was returned.");
@@ -48,6 +53,7 @@ void ConsumeFinalLeg(const Leg& serverLeg, NegotiationHandler& handler)
 } // namespace
 
 std::string Negotiate(
+    Call& call,
     const LegDriver& legs,
     TransportSession& session,
     const TokenSpec& spec,
@@ -55,7 +61,7 @@ std::string Negotiate(
 {
     SPNegoResponse response;
     do {
-        ExchangeLegs(legs, session, spec, handler, response);
+        ExchangeLegs(call, legs, session, spec, handler, response);
     } while (response.token.empty());
     ConsumeFinalLeg(response.leg, handler);
     return std::move(response.token);

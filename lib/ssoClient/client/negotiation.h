@@ -1,6 +1,7 @@
 #pragma once
 
 #include "ssoClient/NegotiationHandler.h"
+#include "ssoClient/client/Call.h"
 #include "ssoClient/client/LegDriver.h"
 
 namespace SsoClient {
@@ -15,6 +16,7 @@ namespace SsoClient {
  * @throws CommunicationException             an answer without context id.
  */
 std::string Negotiate(
+    Call& call,
     const LegDriver& legs,
     TransportSession& session,
     const TokenSpec& spec,

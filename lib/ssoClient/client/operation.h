@@ -1,5 +1,6 @@
 #pragma once
 
+#include "ssoClient/client/Call.h"
 #include "ssoClient/client/logging.h"
 #include "ssoClient/protocol/Transport.h"
 
@@ -17,6 +18,8 @@ public:
     OperationFrame& operator=(const OperationFrame&) = delete;
     ~OperationFrame();
 
+    const std::string& GetId() const noexcept { return _opId; }
+
 private:
     std::string Describe(const char* step) const;
 
@@ -30,36 +33,52 @@ Quillon::Ref<Quillon::Reader> Send(TransportSession& session, const Request& req
 /**
  * Runs an operation. All of them come by here, so what surrounds every one stands here.
  *
+ * @param control   what the service's options say; null without.
  * @param describe  makes the line that says what is asked for; called only if it is logged.
- * @return what `perform` returns.
+ * @return what `perform` returns, which is given the call.
  */
 template <class Describe, class Perform>
-auto Run(const char* operationName, const Describe& describe, const Perform& perform)
+auto Run(
+    const CallControl* control,
+    const char* operationName,
+    const Describe& describe,
+    const Perform& perform)
 {
     const OperationFrame frame(operationName);
     LogTrace(describe);
-    return perform();
+    Call call(control, frame.GetId(), operationName);
+    return call.Report([&] { return perform(call); });
 }
+
+/** The way of an operation: to the service, and back. */
+struct Road
+{
+    const CallControl* control;
+    const Transport& transport;
+    const boost::shared_ptr<const ResponseHandler>& responseHandler;
+};
 
 /**
  * Runs an operation of one exchange, in a session of its own that is over before the reply is read.
  *
  * @param build  fills the request; nothing is connected before it is done.
- * @return what `read` makes of the reply.
+ * @return what `read` makes of the reply, with the handler that it is given.
  */
 template <class Describe, class Build, class Read>
 auto Run(
-    const Transport& transport,
+    const Road& road,
     const char* operationName,
     const Describe& describe,
     const Build& build,
     const Read& read)
 {
-    return Run(operationName, describe, [&] {
-        Request request;
-        build(request);
-        const Quillon::Ref<Quillon::Reader> reply = Send(*transport.CreateSession(), request);
-        return read(reply.get());
+    return Run(road.control, operationName, describe, [&](Call& call) {
+        const Quillon::Ref<Quillon::Reader> reply = call.Attempt(Repeat::IF_NOT_ACTED_ON, [&] {
+            Request request;
+            build(request);
+            return Send(*call.CreateSession(road.transport), request);
+        });
+        return read(*call.Observe(road.responseHandler), reply.get());
     });
 }
 

@@ -9,6 +9,8 @@
 #include <boost/bind/bind.hpp>
 #include <boost/smart_ptr/make_shared.hpp>
 
+#include <algorithm>
+
 namespace SsoClient {
 
 namespace {
@@ -56,6 +58,18 @@ Http::ExchangeObserver MakeObserver(const Http::ExchangeObserver& callers)
         if (!callers.empty()) {
             callers(facts);
         }
+    };
+}
+
+/** Tells both; empty if both are. */
+Http::ExchangeObserver Both(const Http::ExchangeObserver& one, const Http::ExchangeObserver& other)
+{
+    if (one.empty() || other.empty()) {
+        return one.empty() ? other : one;
+    }
+    return [one, other](const Http::ExchangeFacts& facts) {
+        one(facts);
+        other(facts);
     };
 }
 
@@ -123,7 +137,25 @@ HttpsClient::HttpsClient(
 
 boost::shared_ptr<TransportSession> HttpsClient::CreateSession() const
 {
-    return boost::make_shared<HttpsSession>(_connectionSpec.get(), _path, _options);
+    return CreateControlledSession(SessionOptions());
+}
+
+boost::shared_ptr<TransportSession> HttpsClient::CreateControlledSession(
+    const SessionOptions& options) const
+{
+    return boost::make_shared<HttpsSession>(
+        _connectionSpec.get(), _path, _options, _shelf, options);
+}
+
+boost::shared_ptr<const Transport> HttpsClient::WithReuse(
+    const boost::optional<ConnectionReuse>& reuse) const
+{
+    const auto copy = boost::make_shared<HttpsClient>(*this);
+    copy->_shelf.reset();
+    if (reuse) {
+        copy->_shelf = boost::make_shared<ConnectionShelf>(_connectionSpec, *reuse);
+    }
+    return copy;
 }
 
 HttpsSession::HttpsSession(Http::ConnectionSpec* spec, const std::string& path, long long timeout)
@@ -132,22 +164,59 @@ HttpsSession::HttpsSession(Http::ConnectionSpec* spec, const std::string& path, 
 
 HttpsSession::HttpsSession(
     Http::ConnectionSpec* spec, const std::string& path, const ExchangeOptions& options)
+    : HttpsSession(spec, path, options, nullptr, SessionOptions())
+{}
+
+HttpsSession::HttpsSession(
+    Http::ConnectionSpec* spec,
+    const std::string& path,
+    const ExchangeOptions& options,
+    const boost::shared_ptr<ConnectionShelf>& shelf,
+    const SessionOptions& sessionOptions)
     : _path(path)
     , _options(options)
+    , _sessionOptions(sessionOptions)
+    , _shelf(shelf)
 {
+    if (_shelf) {
+        _connection = _shelf->Take();
+    }
     Quillon::Ref<Http::CookieStore> cookies;
     Http::CreateCookieStore("", cookies);
-    Http::CreateHttpUserAgent(spec, cookies.get(), nullptr, _userAgent);
+    Http::CreateHttpUserAgent(spec, cookies.get(), _connection.get(), _userAgent);
+}
+
+HttpsSession::~HttpsSession()
+{
+    if (_shelf && !_sessionOptions.isNegotiation) {
+        _shelf->PutBack(_connection);
+    }
+}
+
+/** The options of this session's transport, with what the call says of the next exchange. */
+ExchangeOptions HttpsSession::LimitOptions() const
+{
+    ExchangeOptions options = _options;
+    if (!_sessionOptions.timeLeft.empty()) {
+        options.timeoutMicroseconds =
+            std::min(options.timeoutMicroseconds, _sessionOptions.timeLeft());
+    }
+    options.observer = Both(_sessionOptions.observer, _options.observer);
+    return options;
 }
 
 void HttpsSession::SendRequest(const Request& request, Quillon::Ref<Quillon::Reader>& response)
 {
+    const ExchangeOptions options = LimitOptions();
     Quillon::Ref<Quillon::System::ScheduledItem> pending;
-    SendRequestAsync(request, boost::bind(&noop), pending);
+    Start(request, options, boost::bind(&noop), pending);
+    if (!_sessionOptions.onPending.empty()) {
+        _sessionOptions.onPending(pending);
+    }
     Quillon::Ref<Http::ClientResponse> httpResponse;
     _userAgent->WaitForResponse(
         static_cast<Http::PendingRequestItem*>(pending.get()),
-        _options.timeoutMicroseconds,
+        options.timeoutMicroseconds,
         httpResponse);
     boost::shared_ptr<Quillon::Exception> error;
     TranslateResponse(nullptr, httpResponse.get(), error, response, request.soap);
@@ -161,6 +230,15 @@ void HttpsSession::SendRequestAsync(
     const ResponseCallback& callback,
     Quillon::Ref<Quillon::System::ScheduledItem>& pending)
 {
+    Start(request, LimitOptions(), callback, pending);
+}
+
+void HttpsSession::Start(
+    const Request& request,
+    const ExchangeOptions& options,
+    const ResponseCallback& callback,
+    Quillon::Ref<Quillon::System::ScheduledItem>& pending)
+{
     const Http::Completion completion = boost::bind(
         &AsyncTranslateResponse,
         callback,
@@ -168,7 +246,7 @@ void HttpsSession::SendRequestAsync(
         boost::placeholders::_2,
         boost::placeholders::_3,
         request.soap);
-    const Quillon::Ref<Http::ClientRequest> httpRequest = ComposeRequest(request, _path, _options);
+    const Quillon::Ref<Http::ClientRequest> httpRequest = ComposeRequest(request, _path, options);
     Quillon::Ref<Http::PendingRequestItem> item;
     _userAgent->SendRequestAsync(httpRequest.get(), completion, item);
     pending = item;

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "ssoClient/protocol/ConnectionShelf.h"
 #include "ssoClient/protocol/Transport.h"
 
 #include "quillon/http/ConnectionSpec.h"
@@ -38,12 +39,17 @@ public:
         const ExchangeOptions& options);
 
     boost::shared_ptr<TransportSession> CreateSession() const override;
+    boost::shared_ptr<TransportSession> CreateControlledSession(
+        const SessionOptions& options) const override;
+    boost::shared_ptr<const Transport> WithReuse(
+        const boost::optional<ConnectionReuse>& reuse) const override;
 
 private:
     Quillon::Ref<Quillon::Http::ConnectionSpec> _connectionSpec;
     Quillon::Ref<Quillon::Ssl::SSLContext> _sslContext;
     std::string _path;
     ExchangeOptions _options;
+    boost::shared_ptr<ConnectionShelf> _shelf; // null: each session has a connection of its own
 };
 
 /** A conversation with cookies and connections of its own. */
@@ -56,6 +62,18 @@ public:
         const std::string& path,
         const ExchangeOptions& options);
 
+    /** @param shelf  where the connection comes from and goes to; null for one of its own. */
+    HttpsSession(
+        Quillon::Http::ConnectionSpec* spec,
+        const std::string& path,
+        const ExchangeOptions& options,
+        const boost::shared_ptr<ConnectionShelf>& shelf,
+        const SessionOptions& sessionOptions);
+
+    HttpsSession(const HttpsSession&) = delete;
+    HttpsSession& operator=(const HttpsSession&) = delete;
+    ~HttpsSession();
+
     void SendRequest(const Request& request, Quillon::Ref<Quillon::Reader>& response) override;
     void SendRequestAsync(
         const Request& request,
@@ -63,9 +81,19 @@ public:
         Quillon::Ref<Quillon::System::ScheduledItem>& pending) override;
 
 private:
+    ExchangeOptions LimitOptions() const;
+    void Start(
+        const Request& request,
+        const ExchangeOptions& options,
+        const ResponseCallback& callback,
+        Quillon::Ref<Quillon::System::ScheduledItem>& pending);
+
     Quillon::Ref<Quillon::Http::UserAgent> _userAgent;
     std::string _path;
     ExchangeOptions _options;
+    SessionOptions _sessionOptions;
+    boost::shared_ptr<ConnectionShelf> _shelf;
+    Quillon::Ref<Quillon::Http::HttpConnectionPool> _connection; // null without a shelf
 };
 
 /**

@@ -1,7 +1,10 @@
 #pragma once
 
 #include "quillon/Reader.h"
+#include "ssoClient/SoapFault.h"
 #include "ssoClient/protocol/SPNegoResponse.h"
+
+#include <boost/smart_ptr/shared_ptr.hpp>
 
 #include <string>
 
@@ -33,6 +36,10 @@ public:
 
     /** Replaces `response`, if the reply is good, by what the service answers to a leg. */
     virtual void HandleSPNegoResponse(Quillon::Reader* body, SPNegoResponse& response) const = 0;
+
+    /** One that shows faults to `observer`, too, after whoever else is shown them. */
+    virtual boost::shared_ptr<const ResponseHandler> ShowingFaultsTo(
+        const FaultObserver& observer) const = 0;
 
 protected:
     ~ResponseHandler() = default;

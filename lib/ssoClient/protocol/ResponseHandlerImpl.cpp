@@ -11,6 +11,8 @@
 #include "ssoClient/wire/assertionPlaces.h"
 #include "ssoClient/wire/xmlReading.h"
 
+#include <boost/smart_ptr/make_shared.hpp>
+
 #include <utility>
 
 using Quillon::Ref;
@@ -154,6 +156,19 @@ void ResponseHandlerImpl::HandleSPNegoResponse(
         body, _form, [](const ElementNode& soapBody, const ServiceDialect& /*dialect*/) {
             return ExtractSPNegoResponse(soapBody);
         });
+}
+
+boost::shared_ptr<const ResponseHandler> ResponseHandlerImpl::ShowingFaultsTo(
+    const FaultObserver& observer) const
+{
+    ReplyForm form = _form;
+    form.faultObserver = [callers = _form.faultObserver, observer](const SoapFault& fault) {
+        if (callers) {
+            callers(fault);
+        }
+        observer(fault);
+    };
+    return boost::make_shared<ResponseHandlerImpl>(form);
 }
 
 } // namespace SsoClient

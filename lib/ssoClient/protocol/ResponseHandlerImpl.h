@@ -23,6 +23,8 @@ public:
     bool HandleValidateSubjectResponse(Quillon::Reader* body) const override;
     void HandleRenewTokenResponse(Quillon::Reader* body, std::string& tokenXml) const override;
     void HandleSPNegoResponse(Quillon::Reader* body, SPNegoResponse& response) const override;
+    boost::shared_ptr<const ResponseHandler> ShowingFaultsTo(
+        const FaultObserver& observer) const override;
 
 private:
     ReplyForm _form;

@@ -4,9 +4,12 @@
 
 #include "quillon/Exceptions.h"
 #include "quillon/Reader.h"
+#include "quillon/http/ExchangeFacts.h"
 #include "quillon/system/ScheduledItem.h"
+#include "ssoClient/ConnectionReuse.h"
 
 #include <boost/function.hpp>
+#include <boost/optional.hpp>
 #include <boost/smart_ptr/shared_ptr.hpp>
 
 namespace SsoClient {
@@ -54,11 +57,35 @@ protected:
     ~TransportSession() = default;
 };
 
+/** What a call has to say of its session; as it starts, nothing. */
+struct SessionOptions
+{
+    /** Told of every exchange, beside the transport's own observer; may be empty. */
+    Quillon::Http::ExchangeObserver observer;
+
+    /** What is left for an exchange, in microseconds and positive; empty for no further limit. */
+    boost::function<long long()> timeLeft;
+
+    /** Given what calls off the exchange that a blocking request waits for; may be empty. */
+    boost::function<void(const Quillon::Ref<Quillon::System::ScheduledItem>&)> onPending;
+
+    /** Whether the service may take the connection for the one who talks. */
+    bool isNegotiation = false;
+};
+
 /** The way to one token service. Thread safety: immutable. */
 class Transport
 {
 public:
     virtual boost::shared_ptr<TransportSession> CreateSession() const = 0;
+
+    /** One for a call that has more to say. */
+    virtual boost::shared_ptr<TransportSession> CreateControlledSession(
+        const SessionOptions& options) const = 0;
+
+    /** The same way with connections that are kept, or without. */
+    virtual boost::shared_ptr<const Transport> WithReuse(
+        const boost::optional<ConnectionReuse>& reuse) const = 0;
 
 protected:
     ~Transport() = default;

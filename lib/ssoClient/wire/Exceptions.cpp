@@ -8,5 +8,6 @@ ParseException::~ParseException() = default;
 InvalidSignatureException::~InvalidSignatureException() = default;
 CommunicationException::~CommunicationException() = default;
 InvalidCredentialsException::~InvalidCredentialsException() = default;
+CancelledException::~CancelledException() = default;
 
 } // namespace SsoClient

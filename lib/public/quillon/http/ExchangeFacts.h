@@ -41,9 +41,17 @@ struct ExchangeFacts
      */
     std::list<Ref<const Crypto::Certificate>> certificates;
 
+    bool isConnectionReused = false; ///< whether the connection was there already
+    bool isSessionResumed = false;   ///< whether the connection took up an earlier TLS session
+    bool isSent = false;             ///< whether the request, or a part of it, went out
+    long long sentOctets = 0;        ///< of the request's body
+    long long receivedOctets = 0;    ///< of the reply's body, as it came
+
     int status = 0;                         ///< of the reply; 0 without one
     std::string location;                   ///< where the reply redirects to [RFC 9110 10.2.2]
     boost::optional<System::DateTime> date; ///< by the server's clock [RFC 9110 6.6.1]
+    /** In how many seconds to come again, by the reply's own clock [RFC 9110 10.2.3]. */
+    boost::optional<long long> retryAfterSeconds;
     std::string failure; ///< the text of the exception that the exchange ends with
 };
 

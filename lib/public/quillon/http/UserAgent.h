@@ -34,6 +34,15 @@ class QUILLON_API HttpConnectionPool : public RefCounted
 QUILLON_API void CreateHttpConnectionPool(ConnectionSpec* spec, Ref<HttpConnectionPool>& out);
 
 /**
+ * The same for a pool that closes all of its connections once it has had nothing to do for a time.
+ *
+ * @param idleLimit  in microseconds; positive.
+ * @throws InvalidArgumentException  it is not positive.
+ */
+QUILLON_API void CreateHttpConnectionPool(
+    ConnectionSpec* spec, long long idleLimit, Ref<HttpConnectionPool>& out);
+
+/**
  * Sends requests to one server, over HTTP/1.1.
  *
  * Nothing outside the arguments has a say in an exchange: no environment, proxy or .netrc.

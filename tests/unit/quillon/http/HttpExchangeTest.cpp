@@ -632,3 +632,82 @@ TEST(Post, SendsNoCredentialsAfterAChallenge)
 }
 
 } // namespace
+
+namespace {
+
+Ref<HttpConnectionPool> MakePool(const Ref<ConnectionSpec>& spec, long long idleLimit)
+{
+    Ref<HttpConnectionPool> pool;
+    CreateHttpConnectionPool(spec.get(), idleLimit, pool);
+    return pool;
+}
+
+} // namespace
+
+TEST(ConnectionPool, ClosesWhatIsIdleForTooLong)
+{
+    std::promise<void> isClosed;
+    std::atomic<int> closed{0};
+    const TestServer server([&](ServerConnection& connection) {
+        while (connection.ReadRequest()) {
+            connection.Write(MakeReply("200 OK", "pong"));
+        }
+        if (closed++ == 0) {
+            isClosed.set_value();
+        }
+    });
+    const Ref<ConnectionSpec> spec = MakeTcpSpec(server);
+    const Ref<HttpConnectionPool> pool = MakePool(spec, Short);
+    HttpClient client(spec, pool.get());
+    EXPECT_EQ(client.Post().body, "pong");
+    EXPECT_TRUE(HasHappened(isClosed));
+    EXPECT_EQ(client.Post().body, "pong"); // over another connection
+    EXPECT_EQ(server.GetConnectionCount(), 2);
+}
+
+TEST(ConnectionPool, KeepsWhatIsNotIdleForLong)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
+    const Ref<ConnectionSpec> spec = MakeTcpSpec(server);
+    const Ref<HttpConnectionPool> pool = MakePool(spec, Generous);
+    const Ref<HttpConnectionPool> shortLived = MakePool(spec, Short); // another one's limit
+    for (int i = 0; i < 3; ++i) {
+        EXPECT_EQ(HttpClient(spec, pool.get()).Post().body, "pong");
+    }
+    EXPECT_EQ(server.GetConnectionCount(), 1);
+}
+
+TEST(ConnectionPool, DoesNotCloseWhatIsInUse)
+{
+    std::promise<void> idleIsClosed;
+    std::atomic<bool> isFirst{true};
+    const TestServer server([&](ServerConnection& connection) {
+        while (const auto request = connection.ReadRequest()) {
+            if (request->body == "wait") {
+                // The other pool has been closed for being idle by the time of this answer.
+                EXPECT_TRUE(HasHappened(idleIsClosed));
+            }
+            connection.Write(MakeReply("200 OK", "pong"));
+        }
+        if (isFirst.exchange(false)) {
+            idleIsClosed.set_value();
+        }
+    });
+    const Ref<ConnectionSpec> spec = MakeTcpSpec(server);
+    const Ref<HttpConnectionPool> busy = MakePool(spec, Short);
+    const Ref<HttpConnectionPool> idle = MakePool(spec, Short);
+    EXPECT_EQ(HttpClient(spec, idle.get()).Post().body, "pong");
+    EXPECT_EQ(HttpClient(spec, busy.get()).Post(HttpClient::MakeRequest("wait")).body, "pong");
+}
+
+TEST(ConnectionPool, RefusesALimitThatIsNone)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
+    const Ref<ConnectionSpec> spec = MakeTcpSpec(server);
+    for (const long long limit : {0, -1}) {
+        EXPECT_EQ(
+            GetArgumentError([&] { MakePool(spec, limit); }),
+            "Invalid argument : The idle limit of " + std::to_string(limit)
+                + " microseconds is not positive.");
+    }
+}

@@ -93,6 +93,67 @@ TEST(Observer, IsToldOfAnAnswer)
     EXPECT_TRUE(facts.certificates.empty());
 }
 
+TEST(Observer, IsToldWhatWentOverTheWire)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong pong")));
+    const ExchangeFacts facts = Observe(MakeTcpSpec(server));
+    EXPECT_EQ(facts.sentOctets, 4); // ping
+    EXPECT_EQ(facts.receivedOctets, 9);
+    EXPECT_TRUE(facts.isSent);
+    EXPECT_FALSE(facts.isConnectionReused);
+    EXPECT_FALSE(facts.isSessionResumed);
+    EXPECT_FALSE(facts.retryAfterSeconds);
+}
+
+TEST(Observer, IsToldThatNothingWasSent)
+{
+    Ref<ConnectionSpec> spec;
+    CreateTCPConnectionSpec("127.0.0.1", 1, false, spec);
+    const ExchangeFacts facts = Observe(spec);
+    EXPECT_FALSE(facts.isSent);
+    EXPECT_FALSE(facts.isConnectionReused);
+    EXPECT_EQ(facts.times.connection, 0);
+    EXPECT_EQ(facts.sentOctets, 0);
+}
+
+TEST(Observer, IsToldOfAConnectionThatWasThere)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
+    HttpClient client(MakeTcpSpec(server));
+    client.Post();
+    std::promise<ExchangeFacts> told;
+    const Ref<ClientRequest> request = HttpClient::MakeRequest("ping", "/sts");
+    request->SetObserver([&](const ExchangeFacts& facts) { told.set_value(facts); });
+    client.Post(request);
+    const ExchangeFacts facts = told.get_future().get();
+    EXPECT_TRUE(facts.isConnectionReused);
+    EXPECT_TRUE(facts.isSent);
+    EXPECT_EQ(facts.times.handshake, 0);
+}
+
+TEST(Observer, IsToldWhenToComeAgain)
+{
+    const std::string date = "Date: Fri, 20 Nov 2026 12:00:00 GMT\r\n";
+    const auto observe = [&](const std::string& fields) {
+        const TestServer server(AnswerAll(MakeReply("503 Busy", "", fields)));
+        return Observe(MakeTcpSpec(server)).retryAfterSeconds.value_or(-1);
+    };
+    EXPECT_EQ(observe("Retry-After: 120\r\n"), 120);
+    EXPECT_EQ(observe("retry-after: 0\r\n"), 0);
+    EXPECT_EQ(observe("Retry-After: Fri, 20 Nov 2026 12:00:07 GMT\r\n" + date), 7);
+    EXPECT_EQ(observe("Retry-After: Fri, 20 Nov 2026 11:59:59 GMT\r\n" + date), 0);
+    for (const std::string value :
+         {"",
+          "-1",
+          "1.5",
+          "12 s",
+          "soon",
+          "99999999999999999999",
+          "Fri, 20 Nov 2026 12:00:07 GMT"}) {
+        EXPECT_EQ(observe("Retry-After: " + value + "\r\n"), -1) << value;
+    }
+}
+
 TEST(Observer, IsToldTheTimesInTheirOrder)
 {
     const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
@@ -144,6 +205,16 @@ TEST_F(ObservedTls, TellsTheChainAndTheVersion)
     EXPECT_THAT(facts.tlsCipher, StartsWith("TLS_"));
     EXPECT_EQ(facts.status, 200);
     EXPECT_GT(facts.times.handshake, facts.times.connection);
+}
+
+TEST_F(ObservedTls, TellsThatASessionIsTakenUpAgain)
+{
+    const Ref<ConnectionSpec> spec = MakeSpec(authority);
+    const ExchangeFacts first = Observe(spec);
+    EXPECT_FALSE(first.isSessionResumed);
+    const ExchangeFacts second = Observe(spec);
+    EXPECT_TRUE(second.isSessionResumed);
+    EXPECT_FALSE(second.isConnectionReused);
 }
 
 TEST_F(ObservedTls, TellsTheChainThatIsRefused)

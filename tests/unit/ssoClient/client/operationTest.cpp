@@ -16,7 +16,7 @@ TEST(Run, LogsWhatIsAskedForBetweenBeginAndEnd)
     EXPECT_EQ(
         7,
         SsoClient::Run(
-            "Name", [] { return "description"; }, [] { return 7; }));
+            nullptr, "Name", [] { return "description"; }, [](Call&) { return 7; }));
     EXPECT_THAT(
         log.lines,
         ElementsAre(
@@ -33,10 +33,16 @@ TEST(Run, DescribesNothingBelowLevel64)
         ++descriptions;
         return "description";
     };
-    SsoClient::Run("Name", describe, [] {});
+    SsoClient::Run(nullptr, "Name", describe, [](Call&) {});
     const FakeTransport transport;
+    const boost::shared_ptr<const ResponseHandler> handler =
+        boost::make_shared<ReplyIsToken>(transport);
     SsoClient::Run(
-        transport, "Name", describe, [](Request&) {}, [](Quillon::Reader*) {});
+        Road{nullptr, transport, handler},
+        "Name",
+        describe,
+        [](Request&) {},
+        [](const ResponseHandler&, Quillon::Reader*) {});
     EXPECT_EQ(0, descriptions);
     EXPECT_EQ(transport.sessionsMade, 1);
 }
@@ -44,15 +50,18 @@ TEST(Run, DescribesNothingBelowLevel64)
 TEST(Run, BuildsThenConnectsThenReads)
 {
     const FakeTransport transport;
+    const boost::shared_ptr<const ResponseHandler> handler =
+        boost::make_shared<ReplyIsToken>(transport);
     const int result = SsoClient::Run(
-        transport,
+        Road{nullptr, transport, handler},
         "Name",
         [] { return "description"; },
         [&](Request& request) {
             EXPECT_EQ(transport.sessionsMade, 0);
             request.body = "built";
         },
-        [&](Quillon::Reader*) {
+        [&](const ResponseHandler& reader, Quillon::Reader*) {
+            EXPECT_EQ(&reader, handler.get());
             EXPECT_EQ(transport.sent.at(0).body, "built");
             EXPECT_EQ(transport.sessionsAlive, 0);
             return 7;
@@ -63,10 +72,10 @@ TEST(Run, BuildsThenConnectsThenReads)
 TEST(Run, LogsTheEndOfWhatFails)
 {
     const LogCapture log(64);
-    const auto fail = [] { throw std::runtime_error("failed"); };
+    const auto fail = [](Call&) { throw std::runtime_error("failed"); };
     EXPECT_EQ("runtime_error: failed", GetFailure([&fail] {
                   SsoClient::Run(
-                      "Name", [] { return "description"; }, fail);
+                      nullptr, "Name", [] { return "description"; }, fail);
               }));
     EXPECT_THAT(log.lines.back(), ContainsRegex(FrameLinePattern("END", "Name")));
 }

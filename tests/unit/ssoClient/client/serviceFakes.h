@@ -9,6 +9,7 @@
 #include <gtest/gtest.h>
 
 #include <deque>
+#include <functional>
 #include <string>
 #include <utility>
 #include <vector>
@@ -28,17 +29,36 @@ public:
     mutable int sessionsMade = 0;
     mutable int sessionsAlive = 0;
 
+    /** Called with what the call says of its session before a request is answered; may be empty. */
+    std::function<void(const SsoClient::SessionOptions&)> onSend;
+    mutable boost::optional<SsoClient::ConnectionReuse> reuse;
+
     boost::shared_ptr<SsoClient::TransportSession> CreateSession() const override
     {
-        return boost::make_shared<Session>(*this);
+        return CreateControlledSession({});
+    }
+
+    boost::shared_ptr<SsoClient::TransportSession> CreateControlledSession(
+        const SsoClient::SessionOptions& options) const override
+    {
+        return boost::make_shared<Session>(*this, options);
+    }
+
+    /** This one, which the tests keep. */
+    boost::shared_ptr<const SsoClient::Transport> WithReuse(
+        const boost::optional<SsoClient::ConnectionReuse>& connectionReuse) const override
+    {
+        reuse = connectionReuse;
+        return {boost::shared_ptr<const SsoClient::Transport>(), this};
     }
 
 private:
     class Session final : public SsoClient::TransportSession
     {
     public:
-        explicit Session(const FakeTransport& transport)
+        Session(const FakeTransport& transport, const SsoClient::SessionOptions& options)
             : _transport(transport)
+            , _options(options)
         {
             ++_transport.sessionsMade;
             ++_transport.sessionsAlive;
@@ -49,6 +69,9 @@ private:
             const SsoClient::Request& request, Quillon::Ref<Quillon::Reader>& response) override
         {
             _transport.sent.push_back(request);
+            if (_transport.onSend) {
+                _transport.onSend(_options);
+            }
             if (_transport.failure) {
                 _transport.failure->Throw();
             }
@@ -65,6 +88,7 @@ private:
 
     private:
         const FakeTransport& _transport;
+        const SsoClient::SessionOptions _options;
     };
 
     std::string TakeReply() const
@@ -107,6 +131,12 @@ public:
     void HandleSPNegoResponse(Quillon::Reader*, SsoClient::SPNegoResponse&) const override
     {
         FAIL() << "An operation without negotiation negotiated.";
+    }
+
+    boost::shared_ptr<const SsoClient::ResponseHandler> ShowingFaultsTo(
+        const SsoClient::FaultObserver&) const override
+    {
+        return {boost::shared_ptr<const SsoClient::ResponseHandler>(), this};
     }
 
 private:

@@ -564,6 +564,147 @@ TEST(TransportSession, OutlivesItsClient)
     EXPECT_EQ("body", Send(*session));
 }
 
+namespace {
+
+boost::shared_ptr<const Transport> MakeReusing(const TestServer& server, unsigned mostIdle = 8)
+{
+    return MakeClient(server).WithReuse(ConnectionReuse{mostIdle, Generous});
+}
+
+} // namespace
+
+TEST(ReusingTransport, GivesAConnectionToOneSessionAfterTheOther)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "body")));
+    const auto transport = MakeReusing(server);
+    for (int i = 0; i < 3; ++i) {
+        EXPECT_EQ("body", Send(*transport->CreateSession()));
+    }
+    EXPECT_EQ(1, server.GetConnectionCount());
+}
+
+TEST(ReusingTransport, GivesNoCookiesWithTheConnection)
+{
+    std::atomic<int> count{0};
+    const TestServer server(GiveCookies(count));
+    const auto transport = MakeReusing(server);
+    EXPECT_EQ("none", Send(*transport->CreateSession()));
+    EXPECT_EQ("none", Send(*transport->CreateSession()));
+    EXPECT_EQ(1, server.GetConnectionCount());
+}
+
+TEST(ReusingTransport, GivesAConnectionToOneSessionAtATime)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "body")));
+    const auto transport = MakeReusing(server);
+    const auto first = transport->CreateSession();
+    const auto second = transport->CreateSession();
+    for (int i = 0; i < 2; ++i) {
+        Send(*first);
+        Send(*second);
+    }
+    EXPECT_EQ(2, server.GetConnectionCount());
+}
+
+TEST(ReusingTransport, KeepsNoMoreThanItShould)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "body")));
+    const auto transport = MakeReusing(server, 1);
+    {
+        const auto first = transport->CreateSession();
+        const auto second = transport->CreateSession();
+        Send(*first);
+        Send(*second);
+    }
+    const auto first = transport->CreateSession();
+    const auto second = transport->CreateSession();
+    Send(*first);
+    Send(*second);
+    EXPECT_EQ(3, server.GetConnectionCount());
+}
+
+TEST(ReusingTransport, DoesNotPassOnTheConnectionOfANegotiation)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "body")));
+    const auto transport = MakeReusing(server);
+    SessionOptions options;
+    options.isNegotiation = true;
+    {
+        const auto negotiation = transport->CreateControlledSession(options);
+        Send(*negotiation);
+        Send(*negotiation);
+        EXPECT_EQ(1, server.GetConnectionCount());
+    }
+    Send(*transport->CreateSession());
+    EXPECT_EQ(2, server.GetConnectionCount());
+}
+
+TEST(ReusingTransport, SharesNothingWithAnother)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "body")));
+    const auto transport = MakeReusing(server);
+    Send(*transport->CreateSession());
+    Send(*transport->WithReuse(ConnectionReuse())->CreateSession());
+    EXPECT_EQ(2, server.GetConnectionCount());
+    const auto without = transport->WithReuse(boost::none);
+    Send(*without->CreateSession());
+    Send(*without->CreateSession());
+    EXPECT_EQ(4, server.GetConnectionCount());
+}
+
+TEST(ControlledSession, HasNoLongerThanIsLeft)
+{
+    const TestServer server([](ServerConnection& connection) { connection.WaitForClose(); });
+    SessionOptions options;
+    options.timeLeft = [] { return Short; };
+    const auto session = MakeClient(server).CreateControlledSession(options);
+    Ref<Reader> response;
+    EXPECT_THROW(session->SendRequest(MakeRequest(), response), Quillon::Http::TimeoutException);
+    options.timeLeft = [] { return Generous; };
+    const auto ownLimit = MakeClient(server, Short).CreateControlledSession(options);
+    EXPECT_THROW(ownLimit->SendRequest(MakeRequest(), response), Quillon::Http::TimeoutException);
+}
+
+TEST(ControlledSession, EndsWhenItsExchangeIsCalledOff)
+{
+    std::promise<void> isSent;
+    const TestServer server([&](ServerConnection& connection) {
+        connection.ReadRequest();
+        isSent.set_value();
+        connection.WaitForClose();
+    });
+    std::promise<Ref<Quillon::System::ScheduledItem>> pending;
+    SessionOptions options;
+    options.onPending = [&](const Ref<Quillon::System::ScheduledItem>& item) {
+        pending.set_value(item);
+    };
+    const auto session = MakeClient(server).CreateControlledSession(options);
+    std::thread canceller([&] {
+        isSent.get_future().wait();
+        pending.get_future().get()->Cancel();
+    });
+    Ref<Reader> response;
+    EXPECT_THROW(session->SendRequest(MakeRequest(), response), Quillon::Http::HttpException);
+    canceller.join();
+}
+
+TEST(ControlledSession, TellsBothObservers)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "body")));
+    std::vector<std::string> told;
+    ExchangeOptions own;
+    own.observer = [&](const auto&) { told.push_back("transport's"); };
+    SessionOptions options;
+    options.observer = [&](const auto&) { told.push_back("call's"); };
+    const HttpsClient client(server.GetUrl("/sts"), nullptr, "", own);
+    Send(*client.CreateControlledSession(options));
+    EXPECT_THAT(told, testing::ElementsAre("call's", "transport's"));
+    Send(*client.CreateSession());
+    EXPECT_EQ(told.size(), 3U);
+    Send(*MakeClient(server).CreateControlledSession(options));
+    EXPECT_EQ(told.back(), "call's");
+}
+
 TEST(HttpsClient, TalksTlsToTheExpectedPeerOnly)
 {
     CertificateOptions options;

@@ -75,6 +75,18 @@ boost::shared_ptr<TransportSession> HttpsClient::CreateSession() const
     return boost::make_shared<MuteSession>();
 }
 
+boost::shared_ptr<TransportSession> HttpsClient::CreateControlledSession(
+    const SessionOptions&) const
+{
+    return CreateSession();
+}
+
+boost::shared_ptr<const Transport> HttpsClient::WithReuse(
+    const boost::optional<ConnectionReuse>&) const
+{
+    return boost::make_shared<HttpsClient>(*this);
+}
+
 } // namespace SsoClient
 
 namespace {

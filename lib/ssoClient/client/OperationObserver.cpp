@@ -1,0 +1,21 @@
+#include "ssoClient/OperationObserver.h"
+
+namespace SsoClient {
+
+OperationObserver::~OperationObserver() = default;
+
+void OperationObserver::OnBegin(const ObservedOperation& /*operation*/) noexcept {}
+
+void OperationObserver::OnExchange(
+    const ObservedOperation& /*operation*/, const Quillon::Http::ExchangeFacts& /*facts*/) noexcept
+{}
+
+void OperationObserver::OnFault(
+    const ObservedOperation& /*operation*/, const SoapFault& /*fault*/) noexcept
+{}
+
+void OperationObserver::OnEnd(
+    const ObservedOperation& /*operation*/, const OperationOutcome& /*outcome*/) noexcept
+{}
+
+} // namespace SsoClient
