@@ -1,6 +1,5 @@
 #include "ssoClient/client/Call.h"
 
-#include "quillon/MessageFormatter.h"
 #include "quillon/http/HttpException.h"
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/client/cancelling.h"
@@ -180,9 +179,10 @@ void Call::RequireLeave() const
 {
     RequireNotCancelled();
     if (_deadline && GetTimeLeft() <= 0) {
-        throw Quillon::Http::TimeoutException(Quillon::MessageFormatter::ASPrint(
-            "The operation was not complete within its %1 milliseconds.",
-            _control->options.deadlineMicroseconds / MicrosecondsPerMillisecond));
+        const long long limit = _control->options.deadlineMicroseconds / MicrosecondsPerMillisecond;
+        throw Quillon::Http::TimeoutException(
+            "The operation was not complete within its " + std::to_string(limit)
+            + " milliseconds.");
     }
 }
 

@@ -32,16 +32,11 @@ public:
     }
 };
 
-[[noreturn]] void Refuse(const std::string& what, long long microseconds, const char* rule)
-{
-    throw Quillon::InvalidArgumentException(
-        what + " of " + std::to_string(microseconds) + " microseconds is " + rule + ".");
-}
-
 void RequireNotNegative(const std::string& what, long long microseconds)
 {
     if (microseconds < 0) {
-        Refuse(what, microseconds, "negative");
+        throw Quillon::InvalidArgumentException(
+            what + std::to_string(microseconds) + " microseconds is negative.");
     }
 }
 
@@ -64,17 +59,17 @@ CallControl CallControl::Started() const
 
 void RequireValid(const CallOptions& options)
 {
-    RequireNotNegative("The deadline", options.deadlineMicroseconds);
-    RequireNotNegative("The first delay of retries", options.retry.firstDelayMicroseconds);
-    RequireNotNegative("The longest delay of retries", options.retry.longestDelayMicroseconds);
+    RequireNotNegative("The deadline of ", options.deadlineMicroseconds);
+    RequireNotNegative("The first delay of retries of ", options.retry.firstDelayMicroseconds);
+    RequireNotNegative("The longest delay of retries of ", options.retry.longestDelayMicroseconds);
     if (options.retry.attempts == 0) {
         throw Quillon::InvalidArgumentException("There are no attempts: 1 is one without retries.");
     }
     if (options.connectionReuse && options.connectionReuse->idleMicroseconds <= 0) {
-        Refuse(
-            "The idle limit of connections",
-            options.connectionReuse->idleMicroseconds,
-            "not positive");
+        throw Quillon::InvalidArgumentException(
+            "The idle limit of connections of "
+            + std::to_string(options.connectionReuse->idleMicroseconds)
+            + " microseconds is not positive.");
     }
 }
 
