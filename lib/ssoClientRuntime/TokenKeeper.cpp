@@ -67,6 +67,8 @@ void RunSomewhere(RuntimeEnvironment& environment, const RuntimeEnvironment::Wor
         work();
     } catch (const std::exception& error) {
         Warn(std::string("A completion raised ") + error.what());
+    } catch (...) {
+        Warn("A completion raised something that is not an exception");
     }
 }
 
@@ -411,6 +413,8 @@ void TokenKeeper::Report(const Outcome& outcome) const
         }
     } catch (const std::exception& error) {
         Warn(std::string("The observer of a token source raised ") + error.what());
+    } catch (...) {
+        Warn("The observer of a token source raised something that is not an exception");
     }
 }
 

@@ -14,6 +14,9 @@ namespace SsoClient {
  * Where the objects of this library take time, chance and threads from, so that a test can put
  * virtual ones in their place. Without a word they use those of the process.
  *
+ * The clocks and `DrawNumber` are asked while locks are held: they must not come back to the object
+ * that asks.
+ *
  * There is no virtual destructor: an environment is only owned by the pointer it was made into.
  *
  * Thread safety: called by any number of threads.

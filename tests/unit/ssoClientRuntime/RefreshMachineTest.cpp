@@ -121,6 +121,16 @@ TEST_F(RefreshMachineTest, SpreadsTheFirstRefreshMoreWidely)
     EXPECT_NEAR(42.0, Seconds(PassUntilDue()) / 60, 0.01) << "out of turn";
 }
 
+TEST_F(RefreshMachineTest, DrawsTheFirstRefreshLikeAnyOtherIfItIsToldTo)
+{
+    policy.spreadsFirst = false;
+    machine = RefreshMachine(policy, [] { return 0.0; });
+    machine.Want();
+    machine.Begin(now);
+    Arrive();
+    EXPECT_NEAR(0.9 * 42 * 60, Seconds(PassUntilDue()), 0.01);
+}
+
 TEST_F(RefreshMachineTest, RefreshesWhileThereIsTimeLeftOfAShortToken)
 {
     machine.Begin(now);

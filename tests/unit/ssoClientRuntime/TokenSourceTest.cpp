@@ -490,7 +490,10 @@ TEST_F(TokenSourceTest, TellsItsObserverOfEachAttempt)
     std::vector<std::string> told;
     options.observer = [&](const TokenSourceStatus& status) {
         told.push_back(status.outage.reason ? status.outage.reason->what() : status.token->GetId());
-        throw std::runtime_error("on purpose");
+        if (told.size() == 1) {
+            throw std::runtime_error("on purpose");
+        }
+        throw 1;
     };
     const auto source = Make();
     source->GetToken();
@@ -501,6 +504,8 @@ TEST_F(TokenSourceTest, TellsItsObserverOfEachAttempt)
     EXPECT_EQ("no route", told[1]);
     EXPECT_EQ("The observer of a token source raised on purpose", log[0]);
     EXPECT_EQ("No token: HttpException: no route", log[1]);
+    EXPECT_EQ(
+        "The observer of a token source raised something that is not an exception", log[2]);
 }
 
 TEST_F(TokenSourceTest, HasOneAttemptUnderWayHoweverManyThreadsWait)
