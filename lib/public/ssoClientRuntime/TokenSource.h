@@ -79,8 +79,8 @@ struct TokenSourceOptions
     /**
      * While there is a good token nobody suffers, so the second failure in a row, and any further,
      * is answered with a wait of half to three quarters of the time that the token is still good
-     * for, up to this, if that is longer. 0: never. It keeps what is due in an outage from coming
-     * all at once when the service is back.
+     * for, but no more than this, unless the usual wait is longer anyway. 0: always the usual wait.
+     * It keeps what is due in an outage from coming all at once when the service is back.
      */
     std::chrono::milliseconds patience = std::chrono::minutes(15);
 
@@ -91,8 +91,8 @@ struct TokenSourceOptions
     Quillon::Ref<const Quillon::Crypto::Certificate> identity;
 
     /**
-     * Told after each attempt, well or not, on the thread that made it, by one attempt at a time;
-     * may be empty. What it throws is logged.
+     * Told after each attempt, well or not, on the thread that made it; may be empty. Two calls
+     * overlap if one takes longer than the next attempt. What it throws is logged.
      */
     std::function<void(const TokenSourceStatus&)> observer;
 
