@@ -1,10 +1,20 @@
 #include "ssoClientRuntime/ProcessEnvironment.h"
 
+#include "ScriptedService.h"
+
+#include "support/FakeSamlToken.h"
 #include "support/FixedClock.h"
 
+#include "quillon/system/Clock.h"
+#include "ssoClient/Exceptions.h"
+#include "ssoClientRuntime/TokenSource.h"
+
+#include <boost/smart_ptr/make_shared.hpp>
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <chrono>
+#include <cstdlib>
 #include <future>
 #include <memory>
 #include <thread>
@@ -88,6 +98,45 @@ TEST(ProcessEnvironment, RunsNothingMoreAfterItsEnd)
     GetProcessEnvironment()->RunAt(soon, [&] { later.set_value(); });
     later.get_future().get();
     EXPECT_FALSE(hasRun);
+}
+
+boost::shared_ptr<const SamlToken> MakeTokenOfAnHour()
+{
+    const auto token = boost::make_shared<FakeSamlToken>();
+    token->startDate = Quillon::System::GetUtcDateTime();
+    token->endDate = Testing::After(token->startDate, 1h);
+    return token;
+}
+
+TEST(ProcessEnvironment, HasSourcesRefreshByThemselves)
+{
+    // An attempt may go on when the source is gone.
+    const auto made = std::make_shared<std::atomic<int>>(0);
+    const auto third = std::make_shared<std::promise<void>>();
+    TokenSourceOptions options;
+    options.refreshAt = 0.00001; // of an hour
+    options.minWait = 1ms;
+    const auto source = CreateTokenSource(
+        [made, third] {
+            if (++*made == 3) {
+                third->set_value();
+            }
+            return MakeTokenOfAnHour();
+        },
+        options);
+    EXPECT_NE(nullptr, source->GetToken());
+    third->get_future().get();
+}
+
+TEST(ProcessEnvironmentDeathTest, LetsTheProcessEndWhileSourcesWait)
+{
+    const auto run = [] {
+        static const auto source = CreateTokenSource(
+            []() -> boost::shared_ptr<const SamlToken> { throw CommunicationException("no"); });
+        EXPECT_THROW(source->GetToken(), NoTokenException);
+        std::exit(3);
+    };
+    EXPECT_EXIT(run(), testing::ExitedWithCode(3), "");
 }
 
 } // namespace

@@ -504,8 +504,7 @@ TEST_F(TokenSourceTest, TellsItsObserverOfEachAttempt)
     EXPECT_EQ("no route", told[1]);
     EXPECT_EQ("The observer of a token source raised on purpose", log[0]);
     EXPECT_EQ("No token: HttpException: no route", log[1]);
-    EXPECT_EQ(
-        "The observer of a token source raised something that is not an exception", log[2]);
+    EXPECT_EQ("The observer of a token source raised something that is not an exception", log[2]);
 }
 
 TEST_F(TokenSourceTest, HasOneAttemptUnderWayHoweverManyThreadsWait)
