@@ -28,8 +28,8 @@ struct TokenWays
  * What a source consists of, kept alive by the work that it has queued. It asks a `RefreshMachine`
  * what is to be done, has it done, and tells those who wait.
  *
- * Under the lock nothing runs but code of its own, and the clocks and the chance of the environment.
- * Whatever belongs to users is put on a list and comes after it.
+ * Under the lock nothing runs but code of its own, and the clocks and the chance of the
+ * environment. Whatever belongs to users is put on a list and comes after it.
  *
  * Thread safety: any number of threads.
  */

@@ -9,7 +9,6 @@
 
 #include <algorithm>
 #include <system_error>
-#include <unistd.h>
 #include <utility>
 
 namespace SsoClient {
@@ -167,7 +166,7 @@ void TrustSet::Supply(const boost::shared_ptr<TokenVerifier>& verifier)
     verifier->SetTrustedCertificates(*Get());
 }
 
-void TrustSet::Follow(FileWatch& watch)
+void TrustSet::Follow(Quillon::System::FileWatch& watch)
 {
     do {
         // Looking begins before reading, so that no change falls between the two.
@@ -186,7 +185,7 @@ TrustStoreImpl::TrustStoreImpl(const std::string& path, const TrustStoreOptions&
 
 void TrustStoreImpl::StartThread(const std::string& path)
 {
-    _watch = std::make_shared<FileWatch>(path);
+    _watch = std::make_shared<Quillon::System::FileWatch>(path);
     const Quillon::System::SignalBlock noSignals;
     try {
         _thread = std::thread([set = _set, watch = _watch] { set->Follow(*watch); });
@@ -194,7 +193,6 @@ void TrustStoreImpl::StartThread(const std::string& path)
         throw Quillon::InvalidStateException(
             "There is no thread to follow changes of certificates with.");
     }
-    _pid = getpid();
 }
 
 TrustStoreImpl::~TrustStoreImpl()
@@ -202,7 +200,7 @@ TrustStoreImpl::~TrustStoreImpl()
     if (!_thread.joinable()) {
         return;
     }
-    const bool isOwn = _pid == getpid();
+    const bool isOwn = _watch->IsOwn();
     if (isOwn) {
         _watch->Stop();
     }

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "ssoClientRuntime/FileWatch.h"
+#include "quillon/system/FileWatch.h"
 #include "ssoClientRuntime/TrustStore.h"
 
 #include <boost/smart_ptr/weak_ptr.hpp>
@@ -28,7 +28,7 @@ public:
     std::string GetFailure() const;
 
     /** Reads the files whenever something changes, until the watch is stopped. */
-    void Follow(FileWatch& watch);
+    void Follow(Quillon::System::FileWatch& watch);
 
 private:
     void TakeOver(Certificates certificates);
@@ -69,9 +69,8 @@ private:
     void StartThread(const std::string& path);
 
     std::shared_ptr<TrustSet> _set;
-    std::shared_ptr<FileWatch> _watch; // null if changes are not followed
+    std::shared_ptr<Quillon::System::FileWatch> _watch; // null if changes are not followed
     std::thread _thread;
-    int _pid = 0; // of the process that has the thread
 };
 
 } // namespace SsoClient

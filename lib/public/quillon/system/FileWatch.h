@@ -1,20 +1,22 @@
 #pragma once
 
+#include "quillon/Export.h"
+
 #include <chrono>
 #include <string>
 
-namespace SsoClient {
+namespace Quillon::System {
 
 /**
  * Waits for changes of a file or of what is in a folder, as far as the system tells of them: by
  * inotify on the folder, and on the one around it, since files and links are renamed into place.
  *
- * Thread safety: `Stop` may be called by any thread, the rest by one.
+ * Thread safety: `Stop` and `IsOwn` may be called by any thread, the rest by one.
  */
-class FileWatch
+class QUILLON_API FileWatch
 {
 public:
-    /** @throws Quillon::InvalidStateException  there is no descriptor to be had. */
+    /** @throws InvalidStateException  there is no descriptor to be had. */
     explicit FileWatch(const std::string& path);
     FileWatch(const FileWatch&) = delete;
     FileWatch& operator=(const FileWatch&) = delete;
@@ -33,6 +35,9 @@ public:
     /** Ends this wait and all further ones. */
     void Stop() noexcept;
 
+    /** Whether it was made in this process, and not in the one that this one was forked from. */
+    bool IsOwn() const noexcept;
+
 private:
     void Close() noexcept;
 
@@ -40,6 +45,7 @@ private:
     std::string _folder; // around it
     int _changes = -1;   // inotify
     int _stop = -1;      // eventfd
+    int _pid = 0;        // of the process that made it
 };
 
-} // namespace SsoClient
+} // namespace Quillon::System

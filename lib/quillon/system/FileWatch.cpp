@@ -1,4 +1,4 @@
-#include "ssoClientRuntime/FileWatch.h"
+#include "quillon/system/FileWatch.h"
 
 #include "quillon/Exceptions.h"
 
@@ -12,7 +12,7 @@
 #include <sys/inotify.h>
 #include <unistd.h>
 
-namespace SsoClient {
+namespace Quillon::System {
 
 namespace {
 
@@ -40,11 +40,11 @@ FileWatch::FileWatch(const std::string& path)
     , _folder(std::filesystem::absolute(path).parent_path().string())
     , _changes(inotify_init1(IN_CLOEXEC | IN_NONBLOCK))
     , _stop(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK))
+    , _pid(getpid())
 {
     if (_changes < 0 || _stop < 0) {
         Close();
-        throw Quillon::InvalidStateException(
-            "There is no descriptor to follow changes of certificates with.");
+        throw InvalidStateException("There is no descriptor to follow changes of files with.");
     }
 }
 
@@ -83,4 +83,9 @@ void FileWatch::Stop() noexcept
     eventfd_write(_stop, 1);
 }
 
-} // namespace SsoClient
+bool FileWatch::IsOwn() const noexcept
+{
+    return _pid == getpid();
+}
+
+} // namespace Quillon::System
