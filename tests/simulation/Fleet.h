@@ -22,7 +22,7 @@ struct Scenario
     Span longestQueue = std::chrono::seconds(10); ///< what would wait longer is refused
     Span outageFrom = Span::max();
     Span outageFor{};
-    Span duration = std::chrono::hours(8);
+    Span duration = std::chrono::hours(6);
     std::uint64_t seed = 1;
 };
 

@@ -25,7 +25,7 @@ def draw(axes, requests, title, highest):
     axes.axhline(3 * STEADY, color="#888888", linewidth=0.8, linestyle="--", label="3 times that")
     axes.step(range(len(requests)), requests, where="post", color="#1f5f99", linewidth=1,
               label="requests a second")
-    axes.set(xlim=(0, 480), ylim=(0, highest), ylabel="requests a second", title=title)
+    axes.set(xlim=(0, 360), ylim=(0, highest), ylabel="requests a second", title=title)
 
 
 def main(program, picture):
