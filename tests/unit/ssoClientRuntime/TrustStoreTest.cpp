@@ -27,8 +27,6 @@ namespace {
 namespace fs = std::filesystem;
 using Quillon::Crypto::Certificate;
 
-constexpr char WhenTokensAreValid[] = "2026-06-15T12:00:00Z";
-
 std::string ReadCertificate(const std::string& name)
 {
     return ReadTestData("keys/" + name + "-cert.pem");
@@ -130,7 +128,7 @@ protected:
     const std::string client = GetFingerprint("client");
     boost::shared_ptr<Noting> observer = boost::make_shared<Noting>();
     TrustStoreOptions options;
-    FixedClock clock{WhenTokensAreValid};
+    FixedClock clock{"2026-06-15T12:00:00Z"}; // when the tokens of the test data are valid
 };
 
 } // namespace
