@@ -8,7 +8,10 @@ void RatioReporter::ReportRuns(const std::vector<Run>& runs)
 {
     for (const Run& run : runs) {
         if (run.run_type == Run::RT_Aggregate && run.aggregate_name == "median") {
-            _medians[run.run_name.function_name] = run.GetAdjustedCPUTime();
+            // What waits for a server is measured by the wall clock.
+            const bool isReal = !run.run_name.time_type.empty();
+            _medians[run.run_name.function_name] =
+                isReal ? run.GetAdjustedRealTime() : run.GetAdjustedCPUTime();
         }
     }
     ConsoleReporter::ReportRuns(runs);

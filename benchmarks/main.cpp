@@ -1,3 +1,4 @@
+#include "AcquireBenchmark.h"
 #include "RatioReporter.h"
 #include "SignBenchmark.h"
 #include "TokenSourceBenchmark.h"
@@ -14,6 +15,7 @@ int main(int argc, char** argv)
     Benchmarks::RegisterVerifyBenchmarks();
     Benchmarks::RegisterSignBenchmarks();
     Benchmarks::RegisterTokenSourceBenchmarks();
+    Benchmarks::RegisterAcquireBenchmarks();
     Benchmarks::RatioReporter reporter;
     benchmark::RunSpecifiedBenchmarks(&reporter);
     benchmark::Shutdown();
