@@ -121,7 +121,8 @@ class Readme(unittest.TestCase):
             stdout=subprocess.PIPE, stderr=subprocess.STDOUT)
         self.assertEqual(0, result.returncode, result.stdout)
         for text in ("export CMAKE_PREFIX_PATH=/opt/ssoclient\n",
-                     '"subject"', "valid\n", "uninstalled from /opt/ssoclient\n"):
+                     '"subject"', "valid\n", "Password for alice@EXAMPLE.TEST: ",
+                     "uninstalled from /opt/ssoclient\n"):
             self.assertIn(text, result.stdout)
 
     def test_the_lines_of_the_readme_are_those_that_run_prints(self):
