@@ -74,7 +74,10 @@ struct RequestedClaim
     bool isOptional = false; ///< a token without it will do
 };
 
-/** How the token of a reply is read, if not in the narrow way of `CreateSamlToken(xml, ...)`. */
+/**
+ * How the token of a reply is read, if not in the narrow way of `CreateSamlToken(xml, ...)`. With
+ * decryption keys in the rules it may be encrypted, but for one that a negotiation leads to.
+ */
 struct TokenReading
 {
     AssertionRules rules;

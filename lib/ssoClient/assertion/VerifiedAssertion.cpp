@@ -3,6 +3,7 @@
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/assertion/assertionReading.h"
 #include "ssoClient/assertion/decryption.h"
+#include "ssoClient/assertion/encryptionReading.h"
 #include "ssoClient/assertion/judging.h"
 #include "ssoClient/wire/wireNames.h"
 #include "ssoClient/wire/xmlReading.h"
@@ -82,7 +83,7 @@ public:
         Ref<Quillon::Xml::Document> document;
         ParseXML(xml, document);
         ElementNode& root = *document->GetRootElement();
-        if (root.HasQName("EncryptedAssertion", Wire::SamlNamespace)) {
+        if (GeneralReader::IsEncrypted(root)) {
             const Quillon::Wiped text = GeneralReader::DecryptAssertion(root, rules.decryptionKeys);
             return VerifyDecrypted(text.Get(), trusted, rules);
         }

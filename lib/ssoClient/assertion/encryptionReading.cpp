@@ -17,6 +17,7 @@ namespace {
 /** The number of keys is bounded: each costs an operation with every private key. */
 constexpr std::size_t MaxKeys = 16;
 
+constexpr char EncryptedData[] = "EncryptedData";
 constexpr char ElementType[] = "http://www.w3.org/2001/04/xmlenc#Element";
 constexpr std::string_view CbcSuffix = "-cbc";
 
@@ -198,16 +199,31 @@ void ReadEncryptedData(const ElementNode& element, EncryptedElement& encrypted)
     child.RequireEnd();
 }
 
-} // namespace
-
-EncryptedElement ReadEncryptedAssertion(const ElementNode& element)
+void ReadWithKeysBeside(const ElementNode& element, EncryptedElement& encrypted)
 {
     CheckAttributeNames(element, {});
     ElementCursor child(element);
-    EncryptedElement encrypted{};
-    ReadEncryptedData(child.TakeNamed("EncryptedData", Wire::XencNamespace), encrypted);
+    ReadEncryptedData(child.TakeNamed(EncryptedData, Wire::XencNamespace), encrypted);
     while (child.Get() != nullptr) {
         AddKey(child.TakeNamed("EncryptedKey", Wire::XencNamespace), encrypted);
+    }
+}
+
+} // namespace
+
+bool IsEncrypted(const ElementNode& element)
+{
+    return IsXenc(&element, EncryptedData)
+           || element.HasQName("EncryptedAssertion", Wire::SamlNamespace);
+}
+
+EncryptedElement ReadEncryptedAssertion(const ElementNode& element)
+{
+    EncryptedElement encrypted{};
+    if (IsXenc(&element, EncryptedData)) {
+        ReadEncryptedData(element, encrypted);
+    } else {
+        ReadWithKeysBeside(element, encrypted);
     }
     if (encrypted.keys.empty()) {
         throw ParseException(Describe(element) + " has no EncryptedKey");

@@ -23,8 +23,11 @@ struct EncryptedElement
     std::vector<EncryptedKey> keys; ///< the same key, for everyone who may have it
 };
 
+/** Whether the element is an `EncryptedAssertion` [SAML-CORE 2.3.4] or an `xenc:EncryptedData`. */
+bool IsEncrypted(const ElementNode& element);
+
 /**
- * Reads an `EncryptedAssertion` [SAML-CORE 2.3.4]. Nothing of it is trusted: nobody has signed it.
+ * Reads one of these. Nothing of it is trusted: nobody has signed it.
  *
  * @throws ParseException  it is not built as [XMLENC11] says, or uses something that is refused.
  */

@@ -71,6 +71,7 @@ auto ProcessResponseWith(Quillon::Reader* body, const ReplyForm& form, const Ext
 }
 
 constexpr char Collection[] = "RequestSecurityTokenResponseCollection";
+constexpr char RequestedToken[] = "RequestedSecurityToken";
 
 // The dialect may leave it to the service.
 bool IsOtherForm(const ElementNode& soapBody, const ServiceDialect& dialect, bool hasCollection)
@@ -79,30 +80,48 @@ bool IsOtherForm(const ElementNode& soapBody, const ServiceDialect& dialect, boo
     return dialect.anyReplyForm && isCollection != hasCollection;
 }
 
-std::string ExtractFromCollection(const ElementNode& soapBody)
+// An encrypted token is one only for a reading that can decrypt it.
+const ElementNode* FindEncrypted(const ElementNode& response, const ServiceDialect& dialect)
 {
-    return ToAssertionText(RequireDescendant(
-        soapBody,
-        {Collection, "RequestSecurityTokenResponse", "RequestedSecurityToken", "Assertion"}));
+    if (!dialect.reading || dialect.reading->rules.decryptionKeys.empty()) {
+        return nullptr;
+    }
+    const ElementNode* const assertion =
+        FindDescendant(response, {RequestedToken, "EncryptedAssertion"});
+    return assertion != nullptr ? assertion
+                                : FindDescendant(response, {RequestedToken, "EncryptedData"});
 }
 
-std::string ExtractFromSingleResponse(const ElementNode& soapBody)
+std::string ExtractToken(const ElementNode& response, const ServiceDialect& dialect)
 {
-    return ToAssertionText(RequireDescendant(
-        soapBody, {"RequestSecurityTokenResponse", "RequestedSecurityToken", "Assertion"}));
+    const ElementNode* const encrypted = FindEncrypted(response, dialect);
+    return ToAssertionText(
+        encrypted != nullptr ? *encrypted
+                             : RequireDescendant(response, {RequestedToken, "Assertion"}));
+}
+
+std::string ExtractFromCollection(const ElementNode& soapBody, const ServiceDialect& dialect)
+{
+    return ExtractToken(
+        RequireDescendant(soapBody, {Collection, "RequestSecurityTokenResponse"}), dialect);
+}
+
+std::string ExtractFromSingleResponse(const ElementNode& soapBody, const ServiceDialect& dialect)
+{
+    return ExtractToken(RequireDescendant(soapBody, {"RequestSecurityTokenResponse"}), dialect);
 }
 
 // Only an issue request is answered by a collection [WST13 4.3, 5].
 std::string ExtractIssuedToken(const ElementNode& soapBody, const ServiceDialect& dialect)
 {
-    return IsOtherForm(soapBody, dialect, true) ? ExtractFromSingleResponse(soapBody)
-                                                : ExtractFromCollection(soapBody);
+    return IsOtherForm(soapBody, dialect, true) ? ExtractFromSingleResponse(soapBody, dialect)
+                                                : ExtractFromCollection(soapBody, dialect);
 }
 
 std::string ExtractRenewedToken(const ElementNode& soapBody, const ServiceDialect& dialect)
 {
-    return IsOtherForm(soapBody, dialect, false) ? ExtractFromCollection(soapBody)
-                                                 : ExtractFromSingleResponse(soapBody);
+    return IsOtherForm(soapBody, dialect, false) ? ExtractFromCollection(soapBody, dialect)
+                                                 : ExtractFromSingleResponse(soapBody, dialect);
 }
 
 bool ExtractValidity(const ElementNode& soapBody, const ServiceDialect& dialect)

@@ -12,7 +12,10 @@ ASSERTIONS = DATA / "assertions"
 ENCRYPTED = DATA / "encrypted"
 sys.path.append(str(ASSERTIONS))
 
+sys.path.append(str(ENCRYPTED))
+
 from assertiongen import assertion, names  # noqa: E402
+from encryptedgen import document  # noqa: E402
 
 KEYS = ("sts", "sts-second", "sts-p256", "sts-p384", "sts-p521")
 TRUST = ["--trust", *(DATA / "keys" / f"{key}-cert.pem" for key in KEYS)]
@@ -191,6 +194,17 @@ class Decrypting(ProgramTest):
         self.assertIn("passage:", outside.err)
 
 
+def issue(service, token):
+    """Lets a scripted service issue a token."""
+    service.say(
+        '<s:Envelope xmlns:s="http://schemas.xmlsoap.org/soap/envelope/" '
+        'xmlns:t="http://docs.oasis-open.org/ws-sx/ws-trust/200512"><s:Body>'
+        "<t:RequestSecurityTokenResponseCollection><t:RequestSecurityTokenResponse>"
+        f"<t:RequestedSecurityToken>{token}</t:RequestedSecurityToken>"
+        "</t:RequestSecurityTokenResponse></t:RequestSecurityTokenResponseCollection>"
+        "</s:Body></s:Envelope>", status=200)
+
+
 def live(**changes):
     """An assertion of now, in a form that only the general reader takes."""
     def stamp(seconds):
@@ -199,6 +213,31 @@ def live(**changes):
            "conditions": {"start": stamp(-60), "end": stamp(3600), "audiences": []},
            "subject": {"value": "alice@example.com", "format": names.EMAIL}}
     return assertion.write(assertion.assertion(**{**now, **changes}))
+
+
+class EncryptedReplies(ScriptedTest):
+    OPTIONS = ("--subject", "email", "--domain", "d", "--lifetime", "3600")
+
+    def test_the_token_is_what_was_encrypted(self):
+        plain = live()
+        out = self.folder / "token.xml"
+        for unwrap in (False, True):
+            token = document.write(document.document(), plain)
+            if unwrap:
+                token = token[token.index("<xenc:"):token.rindex("</saml:")]
+            issue(self.service, token)
+            result = self.acquire(*self.OPTIONS, "--decrypt-key", key("client"), "--out", out)
+            self.assertEqual((DONE, ""), (result.code, result.err))
+            self.assertIn("subject={Name: alice; Domain:example.com}", result.out)
+            self.assertEqual(plain, out.read_text("utf-8"))
+
+    def test_without_its_key_it_is_refused(self):
+        issue(self.service, document.write(document.document(), live()))
+        result = self.acquire(*self.OPTIONS)
+        self.assert_fails(result, REFUSED, "SsoException", "Unexpected XML format")
+        result = self.acquire(*self.OPTIONS, "--decrypt-key", key("foreign"))
+        self.assert_fails(result, REFUSED, "SsoException",
+                          "The assertion cannot be decrypted with the keys of the rules")
 
 
 class Verbose(ScriptedTest):
@@ -214,13 +253,7 @@ class Verbose(ScriptedTest):
         self.token = self.write("token.xml", live())
 
     def reply(self, token):
-        self.service.say(
-            '<s:Envelope xmlns:s="http://schemas.xmlsoap.org/soap/envelope/" '
-            'xmlns:t="http://docs.oasis-open.org/ws-sx/ws-trust/200512"><s:Body>'
-            "<t:RequestSecurityTokenResponseCollection><t:RequestSecurityTokenResponse>"
-            f"<t:RequestedSecurityToken>{token}</t:RequestedSecurityToken>"
-            "</t:RequestSecurityTokenResponse></t:RequestSecurityTokenResponseCollection>"
-            "</s:Body></s:Envelope>", status=200)
+        issue(self.service, token)
 
     def inspect(self, token, *options):
         return ssoclient("inspect", token, *TRUST, *options)

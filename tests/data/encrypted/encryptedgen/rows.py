@@ -180,6 +180,13 @@ def _key_places():
          ("one-of-the-keys-by-rsa-1-5", document(
              keys=[key(to="sts-second", method=names.RSA_1_5), key(**beside)]),
           "is not accepted, expected RSA-OAEP"))
+    alone = [(f'<saml:EncryptedAssertion xmlns:saml="{names.SAML}">', ""),
+             ("</saml:EncryptedAssertion>", "")]
+    _row("data-alone", "in a reply of WS-Trust, the data in the place of the assertion", "WST13 4.4",
+         document(edit=alone),
+         ("data-alone-without-key", document(edit=alone, keys=[]),
+          "'xenc:EncryptedData' at 1,1 has no EncryptedKey"),
+         ("data-alone-tag-changed", document(edit=alone, change=_flip(-1)), CLOSED))
     _row("key-info-of-web-services", "a reference of WS-Security is a hint like any", "WSS-CORE 7",
          _with_key(key_info=f'<wsse:SecurityTokenReference xmlns:wsse="{names.WSSE}"/>'),
          ("key-with-properties", _with_key(after="<xenc:EncryptionProperties/>"),

@@ -4,6 +4,7 @@
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/wire/xmlReading.h"
 #include "support/Failure.h"
+#include "support/TestData.h"
 
 #include <gmock/gmock.h>
 
@@ -156,6 +157,30 @@ TEST(ReplyForm, IsLeftToTheServiceIfTheDialectSaysSo)
                 Quillon::CreateStringReader(Envelope("<x/>")).get(), issued);
         }),
         UnexpectedFormat);
+}
+
+TEST(ReplyForm, HasAnEncryptedTokenForAReadingThatDecrypts)
+{
+    ReplyForm form;
+    form.dialect.reading = TokenReading();
+    const auto read = [&form](const std::string& name) {
+        const std::string body = "<RequestSecurityTokenResponseCollection>"
+                                 "<RequestSecurityTokenResponse><RequestedSecurityToken><"
+                                 + name + ">x</" + name
+                                 + "></RequestedSecurityToken></RequestSecurityTokenResponse>"
+                                   "</RequestSecurityTokenResponseCollection>";
+        std::string issued;
+        ResponseHandlerImpl(form).HandleAcquireTokenResponse(
+            Quillon::CreateStringReader(Envelope(body)).get(), issued);
+        return issued;
+    };
+    for (const std::string name : {"EncryptedAssertion", "EncryptedData"}) {
+        form.dialect.reading->rules.decryptionKeys.clear();
+        EXPECT_EQ(::GetFailure([&] { read(name); }), UnexpectedFormat);
+        form.dialect.reading->rules.decryptionKeys = {GetTestKey("client")};
+        EXPECT_THAT(read(name), testing::EndsWith("\">x</" + name + ">"));
+        EXPECT_THAT(read("Assertion"), testing::EndsWith("\">x</Assertion>"));
+    }
 }
 
 TEST(ReplyForm, HasTheStatusOfItsTrust)
