@@ -19,7 +19,6 @@ using namespace SsoClient;
 
 namespace {
 
-constexpr char AlicesName[] = "alice@example.test";
 
 std::string Describe(const Quillon::Exception* error)
 {

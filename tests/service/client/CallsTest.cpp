@@ -18,7 +18,6 @@ using namespace SsoClient;
 
 namespace {
 
-constexpr char AlicesName[] = "alice@example.test";
 constexpr char Cancelled[] = "CancelledException: The operation was cancelled.";
 
 /** What the exchanges were like. */

@@ -15,6 +15,7 @@
 #include <vector>
 
 inline constexpr char Now[] = "2026-11-20T12:00:00Z";
+inline constexpr char AlicesName[] = "alice@example.test";
 inline constexpr char AlicesPassword[] = "alice-secret";
 inline constexpr char ServiceName[] = "service@example.test";
 
