@@ -263,9 +263,10 @@ private:
  * Verifies a SAML 2.0 assertion, then reads it, then judges it by the rules.
  *
  * An `EncryptedAssertion` [SAML-CORE 2.3.4], or the `xenc:EncryptedData` that token services send
- * in its place, is decrypted before, and what was in it must be one signed assertion. Accepted: AES-128, AES-192 and AES-256 in GCM, their keys by RSA-OAEP with
- * SHA-1, SHA-256, SHA-384 or SHA-512. Not accepted: CBC and PKCS #1 v1.5, which betray the text to
- * who sees how decrypting fails.
+ * in its place, is decrypted before, and what was in it must be one signed assertion. Accepted:
+ * AES-128, AES-192 and AES-256 in GCM, their keys by RSA-OAEP with SHA-1, SHA-256, SHA-384 or
+ * SHA-512. Not accepted: CBC and PKCS #1 v1.5, which betray the text to who sees how decrypting
+ * fails.
  *
  * Refused whatever the rules: a condition that is not known [SAML-CORE 2.5.1]; anything encrypted
  * in the assertion; an assertion without an end of validity; one whose subject has no confirmation

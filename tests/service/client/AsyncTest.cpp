@@ -19,7 +19,6 @@ using namespace SsoClient;
 
 namespace {
 
-
 std::string Describe(const Quillon::Exception* error)
 {
     return error == nullptr ? "" : Quillon::GetClassName(*error) + ": " + error->what();
