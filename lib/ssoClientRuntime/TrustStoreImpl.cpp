@@ -172,7 +172,7 @@ void TrustSet::Follow(Quillon::System::FileWatch& watch)
         // Looking begins before reading, so that no change falls between the two.
         watch.Begin();
         Reload();
-    } while (watch.Wait(_options.longestAge));
+    } while (watch.Wait(_options.longestAge) != Quillon::System::FileWatch::Outcome::STOPPED);
 }
 
 TrustStoreImpl::TrustStoreImpl(const std::string& path, const TrustStoreOptions& options)

@@ -25,12 +25,15 @@ public:
     /** Looks from now on: what changes after this is told by `Wait`. */
     void Begin() noexcept;
 
-    /**
-     * Waits until something changes, the time is over, or `Stop` is called.
-     *
-     * @return whether to go on; not after `Stop`.
-     */
-    bool Wait(std::chrono::milliseconds atMost) noexcept;
+    enum class Outcome
+    {
+        CHANGED,
+        TIME_IS_OVER,
+        STOPPED
+    };
+
+    /** Waits until something changes, the time is over, or `Stop` is called. */
+    Outcome Wait(std::chrono::milliseconds atMost) noexcept;
 
     /** Ends this wait and all further ones. */
     void Stop() noexcept;
@@ -40,12 +43,16 @@ public:
 
 private:
     void Close() noexcept;
+    bool TakeChanges() noexcept;
 
     std::string _path;
+    std::string _name;   // its last part
     std::string _folder; // around it
-    int _changes = -1;   // inotify
-    int _stop = -1;      // eventfd
-    int _pid = 0;        // of the process that made it
+    int _around = -1;    // the watch of that folder
+    bool _isFolder = false;
+    int _changes = -1; // inotify
+    int _stop = -1;    // eventfd
+    int _pid = 0;      // of the process that made it
 };
 
 } // namespace Quillon::System

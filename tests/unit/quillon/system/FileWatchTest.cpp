@@ -14,6 +14,7 @@ using Quillon::System::FileWatch;
 namespace {
 
 namespace fs = std::filesystem;
+using Outcome = FileWatch::Outcome;
 
 constexpr std::chrono::minutes Generous(10); // a wait that no passing test reaches the end of
 
@@ -41,30 +42,44 @@ TEST_F(Watched, TellsOfWhatChangesAfterItHasBegun)
     FileWatch watch(folder / "file");
     watch.Begin();
     Write("file");
-    EXPECT_TRUE(watch.Wait(Generous));
+    EXPECT_EQ(watch.Wait(Generous), Outcome::CHANGED);
     watch.Begin();
     fs::remove(folder / "file");
-    EXPECT_TRUE(watch.Wait(Generous));
+    EXPECT_EQ(watch.Wait(Generous), Outcome::CHANGED);
     watch.Begin(); // there is none
     Write("new");
     fs::rename(folder / "new", folder / "file");
-    EXPECT_TRUE(watch.Wait(Generous));
+    EXPECT_EQ(watch.Wait(Generous), Outcome::CHANGED);
 }
 
 TEST_F(Watched, TellsOfWhatIsInAFolder)
 {
-    FileWatch watch(folder);
+    for (const std::string& path :
+         {folder.string(), folder.string() + "/", folder.string() + "/."}) {
+        FileWatch watch(path);
+        watch.Begin();
+        Write("file");
+        EXPECT_EQ(watch.Wait(Generous), Outcome::CHANGED) << path;
+    }
+}
+
+TEST_F(Watched, TellsNothingOfWhatLiesBesideAFolder)
+{
+    fs::create_directory(folder / "watched");
+    FileWatch watch(folder / "watched");
     watch.Begin();
-    Write("file");
-    EXPECT_TRUE(watch.Wait(Generous));
+    Write("beside");
+    EXPECT_EQ(watch.Wait(std::chrono::milliseconds(1)), Outcome::TIME_IS_OVER);
+    fs::rename(folder / "watched", folder / "before");
+    EXPECT_EQ(watch.Wait(Generous), Outcome::CHANGED);
 }
 
 TEST_F(Watched, WaitsNoLongerThanItMay)
 {
     FileWatch watch(folder / "file");
     watch.Begin();
-    EXPECT_TRUE(watch.Wait(std::chrono::milliseconds(1)));
-    EXPECT_TRUE(watch.Wait(std::chrono::milliseconds(-1)));
+    EXPECT_EQ(watch.Wait(std::chrono::milliseconds(1)), Outcome::TIME_IS_OVER);
+    EXPECT_EQ(watch.Wait(std::chrono::milliseconds(-1)), Outcome::TIME_IS_OVER);
 }
 
 TEST_F(Watched, EndsEveryWaitWhenItIsStopped)
@@ -72,8 +87,8 @@ TEST_F(Watched, EndsEveryWaitWhenItIsStopped)
     FileWatch watch(folder);
     watch.Begin();
     std::thread stopper([&] { watch.Stop(); });
-    EXPECT_FALSE(watch.Wait(Generous));
-    EXPECT_FALSE(watch.Wait(Generous));
+    EXPECT_EQ(watch.Wait(Generous), Outcome::STOPPED);
+    EXPECT_EQ(watch.Wait(Generous), Outcome::STOPPED);
     stopper.join();
 }
 
