@@ -107,7 +107,7 @@ TokenVerifierImpl::Entry TokenVerifierImpl::MakeEntry(
 /** The object for the text: that of another thread, if it was sooner. */
 TokenVerifierImpl::Token TokenVerifierImpl::Keep(Entry entry, const Trust& trust)
 {
-    const Token token = entry.token;
+    Token token = entry.token;
     Entries gone; // after the lock
     const std::lock_guard<std::mutex> lock(_mutex);
     if (trust != _trust || entry.bytes > _options.maxBytes || _options.maxEntries == 0) {

@@ -44,7 +44,6 @@ bool EndsBy(const Certificate& certificate, long long momentUs)
 
 } // namespace
 
-TrustObserver::~TrustObserver() = default;
 void TrustObserver::OnAdded(const Certificate& /*certificate*/) noexcept {}
 void TrustObserver::OnRemoved(const Certificate& /*certificate*/) noexcept {}
 void TrustObserver::OnExpiring(const Certificate& /*certificate*/) noexcept {}

@@ -51,14 +51,13 @@ TrustStore::Certificates ReadTrustFiles(const std::string& path)
     const std::vector<std::string> files =
         fs::is_directory(path, none) ? ListFiles(path) : std::vector<std::string>{path};
     TrustStore::Certificates certificates;
-    std::set<std::string> known; // fingerprints
     for (const std::string& file : files) {
-        for (const auto& certificate : Quillon::Crypto::LoadPemCertificates(file)) {
-            if (known.insert(certificate->GetFingerprint()).second) {
-                certificates.push_back(certificate);
-            }
-        }
+        certificates.splice(certificates.end(), Quillon::Crypto::LoadPemCertificates(file));
     }
+    std::set<std::string> known; // fingerprints
+    certificates.remove_if([&known](const auto& certificate) {
+        return !known.insert(certificate->GetFingerprint()).second;
+    });
     return certificates;
 }
 

@@ -53,7 +53,7 @@ protected:
     OperationObserver() = default;
     OperationObserver(const OperationObserver&) = default;
     OperationObserver& operator=(const OperationObserver&) = default;
-    ~OperationObserver();
+    ~OperationObserver() = default;
 };
 
 } // namespace SsoClient

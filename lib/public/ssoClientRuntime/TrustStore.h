@@ -32,7 +32,7 @@ protected:
     TrustObserver() = default;
     TrustObserver(const TrustObserver&) = default;
     TrustObserver& operator=(const TrustObserver&) = default;
-    ~TrustObserver();
+    ~TrustObserver() = default;
 };
 
 struct TrustStoreOptions

@@ -186,6 +186,15 @@ void Call::RequireLeave() const
     }
 }
 
+/** Called while an exchange's failure is handled; throws it again if it is to stay with that. */
+void Call::RequireRepeat(Repeat rule, unsigned made)
+{
+    RequireLeave();
+    if (!MayRepeat(rule, made)) {
+        throw;
+    }
+}
+
 bool Call::MayRepeat(Repeat rule, unsigned made)
 {
     const boost::optional<ExchangeFacts> facts = _record->Take();

@@ -80,10 +80,7 @@ public:
                 RequireNotCancelled();
                 return result;
             } catch (const Quillon::Exception&) {
-                RequireLeave();
-                if (!MayRepeat(rule, made)) {
-                    throw;
-                }
+                RequireRepeat(rule, made);
             }
             Wait();
         }
@@ -107,6 +104,7 @@ private:
     long long GetTimeLeft() const;
     void RequireNotCancelled() const;
     void RequireLeave() const;
+    void RequireRepeat(Repeat rule, unsigned made);
     bool MayRepeat(Repeat rule, unsigned made);
     void Wait() const;
     long long ComputeDelay(unsigned attempt) const;

@@ -2,8 +2,6 @@
 
 namespace SsoClient {
 
-OperationObserver::~OperationObserver() = default;
-
 void OperationObserver::OnBegin(const ObservedOperation& /*operation*/) noexcept {}
 
 void OperationObserver::OnExchange(
