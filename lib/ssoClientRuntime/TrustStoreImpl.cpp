@@ -17,6 +17,9 @@ namespace {
 
 using Quillon::Crypto::Certificate;
 
+/** A thousand years: times can be added to it. */
+constexpr std::chrono::hours LongestNotice(24 * 365'250);
+
 bool Has(const TrustStore::Certificates& certificates, const Certificate& wanted)
 {
     return std::any_of(certificates.begin(), certificates.end(), [&](const auto& certificate) {
@@ -130,7 +133,8 @@ void TrustSet::TellExpiring()
     if (_options.observer == nullptr) {
         return;
     }
-    const auto notice = std::chrono::microseconds(_options.expiryNotice).count();
+    const auto notice =
+        std::chrono::microseconds(std::min(_options.expiryNotice, LongestNotice)).count();
     const long long moment = Quillon::System::GetUtcDateTime().GetUtcTime() + notice;
     const auto certificates = Get();
     for (const auto& certificate : *certificates) {
@@ -154,6 +158,9 @@ void TrustSet::Fail(const std::string& reason)
 
 void TrustSet::Supply(const boost::shared_ptr<TokenVerifier>& verifier)
 {
+    if (verifier == nullptr) {
+        throw Quillon::InvalidArgumentException("There is no verifier.");
+    }
     const std::lock_guard<std::mutex> lock(_reloading);
     _verifiers.erase(
         std::remove_if(

@@ -59,7 +59,8 @@ struct TrustStoreOptions
  *
  * A set is taken over whole or not at all: if a file cannot be read or decoded, or there is no
  * certificate, the last good set stays. Write a new file beside the old one and rename it; then
- * nobody reads half of it.
+ * nobody reads half of it. Every change in the folder around a file has it read again, because it
+ * may be reached by links there: let that folder not be a busy one.
  *
  * The store's thread ends with it, and takes no signals. A forked child has none; it still has the
  * set and `Reload`.
@@ -79,7 +80,11 @@ public:
     /** Reads the files now. @return whether they could be used. */
     virtual bool Reload() = 0;
 
-    /** Has a verifier trust what the store has, now and after each change, as long as both live. */
+    /**
+     * Has a verifier trust what the store has, now and after each change, as long as both live.
+     *
+     * @throws Quillon::InvalidArgumentException  the verifier is null.
+     */
     virtual void Supply(const boost::shared_ptr<TokenVerifier>& verifier) = 0;
 
     /** Why the files could not be used the last time; empty if they could. */

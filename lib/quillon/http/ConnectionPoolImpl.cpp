@@ -2,6 +2,7 @@
 
 #include "http/HttpEngine.h"
 
+#include <algorithm>
 #include <new>
 #include <utility>
 
@@ -40,6 +41,9 @@ void ConnectionPoolImpl::Leave() noexcept
 
 namespace {
 
+/** Longer than any process lives; the clock's unit is finer than this one's. */
+constexpr long long LongestIdleLimit = 1'000'000'000'000'000;
+
 Ref<const ConnectionSpecImpl> RequireSpec(ConnectionSpec* spec)
 {
     if (spec == nullptr) {
@@ -62,8 +66,8 @@ void CreateHttpConnectionPool(
         throw InvalidArgumentException(
             "The idle limit of " + std::to_string(idleLimit) + " microseconds is not positive.");
     }
-    out = Ref<HttpConnectionPool>(
-        new ConnectionPoolImpl(RequireSpec(spec), std::chrono::microseconds(idleLimit)));
+    const std::chrono::microseconds limit(std::min(idleLimit, LongestIdleLimit));
+    out = Ref<HttpConnectionPool>(new ConnectionPoolImpl(RequireSpec(spec), limit));
 }
 
 } // namespace Quillon::Http

@@ -21,6 +21,9 @@ namespace {
 constexpr std::uint32_t Changes = IN_CLOSE_WRITE | IN_CREATE | IN_DELETE | IN_MOVED_FROM
                                   | IN_MOVED_TO | IN_ATTRIB | IN_DELETE_SELF | IN_MOVE_SELF;
 
+/** Whoever waits for longer asks again; clocks can be added to it. */
+constexpr std::chrono::milliseconds LongestWait = std::chrono::hours(24);
+
 /** As many events as are read at a time; each has a name of at most NAME_MAX octets. */
 using EventBuffer = std::array<char, 16384>;
 
@@ -101,7 +104,7 @@ bool FileWatch::TakeChanges() noexcept
 FileWatch::Outcome FileWatch::Wait(std::chrono::milliseconds atMost) noexcept
 {
     using std::chrono::steady_clock;
-    const auto end = steady_clock::now() + atMost;
+    const auto end = steady_clock::now() + std::min(atMost, LongestWait);
     while (true) {
         const auto left = std::chrono::ceil<std::chrono::milliseconds>(end - steady_clock::now());
         std::array<pollfd, 2> polled{{{_changes, POLLIN, 0}, {_stop, POLLIN, 0}}};

@@ -13,7 +13,6 @@
 namespace SsoClient {
 
 class CallRecord;
-class CancellationWatch;
 
 /** When an exchange that failed may be made again. */
 enum class Repeat

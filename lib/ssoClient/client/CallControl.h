@@ -39,6 +39,9 @@ struct CallControl
     CallControl Started() const;
 };
 
+/** The same options with times that can be computed with: "for ever" becomes 31 years. */
+CallOptions Bound(const CallOptions& options);
+
 /** @throws Quillon::InvalidArgumentException  see `WithOptions`. */
 void RequireValid(const CallOptions& options);
 

@@ -4,6 +4,7 @@
 #include "ssoClient/client/SecurityTokenServiceImpl.h"
 #include "ssoClient/client/cancelling.h"
 
+#include <algorithm>
 #include <chrono>
 #include <random>
 
@@ -32,6 +33,14 @@ public:
     }
 };
 
+/** Longer than any process lives; clocks can be added to it. */
+constexpr long long LongestMicroseconds = 1'000'000'000'000'000;
+
+void BoundTime(long long& microseconds)
+{
+    microseconds = std::min(microseconds, LongestMicroseconds);
+}
+
 void RequireNotNegative(const std::string& what, long long microseconds)
 {
     if (microseconds < 0) {
@@ -46,6 +55,18 @@ const CallEnvironment& GetCallEnvironment()
 {
     static const ProcessEnvironment environment;
     return environment;
+}
+
+CallOptions Bound(const CallOptions& options)
+{
+    CallOptions bounded = options;
+    BoundTime(bounded.deadlineMicroseconds);
+    BoundTime(bounded.retry.firstDelayMicroseconds);
+    BoundTime(bounded.retry.longestDelayMicroseconds);
+    if (bounded.connectionReuse) {
+        BoundTime(bounded.connectionReuse->idleMicroseconds);
+    }
+    return bounded;
 }
 
 CallControl CallControl::Started() const
@@ -84,7 +105,7 @@ boost::shared_ptr<SecurityTokenService> WithOptions(
     }
     RequireValid(options);
     CallControl control;
-    control.options = options;
+    control.options = Bound(options);
     return ours->UnderControl(control);
 }
 

@@ -231,6 +231,21 @@ TEST_F(Trust, TellsOnceOfACertificateThatIsAboutToEnd)
     EXPECT_THAT(observer->Get(), ElementsAre("added " + sts, "expiring " + sts));
 }
 
+TEST_F(Trust, TakesTheLongestNoticeForEver)
+{
+    options.expiryNotice = std::chrono::hours::max();
+    CreateTrustStore(folder, options);
+    EXPECT_THAT(observer->Get(), ElementsAre("added " + sts, "expiring " + sts));
+}
+
+TEST_F(Trust, IsSuppliedToNobodyElse)
+{
+    const auto store = CreateTrustStore(folder, options);
+    EXPECT_EQ(
+        GetFailure([&] { store->Supply(nullptr); }),
+        "InvalidArgumentException: Invalid argument : There is no verifier.");
+}
+
 TEST_F(Trust, IsSuppliedToVerifiers)
 {
     const std::string xml = ReadTestData("tokens/accepted/bearer.xml");

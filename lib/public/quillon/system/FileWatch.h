@@ -32,7 +32,7 @@ public:
         STOPPED
     };
 
-    /** Waits until something changes, the time is over, or `Stop` is called. */
+    /** Waits until something changes, the time or a day is over, or `Stop` is called. */
     Outcome Wait(std::chrono::milliseconds atMost) noexcept;
 
     /** Ends this wait and all further ones. */

@@ -9,6 +9,7 @@
 #include <fcntl.h>
 #include <fstream>
 #include <future>
+#include <limits>
 #include <poll.h>
 
 using namespace Quillon::Http;
@@ -672,6 +673,17 @@ TEST(ConnectionPool, KeepsWhatIsNotIdleForLong)
     const Ref<HttpConnectionPool> pool = MakePool(spec, Generous);
     const Ref<HttpConnectionPool> shortLived = MakePool(spec, Short); // another one's limit
     for (int i = 0; i < 3; ++i) {
+        EXPECT_EQ(HttpClient(spec, pool.get()).Post().body, "pong");
+    }
+    EXPECT_EQ(server.GetConnectionCount(), 1);
+}
+
+TEST(ConnectionPool, KeepsForEverWhatMayBeIdleForEver)
+{
+    const TestServer server(AnswerAll(MakeReply("200 OK", "pong")));
+    const Ref<ConnectionSpec> spec = MakeTcpSpec(server);
+    const Ref<HttpConnectionPool> pool = MakePool(spec, std::numeric_limits<long long>::max());
+    for (int i = 0; i < 2; ++i) {
         EXPECT_EQ(HttpClient(spec, pool.get()).Post().body, "pong");
     }
     EXPECT_EQ(server.GetConnectionCount(), 1);

@@ -82,6 +82,15 @@ TEST_F(Watched, WaitsNoLongerThanItMay)
     EXPECT_EQ(watch.Wait(std::chrono::milliseconds(-1)), Outcome::TIME_IS_OVER);
 }
 
+TEST_F(Watched, MayWaitForEver)
+{
+    FileWatch watch(folder);
+    watch.Begin();
+    std::thread writer([&] { Write("file"); });
+    EXPECT_EQ(watch.Wait(std::chrono::milliseconds::max()), Outcome::CHANGED);
+    writer.join();
+}
+
 TEST_F(Watched, EndsEveryWaitWhenItIsStopped)
 {
     FileWatch watch(folder);

@@ -673,3 +673,27 @@ TEST(WithOptions, RefusesWhatItCannotDo)
         refuse(options),
         start + "The idle limit of connections of 0 microseconds is not positive.");
 }
+
+TEST(WithOptions, TakesTheLongestTimesForEver)
+{
+    constexpr long long Ever = std::numeric_limits<long long>::max();
+    CallOptions options;
+    options.deadlineMicroseconds = Ever;
+    options.retry = {4, Ever, Ever};
+    options.connectionReuse = ConnectionReuse{1, Ever};
+    const CallOptions bounded = Bound(options);
+    EXPECT_GT(bounded.deadlineMicroseconds, 0);
+    EXPECT_EQ(bounded.deadlineMicroseconds, bounded.retry.firstDelayMicroseconds);
+    EXPECT_EQ(bounded.deadlineMicroseconds, bounded.retry.longestDelayMicroseconds);
+    EXPECT_EQ(bounded.deadlineMicroseconds, bounded.connectionReuse->idleMicroseconds);
+    // Nothing listens there: the call fails for that, and not because its time has run out.
+    SecurityTokenServiceConfig config;
+    config.url = "http://127.0.0.1:1/sts";
+    options.retry.attempts = 1;
+    const auto service = WithOptions(CreateSecurityTokenService(config), options);
+    TokenSpec spec;
+    spec.tokenLifetimeSec = 300;
+    EXPECT_EQ(
+        GetFailure([&] { service->AcquireToken("jdoe", "s3cret", spec); }),
+        "HttpException: Cannot connect to 127.0.0.1 port 1: Connection refused.");
+}
