@@ -180,9 +180,15 @@ void TokenKeeper::Close()
     });
 }
 
-/** Makes the change, and does what follows from it. */
 template <class Change>
 void TokenKeeper::Apply(const Change& change)
+{
+    Apply(change, [] {});
+}
+
+/** Makes the change, and does what follows from it, `first` before all else. */
+template <class Change, class First>
+void TokenKeeper::Apply(const Change& change, const First& first)
 {
     const auto self = shared_from_this();
     Chores chores;
@@ -192,6 +198,7 @@ void TokenKeeper::Apply(const Change& change)
         change(now);
         Proceed(now, chores);
     }
+    first();
     for (const auto& chore : chores) {
         chore();
     }
@@ -328,8 +335,8 @@ bool TokenKeeper::MakePendingAttempt()
         asked = GetNow();
     }
     const Result result = Make(attempt, held, asked);
-    Apply([&](const Moment& now) { Take(result, now); });
-    Report(result.outcome);
+    // Whoever waits may end the process with what it is told.
+    Apply([&](const Moment& now) { Take(result, now); }, [&] { Report(result.outcome); });
     return true;
 }
 

@@ -72,6 +72,8 @@ private:
     Moment GetNow() const;
     template <class Change>
     void Apply(const Change& change);
+    template <class Change, class First>
+    void Apply(const Change& change, const First& first);
     Token Await(const std::optional<Span>& deadline);
     void AddWaiter(Waiter waiter);
 

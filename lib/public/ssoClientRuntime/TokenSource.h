@@ -91,8 +91,9 @@ struct TokenSourceOptions
     Quillon::Ref<const Quillon::Crypto::Certificate> identity;
 
     /**
-     * Told after each attempt, well or not, on the thread that made it; may be empty. Two calls
-     * overlap if one takes longer than the next attempt. What it throws is logged.
+     * Told after each attempt, well or not, on the thread that made it, and before those who wait
+     * for that attempt; may be empty. Two calls overlap if one takes longer than the next attempt.
+     * What it throws is logged.
      */
     std::function<void(const TokenSourceStatus&)> observer;
 

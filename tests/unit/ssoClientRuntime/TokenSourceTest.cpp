@@ -75,6 +75,23 @@ protected:
     }
 };
 
+/** Runs what is queued before it says that it is queued. */
+class ImmediateEnvironment final : public RuntimeEnvironment
+{
+public:
+    Quillon::System::DateTime GetWallTime() const override { return _clocks.GetWallTime(); }
+    std::chrono::steady_clock::time_point GetSteadyTime() const override
+    {
+        return _clocks.GetSteadyTime();
+    }
+    double DrawNumber() override { return _clocks.DrawNumber(); }
+    void Run(const Work& work) override { work(); }
+    void RunAt(std::chrono::steady_clock::time_point /*time*/, const Work& /*work*/) override {}
+
+private:
+    VirtualEnvironment _clocks;
+};
+
 struct Answers
 {
     std::vector<std::string> texts;
@@ -505,6 +522,20 @@ TEST_F(TokenSourceTest, TellsItsObserverOfEachAttempt)
     EXPECT_EQ("The observer of a token source raised on purpose", log[0]);
     EXPECT_EQ("No token: HttpException: no route", log[1]);
     EXPECT_EQ("The observer of a token source raised something that is not an exception", log[2]);
+}
+
+TEST_F(TokenSourceTest, TellsItsObserverBeforeThoseWhoWait)
+{
+    std::vector<std::string> told;
+    options.environment = boost::make_shared<ImmediateEnvironment>();
+    options.observer = [&](const TokenSourceStatus& status) {
+        told.push_back("observer " + status.token->GetId());
+    };
+    const auto source = Make();
+    source->GetTokenAsync([&](const Token& token, const Quillon::Exception* /*error*/) {
+        told.push_back("completion " + token->GetId());
+    });
+    EXPECT_EQ((Calls{"observer _1", "completion _1"}), told);
 }
 
 TEST_F(TokenSourceTest, HasOneAttemptUnderWayHoweverManyThreadsWait)
