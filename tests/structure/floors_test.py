@@ -40,7 +40,8 @@ FLOORS = {
         "negotiation": {"wire", "security", "state", "token"},
         "service": {"wire", "security", "state", "token", "negotiation"},
         "http": {"wire", "security", "state", "service"},
-        ".": {"state", "http"},
+        "misbehaviour": {"wire", "security", "state", "service", "http"},
+        ".": {"state", "http", "misbehaviour"},
     },
 }
 

@@ -29,8 +29,8 @@ GSS_UNITS = {
 }
 
 # What Quillon takes from the platform beside the standard library.
-PLATFORM_HEADERS = {"arpa/inet.h", "cxxabi.h", "dlfcn.h", "execinfo.h", "poll.h", "sys/eventfd.h",
-                    "sys/inotify.h", "sys/random.h", "sys/socket.h", "unistd.h"}
+PLATFORM_HEADERS = {"arpa/inet.h", "cxxabi.h", "dlfcn.h", "execinfo.h", "netinet/in.h", "poll.h",
+                    "sys/eventfd.h", "sys/inotify.h", "sys/random.h", "sys/socket.h", "unistd.h"}
 
 
 def is_boost_or_standard(include):

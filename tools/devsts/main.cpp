@@ -1,5 +1,6 @@
 #include "devsts/http/Server.h"
 #include "devsts/http/Versions.h"
+#include "devsts/misbehaviour/MisbehavingServer.h"
 
 #include <CLI/CLI.hpp>
 #include <csignal>
@@ -41,6 +42,17 @@ void SetAddress(DevSts::Options& options, const std::string& listen)
     options.port = std::stoi(parts[3].str());
 }
 
+template <class ServerKind>
+void ServeUntilStopped(const DevSts::Options& options, const sigset_t& signals, ServerKind& server)
+{
+    std::cerr << "For development only: keys and passwords lie in plain files in "
+              << options.stateDir.string() << std::endl;
+    std::cout << "listening on " << server.Url() << std::endl;
+    int received = 0;
+    sigwait(&signals, &received);
+    server.Stop();
+}
+
 void Serve(const DevSts::Options& options)
 {
     const sigset_t signals = BlockStopSignals();
@@ -49,12 +61,40 @@ void Serve(const DevSts::Options& options)
     if (!options.keytab.empty()) {
         std::cerr << "Negotiates Kerberos with the keytab " << options.keytab.string() << std::endl;
     }
-    std::cerr << "For development only: keys and passwords lie in plain files in "
-              << options.stateDir.string() << std::endl;
-    std::cout << "listening on " << server.Url() << std::endl;
-    int received = 0;
-    sigwait(&signals, &received);
-    server.Stop();
+    ServeUntilStopped(options, signals, server);
+}
+
+void PrintMisbehaviours()
+{
+    for (const DevSts::Misbehaviour& row : DevSts::ListMisbehaviours()) {
+        std::cout << row.name << (row.parameter ? ":N" : "") << "\t" << row.about
+                  << (!row.isOverHttp ? " (HTTPS)" : "") << "\n";
+    }
+}
+
+DevSts::Misbehaviour FindMisbehaviour(const std::string& name)
+{
+    try {
+        return DevSts::FindMisbehaviour(name);
+    } catch (const std::invalid_argument& error) {
+        throw UsageError(std::string(error.what()) + " (see: ssoclient-devsts --misbehave list)");
+    }
+}
+
+void Misbehave(const DevSts::Options& options, const std::string& name)
+{
+    const DevSts::Misbehaviour misbehaviour = FindMisbehaviour(name);
+    if (options.plainHttp && !misbehaviour.isOverHttp) {
+        throw UsageError(name + " needs HTTPS: leave out --http");
+    }
+    if (!options.keytab.empty()) {
+        throw UsageError("--misbehave goes without --keytab");
+    }
+    const sigset_t signals = BlockStopSignals();
+    DevSts::MisbehavingServer server(options, misbehaviour);
+    server.Start();
+    std::cerr << "Misbehaves: " << misbehaviour.about << std::endl;
+    ServeUntilStopped(options, signals, server);
 }
 
 int Run(int argc, char** argv)
@@ -70,13 +110,18 @@ int Run(int argc, char** argv)
     DevSts::Options options;
     options.keptRequests = 0;
     std::string listen = "127.0.0.1:0";
-    app.add_option("--state", options.stateDir, "the state directory")->required();
+    app.add_option("--state", options.stateDir, "the state directory; required");
     app.add_option("--listen", listen, "address and port; port 0 takes any free one")
         ->capture_default_str();
     app.add_option(
         "--keytab",
         options.keytab,
         "a Kerberos keytab with keys of this service; clients may then negotiate");
+    std::string misbehaviour;
+    app.add_option(
+        "--misbehave",
+        misbehaviour,
+        "do one thing wrong on every connection, for tests of clients; list prints what there is");
     app.set_version_flag("--version", "ssoclient-devsts " + DevSts::DescribeVersions());
     app.add_flag("--http", options.plainHttp, "serve plain HTTP instead of HTTPS");
     try {
@@ -86,8 +131,19 @@ int Run(int argc, char** argv)
     } catch (const CLI::ParseError& error) {
         throw UsageError(error.what());
     }
+    if (misbehaviour == "list") {
+        PrintMisbehaviours();
+        return 0;
+    }
+    if (options.stateDir.empty()) {
+        throw UsageError("--state is required");
+    }
     SetAddress(options, listen);
-    Serve(options);
+    if (misbehaviour.empty()) {
+        Serve(options);
+    } else {
+        Misbehave(options, misbehaviour);
+    }
     return 0;
 }
 

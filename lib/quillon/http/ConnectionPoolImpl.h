@@ -2,6 +2,7 @@
 
 #include "http/ConnectionSpecImpl.h"
 #include "http/Curl.h"
+#include "http/OpenSockets.h"
 
 #include "quillon/http/UserAgent.h"
 
@@ -24,6 +25,7 @@ struct Connections
     using Clock = std::chrono::steady_clock;
 
     Ref<const ConnectionSpecImpl> spec; // outlives the connections, which point to its `tls`
+    OpenSockets sockets;                // outlive the connections, which are closed through them
     ShareOwner share;                   // made with the first exchange
 
     std::optional<std::chrono::microseconds> idleLimit; // none: they stay as long as the pool
@@ -40,6 +42,9 @@ public:
     ~ConnectionPoolImpl() override;
 
     const ConnectionSpecImpl& GetSpec() const noexcept { return *_connections->spec; }
+
+    /** On the I/O thread. */
+    OpenSockets& GetSockets() const noexcept { return _connections->sockets; }
 
     /** libcurl's handle of the connections, for a transfer that begins. On the I/O thread. */
     CURLSH* Use();

@@ -237,6 +237,11 @@ void HttpEngine::StartTransfer(std::unique_ptr<Transfer> transfer)
         Complete(std::move(transfer), MakeFailure(error.what()));
         return;
     }
+    Perform(std::move(transfer));
+}
+
+void HttpEngine::Perform(std::unique_ptr<Transfer> transfer)
+{
     CURL* const easy = transfer->GetHandle();
     _transfers[easy] = std::move(transfer);
     const CURLMcode code = curl_multi_add_handle(_multi, easy);
@@ -299,6 +304,10 @@ void HttpEngine::CompleteFinished()
         // Removing the handle frees the message.
         const CURLcode result = message->data.result;
         std::unique_ptr<Transfer> transfer = Remove(message->easy_handle);
+        if (transfer->IsToBeStartedAgain()) {
+            Perform(std::move(transfer));
+            continue;
+        }
         Outcome outcome = transfer->Finish(result);
         Complete(std::move(transfer), std::move(outcome));
     }

@@ -78,6 +78,7 @@ private:
     void Run();
     bool TakeWork(std::vector<std::unique_ptr<Transfer>>& submitted);
     void StartTransfer(std::unique_ptr<Transfer> transfer);
+    void Perform(std::unique_ptr<Transfer> transfer);
     void DropCancelled();
     std::chrono::milliseconds CloseIdle();
     void CompleteFinished();

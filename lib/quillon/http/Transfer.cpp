@@ -175,6 +175,8 @@ void Transfer::Prepare()
     CURLSH* const connections = _pool->Use();
     _usesPool = true;
     Set(CURLOPT_SHARE, connections);
+    Set(CURLOPT_CLOSESOCKETFUNCTION, &OpenSockets::Close);
+    Set(CURLOPT_CLOSESOCKETDATA, &_pool->GetSockets());
     if (_cookies != nullptr) {
         _givenCookies = _cookies->GetLines();
         for (const std::string& line : _givenCookies) {
@@ -235,15 +237,40 @@ int Transfer::OnProgress(void* self, curl_off_t, curl_off_t, curl_off_t, curl_of
 /**
  * libcurl sends a request again, over another connection, when a connection that was kept ends
  * before the reply begins. The server may have acted on the request by then, so that it goes out
- * once. A kept connection that libcurl finds closed before it sends does not get here.
+ * once. A kept connection that is of no use is noticed before: it is closed, and another one taken.
  */
-int Transfer::OnRequest(void* self, char* /*ip*/, char* /*localIp*/, int /*port*/, int /*local*/)
+int Transfer::OnRequest(void* self, char* /*ip*/, char* /*localIp*/, int /*port*/, int localPort)
 {
     Transfer& transfer = *static_cast<Transfer*>(self);
+    transfer._hasStaleConnection = transfer.HasUnaskedInput(localPort);
+    if (transfer._hasStaleConnection) {
+        return CURL_PREREQFUNC_ABORT;
+    }
     transfer.FindRecord();
     transfer._earlierError = transfer.GetSystemError();
     transfer._isRepeated = std::exchange(transfer._isSent, true);
     return transfer._isRepeated ? CURL_PREREQFUNC_ABORT : CURL_PREREQFUNC_OK;
+}
+
+/**
+ * Whether a connection that was kept has something to read before anything was asked: its end, or
+ * octets that would be taken for the reply. With TLS it may be a message of TLS itself, for which a
+ * new connection is no high price.
+ */
+bool Transfer::HasUnaskedInput(int localPort) const
+{
+    long opened = 0;
+    curl_easy_getinfo(_easy.get(), CURLINFO_NUM_CONNECTS, &opened);
+    return opened == 0 && _pool->GetSockets().HasInput(localPort);
+}
+
+bool Transfer::IsToBeStartedAgain() noexcept
+{
+    const bool isToBe = std::exchange(_hasStaleConnection, false);
+    if (isToBe) {
+        _errorText[0] = '\0'; // says that the callback refused to go on
+    }
+    return isToBe;
 }
 
 /** A connection that was kept has the one of the transfer that opened it. */
@@ -263,11 +290,9 @@ curl_socket_t Transfer::OnSocket(void* self, curlsocktype /*purpose*/, curl_sock
     if (transfer._isRepeated) {
         return CURL_SOCKET_BAD;
     }
-    // Programs that the host starts do not inherit the connection.
-    const int descriptor =
-        socket(address->family, address->socktype | SOCK_CLOEXEC, address->protocol);
-    transfer._socketError = descriptor < 0 ? errno : 0;
-    return descriptor;
+    const curl_socket_t opened = transfer._pool->GetSockets().Open(*address);
+    transfer._socketError = opened == CURL_SOCKET_BAD ? errno : 0;
+    return opened;
 }
 
 CURLcode Transfer::OnSslContext(CURL* /*easy*/, void* context, void* self)
@@ -393,6 +418,15 @@ std::string Transfer::DescribeAlert(CURLcode result) const
            + words;
 }
 
+std::string Transfer::DescribeFailedHandshake() const
+{
+    const std::string detail = GetDetail(CURLE_SSL_CONNECT_ERROR);
+    // libcurl has no words for an end, nor OpenSSL for an alert that says no more than that.
+    const bool isEnd = _record->isClosed || detail.find("SSL_ERROR_SYSCALL") != std::string::npos;
+    return "The TLS handshake with " + _exchange->GetServer()
+           + " failed: " + (isEnd ? "the server ended the connection" : detail) + ".";
+}
+
 int Transfer::GetSystemError() const
 {
     long error = 0;
@@ -442,6 +476,9 @@ std::string Transfer::Describe(CURLcode result) const
         // libcurl's words for a line that is longer than its own limit, which is above ours.
         return "The reply of " + server + " " + ReplyCollector::DescribeTooManyHeaders() + ".";
     }
+    if (_reply.HasHead() && GetDetail(result) == "Out of memory in chunked-encoding") {
+        return "The reply of " + server + " has a trailer that is too long."; // for libcurl
+    }
     switch (result) {
     case CURLE_OK:
         return "The reply of " + server
@@ -456,7 +493,7 @@ std::string Transfer::Describe(CURLcode result) const
     case CURLE_SSL_PINNEDPUBKEYNOTMATCH:
         return "The TLS key of " + server + " is not the pinned one, " + _spec.pin + ".";
     case CURLE_SSL_CONNECT_ERROR:
-        return "The TLS handshake with " + server + " failed: " + GetDetail(result) + ".";
+        return DescribeFailedHandshake();
     case CURLE_GOT_NOTHING:
         return "The server " + server + " closed the connection without a reply.";
     case CURLE_PARTIAL_FILE:

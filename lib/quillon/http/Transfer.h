@@ -36,6 +36,13 @@ public:
      */
     Outcome Finish(CURLcode result);
 
+    /**
+     * Makes it ready to be started again if it has ended before it sent anything, because the
+     * connection that was kept for it is of no use any more. @return whether it is. On the I/O
+     * thread.
+     */
+    bool IsToBeStartedAgain() noexcept;
+
     CURL* GetHandle() const noexcept { return _easy.get(); }
     const Ref<Exchange>& GetExchange() const noexcept { return _exchange; }
 
@@ -58,6 +65,7 @@ private:
     void SetCallbacks();
 
     bool Take(std::string_view headerLine);
+    bool HasUnaskedInput(int localPort) const;
     void FindRecord();
     bool IsAnswered(CURLcode result) const noexcept;
     bool IsCutOff() const noexcept;
@@ -71,6 +79,7 @@ private:
     std::string DescribeRefusedConnection() const;
     std::string DescribeBrokenConnection() const;
     std::string DescribeAlert(CURLcode result) const;
+    std::string DescribeFailedHandshake() const;
     std::string GetDetail(CURLcode result) const;
     int GetSystemError() const;
 
@@ -82,8 +91,9 @@ private:
 
     CookieLines _givenCookies;
     ReplyCollector _reply;
-    Ref<Ssl::PeerRecord> _record; // of the connection
-    bool _isSent = false;         // libcurl has begun to send the request
+    Ref<Ssl::PeerRecord> _record;     // of the connection
+    bool _hasStaleConnection = false; // see `IsToBeStartedAgain`
+    bool _isSent = false;             // libcurl has begun to send the request
     bool _usesPool = false;
     bool _isRepeated = false; // libcurl has tried to send it again
     int _socketError = 0;

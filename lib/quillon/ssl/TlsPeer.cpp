@@ -213,10 +213,16 @@ Ref<PeerRecord> GetRecord(const SSL* connection)
 
 std::string DescribeAlert(int code)
 {
-    if (code == SSL_AD_CERTIFICATE_REQUIRED) {
-        return "certificate required"; // OpenSSL has no words for it
+    switch (code) { // those that OpenSSL has no words for
+    case SSL_AD_INAPPROPRIATE_FALLBACK:
+        return "inappropriate fallback";
+    case SSL_AD_MISSING_EXTENSION:
+        return "missing extension";
+    case SSL_AD_CERTIFICATE_REQUIRED:
+        return "certificate required";
+    default:
+        return SSL_alert_desc_string_long(code);
     }
-    return SSL_alert_desc_string_long(code);
 }
 
 bool IsAboutCertificate(int code) noexcept

@@ -5,6 +5,7 @@ import json
 import os
 import pathlib
 import re
+import shutil
 import subprocess
 import tempfile
 import unittest
@@ -86,9 +87,12 @@ class DevelopmentSts:
     USER = "alice@example.test"
     PASSWORD = "alice-secret"
 
-    def __init__(self, *switches, environment=None):
+    def __init__(self, *switches, environment=None, like=None):
+        """`like` is another one, with whose files it starts, which saves making keys."""
         self._folder = tempfile.TemporaryDirectory()
         self.state = pathlib.Path(self._folder.name)
+        if like is not None:
+            shutil.copytree(like.state, self.state, dirs_exist_ok=True)
         self._process = subprocess.Popen(
             [os.environ["DEVSTS"], "--state", str(self.state), *switches],
             stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, stderr=subprocess.DEVNULL, text=True,

@@ -1,6 +1,7 @@
 #include "NegotiationHarness.h"
 #include "Requests.h"
 
+#include <algorithm>
 #include <array>
 #include <csignal>
 #include <cstdlib>
@@ -246,6 +247,50 @@ TEST(DevStsProgram, MissingStateArgumentIsRefusedInOneLine)
     EXPECT_EQ(program.Wait(), 2);
     EXPECT_EQ(program.ReadRest(), "");
     EXPECT_EQ(program.Errors(), "ssoclient-devsts: --state is required\n");
+}
+
+TEST(DevStsProgram, MisbehavesAsItIsTold)
+{
+    const Program program({"--state", StateArgument(), "--http", "--misbehave", "status-404"});
+    const CommandResult result = RunCommand(Curl(
+        "--data x --output /dev/null --write-out '%{http_code}' " + UrlIn(program.ReadLine())));
+    EXPECT_EQ(result.output.substr(0, 3), "404");
+    EXPECT_EQ(
+        program.Errors(),
+        "Misbehaves: replies with 404 (Not Found)\n"
+        "For development only: keys and passwords lie in plain files in "
+            + StateArgument() + "\n");
+}
+
+TEST(DevStsProgram, ListsItsMisbehavioursWithoutAState)
+{
+    Program program({"--misbehave", "list"});
+    const std::string list = program.ReadRest();
+    EXPECT_EQ(program.Wait(), 0);
+    EXPECT_NE(list.find("silent\treads the request and says nothing\n"), std::string::npos);
+    EXPECT_NE(list.find("\ntls-cut:N\t"), std::string::npos);
+    EXPECT_GT(std::count(list.begin(), list.end(), '\n'), 180);
+}
+
+TEST(DevStsProgram, MisbehavesOnlyAsItCan)
+{
+    const std::vector<std::pair<std::vector<std::string>, std::string>> refusals = {
+        {{"--misbehave", "nonsense"},
+         "there is no misbehaviour nonsense (see: ssoclient-devsts --misbehave list)"},
+        {{"--misbehave", "tls-cut:x"},
+         "tls-cut takes no \"x\" (see: ssoclient-devsts --misbehave list)"},
+        {{"--misbehave", "silent:1"},
+         "silent takes no \"1\" (see: ssoclient-devsts --misbehave list)"},
+        {{"--misbehave", "tls-cut", "--http"}, "tls-cut needs HTTPS: leave out --http"},
+        {{"--misbehave", "silent", "--keytab", "x"}, "--misbehave goes without --keytab"},
+    };
+    for (const auto& [arguments, refusal] : refusals) {
+        std::vector<std::string> all = {"--state", StateArgument()};
+        all.insert(all.end(), arguments.begin(), arguments.end());
+        Program program(all);
+        EXPECT_EQ(program.Wait(), 2);
+        EXPECT_EQ(program.Errors(), "ssoclient-devsts: " + refusal + "\n");
+    }
 }
 
 TEST(DevStsProgram, SaysThatItNegotiates)

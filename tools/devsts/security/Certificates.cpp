@@ -13,11 +13,6 @@ namespace {
 
 using Bio = std::unique_ptr<BIO, OpenSslDeleter>;
 
-// The certificates outlive every clock that a test may set: the times of tokens are what is
-// under test, never the times of these.
-constexpr const char* NotBefore = "20000101000000Z";
-constexpr const char* NotAfter = "20491231235959Z";
-
 [[noreturn]] void ThrowOpenSslError(const std::string& what)
 {
     const char* reason = ERR_reason_error_string(ERR_get_error());
@@ -72,25 +67,46 @@ void AddExtension(X509* certificate, X509* authority, int nid, const std::string
     Require(X509_add_ext(certificate, extension.get(), -1) == 1, "X509_add_ext");
 }
 
+/** Not registered, so that no verifier knows it. */
+int GetUnknownExtension()
+{
+    static const int nid = OBJ_create("1.3.6.1.4.1.55555.1", "unknown", "unknown extension");
+    return nid;
+}
+
+const std::string& Either(const std::string& chosen, const std::string& usual)
+{
+    return chosen.empty() ? usual : chosen;
+}
+
 void AddExtensions(X509* certificate, X509* authority, const CertificateSpec& spec)
 {
     AddExtension(
         certificate,
         authority,
         NID_basic_constraints,
-        spec.isAuthority ? "critical,CA:TRUE" : "critical,CA:FALSE");
+        Either(spec.basicConstraints, spec.isAuthority ? "critical,CA:TRUE" : "critical,CA:FALSE"));
     AddExtension(
         certificate,
         authority,
         NID_key_usage,
-        spec.isAuthority ? "critical,keyCertSign,cRLSign" : "critical,digitalSignature");
+        Either(
+            spec.keyUsage,
+            spec.isAuthority ? "critical,keyCertSign,cRLSign" : "critical,digitalSignature"));
     AddExtension(certificate, authority, NID_subject_key_identifier, "hash");
     if (authority != certificate) {
         AddExtension(certificate, authority, NID_authority_key_identifier, "keyid");
     }
     if (!spec.alternativeNames.empty()) {
-        AddExtension(certificate, authority, NID_ext_key_usage, "serverAuth");
+        AddExtension(
+            certificate, authority, NID_ext_key_usage, Either(spec.extendedKeyUsage, "serverAuth"));
         AddExtension(certificate, authority, NID_subject_alt_name, spec.alternativeNames);
+    }
+    if (!spec.nameConstraints.empty()) {
+        AddExtension(certificate, authority, NID_name_constraints, spec.nameConstraints);
+    }
+    if (!spec.unknownExtension.empty()) {
+        AddExtension(certificate, authority, GetUnknownExtension(), spec.unknownExtension);
     }
 }
 
@@ -143,12 +159,16 @@ Certificate MakeSigned(
     SetSubject(certificate.get(), spec.commonName);
     Require(
         X509_set_issuer_name(certificate.get(), X509_get_subject_name(issuer)) == 1
-            && ASN1_TIME_set_string_X509(X509_getm_notBefore(certificate.get()), NotBefore) == 1
-            && ASN1_TIME_set_string_X509(X509_getm_notAfter(certificate.get()), NotAfter) == 1
+            && ASN1_TIME_set_string_X509(
+                   X509_getm_notBefore(certificate.get()), spec.notBefore.c_str())
+                   == 1
+            && ASN1_TIME_set_string_X509(
+                   X509_getm_notAfter(certificate.get()), spec.notAfter.c_str())
+                   == 1
             && X509_set_pubkey(certificate.get(), key) == 1,
         "Filling a certificate");
     AddExtensions(certificate.get(), issuer, spec);
-    Require(X509_sign(certificate.get(), authorityKey, EVP_sha256()) > 0, "X509_sign");
+    Require(X509_sign(certificate.get(), authorityKey, spec.digest) > 0, "X509_sign");
     return certificate;
 }
 

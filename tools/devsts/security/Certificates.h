@@ -28,6 +28,17 @@ struct CertificateSpec
     std::string commonName;
     bool isAuthority = false;
     std::string alternativeNames = {}; ///< in the syntax of openssl.cnf; may be empty
+
+    // What follows is for certificates that somebody shall refuse. Extensions are in the syntax of
+    // openssl.cnf, too; where they are empty, they are those of an honest certificate.
+    std::string notBefore = "20000101000000Z"; ///< these outlive every clock that a test may set:
+    std::string notAfter = "20491231235959Z";  ///< its subject are the times of tokens
+    std::string basicConstraints = {};
+    std::string keyUsage = {};
+    std::string extendedKeyUsage = {};
+    std::string nameConstraints = {};
+    std::string unknownExtension = {}; ///< a critical one; its value
+    const EVP_MD* digest = EVP_sha256();
 };
 
 /** A certificate for `key` that signs itself. */

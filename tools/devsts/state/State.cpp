@@ -79,15 +79,6 @@ bool IsAddress(const std::string& host)
     return address != nullptr;
 }
 
-std::string AlternativeNames(const std::string& host)
-{
-    std::string names = "IP:127.0.0.1,IP:::1,DNS:localhost";
-    if (host != "127.0.0.1" && host != "::1" && host != "localhost") {
-        names += (IsAddress(host) ? ",IP:" : ",DNS:") + host;
-    }
-    return names;
-}
-
 } // namespace
 
 State::State(fs::path dir)
@@ -114,11 +105,20 @@ State::TlsIdentity State::IssueTlsIdentity(const std::string& host) const
     const Certificate authority = CertificateFromPem(ReadFile(_dir / "ca.pem"));
     PrivateKey key = GenerateEcKey();
     Certificate certificate = MakeSigned(
-        {"SsoClient development STS (TLS)", false, AlternativeNames(host)},
+        {"SsoClient development STS (TLS)", false, GetAlternativeNames(host)},
         key.get(),
         authority.get(),
         authorityKey.get());
     return {std::move(key), std::move(certificate)};
+}
+
+std::string State::GetAlternativeNames(const std::string& host)
+{
+    std::string names = "IP:127.0.0.1,IP:::1,DNS:localhost";
+    if (host != "127.0.0.1" && host != "::1" && host != "localhost") {
+        names += (IsAddress(host) ? ",IP:" : ",DNS:") + host;
+    }
+    return names;
 }
 
 std::string ReadFile(const fs::path& path)

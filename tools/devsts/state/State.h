@@ -38,6 +38,9 @@ public:
     /** A new TLS certificate for loopback and for `host`, an address or a name. */
     TlsIdentity IssueTlsIdentity(const std::string& host) const;
 
+    /** The names of such a certificate, in the syntax of openssl.cnf. */
+    static std::string GetAlternativeNames(const std::string& host);
+
 private:
     std::filesystem::path _dir;
     std::string _signingKeyPem;

@@ -369,6 +369,76 @@ TEST(Request, GoesOutOnceAlthoughThePoolHasAnotherConnection)
     EXPECT_EQ(3, requestCount);
 }
 
+/**
+ * Answers on each connection, and then does something to the first before it waits for more. The
+ * test goes on when that is done.
+ */
+class DisturbedConnection
+{
+public:
+    using Disturbance = std::function<void(ServerConnection&)>;
+
+    explicit DisturbedConnection(
+        Disturbance disturbance, TestServer::StreamFactory streams = &TestServer::MakePlainStream)
+        : _disturbance(std::move(disturbance))
+        , server([this](ServerConnection& connection) { Serve(connection); }, std::move(streams))
+    {}
+
+    void Disturb()
+    {
+        _mayDisturb.set_value();
+        _isDisturbed.get_future().wait();
+    }
+
+private:
+    void Serve(ServerConnection& connection)
+    {
+        const bool isFirst = !_hasServed.exchange(true);
+        connection.ReadRequest();
+        connection.Write(MakeReply("200 OK", "pong"));
+        if (isFirst) {
+            _mayDisturb.get_future().wait();
+            _disturbance(connection);
+            _isDisturbed.set_value();
+        }
+        while (connection.ReadRequest()) {
+            connection.Write(MakeReply("200 OK", "from the first connection"));
+        }
+    }
+
+    const Disturbance _disturbance;
+    std::atomic<bool> _hasServed{false};
+    std::promise<void> _mayDisturb;
+    std::promise<void> _isDisturbed;
+
+public:
+    const TestServer server; // the last to begin, and the first to end
+};
+
+// [RFC 9112 9.2]: octets that nobody asked for are no reply to the request that follows.
+TEST(KeptConnection, IsNotUsedIfItHasAReplyToARequestNotYetMade)
+{
+    for (const std::string& unasked : {MakeReply("200 OK", "unasked"), std::string("\r\n")}) {
+        DisturbedConnection disturbed(
+            [&](ServerConnection& connection) { connection.Write(unasked); });
+        HttpClient client(disturbed.server);
+        EXPECT_EQ("pong", client.Post().body);
+        disturbed.Disturb();
+        EXPECT_EQ("pong", client.Post().body);
+        EXPECT_EQ(2, disturbed.server.GetConnectionCount());
+    }
+}
+
+TEST(KeptConnection, IsUsedIfNothingHasHappenedToIt)
+{
+    DisturbedConnection disturbed([](ServerConnection&) {});
+    HttpClient client(disturbed.server);
+    EXPECT_EQ("pong", client.Post().body);
+    disturbed.Disturb();
+    EXPECT_EQ("from the first connection", client.Post().body);
+    EXPECT_EQ(1, disturbed.server.GetConnectionCount());
+}
+
 TEST(Reply, GivesItsCookiesEvenIfItFails)
 {
     std::promise<std::string> head;
