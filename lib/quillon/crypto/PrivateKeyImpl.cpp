@@ -1,5 +1,6 @@
 #include "quillon/crypto/PrivateKey.h"
 
+#include "crypto/PreparedContexts.h"
 #include "crypto/handles.h"
 #include "crypto/keyFacts.h"
 #include "quillon/Wiped.h"
@@ -12,6 +13,18 @@ namespace Quillon::Crypto {
 
 namespace {
 
+bool SetUpRsa(EVP_PKEY_CTX* context, const EVP_MD* digest)
+{
+    return EVP_PKEY_sign_init(context) == 1
+           && EVP_PKEY_CTX_set_rsa_padding(context, RSA_PKCS1_PADDING) == 1
+           && EVP_PKEY_CTX_set_signature_md(context, digest) == 1;
+}
+
+bool SetUpEcdsa(EVP_PKEY_CTX* context, const EVP_MD* digest)
+{
+    return EVP_PKEY_sign_init(context) == 1 && EVP_PKEY_CTX_set_signature_md(context, digest) == 1;
+}
+
 class PrivateKeyImpl final : public PrivateKey
 {
 public:
@@ -19,6 +32,7 @@ public:
         : _key(std::move(key))
         , _type(Crypto::GetKeyType(_key.get()))
         , _bits(EVP_PKEY_get_bits(_key.get()))
+        , _contexts(_key.get(), _type == KeyType::RSA ? &SetUpRsa : &SetUpEcdsa)
     {}
 
     KeyType GetKeyType() const noexcept override { return _type; }
@@ -29,13 +43,10 @@ public:
         HashAlgorithm algorithm, const unsigned char* digest) const override
     {
         const ErrorQueueScope errors;
-        const KeyContextOwner context(EVP_PKEY_CTX_new_from_pkey(nullptr, _key.get(), nullptr));
+        const KeyContextOwner context = _contexts.Get(algorithm);
         std::size_t length = static_cast<std::size_t>(EVP_PKEY_get_size(_key.get()));
         std::vector<unsigned char> signature(length);
-        if (!context || EVP_PKEY_sign_init(context.get()) != 1
-            || (_type == KeyType::RSA
-                && EVP_PKEY_CTX_set_rsa_padding(context.get(), RSA_PKCS1_PADDING) != 1)
-            || EVP_PKEY_CTX_set_signature_md(context.get(), GetDigest(algorithm)) != 1
+        if (!context
             || EVP_PKEY_sign(
                    context.get(), signature.data(), &length, digest, GetDigestLength(algorithm))
                    != 1) {
@@ -67,6 +78,7 @@ private:
     KeyOwner _key;
     KeyType _type;
     int _bits;
+    PreparedContexts _contexts;
 };
 
 /** Carries a passphrase callback through OpenSSL, which knows no exceptions. */

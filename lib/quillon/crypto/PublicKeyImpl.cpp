@@ -34,6 +34,28 @@ std::vector<unsigned char> ToDerEcdsa(
     return der;
 }
 
+bool SetUpRsa(EVP_PKEY_CTX* context, const EVP_MD* digest)
+{
+    return EVP_PKEY_verify_init(context) == 1
+           && EVP_PKEY_CTX_set_rsa_padding(context, RSA_PKCS1_PADDING) == 1
+           && EVP_PKEY_CTX_set_signature_md(context, digest) == 1;
+}
+
+bool SetUpPss(EVP_PKEY_CTX* context, const EVP_MD* digest)
+{
+    return EVP_PKEY_verify_init(context) == 1
+           && EVP_PKEY_CTX_set_rsa_padding(context, RSA_PKCS1_PSS_PADDING) == 1
+           && EVP_PKEY_CTX_set_signature_md(context, digest) == 1
+           && EVP_PKEY_CTX_set_rsa_mgf1_md(context, digest) == 1
+           && EVP_PKEY_CTX_set_rsa_pss_saltlen(context, RSA_PSS_SALTLEN_DIGEST) == 1;
+}
+
+bool SetUpEcdsa(EVP_PKEY_CTX* context, const EVP_MD* digest)
+{
+    return EVP_PKEY_verify_init(context) == 1
+           && EVP_PKEY_CTX_set_signature_md(context, digest) == 1;
+}
+
 } // namespace
 
 CryptoException::~CryptoException() = default;
@@ -42,6 +64,8 @@ PublicKeyImpl::PublicKeyImpl(KeyOwner key)
     : _key(std::move(key))
     , _type(Crypto::GetKeyType(_key.get()))
     , _bits(EVP_PKEY_get_bits(_key.get()))
+    , _contexts(_key.get(), _type == KeyType::RSA ? &SetUpRsa : &SetUpEcdsa)
+    , _pssContexts(_key.get(), &SetUpPss)
 {}
 
 bool PublicKeyImpl::VerifyDigest(
@@ -60,16 +84,7 @@ bool PublicKeyImpl::VerifyDigest(
             return false;
         }
     }
-    const KeyContextOwner context(EVP_PKEY_CTX_new_from_pkey(nullptr, _key.get(), nullptr));
-    if (!context || EVP_PKEY_verify_init(context.get()) != 1
-        || (_type == KeyType::RSA
-            && EVP_PKEY_CTX_set_rsa_padding(context.get(), RSA_PKCS1_PADDING) != 1)
-        || EVP_PKEY_CTX_set_signature_md(context.get(), GetDigest(algorithm)) != 1) {
-        throw CryptoException("Cannot verify with a key of type " + GetDescription());
-    }
-    return EVP_PKEY_verify(
-               context.get(), signature, signatureLength, digest, GetDigestLength(algorithm))
-           == 1;
+    return Verify(_contexts, algorithm, digest, signature, signatureLength);
 }
 
 bool PublicKeyImpl::VerifyPssDigest(
@@ -82,13 +97,18 @@ bool PublicKeyImpl::VerifyPssDigest(
         return false;
     }
     const ErrorQueueScope errors;
-    const KeyContextOwner context(EVP_PKEY_CTX_new_from_pkey(nullptr, _key.get(), nullptr));
-    const EVP_MD* const hash = GetDigest(algorithm);
-    if (!context || EVP_PKEY_verify_init(context.get()) != 1
-        || EVP_PKEY_CTX_set_rsa_padding(context.get(), RSA_PKCS1_PSS_PADDING) != 1
-        || EVP_PKEY_CTX_set_signature_md(context.get(), hash) != 1
-        || EVP_PKEY_CTX_set_rsa_mgf1_md(context.get(), hash) != 1
-        || EVP_PKEY_CTX_set_rsa_pss_saltlen(context.get(), RSA_PSS_SALTLEN_DIGEST) != 1) {
+    return Verify(_pssContexts, algorithm, digest, signature, signatureLength);
+}
+
+bool PublicKeyImpl::Verify(
+    const PreparedContexts& contexts,
+    HashAlgorithm algorithm,
+    const unsigned char* digest,
+    const unsigned char* signature,
+    std::size_t signatureLength) const
+{
+    const KeyContextOwner context = contexts.Get(algorithm);
+    if (!context) {
         throw CryptoException("Cannot verify with a key of type " + GetDescription());
     }
     return EVP_PKEY_verify(

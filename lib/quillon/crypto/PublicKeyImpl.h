@@ -1,6 +1,7 @@
 #pragma once
 
 #include "crypto/OpenSsl.h"
+#include "crypto/PreparedContexts.h"
 #include "crypto/keyFacts.h"
 
 #include "quillon/crypto/PublicKey.h"
@@ -29,9 +30,18 @@ public:
     std::vector<unsigned char> GetEncoded() const override;
 
 private:
+    bool Verify(
+        const PreparedContexts& contexts,
+        HashAlgorithm algorithm,
+        const unsigned char* digest,
+        const unsigned char* signature,
+        std::size_t signatureLength) const;
+
     KeyOwner _key;
     KeyType _type;
     int _bits;
+    PreparedContexts _contexts;
+    PreparedContexts _pssContexts;
 };
 
 } // namespace Quillon::Crypto
