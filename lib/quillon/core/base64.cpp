@@ -34,6 +34,24 @@ constexpr std::array<std::uint8_t, 256> MakeDigitValues()
 
 constexpr std::array<std::uint8_t, 256> DigitValues = MakeDigitValues();
 
+/** What a digit adds to its group of four, for each place in the group; `NoDigit` of others. */
+constexpr std::uint32_t NoDigit = 0x01000000;
+using PlaceValues = std::array<std::array<std::uint32_t, 256>, 4>;
+
+constexpr PlaceValues MakePlaceValues()
+{
+    PlaceValues places{};
+    for (unsigned place = 0; place < 4; ++place) {
+        for (unsigned character = 0; character < 256; ++character) {
+            const std::uint32_t value = DigitValues[character];
+            places[place][character] = value < 64 ? value << (18 - 6 * place) : NoDigit;
+        }
+    }
+    return places;
+}
+
+constexpr PlaceValues Places = MakePlaceValues();
+
 std::uint8_t DigitValue(char character) noexcept
 {
     return DigitValues[static_cast<unsigned char>(character)];
@@ -68,16 +86,14 @@ public:
 private:
     void DecodeWholeGroups() noexcept
     {
-        while (_paddingCount == 0 && _text.size() - _position >= 4) {
-            const unsigned a = DigitValue(_text[_position]);
-            const unsigned b = DigitValue(_text[_position + 1]);
-            const unsigned c = DigitValue(_text[_position + 2]);
-            const unsigned d = DigitValue(_text[_position + 3]);
-            if ((a | b | c | d) >= 64) {
+        const auto* in = reinterpret_cast<const unsigned char*>(_text.data()) + _position;
+        for (; _paddingCount == 0 && _text.size() - _position >= 4; in += 4, _position += 4) {
+            const std::uint32_t group =
+                Places[0][in[0]] | Places[1][in[1]] | Places[2][in[2]] | Places[3][in[3]];
+            if (group >= NoDigit) {
                 return;
             }
-            Put((a << 18) | (b << 12) | (c << 6) | d, 3);
-            _position += 4;
+            Put(group, 3);
         }
     }
 

@@ -66,13 +66,20 @@ void* Arena::Allocate(std::size_t size)
 {
     size = RoundUp(size);
     if (size > _left) {
-        const std::size_t grown = _chunks.empty() ? MinChunkSize : 2 * _chunks.back().size;
-        AddChunk(std::max(size, std::min(grown, MaxChunkSize)));
+        AddChunk(std::max(size, std::clamp(GetGrowth(), MinChunkSize, MaxChunkSize)));
     }
     void* memory = _next;
     _next += size;
     _left -= size;
     return memory;
+}
+
+/** How much more there should be; what the nodes of a text will need was estimated well. */
+std::size_t Arena::GetGrowth() const noexcept
+{
+    return _content == ArenaContent::PARSED ? _source.size() / 4
+           : _chunks.empty()                ? 0
+                                            : 2 * _chunks.back().size;
 }
 
 std::string_view Arena::CopyText(std::string_view text)
@@ -88,6 +95,11 @@ std::string_view Arena::CopyText(std::string_view text)
 ElementNode* Arena::NewElement(std::string_view name)
 {
     return new (Allocate(sizeof(ElementNode))) ElementNode(this, name);
+}
+
+ElementNode* Arena::NewElementLike(const ElementNode& element)
+{
+    return new (Allocate(sizeof(ElementNode))) ElementNode(this, element);
 }
 
 TextNode* Arena::NewText(std::string_view text)

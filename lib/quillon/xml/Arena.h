@@ -45,6 +45,9 @@ public:
     std::string_view CopyText(std::string_view text);
 
     ElementNode* NewElement(std::string_view name);
+
+    /** With the name and the attributes of `element`, which is of this arena too. */
+    ElementNode* NewElementLike(const ElementNode& element);
     TextNode* NewText(std::string_view text);
     CommentNode* NewComment(std::string_view text);
     ProcessingInstructionNode* NewProcessingInstruction(
@@ -62,7 +65,7 @@ public:
         return *arena;
     }
 
-    /** The parsed text, which lives in this arena; empty for a composed tree. */
+    /** The parsed text, which lives as long as this arena; empty for a composed tree. */
     std::string_view GetSource() const noexcept { return _source; }
     void SetSource(std::string_view source) noexcept { _source = source; }
 
@@ -93,6 +96,7 @@ private:
     ~Arena();
 
     void AddChunk(std::size_t size);
+    std::size_t GetGrowth() const noexcept;
 
     std::atomic<unsigned> _count{0};
     Arena* _mergedInto = nullptr;

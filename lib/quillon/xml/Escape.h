@@ -68,6 +68,24 @@ public:
         _size += text.size();
     }
 
+    /** `</name>`. */
+    void AppendEndTag(std::string_view name)
+    {
+        constexpr std::size_t Marks = 3;
+        if (name.size() + Marks > _bytes.size() - _size) {
+            Append("</");
+            Append(name);
+            Append('>');
+            return;
+        }
+        char* to = _bytes.data() + _size;
+        to[0] = '<';
+        to[1] = '/';
+        Copy(to + 2, name.data(), name.size());
+        to[2 + name.size()] = '>';
+        _size += name.size() + Marks;
+    }
+
     /** How much has been appended in all. */
     std::size_t GetPosition() const noexcept { return _flushed + _size; }
 

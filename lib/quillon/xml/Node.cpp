@@ -108,6 +108,16 @@ ElementNode::ElementNode(Arena* arena, std::string_view name) noexcept
     _prefixLength = colon == std::string_view::npos ? 0 : static_cast<std::uint32_t>(colon);
 }
 
+ElementNode::ElementNode(Arena* arena, const ElementNode& sameTag) noexcept
+    : Node(NodeType::ELEMENT, arena)
+    , _name(sameTag._name)
+    , _attributes(sameTag._attributes)
+    , _attributeCount(sameTag._attributeCount)
+    , _prefixLength(sameTag._prefixLength)
+{
+    _declaresNamespaces = sameTag._declaresNamespaces;
+}
+
 unsigned ElementNode::GetLine() const noexcept
 {
     const std::string_view source = _arena->GetSource();
@@ -229,6 +239,9 @@ void ElementNode::DefineAttribute(std::string_view name, std::string_view value)
         throw InvalidArgumentException("The value of attribute " + Quote(name) + " " + *fault);
     }
     const std::string_view ownValue = _arena->CopyText(value);
+    if (_attributeCapacity < _attributeCount) {
+        OwnAttributes(_attributeCount);
+    }
     for (std::uint32_t i = 0; i < _attributeCount; ++i) {
         if (_attributes[i].name == name) {
             _attributes[i].value = ownValue;
@@ -236,16 +249,21 @@ void ElementNode::DefineAttribute(std::string_view name, std::string_view value)
         }
     }
     if (_attributeCount == _attributeCapacity) {
-        const std::uint32_t capacity = std::max<std::uint32_t>(2, 2 * _attributeCapacity);
-        auto* attributes = static_cast<Attribute*>(_arena->Allocate(capacity * sizeof(Attribute)));
-        std::uninitialized_copy_n(_attributes, _attributeCount, attributes);
-        _attributes = attributes;
-        _attributeCapacity = capacity;
+        OwnAttributes(std::max<std::uint32_t>(2, 2 * _attributeCapacity));
     }
     Attribute* attribute =
         new (_attributes + _attributeCount) Attribute{_arena->CopyText(name), ownValue};
     ++_attributeCount;
     _declaresNamespaces = _declaresNamespaces || attribute->IsNamespaceDeclaration();
+}
+
+/** Puts the attributes where there is room for as many, and where only this element uses them. */
+void ElementNode::OwnAttributes(std::uint32_t capacity)
+{
+    auto* attributes = static_cast<Attribute*>(_arena->Allocate(capacity * sizeof(Attribute)));
+    std::uninitialized_copy_n(_attributes, _attributeCount, attributes);
+    _attributes = attributes;
+    _attributeCapacity = capacity;
 }
 
 void ElementNode::AppendChild(Node* child)

@@ -31,9 +31,7 @@ public:
     void Leave(const ElementNode& element)
     {
         if (element.GetFirstChild() != nullptr) {
-            _out.Append("</");
-            _out.Append(element.GetName());
-            _out.Append('>');
+            _out.AppendEndTag(element.GetName());
         }
     }
 

@@ -1,6 +1,7 @@
 #include "xml/TreeBuilder.h"
 
 #include <algorithm>
+#include <array>
 #include <cstring>
 #include <functional>
 #include <memory>
@@ -8,6 +9,8 @@
 namespace Quillon::Xml {
 
 namespace {
+
+constexpr std::size_t UsualAttributes = 8;
 
 std::string_view ToView(const unsigned char* text) noexcept
 {
@@ -26,14 +29,24 @@ void SkipBlanks(std::string_view& text) noexcept
     }
 }
 
+/** By octet, whether it ends a name in a tag. */
+constexpr std::array<bool, 256> MakeNameEnds() noexcept
+{
+    std::array<bool, 256> ends{};
+    for (const char byte : {' ', '\t', '\n', '\r', '=', '/'}) {
+        ends[static_cast<unsigned char>(byte)] = true;
+    }
+    return ends;
+}
+constexpr std::array<bool, 256> NameEnds = MakeNameEnds();
+
 /** Takes a name off the front of a tag's text. The parser has found the tag well-formed. */
 std::string_view TakeName(std::string_view& text) noexcept
 {
-    std::size_t length = 0;
-    while (length < text.size() && !IsBlank(text[length]) && text[length] != '='
-           && text[length] != '/') {
-        ++length;
-    }
+    const auto* end = std::find_if(text.begin(), text.end(), [](char byte) {
+        return NameEnds[static_cast<unsigned char>(byte)];
+    });
+    const auto length = static_cast<std::size_t>(end - text.begin());
     const std::string_view name = text.substr(0, length);
     text.remove_prefix(length);
     return name;
@@ -74,7 +87,9 @@ std::uint32_t CountDeclarations(const ElementNode& element) noexcept
 TreeBuilder::TreeBuilder(Ref<Arena> arena, std::string_view source)
     : _arena(std::move(arena))
     , _source(source)
-{}
+{
+    _attributes.reserve(UsualAttributes);
+}
 
 void TreeBuilder::StartElement(const TagEvent& tag)
 {
@@ -92,11 +107,10 @@ void TreeBuilder::StartElement(const TagEvent& tag)
     if (start == nullptr) {
         throw XMLParseException("A tag does not start where the parser found one");
     }
-    std::string_view text(start + 1, static_cast<std::size_t>(tag.tagEnd - start) - 1);
+    const std::string_view text(start + 1, static_cast<std::size_t>(tag.tagEnd - start) - 1);
 
-    ElementNode* element = _arena->NewElement(TakeName(text));
+    ElementNode* element = MakeElement(text, tag);
     element->_offset = static_cast<std::uint32_t>(start - _source.data());
-    ReadAttributes(*element, text, tag);
     EnterNamespaces(*element);
     Link(element);
     if (_current == nullptr) {
@@ -107,6 +121,19 @@ void TreeBuilder::StartElement(const TagEvent& tag)
         throw XMLParseException(
             "More than " + std::to_string(ParserLimits::MaxDepth) + " elements inside one another");
     }
+}
+
+/** The thousand values of one attribute have one tag: it is read once, and its parts are shared. */
+ElementNode* TreeBuilder::MakeElement(std::string_view text, const TagEvent& tag)
+{
+    if (_lastElement != nullptr && text == _lastTag) {
+        return _arena->NewElementLike(*_lastElement);
+    }
+    _lastTag = text;
+    std::string_view rest = text;
+    _lastElement = _arena->NewElement(TakeName(rest));
+    ReadAttributes(*_lastElement, rest, tag);
+    return _lastElement;
 }
 
 void TreeBuilder::EndElement()
@@ -221,7 +248,6 @@ void TreeBuilder::ReadAttributes(ElementNode& element, std::string_view text, Ta
     std::uninitialized_copy(_attributes.begin(), _attributes.end(), memory);
     element._attributes = memory;
     element._attributeCount = static_cast<std::uint32_t>(_attributes.size());
-    element._attributeCapacity = element._attributeCount;
 }
 
 std::string_view TreeBuilder::TakeNamespace(std::string_view raw, TagEvent& tag)

@@ -30,7 +30,7 @@ struct TagEvent
 class TreeBuilder
 {
 public:
-    /** @param source  lives in `arena`. */
+    /** @param source  lives as long as `arena`. */
     TreeBuilder(Ref<Arena> arena, std::string_view source);
 
     void StartElement(const TagEvent& tag);
@@ -47,6 +47,7 @@ private:
     void Link(Node* node);
     bool IsInSource(std::string_view text) const noexcept;
     std::string_view Keep(std::string_view text);
+    ElementNode* MakeElement(std::string_view text, const TagEvent& tag);
     void ReadAttributes(ElementNode& element, std::string_view text, TagEvent tag);
     std::string_view TakeNamespace(std::string_view raw, TagEvent& tag);
     std::string_view TakeAttribute(std::string_view raw, TagEvent& tag);
@@ -57,6 +58,9 @@ private:
     ElementNode* _current = nullptr;
     ElementNode* _root = nullptr;
     Node* _lastTopLevel = nullptr;
+    // The tag that was read last, without its brackets, and the element that was made of it.
+    std::string_view _lastTag;
+    ElementNode* _lastElement = nullptr;
     unsigned _depth = 0;
     unsigned _namespacesInScope = 0;
 

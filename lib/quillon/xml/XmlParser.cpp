@@ -28,8 +28,11 @@ struct ParserContextDeleter
 };
 using ParserContextOwner = std::unique_ptr<xmlParserCtxt, ParserContextDeleter>;
 
-/** A node costs about this many octets of text; half of a typical token's memory is its text. */
-constexpr std::size_t ArenaBytesPerSourceByte = 4;
+/** The nodes of a typical token take one and a half times the memory of its text. */
+constexpr std::size_t EstimateNodes(std::size_t sourceSize) noexcept
+{
+    return sourceSize + sourceSize / 2 + 1024;
+}
 
 std::string_view ToView(const xmlChar* text) noexcept
 {
@@ -283,8 +286,7 @@ private:
 /** An arena of a size that fits the text, with a NUL-terminated copy of it. */
 Ref<Arena> CreateArena(std::size_t sourceSize, char*& source)
 {
-    Ref<Arena> arena =
-        Arena::Create(ArenaContent::PARSED, ArenaBytesPerSourceByte * sourceSize + 1024);
+    Ref<Arena> arena = Arena::Create(ArenaContent::PARSED, sourceSize + EstimateNodes(sourceSize));
     source = static_cast<char*>(arena->Allocate(sourceSize + 1));
     source[sourceSize] = '\0';
     arena->SetSource({source, sourceSize});
@@ -364,6 +366,14 @@ private:
 } // namespace
 
 XMLParseException::~XMLParseException() = default;
+
+Ref<Document> ParseInPlace(const std::string& text)
+{
+    const std::size_t size = std::min(text.size(), ParserLimits::MaxDocumentBytes);
+    const Ref<Arena> arena = Arena::Create(ArenaContent::PARSED, EstimateNodes(size));
+    arena->SetSource(text);
+    return ParseInArena(arena);
+}
 
 Ref<DocumentHandler> CreateXMLDocumentHandler()
 {

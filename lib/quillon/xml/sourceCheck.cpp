@@ -4,6 +4,7 @@
 #include "xml/characters.h"
 
 #include <algorithm>
+#include <cstring>
 #include <string>
 #include <utility>
 
@@ -131,6 +132,13 @@ private:
     std::size_t _next = 0;
 };
 
+/** Where the last `<` stands; there is one. */
+std::size_t FindLastTag(std::string_view text) noexcept
+{
+    const auto* found = static_cast<const char*>(memrchr(text.data(), '<', text.size()));
+    return static_cast<std::size_t>(found - text.data());
+}
+
 /**
  * A tag holds no `<` but its first [XML 3.1], so only a long stretch without one can be a tag
  * with too many attributes. Stretches are found from their far end: cheap on any real document.
@@ -140,7 +148,7 @@ void LimitAttributes(std::string_view source)
     TagFinder tags(source);
     std::size_t start = source.find('<');
     while (start != std::string_view::npos) {
-        const std::size_t next = source.substr(0, start + HarmlessTagLength).rfind('<');
+        const std::size_t next = FindLastTag(source.substr(0, start + HarmlessTagLength));
         if (next != start) {
             start = next;
             continue;

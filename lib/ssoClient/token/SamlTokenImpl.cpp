@@ -3,6 +3,7 @@
 #include "quillon/PanicVerify.h"
 #include "quillon/StringUtil.h"
 #include "quillon/system/Clock.h"
+#include "quillon/xml/Parser.h"
 #include "ssoClient/CreateSamlToken.h"
 #include "ssoClient/Exceptions.h"
 #include "ssoClient/wire/assertionPlaces.h"
@@ -12,6 +13,7 @@
 #include <boost/smart_ptr/make_shared.hpp>
 
 #include <algorithm>
+#include <iterator>
 
 namespace SsoClient {
 
@@ -157,6 +159,17 @@ bool SplitsInTwo(const std::string& text, std::size_t position)
     return position != std::string::npos && position != 0 && position + 1 != text.size();
 }
 
+/** @return where domain and group part. */
+std::size_t RequireGroupIdentity(const std::string& value)
+{
+    const std::size_t backslash = value.find('\\');
+    if (!SplitsInTwo(value, backslash)) {
+        throw ParseException(
+            "Failed to parse Group Identity value: `" + value + "'; domain or group missing");
+    }
+    return backslash;
+}
+
 } // namespace
 
 SamlTokenImpl::SamlTokenImpl(
@@ -165,8 +178,7 @@ SamlTokenImpl::SamlTokenImpl(
     long long clockToleranceSec)
     : _xml(xml)
 {
-    Ref<Quillon::Xml::Document> document;
-    ParseXML(xml, document);
+    const Ref<Quillon::Xml::Document> document = Quillon::Xml::ParseInPlace(_xml);
     InitializeFromDom(document->GetRootElement(), keyResolver, clockToleranceSec);
 }
 
@@ -242,12 +254,27 @@ void SamlTokenImpl::PopulateTokenAttribute(AttributeType& attribute)
     }
 }
 
-void SamlTokenImpl::AppendGroups(const std::vector<std::string>& values)
+/** A token has a thousand groups that hardly anybody asks for, so that they stay as written. */
+void SamlTokenImpl::AppendGroups(std::vector<std::string>& values)
 {
-    _groups.reserve(_groups.size() + values.size());
     for (const std::string& value : values) {
-        _groups.push_back(ParseGroupIdentity(value));
+        RequireGroupIdentity(value);
     }
+    if (_groups.empty()) {
+        _groups = std::move(values);
+    } else {
+        std::move(values.begin(), values.end(), std::back_inserter(_groups));
+    }
+}
+
+void SamlTokenImpl::GetGroups(std::vector<PrincipalId>& out) const
+{
+    std::vector<PrincipalId> groups;
+    groups.reserve(_groups.size());
+    for (const std::string& group : _groups) {
+        groups.push_back(ParseGroupIdentity(group));
+    }
+    out.swap(groups);
 }
 
 void CheckTokenProperties(const SamlAssertionType& assertion, long long clockToleranceSec)
@@ -275,11 +302,7 @@ PrincipalId ParseSamlNameId(const NameIDType& nameId)
 
 PrincipalId ParseGroupIdentity(const std::string& value)
 {
-    const std::size_t backslash = value.find('\\');
-    if (!SplitsInTwo(value, backslash)) {
-        throw ParseException(
-            "Failed to parse Group Identity value: `" + value + "'; domain or group missing");
-    }
+    const std::size_t backslash = RequireGroupIdentity(value);
     return {value.substr(backslash + 1), value.substr(0, backslash)};
 }
 

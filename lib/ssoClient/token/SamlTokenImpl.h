@@ -43,7 +43,7 @@ public:
     bool IsSolution() const override { return _isSolution; }
     ConfirmationType GetConfirmationMethod() const override { return _confirmationMethod; }
     void GetFullName(std::pair<std::string, std::string>& out) const override { out = _fullName; }
-    void GetGroups(std::vector<PrincipalId>& out) const override { out = _groups; }
+    void GetGroups(std::vector<PrincipalId>& out) const override;
     void GetDelegationChain(std::vector<Delegate>& out) const override { out = _delegationChain; }
     void GetAudience(std::set<std::string>& out) const override { out = _audience; }
     void GetAdvice(std::vector<Advice>& out) const override { out = _advice; }
@@ -60,7 +60,7 @@ private:
         long long clockToleranceSec);
     void Populate(SamlAssertionType& assertion);
     void PopulateTokenAttribute(AttributeType& attribute);
-    void AppendGroups(const std::vector<std::string>& values);
+    void AppendGroups(std::vector<std::string>& values);
 
     std::string _xml;
     std::string _id;
@@ -71,7 +71,7 @@ private:
     bool _isDelegable = false;
     bool _isSolution = false;
     std::pair<std::string, std::string> _fullName; // given name, surname
-    std::vector<PrincipalId> _groups;
+    std::vector<std::string> _groups; // as they are written
     std::vector<Delegate> _delegationChain;
     std::set<std::string> _audience;
     std::vector<Advice> _advice;

@@ -11,6 +11,8 @@ using Quillon::Xml::Node;
 
 namespace {
 
+constexpr std::size_t UsualAttributes = 8;
+
 std::size_t CountSiblings(const Node* node) noexcept
 {
     std::size_t count = 0;
@@ -20,10 +22,19 @@ std::size_t CountSiblings(const Node* node) noexcept
     return count;
 }
 
-/** White space alone is an empty value; any other text is kept with its blanks. */
-void ParseAttributeValueElement(NodeFilterIterator& iterator, std::string& value)
+/**
+ * White space alone is an empty value; any other text is kept with its blanks.
+ *
+ * @param last  the value before, which has the right name; null for the first.
+ */
+void ParseAttributeValueElement(
+    NodeFilterIterator& iterator, const ElementNode*& last, std::string& value)
 {
-    RequireElementQName(IteratorToElement(iterator), "AttributeValue", Wire::SamlNamespace);
+    const ElementNode* element = IteratorToElement(iterator);
+    if (last == nullptr || element == nullptr || !element->RepeatsTagOf(*last)) {
+        RequireElementQName(element, "AttributeValue", Wire::SamlNamespace);
+    }
+    last = element;
     if (iterator.FirstChild() != nullptr) {
         RequireTextualContent(iterator, value);
     }
@@ -100,6 +111,7 @@ void ParseAttributeStatementElement(NodeFilterIterator& iterator, AttributeState
     RequireNoAttributes(element);
 
     NodeFilterIterator child = iterator.GetChild();
+    statement.Attribute.reserve(UsualAttributes);
     do {
         statement.Attribute.emplace_back();
         ParseAttributeElement(child, statement.Attribute.back());
@@ -119,9 +131,10 @@ void ParseAttributeElement(NodeFilterIterator& iterator, AttributeType& attribut
 
     NodeFilterIterator child = iterator.GetChild();
     attribute.AttributeValue.reserve(CountSiblings(child.GetNode()));
+    const ElementNode* last = nullptr;
     while (!child.IsAtEnd()) {
         attribute.AttributeValue.emplace_back();
-        ParseAttributeValueElement(child, attribute.AttributeValue.back());
+        ParseAttributeValueElement(child, last, attribute.AttributeValue.back());
     }
     iterator.MoveToSibling();
 }

@@ -213,6 +213,16 @@ public:
     /** Whether the element has the local name and its prefix resolves to `namespaceUri`. */
     bool HasQName(std::string_view localName, std::string_view namespaceUri) const noexcept;
 
+    /**
+     * Whether this is known to have the parent, the name and the attributes of `sibling`, as the
+     * values of one attribute have. If not, it may have them all the same.
+     */
+    bool RepeatsTagOf(const ElementNode& sibling) const noexcept
+    {
+        return GetParent() == sibling.GetParent() && _name.data() == sibling._name.data()
+               && _attributes == sibling._attributes;
+    }
+
     /** Whether any of the attributes is a namespace declaration. */
     bool DeclaresNamespaces() const noexcept { return _declaresNamespaces; }
 
@@ -259,13 +269,15 @@ private:
     friend class TreeBuilder;
 
     ElementNode(Arena* arena, std::string_view name) noexcept;
+    ElementNode(Arena* arena, const ElementNode& sameTag) noexcept;
 
     void RemoveChild(Node* child) noexcept;
+    void OwnAttributes(std::uint32_t capacity);
 
     std::string_view _name;
     Attribute* _attributes = nullptr;
     std::uint32_t _attributeCount = 0;
-    std::uint32_t _attributeCapacity = 0;
+    std::uint32_t _attributeCapacity = 0; // below the count: other elements may use them too
     std::uint32_t _prefixLength = 0;
     Node* _firstChild = nullptr;
     Node* _lastChild = nullptr;

@@ -58,6 +58,14 @@ public:
     virtual void Parse(std::string_view text) = 0;
 };
 
+/**
+ * Reads a text without a copy of it: the nodes of the document point into `text`, which must live,
+ * and stay as it is, for as long as any of them.
+ *
+ * Thread safety: any thread. @throws XMLParseException
+ */
+QUILLON_API Ref<Document> ParseInPlace(const std::string& text);
+
 QUILLON_API Ref<DocumentHandler> CreateXMLDocumentHandler();
 QUILLON_API Ref<Parser> CreateXMLParser(DocumentHandler* handler);
 

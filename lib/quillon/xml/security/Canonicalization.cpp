@@ -7,6 +7,9 @@
 #include "xml/treeWalk.h"
 
 #include <algorithm>
+#include <array>
+#include <cstddef>
+#include <memory_resource>
 #include <tuple>
 
 namespace Quillon::Xml::Security {
@@ -77,12 +80,17 @@ bool HaveSameTag(const ElementNode& a, const ElementNode& b) noexcept
 class CanonicalVisitor
 {
 public:
+    // The memory is left as it is: what is taken of it is written first.
+    // NOLINTNEXTLINE(cppcoreguidelines-pro-type-member-init)
     CanonicalVisitor(
         const CanonicalizationMethod& method, const ElementNode& apex, OutputBuffer& out)
         : _method(method)
         , _apex(apex)
         , _out(out)
     {
+        _marks.reserve(UsualDepth);
+        _attributes.reserve(UsualAttributes);
+        _namespaces.reserve(UsualAttributes);
         EnterAncestors(apex.GetParent());
     }
 
@@ -100,9 +108,7 @@ public:
 
     void Leave(const ElementNode& element)
     {
-        _out.Append("</");
-        _out.Append(element.GetName());
-        _out.Append('>');
+        _out.AppendEndTag(element.GetName());
         _prefixes.Restore(_marks.back());
         _marks.pop_back();
     }
@@ -123,7 +129,8 @@ private:
     bool RepeatsLastLeaf(const ElementNode& element) const noexcept
     {
         return _lastLeaf != nullptr && element.GetParent() == _lastLeaf->GetParent()
-               && IsLeaf(element) && HaveSameTag(element, *_lastLeaf);
+               && IsLeaf(element)
+               && (element.RepeatsTagOf(*_lastLeaf) || HaveSameTag(element, *_lastLeaf));
     }
 
     void WriteStartTag(const ElementNode& element)
@@ -142,7 +149,7 @@ private:
     /** Brings the declarations of the apex's ancestors into scope, outermost first. */
     void EnterAncestors(const ElementNode* nearest)
     {
-        std::vector<const ElementNode*> ancestors;
+        std::pmr::vector<const ElementNode*> ancestors(&_pool);
         for (const ElementNode* element = nearest; element != nullptr;
              element = element->GetParent()) {
             ancestors.push_back(element);
@@ -352,14 +359,21 @@ private:
     const CanonicalizationMethod& _method;
     const ElementNode& _apex;
     OutputBuffer& _out;
-    PrefixTable _prefixes;
-    std::vector<std::size_t> _marks;
+
+    // What most documents need of memory is at hand.
+    static constexpr std::size_t UsualDepth = 16;
+    static constexpr std::size_t UsualAttributes = 8;
+    std::array<std::byte, 3072> _memory;
+    std::pmr::monotonic_buffer_resource _pool{_memory.data(), _memory.size()};
+
+    PrefixTable _prefixes{_pool};
+    std::pmr::vector<std::size_t> _marks{&_pool};
     const ElementNode* _lastLeaf = nullptr;
     std::string _leafTag;
     // Of the element being written; kept to be used again.
-    std::vector<std::string_view> _declared;
-    std::vector<SortedAttribute> _attributes;
-    std::vector<Binding> _namespaces;
+    std::pmr::vector<std::string_view> _declared{&_pool};
+    std::pmr::vector<SortedAttribute> _attributes{&_pool};
+    std::pmr::vector<Binding> _namespaces{&_pool};
 };
 
 class CanonicalizerImpl final : public Canonicalizer

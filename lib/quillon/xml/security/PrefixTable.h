@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstddef>
+#include <memory_resource>
 #include <string_view>
 #include <vector>
 
@@ -22,6 +23,15 @@ struct PrefixState
 class PrefixTable
 {
 public:
+    /** @param memory  has room for more prefixes than most documents have; outlives the table. */
+    explicit PrefixTable(std::pmr::memory_resource& memory)
+        : _states(&memory)
+        , _log(&memory)
+    {
+        _states.reserve(UsualPrefixes);
+        _log.reserve(2 * UsualPrefixes);
+    }
+
     PrefixState* Find(std::string_view prefix) noexcept
     {
         for (PrefixState& state : _states) {
@@ -50,7 +60,7 @@ public:
         state.rendered = state.inScope;
     }
 
-    std::vector<PrefixState>& GetAll() noexcept { return _states; }
+    std::pmr::vector<PrefixState>& GetAll() noexcept { return _states; }
 
     std::size_t GetMark() const noexcept { return _log.size(); }
 
@@ -68,6 +78,8 @@ public:
     }
 
 private:
+    static constexpr std::size_t UsualPrefixes = 8;
+
     struct Change
     {
         std::size_t index;
@@ -94,8 +106,8 @@ private:
         _log.push_back(Change{static_cast<std::size_t>(&state - _states.data()), state, false});
     }
 
-    std::vector<PrefixState> _states;
-    std::vector<Change> _log;
+    std::pmr::vector<PrefixState> _states;
+    std::pmr::vector<Change> _log;
 };
 
 } // namespace Quillon::Xml::Security

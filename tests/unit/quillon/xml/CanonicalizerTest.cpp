@@ -215,6 +215,21 @@ TEST(Canonicalize, AgreesWithItselfOnComposedAndParsedTrees)
         "<p:child xmlns:p=\"urn:p\">a&lt;&amp;&gt;&#xD;</p:child>");
 }
 
+// What is written goes through a buffer of 4,096 octets.
+TEST(Canonicalize, WritesTagsWhereverTheyMeetTheEndOfTheBuffer)
+{
+    for (std::size_t length = 4'060; length < 4'110; ++length) {
+        std::string text = "<r>" + std::string(length, 'x');
+        for (int i = 0; i < 800; ++i) {
+            text += i % 2 == 0 ? "<name a=\"v\"><n></n></name>"
+                               : "<longerThanSixteenOctets></longerThanSixteenOctets>";
+        }
+        text += "</r>";
+        EXPECT_EQ(
+            text, CanonicalizeToText(Security::ExclusiveC14n, ParseText(text)->GetRootElement()));
+    }
+}
+
 TEST(Canonicalize, RefusesUndeclaredPrefixes)
 {
     for (const char* identifier : {InclusiveC14n, ExclusiveC14n}) {

@@ -241,6 +241,39 @@ TEST(DefineAttribute, MakesADeclarationThatIsLookedUp)
 }
 
 // [XML Names 2.1]
+TEST(DefineAttribute, ChangesNoOtherElementWithTheSameTag)
+{
+    for (unsigned changed = 0; changed < 3; ++changed) {
+        const Ref<Document> document = ParseText("<r><a x='1'/><a x='1'/><a x='1'/></r>");
+        ElementNode* element = document->GetRootElement()->FindChildElement("a");
+        for (unsigned i = 0; i < changed; ++i) {
+            element = AsElement(element->GetNextSibling());
+        }
+        element->DefineAttribute("x", "2");
+        element->DefineAttribute("y", "3");
+        std::string expected;
+        for (unsigned i = 0; i < 3; ++i) {
+            expected += i == changed ? "<a x=\"2\" y=\"3\"/>" : "<a x=\"1\"/>";
+        }
+        EXPECT_EQ("<r>" + expected + "</r>", SerializeToText(document->GetRootElement()));
+    }
+}
+
+TEST(RepeatsTagOf, IsSaidOfSiblingsWithOneTag)
+{
+    const Ref<Document> document =
+        ParseText("<r><a x='1'/><a x='1'/><a x='1'><a x='1'/></a><a x='2'/><b x='2'/></r>");
+    std::vector<const ElementNode*> all;
+    CollectElements(document->GetRootElement()->GetFirstChild(), all);
+    EXPECT_TRUE(all[1]->RepeatsTagOf(*all[0]));
+    EXPECT_TRUE(all[2]->RepeatsTagOf(*all[0]));
+    EXPECT_FALSE(all[3]->RepeatsTagOf(*all[0])) << "its parent is another";
+    EXPECT_FALSE(all[4]->RepeatsTagOf(*all[0]));
+    EXPECT_FALSE(all[5]->RepeatsTagOf(*all[4]));
+    document->GetRootElement()->FindChildElement("a")->DefineAttribute("x", "1");
+    EXPECT_FALSE(all[1]->RepeatsTagOf(*all[0]));
+}
+
 TEST(HasQName, TakesAPrefixThatNobodyDeclaresForNoNamespaceAtAll)
 {
     EXPECT_TRUE(MakeElement("", "child")->HasQName("child", ""));

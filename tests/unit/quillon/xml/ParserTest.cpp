@@ -108,6 +108,77 @@ TEST(Parse, TellsWhereATagStarts)
     EXPECT_EQ(root->FindChildElement("b")->GetColumn(), 11U);
 }
 
+TEST(Parse, TellsTagsThatRepeatFromThoseThatNearlyDo)
+{
+    const std::string text =
+        "<r><a x=\"1\"/><a x=\"1\">t</a><a x=\"2\"/><b x=\"2\"/><b x=\"2\" /><b x='2'/><b y=\"2\"/>"
+        "<c z=\"&amp;&#x9;\"/><c z=\"&amp;&#x9;\"><c z=\"&amp;&#x9;\"/></c><d/><d/><d e=\"\"/></r>";
+    EXPECT_EQ(
+        "<r><a x=\"1\"/><a x=\"1\">t</a><a x=\"2\"/><b x=\"2\"/><b x=\"2\"/><b x=\"2\"/><b "
+        "y=\"2\"/>"
+        "<c z=\"&amp;&#x9;\"/><c z=\"&amp;&#x9;\"><c z=\"&amp;&#x9;\"/></c><d/><d/><d e=\"\"/></r>",
+        SerializeToText(ParseText(text)->GetRootElement()));
+}
+
+TEST(Parse, TellsWhereATagStartsThatRepeats)
+{
+    const Ref<Document> document = ParseText("<r><a x='1'/>\n <a x='1'/></r>");
+    std::vector<const ElementNode*> elements;
+    CollectElements(document->GetRootElement()->GetFirstChild(), elements);
+    EXPECT_EQ(1U, elements[0]->GetLine());
+    EXPECT_EQ(4U, elements[0]->GetColumn());
+    EXPECT_EQ(2U, elements[1]->GetLine());
+    EXPECT_EQ(2U, elements[1]->GetColumn());
+}
+
+TEST(Parse, CountsTheNamespacesOfATagThatRepeats)
+{
+    const std::string tag = "<a" + MakeAttributes(40, "xmlns:n") + ">";
+    EXPECT_EQ("accepted", GetParseError("<r>" + Repeat(tag, 6) + Repeat("</a>", 6) + "</r>"));
+    EXPECT_THAT(
+        GetParseError("<r>" + Repeat(tag, 7) + Repeat("</a>", 7) + "</r>"),
+        testing::StartsWith("More than 256 namespaces in scope"));
+    EXPECT_EQ("accepted", GetParseError("<r>" + Repeat(tag + "</a>", 7) + "</r>"));
+}
+
+TEST(ParseInPlace, PointsIntoTheTextAsItIs)
+{
+    const std::string text = "<?p d?><r a='v'><b>one</b>&amp;</r>";
+    const auto isInText = [&text](std::string_view part) {
+        return part.data() >= text.data() && part.data() + part.size() <= text.data() + text.size();
+    };
+    const Ref<Document> document = ParseInPlace(text);
+    const ElementNode* root = document->GetRootElement();
+    EXPECT_EQ("<r a=\"v\"><b>one</b>&amp;</r>", SerializeToText(root));
+    EXPECT_TRUE(isInText(root->GetName()));
+    EXPECT_TRUE(isInText(root->FindAttribute("a")->value));
+    EXPECT_TRUE(isInText(AsText(root->GetFirstChild()->GetFirstChild())->GetText()));
+    EXPECT_EQ(8U, root->GetColumn());
+    EXPECT_EQ(NodeType::PROCESSING_INSTRUCTION, document->GetFirstChild()->GetNodeType());
+}
+
+TEST(ParseInPlace, RefusesWhatParseRefuses)
+{
+    const std::string tooLong(ParserLimits::MaxDocumentBytes + 1, ' ');
+    for (const std::string& text :
+         {std::string(),
+          std::string("<r>"),
+          std::string("<!DOCTYPE r><r/>"),
+          std::string("<r>\0</r>", 8),
+          std::string("<r>\xFF</r>"),
+          std::string("<a b"),
+          tooLong}) {
+        std::string error = "accepted";
+        try {
+            ParseInPlace(text);
+        } catch (const XMLParseException& failure) {
+            error = failure.what();
+        }
+        EXPECT_EQ(GetParseError(text), error);
+        EXPECT_NE("accepted", error);
+    }
+}
+
 TEST(Parse, KnowsWhatTheXmlPrefixIsHoweverItIsDeclared)
 {
     const Ref<Document> document =

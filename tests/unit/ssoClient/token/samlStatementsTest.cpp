@@ -1,5 +1,7 @@
 #include "ssoClient/token/samlStatements.h"
 
+#include "ssoClient/Exceptions.h"
+
 #include "unit/ssoClient/token/TokenText.h"
 
 #include <boost/smart_ptr/make_shared.hpp>
@@ -90,6 +92,20 @@ TEST(ParseAttributeElement, KeepsValuesInOrder)
         "[b][a]",
         ReadValues("<saml:AttributeValue>b</saml:AttributeValue> "
                    "<saml:AttributeValue>a</saml:AttributeValue>"));
+}
+
+TEST(ParseAttributeElement, ChecksTheNameOfEachValue)
+{
+    const std::string value = "<saml:AttributeValue>v</saml:AttributeValue>";
+    EXPECT_EQ("[v][v][v]", ReadValues(value + value + value));
+    for (const char* wrong :
+         {"<saml:Value>v</saml:Value>",
+          "<AttributeValue>v</AttributeValue>",
+          "<saml:AttributeValue xmlns:saml='urn:other'>v</saml:AttributeValue>",
+          "v"}) {
+        EXPECT_THROW(ReadValues(value + value + wrong), ParseException) << wrong;
+        EXPECT_THROW(ReadValues(value + wrong + wrong), ParseException) << wrong;
+    }
 }
 
 TEST(ParseAttributeElement, BlankValuesAreEmptyAndOthersKeepTheirBlanks)
