@@ -10,8 +10,10 @@ struct Digest::State
 };
 
 Digest::Digest(HashAlgorithm algorithm)
-    : _state(std::make_unique<State>(State{DigestContextOwner(EVP_MD_CTX_new())}))
+    : _state(std::make_unique<State>())
 {
+    const ErrorQueueScope errors;
+    _state->context.reset(EVP_MD_CTX_new());
     if (!_state->context
         || EVP_DigestInit_ex2(_state->context.get(), GetDigest(algorithm), nullptr) != 1) {
         throw CryptoException("Cannot start a digest: " + GetOpenSslError());

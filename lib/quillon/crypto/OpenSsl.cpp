@@ -2,9 +2,32 @@
 
 #include "crypto/handles.h"
 
+#include <atomic>
 #include <system_error>
 
 namespace Quillon::Crypto {
+
+namespace {
+
+/**
+ * A fetch walks the providers, so what it finds is kept, for as long as the process lives:
+ * verifying never depends on the order of static destruction. What fails for lack of memory is
+ * tried again.
+ */
+const EVP_MD* Fetch(const char* name, std::atomic<const EVP_MD*>& kept)
+{
+    const EVP_MD* digest = kept.load(std::memory_order_acquire);
+    if (digest != nullptr) {
+        return digest;
+    }
+    DigestOwner fetched(EVP_MD_fetch(nullptr, name, nullptr));
+    if (kept.compare_exchange_strong(digest, fetched.get(), std::memory_order_acq_rel)) {
+        return fetched.release();
+    }
+    return digest; // another thread was first
+}
+
+} // namespace
 
 std::string GetOpenSslError()
 {
@@ -31,14 +54,12 @@ BioOwner OpenForReading(std::string_view text)
 
 const EVP_MD* GetDigest(HashAlgorithm algorithm)
 {
-    // A fetch walks the providers; the first one is kept, and its result lives as long as the
-    // process, so that verifying never depends on the order of static destruction.
-    static const EVP_MD* const sha256 = EVP_MD_fetch(nullptr, "SHA256", nullptr);
-    static const EVP_MD* const sha384 = EVP_MD_fetch(nullptr, "SHA384", nullptr);
-    static const EVP_MD* const sha512 = EVP_MD_fetch(nullptr, "SHA512", nullptr);
-    const EVP_MD* digest = algorithm == HashAlgorithm::SHA256   ? sha256
-                           : algorithm == HashAlgorithm::SHA384 ? sha384
-                                                                : sha512;
+    static std::atomic<const EVP_MD*> sha256{nullptr};
+    static std::atomic<const EVP_MD*> sha384{nullptr};
+    static std::atomic<const EVP_MD*> sha512{nullptr};
+    const EVP_MD* const digest = algorithm == HashAlgorithm::SHA256   ? Fetch("SHA256", sha256)
+                                 : algorithm == HashAlgorithm::SHA384 ? Fetch("SHA384", sha384)
+                                                                      : Fetch("SHA512", sha512);
     if (digest == nullptr) {
         throw CryptoException("OpenSSL offers no SHA-2 digest: " + GetOpenSslError());
     }

@@ -6,12 +6,20 @@
 #include "quillon/Wiped.h"
 
 #include <algorithm>
+#include <atomic>
 #include <cstring>
 #include <exception>
 
 namespace Quillon::Crypto {
 
 namespace {
+
+/**
+ * OpenSSL blinds what it does with an RSA key by two numbers, and makes new ones for each 32nd
+ * signature. When that fails, for lack of memory, they do not fit each other, and its signatures
+ * are wrong until the next time. It has one pair for one thread and one for all others.
+ */
+constexpr int SignaturesInDoubt = 64;
 
 bool SetUpRsa(EVP_PKEY_CTX* context, const EVP_MD* digest)
 {
@@ -30,19 +38,34 @@ class PrivateKeyImpl final : public PrivateKey
 public:
     explicit PrivateKeyImpl(KeyOwner key)
         : _key(std::move(key))
-        , _type(Crypto::GetKeyType(_key.get()))
-        , _bits(EVP_PKEY_get_bits(_key.get()))
-        , _contexts(_key.get(), _type == KeyType::RSA ? &SetUpRsa : &SetUpEcdsa)
+        , _facts(GetKeyFacts(_key.get()))
+        , _contexts(_key.get(), _facts.type == KeyType::RSA ? &SetUpRsa : &SetUpEcdsa)
     {}
 
-    KeyType GetKeyType() const noexcept override { return _type; }
-    int GetBits() const noexcept override { return _bits; }
+    KeyType GetKeyType() const noexcept override { return _facts.type; }
+    int GetBits() const noexcept override { return _facts.bits; }
     std::string GetDescription() const override { return DescribeKey(_key.get()); }
 
     std::vector<unsigned char> SignDigest(
         HashAlgorithm algorithm, const unsigned char* digest) const override
     {
         const ErrorQueueScope errors;
+        std::vector<unsigned char> signature = Sign(algorithm, digest);
+        while (_doubtful > 0) {
+            --_doubtful;
+            if (IsGenuine(signature, algorithm, digest)) {
+                break;
+            }
+            signature = Sign(algorithm, digest);
+        }
+        return _facts.type == KeyType::EC ? ToPlainEcdsa(signature) : signature;
+    }
+
+    EVP_PKEY* GetHandle() const noexcept { return _key.get(); }
+
+private:
+    std::vector<unsigned char> Sign(HashAlgorithm algorithm, const unsigned char* digest) const
+    {
         const KeyContextOwner context = _contexts.Get(algorithm);
         std::size_t length = static_cast<std::size_t>(EVP_PKEY_get_size(_key.get()));
         std::vector<unsigned char> signature(length);
@@ -50,16 +73,35 @@ public:
             || EVP_PKEY_sign(
                    context.get(), signature.data(), &length, digest, GetDigestLength(algorithm))
                    != 1) {
+            _doubtful = SignaturesInDoubt;
             throw CryptoException(
                 "A key of type " + GetDescription() + " fails to sign: " + GetOpenSslError());
         }
         signature.resize(length);
-        return _type == KeyType::EC ? ToPlainEcdsa(signature) : signature;
+        return signature;
     }
 
-    EVP_PKEY* GetHandle() const noexcept { return _key.get(); }
+    /** Whether a signature with the padding of `SetUpRsa` is one; also if that cannot be said. */
+    bool IsGenuine(
+        const std::vector<unsigned char>& signature,
+        HashAlgorithm algorithm,
+        const unsigned char* digest) const
+    {
+        const KeyContextOwner context(EVP_PKEY_CTX_new_from_pkey(nullptr, _key.get(), nullptr));
+        if (_facts.type != KeyType::RSA || !context || EVP_PKEY_verify_init(context.get()) != 1
+            || EVP_PKEY_CTX_set_rsa_padding(context.get(), RSA_PKCS1_PADDING) != 1
+            || EVP_PKEY_CTX_set_signature_md(context.get(), GetDigest(algorithm)) != 1) {
+            return true;
+        }
+        return EVP_PKEY_verify(
+                   context.get(),
+                   signature.data(),
+                   signature.size(),
+                   digest,
+                   GetDigestLength(algorithm))
+               == 1;
+    }
 
-private:
     /** r || s of a signature in DER form [XMLDSIG11 6.4.3]. */
     std::vector<unsigned char> ToPlainEcdsa(const std::vector<unsigned char>& der) const
     {
@@ -76,8 +118,8 @@ private:
     }
 
     KeyOwner _key;
-    KeyType _type;
-    int _bits;
+    KeyFacts _facts;
+    mutable std::atomic<int> _doubtful{0}; // how many of the next signatures are looked at
     PreparedContexts _contexts;
 };
 

@@ -28,10 +28,8 @@ std::vector<unsigned char> ToDerEcdsa(
     const int size = i2d_ECDSA_SIG(value.get(), nullptr);
     std::vector<unsigned char> der(size > 0 ? static_cast<std::size_t>(size) : 0);
     unsigned char* out = der.data();
-    if (size > 0) {
-        i2d_ECDSA_SIG(value.get(), &out);
-    }
-    return der;
+    const bool isWritten = size > 0 && i2d_ECDSA_SIG(value.get(), &out) == size;
+    return isWritten ? der : std::vector<unsigned char>();
 }
 
 bool SetUpRsa(EVP_PKEY_CTX* context, const EVP_MD* digest)
@@ -62,9 +60,8 @@ CryptoException::~CryptoException() = default;
 
 PublicKeyImpl::PublicKeyImpl(KeyOwner key)
     : _key(std::move(key))
-    , _type(Crypto::GetKeyType(_key.get()))
-    , _bits(EVP_PKEY_get_bits(_key.get()))
-    , _contexts(_key.get(), _type == KeyType::RSA ? &SetUpRsa : &SetUpEcdsa)
+    , _facts(GetKeyFacts(_key.get()))
+    , _contexts(_key.get(), _facts.type == KeyType::RSA ? &SetUpRsa : &SetUpEcdsa)
     , _pssContexts(_key.get(), &SetUpPss)
 {}
 
@@ -76,7 +73,7 @@ bool PublicKeyImpl::VerifyDigest(
 {
     const ErrorQueueScope errors;
     std::vector<unsigned char> der;
-    if (_type == KeyType::EC) {
+    if (_facts.type == KeyType::EC) {
         der = ToDerEcdsa(_key.get(), signature, signatureLength);
         signature = der.data();
         signatureLength = der.size();
@@ -93,7 +90,7 @@ bool PublicKeyImpl::VerifyPssDigest(
     const unsigned char* signature,
     std::size_t signatureLength) const
 {
-    if (_type != KeyType::RSA) {
+    if (_facts.type != KeyType::RSA) {
         return false;
     }
     const ErrorQueueScope errors;
@@ -125,7 +122,9 @@ std::vector<unsigned char> PublicKeyImpl::GetEncoded() const
     }
     std::vector<unsigned char> der(static_cast<std::size_t>(size));
     unsigned char* out = der.data();
-    i2d_PUBKEY(_key.get(), &out);
+    if (i2d_PUBKEY(_key.get(), &out) != size) {
+        throw std::bad_alloc(); // it was possible a moment ago
+    }
     return der;
 }
 

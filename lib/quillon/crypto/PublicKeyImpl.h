@@ -14,8 +14,8 @@ class PublicKeyImpl final : public PublicKey
 public:
     explicit PublicKeyImpl(KeyOwner key);
 
-    KeyType GetKeyType() const noexcept override { return _type; }
-    int GetBits() const noexcept override { return _bits; }
+    KeyType GetKeyType() const noexcept override { return _facts.type; }
+    int GetBits() const noexcept override { return _facts.bits; }
     std::string GetDescription() const override { return DescribeKey(_key.get()); }
     bool VerifyDigest(
         HashAlgorithm algorithm,
@@ -38,8 +38,7 @@ private:
         std::size_t signatureLength) const;
 
     KeyOwner _key;
-    KeyType _type;
-    int _bits;
+    KeyFacts _facts;
     PreparedContexts _contexts;
     PreparedContexts _pssContexts;
 };

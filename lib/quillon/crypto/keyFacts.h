@@ -7,7 +7,13 @@
 /** What is known of a key by its handle, public or private. */
 namespace Quillon::Crypto {
 
-KeyType GetKeyType(const EVP_PKEY* key);
+struct KeyFacts
+{
+    KeyType type = KeyType::OTHER;
+    int bits = 0;
+};
+
+KeyFacts GetKeyFacts(const EVP_PKEY* key);
 
 /** For messages, for example `RSA-2048` or `EC prime256v1`. */
 std::string DescribeKey(const EVP_PKEY* key);

@@ -11,10 +11,10 @@ void CallbackThread::Start()
     }
 }
 
-void CallbackThread::Push(const Ref<Exchange>& exchange)
+void CallbackThread::Push(Notice& notice) noexcept
 {
     const std::lock_guard<std::mutex> lock(_mutex);
-    _due.push_back(exchange);
+    _due.splice(_due.end(), notice);
     _changed.notify_one();
 }
 
@@ -26,12 +26,12 @@ void CallbackThread::Run()
             _changed.wait(lock);
             continue;
         }
-        Ref<Exchange> exchange = std::move(_due.front());
-        _due.pop_front();
+        Notice next;
+        next.splice(next.end(), _due, _due.begin());
         _calling = true;
         lock.unlock();
-        exchange->Deliver();
-        exchange.reset();
+        next.front()->GetExchange().Deliver(*next.front());
+        next.clear();
         lock.lock();
         _calling = false;
     }
@@ -39,7 +39,7 @@ void CallbackThread::Run()
 
 void CallbackThread::Stop()
 {
-    std::deque<Ref<Exchange>> dropped;
+    Notice dropped;
     {
         const std::lock_guard<std::mutex> lock(_mutex);
         _stopping = true;

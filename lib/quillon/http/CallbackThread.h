@@ -3,18 +3,22 @@
 #include "http/Exchange.h"
 
 #include <condition_variable>
-#include <deque>
+#include <list>
 #include <mutex>
 #include <thread>
 
 namespace Quillon::Http {
+
+/** An exchange whose completion is due. Made before the exchange begins: its end needs no memory.
+ */
+using Notice = std::list<Ref<PendingRequestItemImpl>>;
 
 /** Calls completions one after another, so that no caller's code runs on the I/O thread. */
 class CallbackThread
 {
 public:
     void Start();
-    void Push(const Ref<Exchange>& exchange);
+    void Push(Notice& notice) noexcept;
 
     /**
      * Lets no further completion start. Does not wait for one that runs: it is the caller's code,
@@ -27,7 +31,7 @@ private:
 
     std::mutex _mutex;
     std::condition_variable _changed;
-    std::deque<Ref<Exchange>> _due;
+    Notice _due;
     bool _stopping = false;
     bool _calling = false;
     std::thread _thread;

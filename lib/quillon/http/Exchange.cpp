@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <chrono>
+#include <new>
 #include <utility>
 
 namespace Quillon::Http {
@@ -30,11 +31,14 @@ std::string FormatSeconds(long long microseconds)
     return text + " seconds";
 }
 
-void LogStrayException(const std::string& what)
+void LogStrayException(const char* what) noexcept
 {
-    Service::GetApp()->GetLogFacility().GetLogger("Quillon")->Log(
-        Service::LOG_LEVEL_WARNING,
-        "The completion of an HTTP exchange raised an exception: " + what);
+    try {
+        Service::GetApp()->GetLogFacility().GetLogger("Quillon")->Log(
+            Service::LOG_LEVEL_WARNING,
+            std::string("The completion of an HTTP exchange raised an exception: ") + what);
+    } catch (const std::bad_alloc&) { // NOLINT(bugprone-empty-catch): a lost line harms nobody
+    }
 }
 
 } // namespace
@@ -56,7 +60,7 @@ bool Exchange::Complete(Outcome outcome)
     return !_completion.empty();
 }
 
-void Exchange::Deliver()
+void Exchange::Deliver(PendingRequestItem& item) noexcept
 {
     Completion completion;
     {
@@ -67,10 +71,8 @@ void Exchange::Deliver()
     if (completion.empty()) {
         return;
     }
-    // The caller's own item may be gone already; this one stands for the same exchange.
-    const Ref<PendingRequestItem> item(new PendingRequestItemImpl(Ref<Exchange>(this)));
     try {
-        completion(_outcome.error.get(), _outcome.response.get(), item.get());
+        completion(_outcome.error.get(), _outcome.response.get(), &item);
     } catch (const std::exception& error) {
         LogStrayException(error.what());
     } catch (...) {

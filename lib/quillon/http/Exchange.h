@@ -31,8 +31,12 @@ public:
     /** Sets the outcome, unless the exchange was called off. @return if the completion is due. */
     bool Complete(Outcome outcome);
 
-    /** Calls the completion with the outcome, unless the exchange was called off. */
-    void Deliver();
+    /**
+     * Calls the completion with the outcome, unless the exchange was called off.
+     *
+     * @param item  what the completion is given for this exchange.
+     */
+    void Deliver(PendingRequestItem& item) noexcept;
 
     /** See `System::ScheduledItem::Cancel`. The completion is released. */
     bool Cancel() noexcept;

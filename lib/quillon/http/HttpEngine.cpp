@@ -19,6 +19,12 @@ namespace {
 /** The poll returns for every event; this only bounds the harm of one that got lost. */
 constexpr std::chrono::milliseconds LongestPoll{60'000};
 
+/** Until connections that could not be closed for lack of memory are looked at again. */
+constexpr std::chrono::milliseconds PollWithoutMemory{1'000};
+
+/** The system may have no memory for the octet that wakes the poll up; then there soon is some. */
+constexpr int WakeUps = 16;
+
 /** No process has this one. */
 constexpr int NoProcess = -1;
 
@@ -31,11 +37,6 @@ union ImmortalEngine {
 
     HttpEngine engine;
 };
-
-Outcome MakeFailure(const std::string& text)
-{
-    return {std::make_shared<HttpException>(text), {}};
-}
 
 [[noreturn]] void ThrowForked()
 {
@@ -89,6 +90,8 @@ void HttpEngine::Start()
     if (!stops) {
         ThrowEnded();
     }
+    _noMemory =
+        std::make_shared<const HttpException>("There is not enough memory for the exchange.");
     // A broken connection raises SIGPIPE, which libcurl leaves to us.
     const System::SignalBlock noSignals;
     try {
@@ -191,8 +194,10 @@ void HttpEngine::Wake() noexcept
 {
     CURLM* const multi = _multi;
     // The wake-up channel of a forked child is still that of its parent.
-    if (multi != nullptr && !HasForked()) {
-        curl_multi_wakeup(multi);
+    if (multi == nullptr || HasForked()) {
+        return;
+    }
+    for (int i = 0; i < WakeUps && curl_multi_wakeup(multi) != CURLM_OK; ++i) {
     }
 }
 
@@ -208,8 +213,7 @@ void HttpEngine::Run()
         int running = 0;
         curl_multi_perform(_multi, &running);
         CompleteFinished();
-        const auto longest = static_cast<int>(CloseIdle().count());
-        curl_multi_poll(_multi, nullptr, 0, longest, nullptr);
+        curl_multi_poll(_multi, nullptr, 0, static_cast<int>(LookForIdle().count()), nullptr);
     }
     CloseEverything();
 }
@@ -226,13 +230,16 @@ bool HttpEngine::TakeWork(std::vector<std::unique_ptr<Transfer>>& submitted)
     return true;
 }
 
-void HttpEngine::StartTransfer(std::unique_ptr<Transfer> transfer)
+void HttpEngine::StartTransfer(std::unique_ptr<Transfer> transfer) noexcept
 {
-    if (transfer->GetExchange()->IsCancelled()) {
+    if (transfer->GetExchange().IsCancelled()) {
         return;
     }
     try {
         transfer->Prepare();
+    } catch (const std::bad_alloc&) {
+        Complete(std::move(transfer), {_noMemory, {}});
+        return;
     } catch (const std::exception& error) {
         Complete(std::move(transfer), MakeFailure(error.what()));
         return;
@@ -240,10 +247,20 @@ void HttpEngine::StartTransfer(std::unique_ptr<Transfer> transfer)
     Perform(std::move(transfer));
 }
 
-void HttpEngine::Perform(std::unique_ptr<Transfer> transfer)
+void HttpEngine::Perform(std::unique_ptr<Transfer> transfer) noexcept
+{
+    try {
+        Attach(transfer);
+    } catch (const std::bad_alloc&) {
+        Complete(std::move(transfer), {_noMemory, {}});
+    }
+}
+
+/** Takes the transfer if it does not throw. */
+void HttpEngine::Attach(std::unique_ptr<Transfer>& transfer)
 {
     CURL* const easy = transfer->GetHandle();
-    _transfers[easy] = std::move(transfer);
+    _transfers[easy].swap(transfer);
     const CURLMcode code = curl_multi_add_handle(_multi, easy);
     if (code != CURLM_OK) {
         Complete(Remove(easy), MakeFailure(curl_multi_strerror(code)));
@@ -256,12 +273,22 @@ void HttpEngine::DropCancelled()
         return;
     }
     for (auto position = _transfers.begin(); position != _transfers.end();) {
-        if (position->second->GetExchange()->IsCancelled()) {
+        if (position->second->GetExchange().IsCancelled()) {
             curl_multi_remove_handle(_multi, position->first);
             position = _transfers.erase(position);
         } else {
             ++position;
         }
+    }
+}
+
+/** @return when to look again, at the latest. */
+std::chrono::milliseconds HttpEngine::LookForIdle() noexcept
+{
+    try {
+        return CloseIdle();
+    } catch (const std::bad_alloc&) {
+        return PollWithoutMemory;
     }
 }
 
@@ -308,18 +335,39 @@ void HttpEngine::CompleteFinished()
             Perform(std::move(transfer));
             continue;
         }
-        Outcome outcome = transfer->Finish(result);
+        Outcome outcome = Finish(*transfer, result);
         Complete(std::move(transfer), std::move(outcome));
     }
 }
 
-void HttpEngine::Complete(std::unique_ptr<Transfer> transfer, Outcome outcome)
+Outcome HttpEngine::Finish(Transfer& transfer, CURLcode result) const noexcept
 {
-    const Ref<Exchange> exchange = transfer->GetExchange();
+    try {
+        return transfer.Finish(result);
+    } catch (const std::bad_alloc&) {
+        return {_noMemory, {}};
+    } catch (const std::exception& error) {
+        return MakeFailure(error.what());
+    }
+}
+
+Outcome HttpEngine::MakeFailure(const char* text) const noexcept
+{
+    try {
+        return {std::make_shared<HttpException>(text), {}};
+    } catch (const std::bad_alloc&) {
+        return {_noMemory, {}};
+    }
+}
+
+void HttpEngine::Complete(std::unique_ptr<Transfer> transfer, Outcome outcome) noexcept
+{
+    Notice notice = transfer->TakeNotice();
+    Exchange& exchange = notice.front()->GetExchange();
     // Before anyone hears of the end: the request with its secrets is gone by then.
     transfer.reset();
-    if (exchange->Complete(std::move(outcome))) {
-        _callbackThread.Push(exchange);
+    if (exchange.Complete(std::move(outcome))) {
+        _callbackThread.Push(notice);
     }
 }
 
@@ -329,21 +377,26 @@ std::unique_ptr<Transfer> HttpEngine::Remove(CURL* easy)
     return std::move(_transfers.extract(easy).mapped());
 }
 
+/** Whoever waits is told; completions do not run in a process that ends. */
+void HttpEngine::GiveUp(const Transfer& transfer) const noexcept
+{
+    transfer.GetExchange().Complete(MakeFailure("The process is about to end."));
+}
+
 void HttpEngine::CloseEverything()
 {
-    std::vector<std::unique_ptr<Transfer>> transfers;
+    std::vector<std::unique_ptr<Transfer>> submitted;
     {
         const System::ProcessLock lock(_mutex);
-        transfers.swap(_submitted);
+        submitted.swap(_submitted);
     }
+    for (const std::unique_ptr<Transfer>& transfer : submitted) {
+        GiveUp(*transfer);
+    }
+    submitted.clear();
     while (!_transfers.empty()) {
-        transfers.push_back(Remove(_transfers.begin()->first));
+        GiveUp(*Remove(_transfers.begin()->first));
     }
-    for (const std::unique_ptr<Transfer>& transfer : transfers) {
-        // Whoever waits is told; completions do not run in a process that ends.
-        transfer->GetExchange()->Complete(MakeFailure("The process is about to end."));
-    }
-    transfers.clear();
     std::list<Connections> retired;
     const System::ProcessLock lock(_mutex);
     retired.swap(_retired);

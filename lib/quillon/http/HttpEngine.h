@@ -77,13 +77,18 @@ private:
     // On the I/O thread.
     void Run();
     bool TakeWork(std::vector<std::unique_ptr<Transfer>>& submitted);
-    void StartTransfer(std::unique_ptr<Transfer> transfer);
-    void Perform(std::unique_ptr<Transfer> transfer);
+    void StartTransfer(std::unique_ptr<Transfer> transfer) noexcept;
+    void Perform(std::unique_ptr<Transfer> transfer) noexcept;
+    void Attach(std::unique_ptr<Transfer>& transfer);
     void DropCancelled();
+    std::chrono::milliseconds LookForIdle() noexcept;
     std::chrono::milliseconds CloseIdle();
     void CompleteFinished();
-    void Complete(std::unique_ptr<Transfer> transfer, Outcome outcome);
+    void Complete(std::unique_ptr<Transfer> transfer, Outcome outcome) noexcept;
+    Outcome Finish(Transfer& transfer, CURLcode result) const noexcept;
+    Outcome MakeFailure(const char* text) const noexcept;
     std::unique_ptr<Transfer> Remove(CURL* easy);
+    void GiveUp(const Transfer& transfer) const noexcept;
     void CloseEverything();
 
     bool IsOwn(const System::ProcessLock& lock) noexcept;
@@ -99,6 +104,9 @@ private:
     std::atomic<int> _pid{0};
     std::thread _ioThread;
     CallbackThread _callbackThread;
+
+    // Made before there is a need for it. Whoever waits is told even if there is no memory.
+    std::shared_ptr<const Exception> _noMemory;
 
     std::map<CURL*, std::unique_ptr<Transfer>> _transfers; // on the I/O thread only
 };

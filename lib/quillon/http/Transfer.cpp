@@ -38,12 +38,13 @@ Transfer::Transfer(
     Ref<ClientRequestImpl> request,
     Ref<ConnectionPoolImpl> pool,
     Ref<CookieStoreImpl> cookies,
-    Ref<Exchange> exchange)
+    Ref<PendingRequestItemImpl> item)
     : _request(std::move(request))
     , _pool(std::move(pool))
     , _spec(_pool->GetSpec())
     , _cookies(std::move(cookies))
-    , _exchange(std::move(exchange))
+    , _notice(1, std::move(item))
+    , _exchange(_notice.front()->GetExchange())
     , _reply(_request->GetBodyStatuses(), !_request->GetObserver().empty())
     , _record(new Ssl::PeerRecord)
     , _easy(curl_easy_init())
@@ -326,7 +327,7 @@ void Transfer::Tell(const Outcome& outcome) const
 ExchangeFacts Transfer::CollectFacts(const Outcome& outcome) const
 {
     ExchangeFacts facts = ReadFacts(_easy.get());
-    facts.server = _exchange->GetServer();
+    facts.server = _exchange.GetServer();
     facts.path = _request->GetPath();
     facts.tlsVersion = _record->version;
     facts.tlsCipher = _record->cipher;
@@ -356,8 +357,8 @@ TimeoutException Transfer::DescribeTimeout() const
 {
     const long long connectTimeout = _request->GetConnectTimeout();
     return !_isSent && connectTimeout < _request->GetTimeout()
-               ? MakeConnectTimeoutException(_exchange->GetServer(), connectTimeout)
-               : MakeTimeoutException(_exchange->GetServer(), _request->GetTimeout());
+               ? MakeConnectTimeoutException(_exchange.GetServer(), connectTimeout)
+               : MakeTimeoutException(_exchange.GetServer(), _request->GetTimeout());
 }
 
 bool Transfer::IsAnswered(CURLcode result) const noexcept
@@ -398,14 +399,14 @@ std::string Transfer::DescribeTlsRefusal() const
 {
     long verdict = 0;
     curl_easy_getinfo(_easy.get(), CURLINFO_SSL_VERIFYRESULT, &verdict);
-    return "The TLS certificate of " + _exchange->GetServer() + " is refused: "
+    return "The TLS certificate of " + _exchange.GetServer() + " is refused: "
            + (verdict != 0 ? Ssl::DescribeVerifyResult(verdict) : _errorText.data())
            + ". It must name \"" + _spec.tls->GetName() + "\" and lead to a trusted authority.";
 }
 
 std::string Transfer::DescribeAlert(CURLcode result) const
 {
-    const std::string& server = _exchange->GetServer();
+    const std::string& server = _exchange.GetServer();
     const std::string words = Ssl::DescribeAlert(_record->alert) + ".";
     if (!Ssl::IsAboutCertificate(_record->alert)) {
         return result == CURLE_SSL_CONNECT_ERROR
@@ -423,7 +424,7 @@ std::string Transfer::DescribeFailedHandshake() const
     const std::string detail = GetDetail(CURLE_SSL_CONNECT_ERROR);
     // libcurl has no words for an end, nor OpenSSL for an alert that says no more than that.
     const bool isEnd = _record->isClosed || detail.find("SSL_ERROR_SYSCALL") != std::string::npos;
-    return "The TLS handshake with " + _exchange->GetServer()
+    return "The TLS handshake with " + _exchange.GetServer()
            + " failed: " + (isEnd ? "the server ended the connection" : detail) + ".";
 }
 
@@ -445,7 +446,7 @@ std::string Transfer::DescribeBrokenConnection() const
 {
     const int error = GetSystemError();
     const bool isOfThisConnection = error != 0 && error != _earlierError;
-    return "The exchange with " + _exchange->GetServer() + " failed: "
+    return "The exchange with " + _exchange.GetServer() + " failed: "
            + (isOfThisConnection ? System::DescribeSystemError(error) : GetDetail(CURLE_RECV_ERROR))
            + ".";
 }
@@ -462,7 +463,7 @@ std::string Transfer::GetDetail(CURLcode result) const
 
 std::string Transfer::Describe(CURLcode result) const
 {
-    const std::string& server = _exchange->GetServer();
+    const std::string& server = _exchange.GetServer();
     if (!_reply.GetProblem().empty()) {
         return "The reply of " + server + " " + _reply.GetProblem() + ".";
     }

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "http/CallbackThread.h"
 #include "http/ClientRequestImpl.h"
 #include "http/ConnectionPoolImpl.h"
 #include "http/CookieStoreImpl.h"
@@ -23,7 +24,7 @@ public:
         Ref<ClientRequestImpl> request,
         Ref<ConnectionPoolImpl> pool,
         Ref<CookieStoreImpl> cookies,
-        Ref<Exchange> exchange);
+        Ref<PendingRequestItemImpl> item);
 
     ~Transfer();
     Transfer(const Transfer&) = delete;
@@ -44,7 +45,10 @@ public:
     bool IsToBeStartedAgain() noexcept;
 
     CURL* GetHandle() const noexcept { return _easy.get(); }
-    const Ref<Exchange>& GetExchange() const noexcept { return _exchange; }
+    Exchange& GetExchange() const noexcept { return _exchange; }
+
+    /** What the callback thread is given when the exchange has ended. Called once. */
+    Notice TakeNotice() noexcept { return std::move(_notice); }
 
 private:
     static std::size_t OnHeader(char* data, std::size_t size, std::size_t count, void* self);
@@ -87,7 +91,8 @@ private:
     const Ref<ConnectionPoolImpl> _pool;
     const ConnectionSpecImpl& _spec; // kept by the pool
     const Ref<CookieStoreImpl> _cookies;
-    const Ref<Exchange> _exchange;
+    Notice _notice;
+    Exchange& _exchange; // kept by the notice, or by who has taken that
 
     CookieLines _givenCookies;
     ReplyCollector _reply;

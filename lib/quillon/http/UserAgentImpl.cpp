@@ -24,12 +24,12 @@ public:
         HttpEngine& engine = HttpEngine::Get();
         engine.RequireRunning();
         const Ref<Exchange> exchange(new Exchange(completion, _pool->GetSpec().DescribeServer()));
-        const Ref<PendingRequestItem> item(new PendingRequestItemImpl(exchange));
+        const Ref<PendingRequestItemImpl> item(new PendingRequestItemImpl(exchange));
         engine.Submit(std::make_unique<Transfer>(
             Ref<ClientRequestImpl>(static_cast<ClientRequestImpl*>(request)),
             _pool,
             _cookies,
-            exchange));
+            item));
         pending = item;
     }
 

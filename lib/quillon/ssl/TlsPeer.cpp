@@ -12,11 +12,23 @@ namespace {
 /** Enough for a burst of connections; a server hands out two with each full handshake. */
 constexpr std::size_t MaxSessions = 16;
 
-/** The slot of an `SSL_CTX` that points to its `TlsPeer`. */
-int GetPeerSlot()
+/**
+ * A slot of every `SSL_CTX`, made when there is a first need of it. If there is no memory for it,
+ * the next look makes it. On the I/O thread.
+ */
+int GetSlot(int& slot, CRYPTO_EX_free* release) noexcept
 {
-    static const int slot = SSL_CTX_get_ex_new_index(0, nullptr, nullptr, nullptr, nullptr);
+    if (slot < 0) {
+        slot = SSL_CTX_get_ex_new_index(0, nullptr, nullptr, nullptr, release);
+    }
     return slot;
+}
+
+/** The slot of an `SSL_CTX` that points to its `TlsPeer`. */
+int GetPeerSlot() noexcept
+{
+    static int slot = -1;
+    return GetSlot(slot, nullptr);
 }
 
 void ReleaseRecord(
@@ -26,10 +38,10 @@ void ReleaseRecord(
 }
 
 /** The slot of an `SSL_CTX` that owns a reference to its `PeerRecord`. */
-int GetRecordSlot()
+int GetRecordSlot() noexcept
 {
-    static const int slot = SSL_CTX_get_ex_new_index(0, nullptr, nullptr, nullptr, &ReleaseRecord);
-    return slot;
+    static int slot = -1;
+    return GetSlot(slot, &ReleaseRecord);
 }
 
 bool AttachRecord(SSL_CTX* connection, const Ref<PeerRecord>& record) noexcept
@@ -73,11 +85,14 @@ void NoteCertificates(const STACK_OF(X509) * shown, PeerRecord& record)
     }
 }
 
-void NoteParameters(const SSL* ssl, PeerRecord& record)
+void NoteParameters(const SSL* ssl, PeerRecord& record) noexcept
 {
-    record.version = SSL_get_version(ssl);
-    record.cipher = SSL_get_cipher_name(ssl);
     record.isResumed = SSL_session_reused(ssl) == 1;
+    try {
+        record.version = SSL_get_version(ssl);
+        record.cipher = SSL_get_cipher_name(ssl);
+    } catch (const std::bad_alloc&) { // NOLINT(bugprone-empty-catch): for people to look at
+    }
 }
 
 /** Looks on while OpenSSL verifies, and changes nothing: a chain that is refused is gone later. */
@@ -114,7 +129,9 @@ TlsPeer::TlsPeer(Ref<const SSLContextImpl> context, std::string name, bool nameI
     : _context(std::move(context))
     , _name(std::move(name))
     , _nameIsAddress(nameIsAddress)
-{}
+{
+    _sessions.reserve(MaxSessions); // no exception must pass through OpenSSL
+}
 
 bool TlsPeer::Prepare(SSL_CTX* connection, const Ref<PeerRecord>& record) noexcept
 {
@@ -173,15 +190,11 @@ void TlsPeer::OfferSession(const SSL* ssl)
 
 int TlsPeer::OnNewSession(SSL* ssl, SSL_SESSION* session)
 {
-    try {
-        GetPeer(ssl)->Keep(SessionOwner(session));
-    } catch (const std::bad_alloc&) {
-        // The owner has freed it; the next connection makes a full handshake.
-    }
+    GetPeer(ssl)->Keep(SessionOwner(session));
     return 1; // the reference is ours
 }
 
-void TlsPeer::Keep(SessionOwner session)
+void TlsPeer::Keep(SessionOwner session) noexcept
 {
     if (_sessions.size() == MaxSessions) {
         _sessions.erase(_sessions.begin());
@@ -189,7 +202,7 @@ void TlsPeer::Keep(SessionOwner session)
     _sessions.push_back(std::move(session));
 }
 
-TlsPeer::SessionOwner TlsPeer::Take()
+TlsPeer::SessionOwner TlsPeer::Take() noexcept
 {
     if (_sessions.empty()) {
         return nullptr;

@@ -55,8 +55,8 @@ private:
     static int OnNewSession(SSL* ssl, SSL_SESSION* session);
 
     bool RequireName(SSL_CTX* connection) const noexcept;
-    void Keep(SessionOwner session);
-    SessionOwner Take();
+    void Keep(SessionOwner session) noexcept;
+    SessionOwner Take() noexcept;
 
     Ref<const SSLContextImpl> _context;
     std::string _name;

@@ -91,6 +91,23 @@ class WhatStandsThere(ServiceTest):
                           "UsageError", f"cannot write `{old}': Permission denied")
         self.assertEqual("older", old.read_text())
 
+    def test_disk_without_room_leaves_the_older_file(self):
+        """A file system of its own, of two pages, one of which the older file takes."""
+        script = """mount -t tmpfs -o size=8k tmpfs "$1" && cd "$1" && printf older >token.xml || exit 99
+            shift
+            "$@" --out token.xml; code=$?
+            cat token.xml && ls -A && exit "$code" """
+        command = ["unshare", "--map-root-user", "--mount", "sh", "-c", script, "sh",
+                   self.folder, SSOCLIENT, "acquire", "password", *self.sts.service_options,
+                   "--user", DevelopmentSts.USER, "--password-file", "/dev/stdin"]
+        result = subprocess.run(list(map(str, command)), capture_output=True, text=True,
+                                input=DevelopmentSts.PASSWORD + "\n", timeout=120, check=False)
+        if result.returncode == 99 or "unshare failed" in result.stderr:
+            self.skipTest("this host lets nobody mount: " + result.stderr)
+        self.assert_fails(Result(result.returncode, "", result.stderr), USAGE, "UsageError",
+                          "cannot write `token.xml': No space left on device")
+        self.assertEqual("oldertoken.xml\n", result.stdout)
+
     def test_full_disk_leaves_the_older_file(self):
         # A limit on the size of files fails a write as a full disk does, or by a signal.
         out = self.write("token.xml", "older")
