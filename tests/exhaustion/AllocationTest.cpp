@@ -47,6 +47,19 @@ TEST(LackOfMemory, EndsReading)
     ExpectNoFinding(GetReadings(), EachAllocationAndTheRest(31));
 }
 
+TEST(LackOfMemory, LeavesNoKeyThatSignsWrongly)
+{
+    // OpenSSL makes new numbers for the blinding with each 32nd signature, so that the same
+    // allocation is another one each time.
+    constexpr int Signatures = 32;
+    const Operation signing = GetSigning();
+    for (int i = 0; i < Signatures; ++i) {
+        ExpectNoFinding({signing}, EachAllocation(1));
+        EXPECT_EQ(signing.run(), signing.result);
+    }
+    ExpectNoFinding({signing}, EachAllocationAndTheRest(1));
+}
+
 TEST(LackOfMemory, HasNoTokenAccepted)
 {
     ExpectNoFinding(GetJudgements(), EachAllocation(5));

@@ -80,6 +80,7 @@ Faults::Plan MakePlan(const Run& run, unsigned long nth)
     plan.fromThereOn = run.fromThereOn;
     plan.error = run.error;
     plan.spared = run.spared;
+    plan.only = run.only;
     return plan;
 }
 

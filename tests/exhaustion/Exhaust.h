@@ -23,6 +23,7 @@ struct Run
     int error = 0;
     bool fromThereOn = false;
     const char* spared = nullptr; ///< see Faults::Plan
+    const char* only = nullptr;   ///< the same
     /** What may keep a whole process from succeeding after it has failed in its first operation. */
     const char* lasting = nullptr;
     bool mustSurvive = false; ///< whether the failure must not show

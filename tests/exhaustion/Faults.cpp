@@ -147,7 +147,8 @@ bool IsInOrder() noexcept
 {
     const Exemption exemption;
     const Stack stack = GetStack();
-    if (current.spared != nullptr && IsIn(stack, current.spared)) {
+    if ((current.spared != nullptr && IsIn(stack, current.spared))
+        || (current.only != nullptr && !IsIn(stack, current.only))) {
         return false;
     }
     latest = stack;

@@ -32,7 +32,8 @@ struct Plan
     unsigned long nth = 0; ///< 0: none, they are only counted
     bool fromThereOn = false;
     int error = 0;                ///< what errno is; without a meaning for allocations
-    const char* spared = nullptr; ///< libraries or functions with this in their names
+    const char* spared = nullptr; ///< a library or function in which nothing fails; null for none
+    const char* only = nullptr;   ///< the one in which alone something fails
 };
 
 void Arm(const Plan& plan) noexcept;

@@ -17,6 +17,9 @@ using TokenPtr = boost::shared_ptr<const SsoClient::SamlToken>;
 /** Reading alone: documents, certificates and keys. */
 std::vector<Operation> GetReadings();
 
+/** Signing with one key. */
+Operation GetSigning();
+
 /** Judging genuine tokens and assertions, and one that breaks each of the rules. */
 std::vector<Operation> GetJudgements();
 

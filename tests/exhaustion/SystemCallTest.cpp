@@ -22,6 +22,7 @@ struct Failure
     int error;
     bool mustSurvive = false;
     const char* spared = nullptr;
+    const char* only = nullptr;
 };
 
 std::ostream& operator<<(std::ostream& out, const Failure& failure)
@@ -39,6 +40,7 @@ const std::vector<Failure> Failures{
     {"SendWithEintr", Kind::SEND, EINTR, true},
     // For the channel that wakes the I/O thread up it means that this is being woken up.
     {"SendWithEagain", Kind::SEND, EAGAIN, true, "curl_multi_wakeup"},
+    {"WakingUpWithEnomem", Kind::SEND, ENOMEM, true, nullptr, "curl_multi_wakeup"},
     {"ReceiveWithEconnreset", Kind::RECEIVE, ECONNRESET},
     {"ReceiveWithEnomem", Kind::RECEIVE, ENOMEM},
     {"ReceiveWithEintr", Kind::RECEIVE, EINTR, true},
@@ -65,6 +67,7 @@ protected:
         run.error = GetParam().error;
         run.mustSurvive = GetParam().mustSurvive;
         run.spared = GetParam().spared;
+        run.only = GetParam().only;
         return run;
     }
 
