@@ -68,7 +68,11 @@ Misbehaviour ReadRow(const Json& json)
 
 std::vector<Misbehaviour> ReadTable()
 {
-    const Json table = Json::parse(MisbehaviourTableText);
+    std::string text;
+    for (const char* const row : GetMisbehaviourRows()) {
+        text += (text.empty() ? "" : ",") + std::string(row);
+    }
+    const Json table = Json::parse(text);
     std::vector<Misbehaviour> rows;
     std::transform(table.begin(), table.end(), std::back_inserter(rows), &ReadRow);
     return rows;

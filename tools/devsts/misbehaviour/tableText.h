@@ -1,8 +1,10 @@
 #pragma once
 
+#include <vector>
+
 namespace DevSts {
 
-/** misbehaviours.json, as it was when the program was built. */
-extern const char* const MisbehaviourTableText;
+/** The text of misbehaviours.json when the program was built, cut at the commas between its rows. */
+const std::vector<const char*>& GetMisbehaviourRows();
 
 } // namespace DevSts
