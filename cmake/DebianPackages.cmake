@@ -84,17 +84,16 @@ Keeps good tokens for as long as a process lives: refreshes them in the
 background, bridges outages of the token service, and caches tokens that
 were exchanged for those of users.")
 string(CONCAT all_libraries "libquillon${major} ${same_version}, libssoclient${major} ${same_version}, "
-    "libssoclient-gss${major} ${same_version}")
-set(development_libraries
-    "${all_libraries}, libssoclient-runtime${major} ${same_version}")
-ssoclient_package(libssoclient-dev libdevel "${development_libraries}, libboost-dev (>= 1.74)"
+    "libssoclient-gss${major} ${same_version}, libssoclient-runtime${major} ${same_version}")
+ssoclient_package(libssoclient-dev libdevel "${all_libraries}, libboost-dev (>= 1.74)"
     "SAML 2.0 tokens from a WS-Trust 1.3 token service (development files)
 The headers of SsoClient and of Quillon below it, with a CMake package and
 pkg-config files.")
 ssoclient_package(ssoclient net "${all_libraries}"
     "SAML 2.0 tokens from a WS-Trust 1.3 token service (command line)
 Obtains, renews and validates SAML 2.0 tokens at a WS-Trust 1.3 security
-token service over HTTPS, and verifies and explains token files.")
+token service over HTTPS, keeps token files fresh, and verifies and
+explains them.")
 set(CPACK_DEBIAN_SSOCLIENT_PACKAGE_RECOMMENDS "krb5-user")
 ssoclient_package(ssoclient-devsts net ""
     "WS-Trust 1.3 token service for development and tests

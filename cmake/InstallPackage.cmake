@@ -31,6 +31,9 @@ if(SSOCLIENT_BUILD_TOOLS)
     set_target_properties(ssoclient_tool PROPERTIES INSTALL_RPATH "$ORIGIN/${bin_to_lib}")
     install(TARGETS ssoclient_tool RUNTIME
         DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT ssoclient)
+    # Where systemd looks below /usr and /usr/local alike.
+    install(FILES packaging/systemd/ssoclient-keep@.service
+        DESTINATION lib/systemd/system COMPONENT ssoclient)
 endif()
 # A service with well-known users is no part of a usual installation.
 if(SSOCLIENT_BUILD_DEVSTS)

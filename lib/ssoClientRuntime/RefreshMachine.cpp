@@ -55,7 +55,7 @@ bool RefreshMachine::IsDue(const Moment& now) const noexcept
     return !IsGood(now) || now.wall >= _held->refresh.wall || now.steady >= _held->refresh.steady;
 }
 
-std::optional<Span> RefreshMachine::GetWakeUp(const Moment& now) const
+std::optional<Span> RefreshMachine::GetNextAttempt(const Moment& now) const
 {
     if (!_isWanted || IsUnderWay()) {
         return std::nullopt;
@@ -67,7 +67,14 @@ std::optional<Span> RefreshMachine::GetWakeUp(const Moment& now) const
         return _outage->nextAttempt;
     }
     const Span byWall = now.steady + (_held->refresh.wall - now.wall);
-    return std::min({_held->refresh.steady, byWall, now.steady + LongestSleep});
+    return std::min(_held->refresh.steady, byWall);
+}
+
+/** Waits after failures are measured by the steady clock alone: nothing is missed by waiting. */
+std::optional<Span> RefreshMachine::GetWakeUp(const Moment& now) const
+{
+    const std::optional<Span> next = GetNextAttempt(now);
+    return next && !_outage ? std::min(*next, now.steady + LongestSleep) : next;
 }
 
 bool RefreshMachine::Accept(const Moment& asked, const Moment& now, const TokenFacts& token)

@@ -66,8 +66,12 @@ public:
     /** What is to be done now. It counts as under way until `Accept` or `Fail`. */
     Attempt Begin(const Moment& now);
 
+    /** When `Begin` has something to be done if nothing happens until then, by the steady clock;
+     *  absent while it is under way. */
+    std::optional<Span> GetNextAttempt(const Moment& now) const;
+
     /** When to call `Begin` the next time, by the steady clock; absent if there is nothing to wait
-     *  for. */
+     *  for. It may be earlier than the next attempt. */
     std::optional<Span> GetWakeUp(const Moment& now) const;
 
     /**

@@ -406,6 +406,9 @@ TokenSourceStatus TokenKeeper::DescribeStatus(const Moment& now) const
     status.isBusy = _machine.IsUnderWay();
     status.outage = DescribeOutage(now);
     status.serviceClockAhead = _serviceClockAhead;
+    if (const auto next = _isClosed ? std::nullopt : _machine.GetNextAttempt(now)) {
+        status.nextAttempt = ToDateTime(now.wall + (*next - now.steady));
+    }
     return status;
 }
 

@@ -133,7 +133,7 @@ class Documents(unittest.TestCase):
     def test_every_option_of_the_command_line_is_described(self):
         text = read("docs/usage.md")
         for command in (["acquire", "password"], ["acquire", "certificate"], ["acquire", "token"],
-                        ["acquire", "gss"], ["renew"], ["validate"], ["inspect"], ["doctor"]):
+                        ["acquire", "gss"], ["keep"], ["renew"], ["validate"], ["inspect"], ["doctor"]):
             options = set(re.findall(r"--[a-z][a-z-]+", help_of(*command))) - {"--help"}
             self.assertIn("--trust", options)
             for option in options:

@@ -1,6 +1,6 @@
-#include "Arguments.h"
 #include "Commands.h"
 #include "IdentityOptions.h"
+#include "PasswordOptions.h"
 #include "PresentedToken.h"
 #include "Secret.h"
 #include "ServiceOptions.h"
@@ -17,8 +17,7 @@ struct AcquirePasswordOptions
     IdentityOptions identity;
     TokenSpecOptions token;
     OutputOptions output;
-    std::string user;
-    std::string passwordFile;
+    PasswordOptions password;
 };
 
 using TokenPtr = boost::shared_ptr<const SsoClient::SamlToken>;
@@ -31,7 +30,9 @@ TokenPtr AcquireForAnother(
 {
     const CertificateList trusted = ReadCertificates(options.service.trustFiles);
     const auto service = options.service.CreateService(
-        trusted, options.identity.Read(), SsoClient::PasswordCredentials(options.user, password));
+        trusted,
+        options.identity.Read(),
+        SsoClient::PasswordCredentials(options.password.user, password));
     const TokenPtr presented =
         ReadToken(options.service.dialect.GetPresentedFile(), trusted, options.service);
     return options.service.Await(
@@ -44,13 +45,13 @@ ExitCode AcquirePassword(const AcquirePasswordOptions& options, const Presentati
         ReadCertificates(options.service.trustFiles), options.identity.Read());
     TokenOutput output(options.output, presentation);
     Quillon::Wiped password;
-    GetPassword(options.passwordFile, password);
+    GetPassword(options.password.file, password);
     if (!options.service.dialect.GetPresentedFile().empty()) {
         output.Show(AcquireForAnother(options, password.Get(), presentation));
         return ExitCode::DONE;
     }
     output.Show(options.service.Await(presentation, [&] {
-        return service->AcquireToken(options.user, password.Get(), options.token.spec);
+        return service->AcquireToken(options.password.user, password.Get(), options.token.spec);
     }));
     return ExitCode::DONE;
 }
@@ -63,17 +64,7 @@ void AddAcquirePasswordCommand(const Command& parent, Invocation& invocation)
         parent.AddCommand("password", "Acquire a token with a user name and a password");
     const auto options = std::make_shared<AcquirePasswordOptions>();
     options->service.AddTo(command, invocation.exchanges);
-    command.AddOption("--user", options->user, "User name")
-        .Required()
-        .Check(CheckName)
-        .ValueName("NAME");
-    command
-        .AddOption(
-            "--password-file",
-            options->passwordFile,
-            "File whose first line is the password, - for standard input (default: ask for it)")
-        .Check(CheckNotEmpty)
-        .ValueName("FILE");
+    options->password.AddTo(command).Required();
     options->identity.AddTo(command);
     options->token.AddTo(command);
     options->service.dialect.AddIssueTo(command, options->token.spec);

@@ -25,6 +25,7 @@ void AddAcquirePasswordCommand(const Command& parent, Invocation& invocation);
 void AddAcquireCertificateCommand(const Command& parent, Invocation& invocation);
 void AddAcquireTokenCommand(const Command& parent, Invocation& invocation);
 void AddAcquireGssCommand(const Command& parent, Invocation& invocation);
+void AddKeepCommand(const Command& parent, Invocation& invocation);
 void AddRenewCommand(const Command& parent, Invocation& invocation);
 void AddValidateCommand(const Command& parent, Invocation& invocation);
 void AddInspectCommand(const Command& parent, Invocation& invocation);

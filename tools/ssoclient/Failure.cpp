@@ -12,9 +12,6 @@ using Json = nlohmann::ordered_json;
 
 namespace {
 
-// A service may put megabytes into a fault.
-constexpr std::size_t MaxMessageBytes = 4096;
-
 struct Failure
 {
     std::string className;

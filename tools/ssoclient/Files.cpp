@@ -2,13 +2,10 @@
 
 #include "ExitCode.h"
 #include "FileDescriptor.h"
+#include "fileWriting.h"
 
 #include "quillon/MessageFormatter.h"
 
-#include <sys/stat.h>
-
-#include <cerrno>
-#include <csignal>
 #include <cstdio>
 #include <cstdlib>
 
@@ -49,73 +46,6 @@ std::string ReadAll(int descriptor, const std::string& name)
         }
     }
 }
-
-[[noreturn]] void ThrowWriteError(const std::string& path)
-{
-    ThrowSystemError("cannot write `" + path + "'");
-}
-
-/**
- * Renaming over a device or a pipe would replace it instead of writing to it. A link is refused
- * rather than followed: somebody else may have laid it where the file was expected.
- */
-void RequireRegularOrAbsent(const std::string& path)
-{
-    struct stat status = {};
-    if (::lstat(path.c_str(), &status) != 0) {
-        if (errno != ENOENT) {
-            ThrowWriteError(path);
-        }
-    } else if (S_ISLNK(status.st_mode)) {
-        throw UsageError(MessageFormatter::ASPrint("`%1' is a link: name the file itself", path));
-    } else if (!S_ISREG(status.st_mode)) {
-        throw UsageError(MessageFormatter::ASPrint("`%1' is not a regular file", path));
-    }
-}
-
-/** The folder of `path`, to put the name of a file behind. */
-std::string GetFolder(const std::string& path)
-{
-    const std::size_t slash = path.rfind('/');
-    return slash == std::string::npos ? "./" : path.substr(0, slash + 1);
-}
-
-void RequireWritableFolder(const std::string& path)
-{
-    if (::access(GetFolder(path).c_str(), W_OK | X_OK) != 0) {
-        ThrowWriteError(path);
-    }
-}
-
-void WriteAll(int descriptor, const std::string& text, const std::string& path)
-{
-    for (std::size_t at = 0; at < text.size();) {
-        const ssize_t count = RetryInterrupted(
-            [&] { return ::write(descriptor, text.data() + at, text.size() - at); });
-        if (count < 0) {
-            ThrowWriteError(path);
-        }
-        at += static_cast<std::size_t>(count);
-    }
-}
-
-/**
- * For as long as it lives, a file beyond the limit of the process is an error of `write`, not a
- * signal that would leave the temporary file behind.
- */
-class FileSizeSignalGuard
-{
-public:
-    FileSizeSignalGuard()
-        : _before(std::signal(SIGXFSZ, SIG_IGN))
-    {}
-    FileSizeSignalGuard(const FileSizeSignalGuard&) = delete;
-    FileSizeSignalGuard& operator=(const FileSizeSignalGuard&) = delete;
-    ~FileSizeSignalGuard() { std::signal(SIGXFSZ, _before); }
-
-private:
-    void (*_before)(int);
-};
 
 /** A file beside the one that it is to become; it goes if it does not become that. */
 class TemporaryFile

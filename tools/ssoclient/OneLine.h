@@ -22,5 +22,8 @@ std::string ToOneLine(std::string_view text);
 /** How much of a text of others a message repeats. */
 inline constexpr std::size_t MaxShownBytes = 300;
 
+/** How much of a failure's message is shown: a service may put megabytes into a fault. */
+inline constexpr std::size_t MaxMessageBytes = 4096;
+
 /** At most `maxBytes` of `text`, and how long it is if that is not all of it. */
 std::string Shorten(const std::string& text, std::size_t maxBytes);

@@ -14,6 +14,7 @@ std::unique_ptr<CommandLine> MakeCommandLine(Invocation& invocation)
     AddAcquireCertificateCommand(acquire, invocation);
     AddAcquireTokenCommand(acquire, invocation);
     AddAcquireGssCommand(acquire, invocation);
+    AddKeepCommand(program, invocation);
     AddRenewCommand(program, invocation);
     AddValidateCommand(program, invocation);
     AddInspectCommand(program, invocation);

@@ -37,6 +37,10 @@ struct TokenSourceStatus
      * more if the service issues its tokens in advance. Absent before the first token.
      */
     std::optional<std::chrono::microseconds> serviceClockAhead;
+
+    /** When the source asks for the next token if nothing happens until then, whether or not there
+     *  is an outage; absent while it does, and before the first token is wanted. */
+    std::optional<Quillon::System::DateTime> nextAttempt;
 };
 
 /** How a source keeps its token. As it starts, it is right for tokens of minutes to days. */

@@ -9,7 +9,7 @@ from programs import DONE, run, ssoclient
 
 SHARE = pathlib.Path(os.environ["SHARE"])
 COMMANDS = ("", "acquire", "acquire password", "acquire certificate", "acquire token",
-            "acquire gss", "renew", "validate", "inspect", "doctor", "profile", "profile show")
+            "acquire gss", "keep", "renew", "validate", "inspect", "doctor", "profile", "profile show")
 BASH = SHARE / "bash-completion" / "completions" / "ssoclient"
 ZSH = SHARE / "zsh" / "site-functions" / "_ssoclient"
 FISH = SHARE / "fish" / "vendor_completions.d" / "ssoclient.fish"
@@ -66,10 +66,11 @@ class Completions(unittest.TestCase):
 
     def test_know_commands_and_options(self):
         for complete in (self.bash, self.fish):
-            self.assertEqual({"acquire", "renew", "validate", "inspect", "doctor", "profile"},
+            self.assertEqual({"acquire", "keep", "renew", "validate", "inspect", "doctor",
+                              "profile"},
                              complete(""))
             self.assertEqual({"password", "certificate", "token", "gss"}, complete("acquire", ""))
-            for command in COMMANDS[2:6] + COMMANDS[6:10]:
+            for command in COMMANDS[2:11]:
                 with self.subTest(command=command):
                     self.assertEqual(options(command), complete(*command.split(), "--"))
 

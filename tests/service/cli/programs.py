@@ -9,6 +9,7 @@ import shutil
 import subprocess
 import tempfile
 import unittest
+import urllib.parse
 
 SSOCLIENT = os.environ["SSOCLIENT"]
 DATA = pathlib.Path(os.environ["TEST_DATA_DIR"])
@@ -93,15 +94,29 @@ class DevelopmentSts:
         self.state = pathlib.Path(self._folder.name)
         if like is not None:
             shutil.copytree(like.state, self.state, dirs_exist_ok=True)
-        self._process = subprocess.Popen(
-            [os.environ["DEVSTS"], "--state", str(self.state), *switches],
-            stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, stderr=subprocess.DEVNULL, text=True,
-            env=environment)
-        self.url = self._read_url()
+        self._switches = switches
+        self._environment = environment
+        self._start()
         self.ca = self.state / "ca.pem"
         self.trust = self.state / "sts.pem"
         self.key = self.state / "client.key"
         self.certificate = self.state / "client.pem"
+
+    def _start(self, *switches):
+        self._process = subprocess.Popen(
+            [os.environ["DEVSTS"], "--state", str(self.state), *self._switches, *switches],
+            stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, stderr=subprocess.DEVNULL, text=True,
+            env=self._environment)
+        self.url = self._read_url()
+
+    def go_down(self):
+        self._process.terminate()
+        self._process.wait(timeout=60)
+        self._process.stdout.close()
+
+    def come_up(self):
+        """At the same address, with the same keys."""
+        self._start("--listen", urllib.parse.urlsplit(self.url).netloc)
 
     def _read_url(self):
         for line in self._process.stdout:
@@ -119,9 +134,7 @@ class DevelopmentSts:
         return ["--key", self.key, "--cert", self.certificate]
 
     def stop(self):
-        self._process.terminate()
-        self._process.wait(timeout=60)
-        self._process.stdout.close()
+        self.go_down()
         self._folder.cleanup()
 
 

@@ -64,7 +64,7 @@ class Help(unittest.TestCase):
                 self.assert_prints(ssoclient(*command.split(), "--help"), *options)
 
     COMMANDS = ("", "acquire", "acquire password", "acquire certificate", "acquire token",
-                "acquire gss", "renew", "validate", "inspect", "doctor")
+                "acquire gss", "keep", "renew", "validate", "inspect", "doctor")
 
     def test_fits_into_80_columns(self):
         for command in self.COMMANDS:
@@ -78,7 +78,8 @@ class Help(unittest.TestCase):
                 text = ssoclient(*command.split(), "--help").out
                 self.assertRegex(text, rf"\nExample:\n  ssoclient {command} --?[\s\S]+\n\n"
                                  r"Exit codes: 0 done; [\s\S]+ 5 [^;]+\.\n\Z"
-                                 if command != "inspect" else r"\nExample:\n  ssoclient inspect ")
+                                 if command not in ("inspect", "keep")
+                                 else rf"\nExample:\n  ssoclient {command} \w+\.xml ")
 
     def test_examples_name_options_that_there_are(self):
         for command in self.COMMANDS[2:]:
@@ -137,7 +138,7 @@ class UsageErrors(ProgramTest):
         self.assert_misused(ssoclient(*command.split(), *arguments), command, message)
 
     def test_without_a_command(self):
-        self.assert_misuse("", "ssoclient needs a command: acquire, renew, validate, inspect, "
+        self.assert_misuse("", "ssoclient needs a command: acquire, keep, renew, validate, inspect, "
                            "doctor, profile")
         self.assert_misuse("acquire", "ssoclient acquire needs a command: password, certificate, "
                            "token, gss")
@@ -148,7 +149,7 @@ class UsageErrors(ProgramTest):
                            "certificate?", "cert")
 
     def test_unknown_command_is_not_shown(self):
-        self.assert_misuse("", "ssoclient has no such command, only acquire, renew, validate, "
+        self.assert_misuse("", "ssoclient has no such command, only acquire, keep, renew, validate, "
                            "inspect, doctor, profile", "SECRET")
         self.assert_misuse("acquire", "ssoclient acquire has no such command, only password, "
                            "certificate, token, gss", "SECRET", "SECRET")

@@ -502,6 +502,22 @@ TEST_F(TokenSourceTest, SaysHowItStands)
     EXPECT_TRUE(status.outage.nextAttempt);
 }
 
+TEST_F(TokenSourceTest, SaysWhenItAsksForTheNextToken)
+{
+    options.spreadsFirst = false;
+    options.jitter = 0;
+    const auto source = Make();
+    EXPECT_FALSE(source->GetStatus().nextAttempt);
+    source->GetToken();
+    EXPECT_EQ("2011-07-05T09:42:00.000Z", source->GetStatus().nextAttempt->ToString());
+    environment->StepWall(10min);
+    EXPECT_EQ("2011-07-05T09:42:00.000Z", source->GetStatus().nextAttempt->ToString());
+    BeUnreachable();
+    environment->Pass(32min);
+    const TokenSourceStatus status = source->GetStatus();
+    EXPECT_EQ(status.outage.nextAttempt->ToString(), status.nextAttempt->ToString());
+}
+
 TEST_F(TokenSourceTest, TellsItsObserverOfEachAttempt)
 {
     std::vector<std::string> told;
