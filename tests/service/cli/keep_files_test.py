@@ -121,7 +121,8 @@ class Later(KeepTest):
     """What stands in the way later is told, and the process goes on."""
 
     def test_link_is_laid_where_the_file_was(self):
-        keeping = self.keep("--status", self.status_file)
+        rarely = ["--lifetime", "100000", "--refresh-at", "90"]
+        keeping = self.keep("--status", self.status_file, *rarely)
         keeping.find(WRITTEN)
         target = self.write("target", "older")
         self.file.unlink()
