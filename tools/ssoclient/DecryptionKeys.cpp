@@ -6,6 +6,8 @@
 
 #include "quillon/MessageFormatter.h"
 
+#include <algorithm>
+
 using Quillon::Crypto::PrivateKey;
 
 namespace {
@@ -47,6 +49,11 @@ void DecryptionKeys::AddTo(const Command& command)
         .Needs(key)
         .Check(CheckNotEmpty)
         .ValueName("FILE");
+}
+
+bool DecryptionKeys::AreInStores() const
+{
+    return std::any_of(_names.begin(), _names.end(), &IsUri);
 }
 
 const DecryptionKeys::Keys& DecryptionKeys::Get() const

@@ -18,6 +18,9 @@ public:
 
     bool IsGiven() const { return !_names.empty(); }
 
+    /** Whether one is not in a file but in a store, for which others may do the work. */
+    bool AreInStores() const;
+
     /**
      * The keys, which are read once, so that a passphrase is asked for once.
      *

@@ -1,12 +1,15 @@
 #include "Arguments.h"
 #include "AssertionPage.h"
 #include "Commands.h"
+#include "Confinement.h"
 #include "DialectOptions.h"
 #include "ExitCode.h"
 #include "Explanation.h"
 #include "Files.h"
 #include "GeneralReading.h"
+#include "PageWriter.h"
 #include "Profile.h"
+#include "Terminal.h"
 #include "TokenOutput.h"
 #include "TokenPage.h"
 #include "Trust.h"
@@ -53,10 +56,21 @@ Quillon::Ref<const Quillon::Crypto::Certificate> FindSigner(
 }
 
 /** Where the page goes; looked up before anything is read. */
-std::optional<OutputFile> OpenPage(const InspectOptions& options)
+std::unique_ptr<PageWriter> OpenPage(const InspectOptions& options)
 {
-    return options.pageFile.empty() ? std::nullopt
-                                    : std::optional<OutputFile>(std::in_place, options.pageFile);
+    return options.pageFile.empty() ? nullptr : std::make_unique<PageWriter>(options.pageFile);
+}
+
+/** Called when everything is read that is needed, and before the first look at it. */
+void ConfineInspection(const InspectOptions& options)
+{
+    // A store of keys, such as a smart card's, may have to ask somebody for each decryption.
+    const std::string why = options.reading.decryptionKeys.AreInStores()
+                                ? "the decryption key is in a store"
+                                : Confine();
+    if (!why.empty() && options.verbose) {
+        Notice("the token is read without a filter of system calls: " + why);
+    }
 }
 
 SsoClient::AssertionRules MakeRules(const InspectOptions& options)
@@ -98,10 +112,11 @@ Quillon::Ref<const Quillon::Crypto::Certificate> FindAssertionSigner(
 ExitCode InspectGeneral(
     const InspectOptions& options, const Presentation& presentation, std::string& text)
 {
-    const std::optional<OutputFile> page = OpenPage(options);
+    const std::unique_ptr<PageWriter> page = OpenPage(options);
     const CertificateList trusted = ReadCertificates(options.trustFiles);
     text = ReadFile(options.file);
     const SsoClient::AssertionRules rules = MakeRules(options);
+    ConfineInspection(options);
     const auto assertion = SsoClient::VerifyAssertion(text, trusted, rules);
     // Before anything is shown: the assertion may expire in between.
     const auto signer = page ? FindAssertionSigner(text, trusted, rules) : nullptr;
@@ -136,9 +151,10 @@ ExitCode Inspect(const InspectOptions& options, const Presentation& presentation
         return InspectGeneral(options, presentation, text);
     }
     TokenOutput output({}, presentation);
-    const std::optional<OutputFile> page = OpenPage(options);
+    const std::unique_ptr<PageWriter> page = OpenPage(options);
     const CertificateList trusted = ReadCertificates(options.trustFiles);
     text = ReadFile(options.file);
+    ConfineInspection(options);
     const auto token = ReadDefaultToken(text, trusted, options);
     // Before anything is shown: the token may expire in between.
     const bool needsSigner = page || presentation.ShowsExplanations();

@@ -3,16 +3,19 @@
 import datetime
 import hashlib
 import json
+import os
+import pathlib
 import re
 import ssl
 import stat
 import subprocess
+import time
 import unittest
 
 import lxml.etree
 import lxml.html
 
-from programs import (DATA, DONE, OUT_OF_VALIDITY, REFUSED, ProgramTest, ServiceTest,
+from programs import (DATA, DONE, OUT_OF_VALIDITY, REFUSED, SSOCLIENT, ProgramTest, ServiceTest,
                       ssoclient)
 from terminals import TerminalTest
 
@@ -169,6 +172,51 @@ class Inspect(ProgramTest):
         text = f"<a>{'x' * 30_000_000}</a>"
         result = ssoclient("inspect", "-", *self.TRUST, stdin=text)
         self.assert_fails_matching(result, REFUSED, "XMLParseException", ".+")
+
+
+class Confined(ProgramTest):
+    """What looks at a token opens nothing any more."""
+
+    COMMAND = ("inspect", Inspect.TOKEN, "--trust", DATA / "keys" / "sts-cert.pem", *ANY_TIME)
+
+    def setUp(self):
+        super().setUp()
+        notice = ssoclient(*self.COMMAND, "--verbose").err
+        if notice:
+            self.assertRegex(notice, r"\Assoclient: the token is read without a filter of system "
+                                     r"calls: .+\n\Z")
+            self.skipTest(notice)
+
+    def filter_of(self, *options):
+        """As the system has it while the process waits for somebody to read what it writes."""
+        reading, writing = os.pipe()
+        os.set_blocking(writing, False)
+        with self.assertRaises(BlockingIOError):
+            while True:
+                os.write(writing, b" " * 4096)
+        os.set_blocking(writing, True)
+        command = [SSOCLIENT, *self.COMMAND, *options]
+        with subprocess.Popen(list(map(str, command)), stdout=writing) as process:
+            os.close(writing)
+            deadline = time.monotonic() + 20
+            found = "0"
+            while found == "0" and time.monotonic() < deadline:
+                status = pathlib.Path(f"/proc/{process.pid}/status").read_text("ascii")
+                found = re.search(r"^Seccomp:\s+(\d)$", status, re.MULTILINE)[1]
+            with open(reading, "rb") as output:
+                output.read()
+        self.assertEqual(DONE, process.returncode)
+        return found
+
+    def test_by_a_filter_of_system_calls(self):
+        self.assertEqual("2", self.filter_of())
+
+    def test_also_with_other_outputs(self):
+        for options in (("--json",), ("--explain",), ("--general",),
+                        ("--html", self.folder / "page.html")):
+            with self.subTest(options=options):
+                self.assertEqual("2", self.filter_of(*options))
+        self.assertTrue((self.folder / "page.html").is_file())
 
 
 class Explained(ProgramTest):
