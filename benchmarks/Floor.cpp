@@ -2,6 +2,7 @@
 
 #include <libxml/SAX2.h>
 #include <libxml/parser.h>
+#include <libxml/parserInternals.h>
 
 #include <openssl/evp.h>
 #include <openssl/pem.h>
@@ -62,7 +63,9 @@ void OnCharacters(void* data, const xmlChar* /*text*/, int length)
     *static_cast<std::size_t*>(data) += static_cast<std::size_t>(length);
 }
 
-bool ParsePass(const std::string& xml)
+using ParserOwner = std::unique_ptr<xmlParserCtxt, Deleter<xmlFreeParserCtxt>>;
+
+xmlSAXHandler MakeHandler()
 {
     xmlSAXHandler handler;
     std::memset(&handler, 0, sizeof handler);
@@ -70,10 +73,18 @@ bool ParsePass(const std::string& xml)
     handler.startElementNs = &OnStartElement;
     handler.endElementNs = &OnEndElement;
     handler.characters = &OnCharacters;
+    return handler;
+}
+
+bool ParsePass(xmlParserCtxt& parser, const std::string& xml)
+{
     std::size_t characters = 0;
-    return xmlSAXUserParseMemory(&handler, &characters, xml.data(), static_cast<int>(xml.size()))
-               == 0
-           && characters != 0;
+    xmlCtxtReset(&parser);
+    *parser.sax = MakeHandler();
+    parser.userData = &characters;
+    inputPush(
+        &parser, xmlNewStringInputStream(&parser, reinterpret_cast<const xmlChar*>(xml.c_str())));
+    return xmlParseDocument(&parser) == 0 && characters != 0;
 }
 
 // An RSA key and the digest that it signs.
@@ -99,27 +110,12 @@ struct RsaOperation
         return context;
     }
 
-    bool Sign(std::vector<unsigned char>& signature) const
+    bool Sign(EVP_PKEY_CTX& context, std::vector<unsigned char>& signature) const
     {
         std::size_t length = static_cast<std::size_t>(EVP_PKEY_get_size(key.get()));
         signature.resize(length);
         return EVP_PKEY_sign(
-                   MakeContext(&EVP_PKEY_sign_init).get(),
-                   signature.data(),
-                   &length,
-                   signedDigest.data(),
-                   signedDigest.size())
-               == 1;
-    }
-
-    bool Verify(const std::vector<unsigned char>& signature) const
-    {
-        return EVP_PKEY_verify(
-                   MakeContext(&EVP_PKEY_verify_init).get(),
-                   signature.data(),
-                   signature.size(),
-                   signedDigest.data(),
-                   signedDigest.size())
+                   &context, signature.data(), &length, signedDigest.data(), signedDigest.size())
                == 1;
     }
 };
@@ -132,41 +128,59 @@ KeyOwner ReadKey(const std::string& pem)
 
 } // namespace
 
+// Whatever can be made once and used again is.
 struct VerifyFloor::Handles
 {
     RsaOperation rsa{KeyOwner(EVP_RSA_gen(2048))};
+    ContextOwner verifying = rsa.MakeContext(&EVP_PKEY_verify_init);
+    MdContextOwner hashing{EVP_MD_CTX_new()};
+    ParserOwner parser{xmlNewParserCtxt()};
     std::vector<unsigned char> signature;
 
     bool HashPass(const std::string& xml) const
     {
-        const MdContextOwner context(EVP_MD_CTX_new());
         DigestBytes digest{};
-        return EVP_DigestInit_ex2(context.get(), rsa.sha256.get(), nullptr) == 1
-               && EVP_DigestUpdate(context.get(), xml.data(), xml.size()) == 1
-               && EVP_DigestFinal_ex(context.get(), digest.data(), nullptr) == 1;
+        return EVP_DigestInit_ex2(hashing.get(), rsa.sha256.get(), nullptr) == 1
+               && EVP_DigestUpdate(hashing.get(), xml.data(), xml.size()) == 1
+               && EVP_DigestFinal_ex(hashing.get(), digest.data(), nullptr) == 1;
+    }
+
+    bool VerifyOnce() const
+    {
+        return EVP_PKEY_verify(
+                   verifying.get(),
+                   signature.data(),
+                   signature.size(),
+                   rsa.signedDigest.data(),
+                   rsa.signedDigest.size())
+               == 1;
     }
 };
 
 VerifyFloor::VerifyFloor()
     : _handles(std::make_unique<Handles>())
 {
-    Require(_handles->rsa.Sign(_handles->signature));
+    Require(_handles->hashing != nullptr && _handles->parser != nullptr);
+    Require(
+        _handles->rsa.Sign(*_handles->rsa.MakeContext(&EVP_PKEY_sign_init), _handles->signature));
 }
 
 VerifyFloor::~VerifyFloor() = default;
 
 bool VerifyFloor::Run(const std::string& xml) const
 {
-    return ParsePass(xml) && _handles->HashPass(xml) && _handles->HashPass(xml)
-           && _handles->rsa.Verify(_handles->signature);
+    return ParsePass(*_handles->parser, xml) && _handles->HashPass(xml) && _handles->HashPass(xml)
+           && _handles->VerifyOnce();
 }
 
 struct SignFloor::Handles
 {
     RsaOperation rsa;
+    ContextOwner signing;
 
     explicit Handles(KeyOwner key)
         : rsa(std::move(key))
+        , signing(rsa.MakeContext(&EVP_PKEY_sign_init))
     {}
 };
 
@@ -179,7 +193,7 @@ SignFloor::~SignFloor() = default;
 bool SignFloor::Run() const
 {
     std::vector<unsigned char> signature;
-    return _handles->rsa.Sign(signature);
+    return _handles->rsa.Sign(*_handles->signing, signature);
 }
 
 } // namespace Benchmarks

@@ -2,6 +2,7 @@
 
 #include "Floor.h"
 #include "TestData.h"
+#include "XmlsecPeer.h"
 
 #include "quillon/system/Clock.h"
 #include "ssoClient/CreateSamlToken.h"
@@ -53,12 +54,22 @@ void BM_Floor(benchmark::State& state, const std::string& xml, const VerifyFloor
     }
 }
 
+void BM_Xmlsec(benchmark::State& state, const std::string& xml, const XmlsecPeer& peer)
+{
+    for (auto _ : state) {
+        if (!peer.Run(xml)) {
+            state.SkipWithError("xmlsec1 refuses the token");
+        }
+    }
+}
+
 } // namespace
 
 void RegisterVerifyBenchmarks()
 {
     static const TokenClock Clock;
     static const VerifyFloor Floor;
+    static const XmlsecPeer Peer(ReadFile("keys/sts-cert.pem"));
     static const auto Trusted =
         Quillon::Crypto::ParsePemCertificates(ReadFile("keys/sts-cert.pem"));
     Quillon::System::ReplaceClock(&Clock);
@@ -70,6 +81,9 @@ void RegisterVerifyBenchmarks()
         });
         benchmark::RegisterBenchmark(("Own/" + name).c_str(), [xml](benchmark::State& state) {
             BM_Own(state, xml, Trusted);
+        });
+        benchmark::RegisterBenchmark(("xmlsec1/" + name).c_str(), [xml](benchmark::State& state) {
+            BM_Xmlsec(state, xml, Peer);
         });
         // Of these two the ratio says how much is saved.
         const std::string again = std::string("VerifyAgain/") + size;

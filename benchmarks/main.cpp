@@ -1,4 +1,5 @@
 #include "AcquireBenchmark.h"
+#include "GrowthBenchmark.h"
 #include "RatioReporter.h"
 #include "SignBenchmark.h"
 #include "TokenSourceBenchmark.h"
@@ -16,6 +17,7 @@ int main(int argc, char** argv)
     Benchmarks::RegisterSignBenchmarks();
     Benchmarks::RegisterTokenSourceBenchmarks();
     Benchmarks::RegisterAcquireBenchmarks();
+    Benchmarks::RegisterGrowthBenchmarks();
     Benchmarks::RatioReporter reporter;
     benchmark::RunSpecifiedBenchmarks(&reporter);
     benchmark::Shutdown();
