@@ -1,6 +1,7 @@
 #include "ssoClientRuntime/DelegatedTokensImpl.h"
 
 #include "ssoClient/Exceptions.h"
+#include "ssoClientRuntime/observing.h"
 
 #include <boost/smart_ptr/make_shared.hpp>
 
@@ -37,12 +38,15 @@ boost::shared_ptr<const SamlToken> DelegatedTokensImpl::GetToken(
     }
     DelegationKey key(service, presented, spec);
     std::shared_future<Outcome> others;
+    Token kept;
     {
         const std::lock_guard<std::mutex> lock(_mutex);
-        if (Token token = Find(key)) {
-            return token;
-        }
-        others = JoinOrBegin(key);
+        kept = Find(key);
+        others = kept ? others : JoinOrBegin(key);
+    }
+    TellLookUp(_options.observer, "DelegatedTokens", kept || others.valid());
+    if (kept) {
+        return kept;
     }
     const Outcome outcome = others.valid() ? others.get() : Exchange(key, presented, spec);
     if (outcome.failure) {

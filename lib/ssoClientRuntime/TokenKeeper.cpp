@@ -84,6 +84,7 @@ TokenKeeper::TokenKeeper(TokenWays ways, const TokenSourceOptions& options)
     , _environment(options.environment ? options.environment : GetProcessEnvironment())
     , _identity(options.identity)
     , _observer(options.observer)
+    , _operationObserver(options.operationObserver)
     , _machine(
           MakePolicy(options), [environment = _environment] { return environment->DrawNumber(); })
 {}
@@ -312,7 +313,8 @@ void TokenKeeper::DropPendingAttempt(const Quillon::Exception& failure)
     Apply([&](const Moment& now) {
         if (_pending) {
             _pending.reset();
-            Take({{nullptr, Keep(failure)}, now, {}}, now);
+            Result result{{nullptr, Keep(failure)}, now, {}, {}};
+            Take(result, now);
         }
     });
 }
@@ -334,9 +336,9 @@ bool TokenKeeper::MakePendingAttempt()
         held = _token;
         asked = GetNow();
     }
-    const Result result = Make(attempt, held, asked);
+    Result result = Make(attempt, held, asked);
     // Whoever waits may end the process with what it is told.
-    Apply([&](const Moment& now) { Take(result, now); }, [&] { Report(result.outcome); });
+    Apply([&](const Moment& now) { Take(result, now); }, [&] { Report(result); });
     return true;
 }
 
@@ -344,7 +346,12 @@ TokenKeeper::Result TokenKeeper::Make(Attempt attempt, const Token& held, const 
 {
     // The token may have been refused since it was decided to renew it.
     const bool renews = attempt == Attempt::RENEW && held != nullptr;
-    Result result{renews ? Try([&] { return _ways.renew(*held); }) : Try(_ways.acquire), asked, {}};
+    const ObservedRefresh refresh{renews};
+    if (_operationObserver != nullptr) {
+        _operationObserver->OnRefreshBegin(refresh);
+    }
+    Result result{
+        renews ? Try([&] { return _ways.renew(*held); }) : Try(_ways.acquire), asked, {}, refresh};
     if (const Token& token = result.outcome.token) {
         result.facts.validity = ReadValidity(*token);
         result.facts.isRenewable = _ways.renew != nullptr && IsRenewableBy(*token, _identity.get());
@@ -352,7 +359,7 @@ TokenKeeper::Result TokenKeeper::Make(Attempt attempt, const Token& held, const 
     return result;
 }
 
-void TokenKeeper::Take(const Result& result, const Moment& now)
+void TokenKeeper::Take(Result& result, const Moment& now)
 {
     if (_isClosed) {
         return;
@@ -365,13 +372,15 @@ void TokenKeeper::Take(const Result& result, const Moment& now)
     _machine.Fail(now, Classify(*_reason));
 }
 
-void TokenKeeper::Accept(const Result& result, const Moment& now)
+/** A token that cannot be handed out is a failure of the attempt. */
+void TokenKeeper::Accept(Result& result, const Moment& now)
 {
     const Validity& validity = result.facts.validity;
     const Span tookHalf = (now.steady - result.asked.steady) / 2;
     _serviceClockAhead = validity.issued - (now.wall - tookHalf);
     if (!_machine.Accept(result.asked, now, result.facts)) {
         _reason = MakeTooEarly(validity, now);
+        result.outcome = {nullptr, _reason};
         return;
     }
     _token = result.outcome.token;
@@ -412,11 +421,26 @@ TokenSourceStatus TokenKeeper::DescribeStatus(const Moment& now) const
     return status;
 }
 
-void TokenKeeper::Report(const Outcome& outcome) const
+void TokenKeeper::TellEnd(const Result& result) const
+{
+    if (_operationObserver == nullptr) {
+        return;
+    }
+    OperationOutcome outcome;
+    outcome.succeeded = result.outcome.failure == nullptr;
+    if (!outcome.succeeded) {
+        outcome.exceptionClass = Quillon::GetClassName(*result.outcome.failure);
+    }
+    outcome.durationMicroseconds = (GetNow().steady - result.asked.steady).count();
+    _operationObserver->OnRefreshEnd(result.refresh, outcome);
+}
+
+void TokenKeeper::Report(const Result& result) const
 {
     try {
-        if (outcome.failure) {
-            Warn("No token: " + DescribeFailure(*outcome.failure));
+        TellEnd(result);
+        if (result.outcome.failure) {
+            Warn("No token: " + DescribeFailure(*result.outcome.failure));
         }
         if (_observer) {
             _observer(GetStatus());

@@ -65,6 +65,7 @@ private:
         Outcome outcome;
         Moment asked;
         TokenFacts facts;
+        ObservedRefresh refresh;
     };
 
     using Chores = std::vector<std::function<void()>>;
@@ -84,8 +85,8 @@ private:
     std::optional<Span> GetNextAttempt() const;
     void ArmTimer(const Moment& now, Chores& chores);
     void LetGo();
-    void Take(const Result& result, const Moment& now);
-    void Accept(const Result& result, const Moment& now);
+    void Take(Result& result, const Moment& now);
+    void Accept(Result& result, const Moment& now);
     TokenOutage DescribeOutage(const Moment& now) const;
     TokenSourceStatus DescribeStatus(const Moment& now) const;
 
@@ -97,12 +98,14 @@ private:
     bool MakePendingAttempt();
     Result Make(Attempt attempt, const Token& held, const Moment& asked) const;
     void DropPendingAttempt(const Quillon::Exception& failure);
-    void Report(const Outcome& outcome) const;
+    void Report(const Result& result) const;
+    void TellEnd(const Result& result) const;
 
     const TokenWays _ways;
     const boost::shared_ptr<RuntimeEnvironment> _environment;
     const Quillon::Ref<const Quillon::Crypto::Certificate> _identity;
     const std::function<void(const TokenSourceStatus&)> _observer;
+    const boost::shared_ptr<OperationObserver> _operationObserver; // may be null
 
     PublishedToken _published; // written under the lock
 

@@ -2,6 +2,7 @@
 
 #include "quillon/Exceptions.h"
 #include "quillon/system/Clock.h"
+#include "ssoClientRuntime/observing.h"
 
 #include <boost/smart_ptr/make_shared.hpp>
 
@@ -66,9 +67,11 @@ boost::shared_ptr<const SamlToken> TokenVerifierImpl::Verify(const std::string& 
     Token known = Find(digest, trust);
     if (known != nullptr && known->ToXml() == xml) {
         ++_hits;
+        TellLookUp(_options.observer, "TokenVerifier", true);
         return known;
     }
     ++_misses;
+    TellLookUp(_options.observer, "TokenVerifier", false);
     Entry entry = MakeEntry(digest, CreateSamlToken(xml, *trust, _options.clockToleranceSec));
     return Keep(std::move(entry), trust);
 }

@@ -15,7 +15,20 @@ struct ObservedOperation
     std::string name; ///< for example `AcquireTokenByCertificate`
 };
 
-/** How a call ended. */
+/** An attempt of a token source to have another token. */
+struct ObservedRefresh
+{
+    /** Whether the token that it has is renewed; otherwise one is acquired. */
+    bool isRenewal = false;
+};
+
+/** Something that remembers, so that it need not be asked for or judged again. */
+struct ObservedCache
+{
+    std::string name; ///< `DelegatedTokens` or `TokenVerifier`
+};
+
+/** How a call, or a refresh, ended. */
 struct OperationOutcome
 {
     bool succeeded = false;
@@ -48,6 +61,22 @@ public:
 
     virtual void OnEnd(
         const ObservedOperation& operation, const OperationOutcome& outcome) noexcept;
+
+    // Told by the objects of the library for long-running processes that are given the observer.
+
+    /**
+     * On the thread that makes the attempt, as its end. The operations in between are told only if
+     * their service has an observer. A renewal that is refused is followed by an acquisition.
+     */
+    virtual void OnRefreshBegin(const ObservedRefresh& refresh) noexcept;
+
+    /** A token that came too late, or ends too early, to be handed out is a failure. */
+    virtual void OnRefreshEnd(
+        const ObservedRefresh& refresh, const OperationOutcome& outcome) noexcept;
+
+    /** What was asked for was there, or somebody else was about to get it. */
+    virtual void OnCacheHit(const ObservedCache& cache) noexcept;
+    virtual void OnCacheMiss(const ObservedCache& cache) noexcept;
 
 protected:
     OperationObserver() = default;

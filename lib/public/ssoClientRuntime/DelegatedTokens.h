@@ -1,5 +1,6 @@
 #pragma once
 
+#include "ssoClient/OperationObserver.h"
 #include "ssoClient/SamlToken.h"
 #include "ssoClient/SecurityTokenService.h"
 #include "ssoClientRuntime/RuntimeEnvironment.h"
@@ -25,6 +26,9 @@ struct DelegatedTokensOptions
 
     /** Null: the environment of the process. */
     boost::shared_ptr<RuntimeEnvironment> environment;
+
+    /** Told of each hit and miss, on the thread that asks. Kept; null for none. */
+    boost::shared_ptr<OperationObserver> observer;
 };
 
 struct DelegatedTokensStatus

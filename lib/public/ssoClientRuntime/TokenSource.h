@@ -1,6 +1,7 @@
 #pragma once
 
 #include "quillon/crypto/Certificate.h"
+#include "ssoClient/OperationObserver.h"
 #include "ssoClient/SamlToken.h"
 #include "ssoClient/SecurityTokenService.h"
 #include "ssoClientRuntime/Exceptions.h"
@@ -103,6 +104,10 @@ struct TokenSourceOptions
 
     /** Null: the environment of the process. */
     boost::shared_ptr<RuntimeEnvironment> environment;
+
+    /** Told of the beginning and the end of each attempt, how it is made, and how long it took.
+     *  Kept; null for none. */
+    boost::shared_ptr<OperationObserver> operationObserver;
 };
 
 /**

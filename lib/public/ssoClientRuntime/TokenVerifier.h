@@ -2,6 +2,7 @@
 
 #include "quillon/crypto/Certificate.h"
 #include "ssoClient/CreateSamlToken.h"
+#include "ssoClient/OperationObserver.h"
 #include "ssoClientRuntime/Export.h"
 
 #include <boost/smart_ptr/shared_ptr.hpp>
@@ -22,6 +23,9 @@ struct TokenVerifierOptions
     /** Beyond either, what was used least recently goes. 0: nothing is kept. */
     std::size_t maxEntries = 10'000;
     std::size_t maxBytes = std::size_t{64} * 1024 * 1024;
+
+    /** Told of each hit and miss, on the thread that asks. Kept; null for none. */
+    boost::shared_ptr<OperationObserver> observer;
 };
 
 struct TokenVerifierStatus

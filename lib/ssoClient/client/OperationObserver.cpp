@@ -16,4 +16,13 @@ void OperationObserver::OnEnd(
     const ObservedOperation& /*operation*/, const OperationOutcome& /*outcome*/) noexcept
 {}
 
+void OperationObserver::OnRefreshBegin(const ObservedRefresh& /*refresh*/) noexcept {}
+
+void OperationObserver::OnRefreshEnd(
+    const ObservedRefresh& /*refresh*/, const OperationOutcome& /*outcome*/) noexcept
+{}
+
+void OperationObserver::OnCacheHit(const ObservedCache& /*cache*/) noexcept {}
+void OperationObserver::OnCacheMiss(const ObservedCache& /*cache*/) noexcept {}
+
 } // namespace SsoClient

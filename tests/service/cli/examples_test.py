@@ -3,6 +3,7 @@
 import os
 import unittest
 
+import expositions
 from programs import DESCRIPTION, DONE, DevelopmentSts, ServiceTest, run
 from realm import KerberosTest
 
@@ -62,6 +63,59 @@ class Examples(ServiceTest):
         self.assertEqual(1, result.err.count("no new token: "))
         self.assertRegex(result.out, r"\A(There is no token; attempts have failed since \S+, the next"
                                      r" one is at \S+: InvalidCredentialsException: .+\n){2}\Z")
+
+    def observe(self, example, password):
+        return run(os.environ[example], self.sts.url, self.sts.ca, self.sts.trust,
+                   DevelopmentSts.USER, stdin=password + "\n")
+
+    def metrics(self, result):
+        """The counts; the sums of durations differ each time."""
+        return {name: value for name, value in expositions.parse(result.out).items()
+                if "_seconds_sum" not in name and "_bucket" not in name}
+
+    def test_observe_with_prometheus(self):
+        result = self.observe("PROMETHEUS_EXAMPLE", DevelopmentSts.PASSWORD)
+        self.assertEqual((DONE, ""), (result.code, result.err))
+        self.assertEqual({
+            'sso_operations_total{failure="",operation="AcquireToken"}': 1,
+            'sso_exchange_seconds_count{connection="new",operation="AcquireToken"}': 1,
+            'sso_refreshes_total{failure="",how="acquisition"}': 1,
+            'sso_cache_look_ups_total{cache="TokenVerifier",outcome="hit"}': 1,
+            'sso_cache_look_ups_total{cache="TokenVerifier",outcome="miss"}': 1,
+        }, self.metrics(result))
+
+    def test_observe_with_prometheus_a_refusal(self):
+        result = self.observe("PROMETHEUS_EXAMPLE", "wrong")
+        self.assertEqual(1, result.code)
+        self.assertRegex(result.err, r"NoTokenException: .+InvalidCredentialsException")
+        failure = 'failure="InvalidCredentialsException"'
+        self.assertEqual({
+            f'sso_operations_total{{{failure},operation="AcquireToken"}}': 1,
+            'sso_faults_total{operation="AcquireToken"}': 1,
+            'sso_exchange_seconds_count{connection="new",operation="AcquireToken"}': 1,
+            f'sso_refreshes_total{{{failure},how="acquisition"}}': 1,
+        }, self.metrics(result))
+
+    def assert_lines(self, result, *patterns):
+        begin = r"\[[\d-]+ [\d:.]+\] \[sso\] "
+        self.assertRegex(result.err, "\\A" + "".join(f"{begin}{line}\n" for line in patterns) + "\\Z")
+
+    def test_observe_with_spdlog(self):
+        result = self.observe("SPDLOG_EXAMPLE", DevelopmentSts.PASSWORD)
+        self.assertEqual(DONE, result.code)
+        self.assertRegex(result.out, DESCRIPTION)
+        self.assert_lines(
+            result, r"\[info\] (\S+) AcquireToken begins",
+            r"\[info\] \1 127\.0\.0\.1 port \d+: HTTP status 200 after \d+ us, \d{3,} octets sent, "
+            r"\d{4,} received, TLSv1\.3, new connection", r"\[info\] \1 done after \d+ us")
+
+    def test_observe_with_spdlog_a_refusal(self):
+        result = self.observe("SPDLOG_EXAMPLE", "wrong")
+        self.assertEqual((1, ""), (result.code, result.out))
+        lines, _, last = result.err.rstrip("\n").rpartition("\n")
+        self.assertRegex(last, r"\AInvalidCredentialsException: ")
+        self.assertRegex(lines, r"\[warning\] \S+ fault \S+: .+\n.+\[error\] \S+ failed: "
+                         r"InvalidCredentialsException\Z")
 
     def test_inspect_file(self):
         out = self.folder / "token.xml"

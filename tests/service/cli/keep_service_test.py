@@ -1,42 +1,15 @@
 """`ssoclient keep` as a service: its manager, and its metrics."""
 
 import os
-import re
 import signal
 import socket
 import unittest
 import urllib.parse
 import urllib.request
 
+from expositions import parse
 from keeping import DEADLINE, WRITTEN, KeepTest
 from programs import USAGE, ssoclient
-
-# [Prometheus text format 0.0.4]
-NAME = r"[a-zA-Z_:][a-zA-Z0-9_:]*"
-SAMPLE = re.compile(
-    rf'({NAME})(\{{[a-zA-Z_][a-zA-Z0-9_]*="(?:[^"\\\n]|\\[\\"n])*"\}})? (-?\d+(?:\.\d+)?)\Z')
-
-
-def parse(text):
-    """The values of an exposition by name and label, each after its own HELP and TYPE."""
-    assert text.endswith("\n")
-    samples, described, family = {}, set(), None
-    for line in text[:-1].split("\n"):
-        if match := re.match(rf"# HELP ({NAME}) \S.*\Z", line):
-            family = match[1]
-            assert family not in described, line
-        elif match := re.match(rf"# TYPE ({NAME}) (counter|gauge)\Z", line):
-            assert match[1] == family, line
-            described.add(family)
-            assert (match[2] == "counter") == family.endswith("_total"), line
-        else:
-            match = SAMPLE.match(line)
-            assert match and match[1] == family and family in described, line
-            key = match[1] + (match[2] or "")
-            assert key not in samples, line
-            samples[key] = float(match[3])
-    return samples
-
 
 class NotifySocket:
     """What a service manager listens at."""
