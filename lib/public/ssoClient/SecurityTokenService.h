@@ -173,4 +173,15 @@ SSOCLIENT_API boost::shared_ptr<SecurityTokenService> CreateSecurityTokenService
 SSOCLIENT_API boost::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
     const SecurityTokenServiceConfig& config, const ExchangeOptions& options);
 
+/**
+ * A service that shares everything with `service`, kept connections included, but for the
+ * certificates that may have signed its tokens.
+ *
+ * @throws Quillon::InvalidArgumentException  `service` is null or not one that this library made,
+ *                                            or a certificate is null.
+ */
+SSOCLIENT_API boost::shared_ptr<SecurityTokenService> WithTrustedCertificates(
+    const boost::shared_ptr<const SecurityTokenService>& service,
+    const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& certificates);
+
 } // namespace SsoClient

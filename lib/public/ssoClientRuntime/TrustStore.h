@@ -1,6 +1,7 @@
 #pragma once
 
 #include "quillon/crypto/Certificate.h"
+#include "ssoClient/SecurityTokenService.h"
 #include "ssoClientRuntime/Export.h"
 #include "ssoClientRuntime/TokenVerifier.h"
 
@@ -104,5 +105,20 @@ protected:
  */
 SSOCLIENT_RUNTIME_API boost::shared_ptr<TrustStore> CreateTrustStore(
     const std::string& path, const TrustStoreOptions& options = TrustStoreOptions());
+
+/**
+ * A service that shares everything with `service`, options included, but takes tokens that were
+ * signed by what the store trusts at the moment: each operation has the set with which it begins.
+ * It keeps the store alive. `WithOptions` takes the service that is given here, not the one that
+ * comes of it.
+ *
+ * @throws Quillon::InvalidArgumentException  the store is null, or the service is null or not one
+ *                                            that the library made.
+ *
+ * Thread safety: any number of threads.
+ */
+SSOCLIENT_RUNTIME_API boost::shared_ptr<SecurityTokenService> FollowTrust(
+    const boost::shared_ptr<const SecurityTokenService>& service,
+    const boost::shared_ptr<const TrustStore>& trust);
 
 } // namespace SsoClient

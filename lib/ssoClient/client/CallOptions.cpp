@@ -97,16 +97,11 @@ void RequireValid(const CallOptions& options)
 boost::shared_ptr<SecurityTokenService> WithOptions(
     const boost::shared_ptr<const SecurityTokenService>& service, const CallOptions& options)
 {
-    const auto* const ours = dynamic_cast<const SecurityTokenServiceImpl*>(service.get());
-    if (ours == nullptr) {
-        throw Quillon::InvalidArgumentException(
-            service == nullptr ? "There is no service."
-                               : "The service is not one that this library made.");
-    }
+    const SecurityTokenServiceImpl& own = RequireOwn(service);
     RequireValid(options);
     CallControl control;
     control.options = Bound(options);
-    return ours->UnderControl(control);
+    return own.UnderControl(control);
 }
 
 } // namespace SsoClient

@@ -253,6 +253,14 @@ boost::shared_ptr<SecurityTokenService> SecurityTokenServiceImpl::UnderControl(
     return copy;
 }
 
+boost::shared_ptr<SecurityTokenService> SecurityTokenServiceImpl::Trusting(
+    const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& certificates) const
+{
+    const auto copy = boost::make_shared<SecurityTokenServiceImpl>(*this);
+    copy->_trustedCertificates = certificates;
+    return copy;
+}
+
 boost::shared_ptr<const SecurityTokenService> SecurityTokenServiceImpl::Copy() const
 {
     const auto copy = boost::make_shared<SecurityTokenServiceImpl>(*this);
@@ -289,6 +297,18 @@ boost::shared_ptr<const SamlToken> SecurityTokenServiceImpl::ToSamlToken(
             "Successfully acquired token: %1", CreateRedactedDescription(*token));
     });
     return token;
+}
+
+const SecurityTokenServiceImpl& RequireOwn(
+    const boost::shared_ptr<const SecurityTokenService>& service)
+{
+    const auto* const own = dynamic_cast<const SecurityTokenServiceImpl*>(service.get());
+    if (own == nullptr) {
+        throw Quillon::InvalidArgumentException(
+            service == nullptr ? "There is no service."
+                               : "The service is not one that this library made.");
+    }
+    return *own;
 }
 
 } // namespace SsoClient

@@ -29,6 +29,10 @@ public:
     /** A service that shares everything with this one but what is said of its calls. */
     boost::shared_ptr<SecurityTokenService> UnderControl(const CallControl& control) const;
 
+    /** The same but for whose tokens it takes. */
+    boost::shared_ptr<SecurityTokenService> Trusting(
+        const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& certificates) const;
+
     boost::shared_ptr<const SamlToken> AcquireToken(
         const std::string& userName,
         const std::string& password,
@@ -101,5 +105,9 @@ private:
     boost::optional<HolderOfKeyConfig> _identity;
     boost::shared_ptr<const CallControl> _control; // null without options
 };
+
+/** @throws Quillon::InvalidArgumentException  it is null, or somebody else made it. */
+const SecurityTokenServiceImpl& RequireOwn(
+    const boost::shared_ptr<const SecurityTokenService>& service);
 
 } // namespace SsoClient

@@ -2,6 +2,7 @@
 #include "ssoClient/SecurityTokenService.h"
 #include "ssoClient/client/GssNegotiationContextImpl.h"
 #include "ssoClient/client/SecurityTokenServiceImpl.h"
+#include "ssoClient/client/trustedCertificates.h"
 #include "ssoClient/protocol/HttpsClient.h"
 #include "ssoClient/protocol/RequestBuilderImpl.h"
 #include "ssoClient/protocol/ResponseHandlerImpl.h"
@@ -82,6 +83,15 @@ boost::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
     RequirePositive(options.timeoutMicroseconds);
     RequirePositive(options.connectTimeoutMicroseconds);
     return MakeService(config, options);
+}
+
+boost::shared_ptr<SecurityTokenService> WithTrustedCertificates(
+    const boost::shared_ptr<const SecurityTokenService>& service,
+    const std::list<Quillon::Ref<const Quillon::Crypto::Certificate>>& certificates)
+{
+    const SecurityTokenServiceImpl& own = RequireOwn(service);
+    RefuseNullCertificate(certificates);
+    return own.Trusting(certificates);
 }
 
 boost::shared_ptr<InternalApi::GssNegotiationContext> InternalApi::CreateGssNegotiationContext(
