@@ -129,6 +129,27 @@ End GetEnd(const Operation& operation)
     return {};
 }
 
+/** Answers the legs when the server has done all that it does by itself. */
+class SlowHandler final : public NegotiationHandler
+{
+public:
+    explicit SlowHandler(DevSts::MisbehavingServer& server)
+        : _server(server)
+    {}
+
+    boost::shared_ptr<Leg> Negotiate(const Leg& serverLeg) override
+    {
+        if (!serverLeg.empty()) {
+            _server.AwaitQuiet();
+        }
+        return _answers.Negotiate(serverLeg);
+    }
+
+private:
+    DevSts::MisbehavingServer& _server;
+    ScriptedHandler _answers{{"first", "second"}};
+};
+
 /** The server of one row, and a client of it. */
 class MisbehavingServerTest : public testing::TestWithParam<Situation>
 {
@@ -178,6 +199,10 @@ protected:
         const std::string kind = GetParam().row.value("asks", "once");
         if (kind == "negotiates") {
             ScriptedHandler handler({"first", "second"});
+            return GetEnd([&] { service->AcquireTokenByGSS(MakeSpec(), handler); });
+        }
+        if (kind == "negotiatesSlowly") {
+            SlowHandler handler(server);
             return GetEnd([&] { service->AcquireTokenByGSS(MakeSpec(), handler); });
         }
         const auto acquire = [&] {
