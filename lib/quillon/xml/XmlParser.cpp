@@ -249,23 +249,54 @@ private:
     std::exception_ptr _failure;
 };
 
-/** A parser that reads `source` where it is; the octet after it is NUL. */
-ParserContextOwner CreateContext(std::string_view source)
+ParserContextOwner MakeContext()
 {
     static std::once_flag initialized;
     std::call_once(initialized, &xmlInitParser);
-
-    ParserContextOwner context(xmlNewParserCtxt());
-    // A string input has no buffer of its own: the parser neither copies nor moves the text.
-    xmlParserInput* input = context == nullptr
-                                ? nullptr
-                                : xmlNewStringInputStream(
-                                    context.get(), reinterpret_cast<const xmlChar*>(source.data()));
-    if (input == nullptr || inputPush(context.get(), input) < 0) {
-        throw std::bad_alloc();
-    }
-    return context;
+    return ParserContextOwner(xmlNewParserCtxt());
 }
+
+/**
+ * A parser for one text. The next one of the thread gets it too, unless this one failed, or took
+ * more memory than a token has it take: its dictionary keeps every name it has seen.
+ */
+class ThreadsParser
+{
+public:
+    /** @param source  is read where it is; the octet after it is NUL. */
+    explicit ThreadsParser(std::string_view source)
+        : _context(Idle ? std::move(Idle) : MakeContext())
+    {
+        // A string input has no buffer of its own: the parser neither copies nor moves the text.
+        xmlParserInput* input =
+            _context == nullptr
+                ? nullptr
+                : xmlNewStringInputStream(
+                    _context.get(), reinterpret_cast<const xmlChar*>(source.data()));
+        if (input == nullptr || inputPush(_context.get(), input) < 0) {
+            throw std::bad_alloc();
+        }
+    }
+
+    void Run(TreeBuilder& builder)
+    {
+        SaxRun(*_context, builder).Run();
+        xmlCtxtReset(_context.get());
+        if (xmlDictGetUsage(_context->dict) <= MostKept && _context->maxatts <= MostAttributes) {
+            Idle = std::move(_context);
+        }
+    }
+
+private:
+    static constexpr std::size_t MostKept = std::size_t{16} * 1024; // octets
+    static constexpr int MostAttributes = 256;                      // of libxml2, five for each
+
+    static thread_local ParserContextOwner Idle;
+
+    ParserContextOwner _context;
+};
+
+thread_local ParserContextOwner ThreadsParser::Idle;
 
 class DocumentImpl final : public Document
 {
@@ -298,8 +329,7 @@ Ref<Document> ParseInArena(const Ref<Arena>& arena)
     const std::string_view source = arena->GetSource();
     CheckSource(source);
     TreeBuilder builder(arena, source);
-    const ParserContextOwner context = CreateContext(source);
-    SaxRun(*context, builder).Run();
+    ThreadsParser(source).Run(builder);
     return Ref<Document>(new DocumentImpl(arena, builder.Finish()));
 }
 

@@ -3,6 +3,10 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <malloc.h>
+#include <thread>
+#include <vector>
+
 namespace Quillon::Xml {
 
 namespace {
@@ -139,6 +143,67 @@ TEST(Parse, CountsTheNamespacesOfATagThatRepeats)
         GetParseError("<r>" + Repeat(tag, 7) + Repeat("</a>", 7) + "</r>"),
         testing::StartsWith("More than 256 namespaces in scope"));
     EXPECT_EQ("accepted", GetParseError("<r>" + Repeat(tag + "</a>", 7) + "</r>"));
+}
+
+/** The tree as text, or why there is none. */
+std::string DescribeParse(const std::string& text)
+{
+    try {
+        return SerializeToText(ParseText(text)->GetRootElement());
+    } catch (const XMLParseException& error) {
+        return error.what();
+    }
+}
+
+/** What becomes of `text` on a thread that has read `before` last; empty for nothing at all. */
+std::string DescribeParseAfter(const std::string& before, const std::string& text)
+{
+    std::string description;
+    std::thread thread([&] {
+        if (!before.empty()) {
+            DescribeParse(before);
+        }
+        description = DescribeParse(text);
+    });
+    thread.join();
+    return description;
+}
+
+TEST(Parse, DependsOnNothingThatTheThreadHasReadBefore)
+{
+    const std::vector<std::string> texts{
+        "<r xmlns='urn:d' xmlns:p='urn:p'><p:a p:b='1'/></r>",
+        "<p:r><p:a p:b='1' p:b='2'/></p:r>",
+        "<p:r/>",
+        "<r xmlns:p='urn:p'><p:a>",
+        "<?xml version='1.0' encoding='UTF-8' standalone='yes'?><r/>",
+        "<r/>",
+        "<r>" + Repeat("<a>", 200),
+        "<r xml:space='preserve'> &amp; </r>",
+        "<!DOCTYPE r [<!ENTITY e 'f'>]><r>&e;</r>",
+        "<r>&e;</r>",
+        "<r" + MakeAttributes(200) + "/>",
+        "\xEF\xBB\xBF<r>\xC3\xA4</r>"};
+    for (const std::string& text : texts) {
+        const std::string alone = DescribeParseAfter("", text);
+        for (const std::string& before : texts) {
+            EXPECT_EQ(alone, DescribeParseAfter(before, text)) << "after " << before;
+        }
+    }
+}
+
+TEST(Parse, KeepsNoLargeDictionary)
+{
+    const auto measure = [] { return mallinfo2().uordblks; }; // nothing, with a sanitizer
+    ParseText("<r/>");
+    const std::size_t before = measure();
+    std::string text = "<r>";
+    for (int i = 0; i < 200'000; ++i) {
+        text += "<name-" + std::to_string(i) + "/>";
+    }
+    ParseText(text + "</r>");
+    text = std::string();
+    EXPECT_LT(measure(), before + 1'000'000);
 }
 
 TEST(ParseInPlace, PointsIntoTheTextAsItIs)
