@@ -74,6 +74,7 @@ auto Run(
 {
     return Run(road.control, operationName, describe, [&](Call& call) {
         const Quillon::Ref<Quillon::Reader> reply = call.Attempt(Repeat::IF_NOT_ACTED_ON, [&] {
+            road.transport.RequireUsable();
             Request request;
             build(request);
             return Send(*call.CreateSession(road.transport), request);

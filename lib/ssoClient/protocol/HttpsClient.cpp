@@ -135,6 +135,12 @@ HttpsClient::HttpsClient(
     }
 }
 
+void HttpsClient::RequireUsable() const
+{
+    Quillon::Ref<Http::HttpConnectionPool> pool;
+    Http::CreateHttpConnectionPool(_connectionSpec.get(), pool); // which is what refuses it
+}
+
 boost::shared_ptr<TransportSession> HttpsClient::CreateSession() const
 {
     return CreateControlledSession(SessionOptions());

@@ -39,6 +39,7 @@ public:
         const ExchangeOptions& options);
 
     boost::shared_ptr<TransportSession> CreateSession() const override;
+    void RequireUsable() const override;
     boost::shared_ptr<TransportSession> CreateControlledSession(
         const SessionOptions& options) const override;
     boost::shared_ptr<const Transport> WithReuse(
