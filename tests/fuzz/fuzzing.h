@@ -10,6 +10,13 @@
 /** One run of a target. What it promises is checked by `Require`; it must never end otherwise. */
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size);
 
+/**
+ * Makes another input of one in place, of at most `most` octets. A target may have one, and has
+ * libFuzzer's without.
+ */
+extern "C" std::size_t LLVMFuzzerCustomMutator(
+    std::uint8_t* data, std::size_t size, std::size_t most, unsigned seed);
+
 namespace Fuzzing {
 
 inline std::string_view ToText(const std::uint8_t* data, std::size_t size)

@@ -5,6 +5,7 @@
 #include "Files.h"
 #include "Neighbour.h"
 #include "PrivateKeys.h"
+#include "tomlText.h"
 
 #include "quillon/MessageFormatter.h"
 
@@ -70,6 +71,10 @@ std::string SuggestOneOf(const std::string& typed, const Words& names)
 
 toml::table ParseToml(const std::string& text, const std::string& file)
 {
+    if (const long line = FindForeignCharacter(text); line != 0) {
+        throw UsageError(MessageFormatter::ASPrint(
+            "`%1' line %2: a character that is not ASCII stands outside of quotes", file, line));
+    }
     try {
         return toml::parse(text);
     } catch (const toml::parse_error& error) {

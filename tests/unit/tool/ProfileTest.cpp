@@ -69,6 +69,32 @@ private:
 
 } // namespace
 
+// What toml++ does with them is not defined.
+TEST(ParseProfile, RefusesForeignCharactersOutsideOfQuotes)
+{
+    const std::string why = "a character that is not ASCII stands outside of quotes";
+    EXPECT_EQ(At(1, why), GetError("\xC3\xA9 = 1\n[p]\n"));
+    EXPECT_EQ(At(2, why), GetError("[p]\nurl\xD1\xA6 = 'x'\n"));
+    EXPECT_EQ(At(3, why), GetError("[p]\n# \xC3\xA9\nurl = 'x' \xC3\xA9\n"));
+    EXPECT_EQ(At(3, why), GetError("[p]\nurl = \"x\n\xC3\xA9\"\n"));
+    EXPECT_EQ(At(3, why), GetError("[p]\nurl = \"\"\"a\\\n  \xC3\xA9\"\"\"\n"));
+    EXPECT_EQ(At(2, why), GetError("[p]\nurl = \"\"\"a\\\xC3\xA9\"\"\"\n"));
+    EXPECT_EQ(At(2, why), GetError("[p]\nurl = 'x\\' \xC3\xA9'\n"));
+}
+
+TEST(ParseProfile, TakesForeignCharactersInQuotesAndComments)
+{
+    const std::string text = "\xEF\xBB\xBF[p] # \xC3\xA9\"\n"
+                             "url = \"\xC3\xA9\\\"\xC3\xA9\"\n"
+                             "user = '\xC3\xA9\\'\n"
+                             "ca = \"\"\"/\xC3\xA9\"\"\"\ncert = '\'\'/\xC3\xA9'\'\'\n";
+    const Profile profile = ParseProfile(text, File, "p");
+    EXPECT_EQ(Words{"\xC3\xA9\"\xC3\xA9"}, profile.values.at("url"));
+    EXPECT_EQ(Words{"\xC3\xA9\\"}, profile.values.at("user"));
+    EXPECT_EQ(Words{"/\xC3\xA9"}, profile.values.at("ca"));
+    EXPECT_EQ(Words{"/\xC3\xA9"}, profile.values.at("cert"));
+}
+
 TEST(ParseProfile, ReadsEveryKeyAndFindsFilesBesideItself)
 {
     EXPECT_THAT(
