@@ -39,18 +39,15 @@ std::vector<char*> ToPointers(std::vector<std::string>& texts)
     return pointers;
 }
 
-/** How a process is started: with signals as a shell expects them, and with no input. */
+/** How a process is started: with the signals that are this one's to read, and with no input. */
 class SpawnSettings
 {
 public:
     explicit SpawnSettings(const sigset_t& signals)
     {
-        sigset_t all;
-        sigfillset(&all);
         ::posix_spawnattr_init(&attributes);
         ::posix_spawnattr_setsigmask(&attributes, &signals);
-        ::posix_spawnattr_setsigdefault(&attributes, &all);
-        ::posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF);
+        ::posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSIGMASK);
         ::posix_spawn_file_actions_init(&actions);
         ::posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
     }

@@ -6,8 +6,6 @@
 #include "PresentedToken.h"
 #include "Secret.h"
 
-#include "ssoClient/CallOptions.h"
-
 #include <sys/stat.h>
 
 #include <memory>
@@ -136,8 +134,7 @@ void KeepSourceOptions::RequireFitting() const
     Require(method != ByCertificate || !isBearer, "--bearer is not for --method certificate");
 }
 
-Source KeepSourceOptions::Make(
-    SsoClient::TokenSourceOptions source, const SsoClient::CancellationToken& cancellation) const
+Source KeepSourceOptions::Make(SsoClient::TokenSourceOptions source) const
 {
     RequireFitting();
     const CertificateList trusted = ReadCertificates(service.trustFiles);
@@ -145,9 +142,7 @@ Source KeepSourceOptions::Make(
     if (holder) {
         source.identity = holder->certificate;
     }
-    SsoClient::CallOptions calls;
-    calls.cancellation = cancellation;
-    const Service asked = SsoClient::WithOptions(service.CreateService(trusted, holder), calls);
+    const Service asked = service.CreateService(trusted, holder);
     if (method == ByPassword) {
         return CreatePasswordTokenSource(asked, PasswordReader(password), token.spec, source);
     }

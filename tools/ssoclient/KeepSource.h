@@ -5,7 +5,6 @@
 #include "ServiceOptions.h"
 #include "TokenSpecOptions.h"
 
-#include "ssoClient/Cancellation.h"
 #include "ssoClientGss/KerberosNegotiationHandler.h"
 #include "ssoClientRuntime/TokenSource.h"
 
@@ -28,13 +27,10 @@ struct KeepSourceOptions
      * Makes the source. Reads the files that are read once, and asks for what nobody can be asked
      * later: passphrase and password.
      *
-     * @param source        what is said of the source beside this.
-     * @param cancellation  of the calls of the service.
-     * @throws UsageError   the options do not fit the method, or a file cannot be used.
+     * @param source       what is said of the source beside this.
+     * @throws UsageError  the options do not fit the method, or a file cannot be used.
      */
-    boost::shared_ptr<SsoClient::TokenSource> Make(
-        SsoClient::TokenSourceOptions source,
-        const SsoClient::CancellationToken& cancellation) const;
+    boost::shared_ptr<SsoClient::TokenSource> Make(SsoClient::TokenSourceOptions source) const;
 
 private:
     void RequireFitting() const;

@@ -92,7 +92,6 @@ private:
     std::optional<MetricsServer> _metrics;
 
     const std::shared_ptr<StatusMailbox> _mailbox = std::make_shared<StatusMailbox>();
-    const SsoClient::CancellationSource _cancellation;
     boost::shared_ptr<SsoClient::TokenSource> _source;
     const SignalReader _signals; // from here on they are blocked: no more questions to the user
     FollowUp _followUp;
@@ -110,7 +109,7 @@ Keeping::Keeping(
     : _speech(presentation, exchanges)
     , _file(options.file, SecretMode)
     , _manager([speech = _speech](const std::string& text) { speech.TellProblem(text); })
-    , _source(options.source.Make(MakeSourceOptions(options), _cancellation.GetToken()))
+    , _source(options.source.Make(MakeSourceOptions(options)))
     , _followUp(options.shellCommand, options.file, _signals.GetBefore())
 {
     if (!options.source.service.verbose) {
@@ -163,8 +162,7 @@ void Keeping::Run()
         }
     }
     _manager.TellStopping();
-    _cancellation.Cancel();
-    _source.reset();
+    _source.reset(); // an exchange that is under way is called off when the process ends
 }
 
 void Keeping::Wait() const

@@ -131,11 +131,17 @@ class Later(KeepTest):
         keeping.find(rf"\Assoclient: UsageError: `{self.file}' is a link: name the file itself; "
                      r"the next attempt is at \S+Z\Z")
         self.assertEqual("older", target.read_text())
-        self.assertEqual("UsageError", self.status()["error"]["class"])
+        first = self.status()["error"]
+        self.assertEqual("UsageError", first["class"])
         self.file.unlink()
         keeping.find(WRITTEN)  # by itself
         self.assertEqual(self.token_id(), self.status()["token"]["id"])
         self.assertIsNone(self.status()["error"])
+        self.file.unlink()
+        self.file.symlink_to(target)
+        keeping.send(signal.SIGHUP)
+        keeping.find("UsageError")
+        self.assertLess(first["since"], self.status()["error"]["since"])
         self.assert_ends(keeping)
 
     def test_full_disk_leaves_the_older_file(self):
