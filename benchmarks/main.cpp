@@ -2,6 +2,7 @@
 #include "GrowthBenchmark.h"
 #include "RatioReporter.h"
 #include "SignBenchmark.h"
+#include "ThreadsBenchmark.h"
 #include "TokenSourceBenchmark.h"
 #include "VerifyBenchmark.h"
 
@@ -15,6 +16,7 @@ int main(int argc, char** argv)
     }
     Benchmarks::RegisterVerifyBenchmarks();
     Benchmarks::RegisterSignBenchmarks();
+    Benchmarks::RegisterThreadsBenchmarks();
     Benchmarks::RegisterTokenSourceBenchmarks();
     Benchmarks::RegisterAcquireBenchmarks();
     Benchmarks::RegisterGrowthBenchmarks();
