@@ -7,7 +7,7 @@
 
 #include <iostream>
 
-using Json = nlohmann::json;
+using Json = nlohmann::ordered_json;
 
 namespace {
 
