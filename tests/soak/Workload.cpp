@@ -6,8 +6,6 @@
 #include "ssoClientGss/KerberosNegotiationHandler.h"
 #include "support/TestData.h"
 
-#include <list>
-#include <mutex>
 #include <thread>
 
 using namespace SsoClient;
@@ -19,17 +17,18 @@ namespace {
 constexpr char SolutionUser[] = "service";
 constexpr long MostPending = 64;
 
-/** They outlive the services, as their users must see to, and threads beyond the end of `main`. */
-Quillon::Ssl::SSLContext* KeepContext(const std::string& authorities)
+Quillon::Ref<Quillon::Ssl::SSLContext> MakeContext(const std::string& authorities)
 {
-    static std::mutex mutex;
-    static auto& contexts = *new std::list<Quillon::Ref<Quillon::Ssl::SSLContext>>;
     Quillon::Ssl::SSLContextOptions options;
     options.useSystemAuthorities = false;
     options.authorities = Quillon::Crypto::ParsePemCertificates(authorities);
-    const std::lock_guard<std::mutex> lock(mutex);
-    contexts.push_back(CreateSSLContext(options));
-    return contexts.back().get();
+    return CreateSSLContext(options);
+}
+
+/** The same service, which keeps what it refers to. */
+ServicePtr Keeping(const ServicePtr& service, const Quillon::Ref<Quillon::Ssl::SSLContext>& context)
+{
+    return ServicePtr(service.get(), [service, context](SecurityTokenService*) {});
 }
 
 } // namespace
@@ -65,16 +64,17 @@ ServicePtr MakeService(
     config.trustedCertificates = GetTestCertificates("sts");
     config.holderOfKeyConfig =
         HolderOfKeyConfig{GetTestKey("client"), GetTestCertificates("client").front()};
-    config.sslContext = KeepContext(authorities);
+    const auto context = MakeContext(authorities);
+    config.sslContext = context.get();
     ExchangeOptions options;
     options.timeoutMicroseconds = timeoutMs * 1000;
     const ServicePtr service = CreateSecurityTokenService(config, options);
     if (!reuses) {
-        return service;
+        return Keeping(service, context);
     }
     CallOptions calls;
     calls.connectionReuse = ConnectionReuse();
-    return WithOptions(service, calls);
+    return Keeping(WithOptions(service, calls), context);
 }
 
 TokenSpec MakeSpec()

@@ -2,7 +2,8 @@
 #include <cstdlib>
 #include <dlfcn.h>
 
-// Loads a module, lets it begin, and unloads it in the midst of what it began, a few times.
+// Loads a module, lets it use the library, and unloads it while the library's threads go on, a few
+// times.
 int main(int count, char** words)
 {
     if (count != 4) {

@@ -109,6 +109,13 @@ int Require(bool holds, const std::string& what)
     return holds ? 0 : 1;
 }
 
+/** The sanitizers keep what is freed for a while. */
+bool IsSanitized()
+{
+    const char* const sanitizers = std::getenv("SOAK_SANITIZED");
+    return sanitizers != nullptr && *sanitizers != '\0';
+}
+
 /** From the end of the first tenth to the last. Two services keep up to eight connections each. */
 int JudgeGrowth(const Usage& first, const Usage& last)
 {
@@ -118,8 +125,7 @@ int JudgeGrowth(const Usage& first, const Usage& last)
     constexpr long MostLibraryThreads = Quillon::System::ThreadPool::DefaultLimit + 8;
     return Require(last.heapKilobytes <= first.heapKilobytes + HeapSlack, "the heap grows")
            + Require(
-               last.residentKilobytes <= first.residentKilobytes + ResidentSlack
-                   || std::getenv("SOAK_SANITIZED") != nullptr,
+               last.residentKilobytes <= first.residentKilobytes + ResidentSlack || IsSanitized(),
                "resident memory grows")
            + Require(
                last.descriptors <= first.descriptors + KeptConnections, "descriptors are lost")
@@ -152,7 +158,8 @@ pid_t StartBriefProcess(const Options& options, const std::string& url, unsigned
     return pid;
 }
 
-/** A host that loads a module with the library, and unloads it in the midst of its work. */
+/** A host that loads a module with the library, and unloads it while threads of the library go on.
+ */
 pid_t StartHost(const std::string& url, unsigned seed)
 {
     const std::string number = std::to_string(seed);
@@ -190,8 +197,10 @@ pid_t ForkMidway(const ServicePtr& service)
     std::ifstream file(options.authorities);
     const std::string authorities{std::istreambuf_iterator<char>(file), {}};
     // Never destroyed: completions may still use them while the process ends.
-    auto& services = *new std::vector<ServicePtr>{MakeService(options.url, authorities, TimeoutMs)};
-    Workload& workload = *new Workload(services, {}, *new Ledger, options.seed);
+    static auto& services =
+        *new std::vector<ServicePtr>{MakeService(options.url, authorities, TimeoutMs)};
+    static Ledger& ledger = *new Ledger;
+    static Workload& workload = *new Workload(services, {}, ledger, options.seed);
     const auto end = Clock::now() + milliseconds(options.seed % 300);
     while (Clock::now() < end) {
         workload.StartAcquisition();
