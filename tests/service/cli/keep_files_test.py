@@ -9,6 +9,7 @@ import signal
 import socket
 import subprocess
 import threading
+import time
 import unittest
 
 from keeping import DEADLINE, WRITTEN, Keeping, KeepTest
@@ -22,15 +23,19 @@ class Killed(KeepTest):
         """Each time at another moment; whoever is killed while writing leaves one file at most."""
         chance = random.Random(20261122)
         allowed = {"token.xml", ".token.xml.ssoclient", "password"}
+        began = time.monotonic()
+        first = self.keep()
+        first.find(WRITTEN)
+        until_written = time.monotonic() - began
+        first.end(signal.SIGKILL)
         seen = set()
         for _ in range(KILLS):
             keeping = Keeping(self.file, *self.by_password)
-            threading.Event().wait(chance.uniform(0, 0.12))
+            threading.Event().wait(chance.uniform(0, 1.5 * until_written))
             keeping.send(signal.SIGKILL)
             keeping.end()
             self.assertLessEqual({path.name for path in self.folder.iterdir()}, allowed)
-            if self.file.exists():
-                seen.add(self.token_id())
+            seen.add(self.token_id())
         self.assertLess(1, len(seen), "nobody lived long enough to write")
         self.assertLess(len(seen), KILLS, "nobody was killed early enough")
 
