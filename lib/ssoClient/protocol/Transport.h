@@ -77,14 +77,6 @@ struct SessionOptions
 class Transport
 {
 public:
-    /**
-     * Refuses a process that can send nothing, before anything is done for a request: in a forked
-     * child a lock of OpenSSL's may never be free, because another thread had it at the fork.
-     *
-     * @throws Quillon::Http::HttpException  the process is a child that was forked too late.
-     */
-    virtual void RequireUsable() const {}
-
     virtual boost::shared_ptr<TransportSession> CreateSession() const = 0;
 
     /** One for a call that has more to say. */
@@ -94,6 +86,14 @@ public:
     /** The same way with connections that are kept, or without. */
     virtual boost::shared_ptr<const Transport> WithReuse(
         const boost::optional<ConnectionReuse>& reuse) const = 0;
+
+    /**
+     * Refuses a process that can send nothing, before anything is done for a request: in a forked
+     * child a lock of OpenSSL's may never be free, because another thread had it at the fork.
+     *
+     * @throws Quillon::Http::HttpException  the process is a child that was forked too late.
+     */
+    virtual void RequireUsable() const {}
 
 protected:
     ~Transport() = default;
