@@ -70,6 +70,8 @@ HttpsClient::HttpsClient(
         {url, sslContext, peer, options.timeoutMicroseconds, options.connectTimeoutMicroseconds});
 }
 
+void HttpsClient::RequireUsable() const {}
+
 boost::shared_ptr<TransportSession> HttpsClient::CreateSession() const
 {
     return boost::make_shared<MuteSession>();
