@@ -53,13 +53,11 @@ private:
             if (!isLong && _text[_at] == '\n') {
                 return; // which is an error
             }
-            if (_text[_at] == '\\' && quote == '"') {
-                if (SkipEscape(isLong)) {
-                    return;
-                }
-            } else {
-                ++_at;
+            const bool isEscape = _text[_at] == '\\' && quote == '"';
+            if (isEscape && SkipEscape(isLong)) {
+                return;
             }
+            _at += isEscape ? 0 : 1;
         }
         _at = std::min(_at + end.size(), _text.size());
     }
