@@ -27,9 +27,11 @@ public:
         while (_at < _text.size() && !IsForeign(_text[_at])) {
             if (_text[_at] == '#') {
                 _at = Find("\n", _at);
-            } else if (_text[_at] == '"' || _text[_at] == '\'') {
+            } else if (_startsValue && (_text[_at] == '"' || _text[_at] == '\'')) {
                 SkipString();
+                _startsValue = false;
             } else {
+                _startsValue = MayStartValueBehind(_text[_at]);
                 ++_at;
             }
         }
@@ -37,6 +39,14 @@ public:
     }
 
 private:
+    /** A quote inside of a number or a bare word begins no string: toml++ reads on to its end. */
+    bool MayStartValueBehind(char character) const
+    {
+        constexpr std::string_view Before = " \t\r\n=,";
+        const bool isOpening = character == '[' || character == '{';
+        return Before.find(character) != std::string_view::npos || (_startsValue && isOpening);
+    }
+
     std::size_t Find(std::string_view what, std::size_t from) const
     {
         return std::min(_text.find_first_of(what, from), _text.size());
@@ -81,6 +91,7 @@ private:
 
     const std::string_view _text;
     std::size_t _at = 0;
+    bool _startsValue = true;
 };
 
 } // namespace

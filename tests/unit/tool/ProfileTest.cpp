@@ -79,6 +79,8 @@ TEST(ParseProfile, RefusesForeignCharactersOutsideOfQuotes)
     EXPECT_EQ(At(3, why), GetError("[p]\nurl = \"x\n\xC3\xA9\"\n"));
     EXPECT_EQ(At(3, why), GetError("[p]\nurl = \"\"\"a\\\n  \xC3\xA9\"\"\"\n"));
     EXPECT_EQ(At(2, why), GetError("[p]\nurl = \"\"\"a\\\xC3\xA9\"\"\"\n"));
+    EXPECT_EQ(At(2, why), GetError("[p]\nurl = 1979-52\"\"\"\xC3\xA9\"\"\"\n"));
+    EXPECT_EQ(At(2, why), GetError("[p]\nurl = 1[\"\xC3\xA9\"]\n"));
     EXPECT_EQ(At(2, why), GetError("[p]\nurl = 'x\\' \xC3\xA9'\n"));
 }
 
@@ -89,6 +91,10 @@ TEST(ParseProfile, TakesForeignCharactersInQuotesAndComments)
                              "user = '\xC3\xA9\\'\n"
                              "ca = \"\"\"/\xC3\xA9\"\"\"\ncert = '\'\'/\xC3\xA9'\'\'\n";
     const Profile profile = ParseProfile(text, File, "p");
+    EXPECT_EQ(
+        (Words{"/\xC3\xA9", "/x"}),
+        ParseProfile("[\"\xC3\xA9\"]\nca = [\"/\xC3\xA9\",'/x']\n", File, "\xC3\xA9")
+            .values.at("ca"));
     EXPECT_EQ(Words{"\xC3\xA9\"\xC3\xA9"}, profile.values.at("url"));
     EXPECT_EQ(Words{"\xC3\xA9\\"}, profile.values.at("user"));
     EXPECT_EQ(Words{"/\xC3\xA9"}, profile.values.at("ca"));
