@@ -71,7 +71,7 @@ private:
     bool _isDelegable = false;
     bool _isSolution = false;
     std::pair<std::string, std::string> _fullName; // given name, surname
-    std::vector<std::string> _groups; // as they are written
+    std::vector<std::string> _groups;              // as they are written
     std::vector<Delegate> _delegationChain;
     std::set<std::string> _audience;
     std::vector<Advice> _advice;
