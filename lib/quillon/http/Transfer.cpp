@@ -38,12 +38,12 @@ Transfer::Transfer(
     Ref<ClientRequestImpl> request,
     Ref<ConnectionPoolImpl> pool,
     Ref<CookieStoreImpl> cookies,
-    Ref<PendingRequestItemImpl> item)
+    const Ref<PendingRequestItemImpl>& item)
     : _request(std::move(request))
     , _pool(std::move(pool))
     , _spec(_pool->GetSpec())
     , _cookies(std::move(cookies))
-    , _notice(1, std::move(item))
+    , _notice(1, item)
     , _exchange(_notice.front()->GetExchange())
     , _reply(_request->GetBodyStatuses(), !_request->GetObserver().empty())
     , _record(new Ssl::PeerRecord)

@@ -24,7 +24,7 @@ public:
         Ref<ClientRequestImpl> request,
         Ref<ConnectionPoolImpl> pool,
         Ref<CookieStoreImpl> cookies,
-        Ref<PendingRequestItemImpl> item);
+        const Ref<PendingRequestItemImpl>& item);
 
     ~Transfer();
     Transfer(const Transfer&) = delete;

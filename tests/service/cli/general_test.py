@@ -1,6 +1,7 @@
 """`ssoclient inspect --general` on assertions of many producers, which other tools made."""
 
 import json
+import re
 import sys
 import time
 import unittest
@@ -256,7 +257,11 @@ class Verbose(ScriptedTest):
         issue(self.service, token)
 
     def inspect(self, token, *options):
-        return ssoclient("inspect", token, *TRUST, *options)
+        """Without the first line of a program that cannot be confined, for which see inspect_test."""
+        result = ssoclient("inspect", token, *TRUST, *options)
+        notice = r"\Assoclient: the token is read without a filter of system calls: .+\n"
+        said = re.sub(notice, "", result.err) if "--verbose" in options else result.err
+        return result._replace(err=said)
 
     def present(self, token, *options):
         return ssoclient("validate", "--url", self.service.url, *TRUST, "--token", token, *options)
