@@ -59,6 +59,8 @@ def complaint(operation, counted, recorded):
 
 
 def main():
+    if len(sys.argv) < 2 or sys.argv[2:] not in ([], ["--record"]):
+        sys.exit("usage: instructions.py PROGRAM [--record]")
     program = str(pathlib.Path(sys.argv[1]).resolve())
     counted = {operation: count(program, operation) for operation in OPERATIONS}
     if sys.argv[2:] == ["--record"]:
